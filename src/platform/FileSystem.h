@@ -1,0 +1,48 @@
+// The seam to the local files. Paths are full paths or relative to the process's folder.
+#pragma once
+
+#include <cstdint>
+
+#include "support/Text.h"
+
+namespace tarnwick {
+
+// Attribute bits as the system numbers them. A file without any of them is a normal one.
+namespace attribute {
+inline constexpr std::uint32_t kReadOnly = 0x01;
+inline constexpr std::uint32_t kHidden = 0x02;
+inline constexpr std::uint32_t kSystem = 0x04;
+inline constexpr std::uint32_t kArchive = 0x20;
+}  // namespace attribute
+
+class FileSystem {
+ public:
+  virtual ~FileSystem() = default;
+
+  // Length in bytes. Throws run-time error 53 when there is no such file.
+  virtual std::uint64_t Length(TextView path) = 0;
+
+  // Time of the last change as text in the user's date and time format. Throws 53 like Length.
+  virtual Text ModifiedText(TextView path) = 0;
+
+  // The attribute bits above. Throws 53 like Length.
+  virtual std::uint32_t Attributes(TextView path) = 0;
+
+  // Sets the attribute bits; 0 makes the file normal. Throws 75 on failure.
+  virtual void SetAttributes(TextView path, std::uint32_t attributes) = 0;
+
+  // Copies over an existing destination, whole or not at all. Throws 53 or 75.
+  virtual void Copy(TextView source, TextView destination) = 0;
+
+  // First name that matches `pattern` (wildcards in the last part): files that are neither hidden nor system
+  // files, and with `folders` folders too. Empty when there is none.
+  virtual Text FirstName(TextView pattern, bool folders) = 0;
+
+  // Creates one level. Throws 58 when the name is taken, 76 when the parent is missing, 75 otherwise.
+  virtual void MakeFolder(TextView path) = 0;
+
+  // The temporary folder with its trailing separator, at most 254 characters; empty on failure.
+  virtual Text TempPath() = 0;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,52 @@
+// The request component: carries one request to the service page and reads its reply, and calls the acceptor
+// pages for folders.
+//
+// Wire form of an exchange: an HTTP POST to PATH/PAGE?Request=NAME&Flag=FLAG whose body is name=value joined by
+// "&", in the order of adding. Values come escaped or enciphered, so the only further escape is %XX (upper-case
+// hex) for each byte of the UTF-8 form outside 0x21 to 0x7E.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "service/Reply.h"
+#include "support/Text.h"
+
+namespace tarnwick {
+
+class HttpTransport;
+
+// A request that is being composed.
+struct Request {
+  Text name;
+  Text page;
+  std::vector<std::pair<Text, Text>> parameters;
+};
+
+class HTTPServer {
+ public:
+  // `http` outlives the object.
+  explicit HTTPServer(HttpTransport& http) : http_(http) {}
+
+  // A new request without parameters, addressed to `page`.
+  static Request CreateXLLDFRequest(TextView requestName, TextView page);
+
+  static void AddParameter(Request& request, TextView name, TextView value);
+
+  // Sends the request. `path` is the server name ("host" or "host:port") followed by the folder of the page,
+  // without a scheme. Never throws for what the network does: a failed exchange is a reply whose ErrorOccured
+  // is 1.
+  Reply SendRequest(const Request& request, TextView path, std::int32_t sendFlag);
+
+  // Asks the acceptor page for `action` on `folder` (a bare name). Throws a run-time error with the page's error
+  // number, see PostAcceptorForm.
+  void FolderActionWithEvents(TextView usersBaseUrl, TextView folder, TextView acceptorPath, std::int32_t action,
+                              TextView user, TextView password, TextView productGuid);
+
+ private:
+  HttpTransport& http_;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,38 @@
+// The reply of the service page: variables by name, each an array of texts.
+#pragma once
+
+#include <cstdint>
+#include <string>
+#include <string_view>
+#include <unordered_map>
+#include <vector>
+
+#include "support/Text.h"
+
+namespace tarnwick {
+
+class Reply {
+ public:
+  // A failed exchange without variables.
+  Reply() = default;
+
+  // Reads an `application/x-www-form-urlencoded` body in UTF-8. A broken escape or invalid UTF-8 anywhere makes
+  // the exchange a failed one, as does a variable ErrorOccured of 1.
+  static Reply FromBody(std::string_view body);
+
+  // 1 when the exchange failed, else 0.
+  std::int32_t ErrorOccured() const { return failed_ ? 1 : 0; }
+
+  // Every value that the server sent under `name` (letter case counts), in its order; a bare name has none.
+  // Throws run-time error 9 when the name did not occur.
+  const std::vector<Text>& GetValueByVariableName(TextView name) const;
+
+  // Element 0 of the above; throws 9 when there is none.
+  const Text& First(TextView name) const;
+
+ private:
+  std::unordered_map<Text, std::vector<Text>> variables_;
+  bool failed_ = true;
+};
+
+}  // namespace tarnwick

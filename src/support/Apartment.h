@@ -1,0 +1,84 @@
+// The state that all objects of one thread apartment share. It is handed to constructors; nothing of it is a
+// global of the core. Objects are apartment-threaded, so it needs no lock.
+#pragma once
+
+#include <cstdint>
+#include <memory>
+
+#include "platform/Internet.h"
+#include "platform/Platform.h"
+#include "platform/StringResources.h"
+#include "service/CUpload.h"
+#include "support/KeyedList.h"
+#include "support/Text.h"
+
+namespace tarnwick {
+
+using FileList = KeyedList<std::shared_ptr<CUpload>>;
+
+// Who is connected to what; set by `ConnectToServer` and `LogonAs`.
+struct SessionValues {
+  // "host" or "host:port".
+  Text serverName;
+  Text userName;
+  Text password;
+  std::int32_t productNumber = 0;
+  Text mguid;
+  // Set by a log-on; cleared once its FTP values were rewritten for the proxy.
+  bool loggedOn = false;
+};
+
+// How an FTP proxy learns the server behind it.
+enum class ProxyStyle { kUserAtHostColonPort, kUserAtHostBlankPort };
+
+struct FtpState {
+  Text host;
+  std::uint16_t port = 21;
+  Text userName;
+  Text password;
+  Text proxyHost;
+  Text proxyPort;
+  ProxyStyle proxyStyle = ProxyStyle::kUserAtHostColonPort;
+  bool useProxy = false;
+  // The connection is open and its directory is the user's folder.
+  bool connected = false;
+  Text directory;
+  // The connection goes first when the state ends.
+  std::unique_ptr<InternetSession> internet;
+  std::unique_ptr<FtpConnection> connection;
+};
+
+// The browser's proxy for picture downloads.
+struct ProxyValues {
+  // Empty when no proxy is used.
+  Text ProxyHost;
+  Text ProxyPort;
+  // The setting as it stood in the registry.
+  Text ProxyServerSetting;
+};
+
+struct Apartment {
+  explicit Apartment(const Platform& systemPlatform) : platform(systemPlatform) {}
+
+  const Platform platform;
+  SessionValues session;
+  FtpState ftp;
+  ProxyValues proxy;
+
+  // Working folder of the user without a trailing separator; empty until it is prepared.
+  Text UserFolderPath;
+
+  // The server's listing, and the part of it that a filter shows.
+  FileList allFiles;
+  FileList shownFiles;
+  bool listingIsCurrent = false;
+  bool listLoaded = false;
+
+  bool abortTransfer = false;
+
+  // The host product's strings, tried once; null when there are none.
+  std::unique_ptr<ResourceLibrary> resourceLibrary;
+  bool resourceLibraryTried = false;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,70 @@
+// An ordered list whose items may have a unique key, the core of an automation collection.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <unordered_set>
+#include <utility>
+#include <vector>
+
+#include "support/RuntimeError.h"
+#include "support/Text.h"
+
+namespace tarnwick {
+
+// Positions count from 1, as hosts count. Keys are compared exactly; an item without a key has the empty one.
+template <typename Item>
+class KeyedList {
+ public:
+  std::size_t Count() const { return entries_.size(); }
+  bool IsEmpty() const { return entries_.empty(); }
+
+  // Appends. Throws run-time error 457 when the key is in use; the list is then unchanged.
+  void Add(Item item, TextView key = {}) { Insert(Count() + 1, std::move(item), key); }
+
+  // Puts the item at `position` (1 to Count() + 1). Throws 9 for another position, 457 like Add.
+  void Insert(std::size_t position, Item item, TextView key = {}) {
+    if (position < 1 || position > Count() + 1) throw RuntimeError(error::kSubscriptOutOfRange);
+    if (!key.empty() && !keys_.emplace(key).second) throw RuntimeError(error::kDuplicateKey);
+    entries_.insert(entries_.begin() + static_cast<std::ptrdiff_t>(position - 1),
+                    Entry{std::move(item), Text(key)});
+  }
+
+  // Throws 9 when `position` is not 1 to Count().
+  const Item& At(std::size_t position) const { return EntryAt(position).item; }
+
+  // Position of the item with that key, 0 when there is none.
+  std::size_t PositionOf(TextView key) const {
+    if (key.empty() || !keys_.contains(Text(key))) return 0;
+    for (std::size_t i = 0; i < entries_.size(); ++i)
+      if (entries_[i].key == key) return i + 1;
+    return 0;
+  }
+
+  // Throws 9 like At.
+  void Remove(std::size_t position) {
+    keys_.erase(EntryAt(position).key);
+    entries_.erase(entries_.begin() + static_cast<std::ptrdiff_t>(position - 1));
+  }
+
+  void Clear() {
+    entries_.clear();
+    keys_.clear();
+  }
+
+ private:
+  struct Entry {
+    Item item;
+    Text key;
+  };
+
+  const Entry& EntryAt(std::size_t position) const {
+    if (position < 1 || position > Count()) throw RuntimeError(error::kSubscriptOutOfRange);
+    return entries_[position - 1];
+  }
+
+  std::vector<Entry> entries_;
+  std::unordered_set<Text> keys_;
+};
+
+}  // namespace tarnwick
