@@ -180,16 +180,27 @@ class CFileUpload {
   const Reply& Ask(TextView requestName, TextView clientAction, std::initializer_list<Parameter> parameters,
                    std::int32_t sendFlag);
 
-  // The exchange of an operation whose result is the text or the number of one reply variable and `onFailure`
-  // after a failed exchange.
-  template <typename Value, typename Convert>
-  Value AskForValue(TextView requestName, TextView clientAction, std::initializer_list<Parameter> parameters,
-                    std::int32_t sendFlag, TextView variable, Value onFailure, Convert convert);
+  // The first value of one reply variable, which is the whole result of an operation. `onFailure` after a failed
+  // exchange; throws what a missing variable throws.
+  Text AskForText(TextView requestName, TextView clientAction, std::initializer_list<Parameter> parameters,
+                  std::int32_t sendFlag, TextView variable, TextView onFailure);
+
+  // The same as a number. Never throws: 0 when the variable is missing or no number.
+  std::int32_t AskForNumber(TextView requestName, TextView clientAction,
+                            std::initializer_list<Parameter> parameters, std::int32_t sendFlag,
+                            TextView variable, std::int32_t onFailure);
 
   Text RegisterFile(TextView fileName, TextView path);
-  // The session's product number and user name as parameter values.
-  Text SessionProduct() const;
-  Text SessionUser() const;
+  // Logs the new user on and creates the user's folder; false when either fails.
+  bool SetUpAccount(TextView ProductID, TextView Username, TextView password, TextView mguid, TextView folder);
+  void LookUpFtpProxy();
+
+  // A value as it goes into the form when it is enciphered.
+  static Text Encipher(TextView value);
+
+  // The session's product number and escaped user name as parameter values.
+  Text SessionProduct() const { return TextFromNumber(apartment_.session.productNumber); }
+  Text SessionUser() const { return EnCodeString(apartment_.session.userName); }
 
   Apartment& apartment_;
   HTTPServer channel_;

@@ -23,11 +23,11 @@ class Reply {
   // 1 when the exchange failed, else 0.
   std::int32_t ErrorOccured() const { return failed_ ? 1 : 0; }
 
-  // Every value that the server sent under `name` (letter case counts), in its order; a bare name has none.
-  // Throws run-time error 9 when the name did not occur.
-  const std::vector<Text>& GetValueByVariableName(TextView name) const;
+  // Every value that the server sent under `name` (letter case counts), in its order; a bare name has none. Null
+  // when the name did not occur. Owned by the reply.
+  const std::vector<Text>* GetValueByVariableName(TextView name) const;
 
-  // Element 0 of the above; throws 9 when there is none.
+  // Element 0 of the above. Throws run-time error 9 when there is none.
   const Text& First(TextView name) const;
 
  private:

@@ -1,0 +1,195 @@
+// Construction, the exchange that all operations use, session and FTP connection. The operations on files and on
+// accounts are in CFileUploadFiles.cpp and CFileUploadAccounts.cpp.
+#include "service/CFileUpload.h"
+
+#include "service/Log.h"
+#include "service/modEnctyption.h"
+#include "support/ProxySettings.h"
+#include "support/ResourceStrings.h"
+#include "support/RuntimeError.h"
+#include "transfer/HttpAddress.h"
+
+namespace tarnwick {
+namespace {
+
+constexpr TextView kServicePage = u"BVServicePage.asp";
+constexpr TextView kServiceFolder = u"/bv/bin";
+constexpr TextView kFtpAgent = u"FileUploadClient";
+constexpr std::uint16_t kFtpPort = 21;
+
+// The FTP session speaks to the session's server as the session's user.
+void SetFtpLogon(FtpState& ftp, const SessionValues& session) {
+  const auto address = SplitHttpAddress(session.serverName);
+  ftp.host = address ? address->host : Text();
+  ftp.port = kFtpPort;
+  ftp.userName = session.userName;
+  ftp.password = session.password;
+}
+
+void RewriteForProxy(FtpState& ftp) {
+  const Text port = TextFromNumber(ftp.port);
+  switch (ftp.proxyStyle) {
+    case ProxyStyle::kUserAtHostColonPort:
+      ftp.userName += u"@" + ftp.host + u":" + port;
+      break;
+    case ProxyStyle::kUserAtHostBlankPort:
+      ftp.userName += u"@" + ftp.host + u" " + port;
+      break;
+  }
+  ftp.host = ftp.proxyHost;
+}
+
+}  // namespace
+
+CFileUpload::CFileUpload(Apartment& apartment) : apartment_(apartment), channel_(apartment.platform.http) {
+  LoadResourceLibrary(apartment_);
+  Log(u"");
+  Log(u"Start Logging for ORV2 BV Component");
+  Log(u"Logging ORV2 BV component for tracking Password reminder mailer error");
+}
+
+CFileUpload::~CFileUpload() { DisconnectFromServer(); }
+
+const Reply& CFileUpload::Ask(TextView requestName, TextView clientAction,
+                              std::initializer_list<Parameter> parameters, std::int32_t sendFlag) {
+  request_ = HTTPServer::CreateXLLDFRequest(requestName, kServicePage);
+  HTTPServer::AddParameter(request_, u"ClientAction", Encipher(clientAction));
+  for (const Parameter& parameter : parameters)
+    HTTPServer::AddParameter(request_, parameter.name, parameter.value);
+  reply_ = channel_.SendRequest(request_, apartment_.session.serverName + Text(kServiceFolder), sendFlag);
+  return reply_;
+}
+
+Text CFileUpload::AskForText(TextView requestName, TextView clientAction,
+                             std::initializer_list<Parameter> parameters, std::int32_t sendFlag,
+                             TextView variable, TextView onFailure) {
+  const Reply& reply = Ask(requestName, clientAction, parameters, sendFlag);
+  return reply.ErrorOccured() == 1 ? Text(onFailure) : reply.First(variable);
+}
+
+std::int32_t CFileUpload::AskForNumber(TextView requestName, TextView clientAction,
+                                       std::initializer_list<Parameter> parameters, std::int32_t sendFlag,
+                                       TextView variable, std::int32_t onFailure) {
+  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& number) {
+    const Text failure = TextFromNumber(onFailure);
+    number = NumberFromText(AskForText(requestName, clientAction, parameters, sendFlag, variable, failure));
+  });
+}
+
+void CFileUpload::SetHTTPServer(TextView serverName) {
+  serverName_ = serverName;
+  apartment_.session.serverName = serverName;
+}
+
+const std::shared_ptr<CUpload>& CFileUpload::GetUploadObject() {
+  if (!uploadObject_) uploadObject_ = std::make_shared<CUpload>();
+  return uploadObject_;
+}
+
+bool CFileUpload::ConnectToServer(TextView szServer) {
+  return ResultAsItStood(false, [&](bool& connected) {
+    apartment_.session.serverName = szServer;
+    connected = BooleanFromText(
+        AskForText(u"EstablishConnection", u"EstablishConnection", {}, 0, u"EstablishConnection", u"FALSE"));
+  });
+}
+
+bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Password, TextView MGUID) {
+  SessionValues& session = apartment_.session;
+  // Copies first: the arguments may be views of the very values that are replaced.
+  Text previousUser = session.userName;
+  Text previousPassword = session.password;
+  const bool loggedOn = ResultAsItStood(false, [&](bool& result) {
+    const Text user(Username);
+    const Text password(Password);
+    session.mguid = Text(MGUID);
+    session.userName = user;
+    session.password = password;
+    session.productNumber = NumberFromText(ProductID);
+    apartment_.allFiles.Clear();
+    // What was listed is gone, so neither control may take it for the user's files.
+    apartment_.listingIsCurrent = false;
+    apartment_.listLoaded = false;
+
+    const Text status = AskForText(u"ValidationRequest", u"UserValidate",
+                                   {{u"UserName", Encipher(user)},
+                                    {u"Password", Encipher(password)},
+                                    {u"ProductID", SessionProduct()},
+                                    {u"MGUID", session.mguid}},
+                                   0, u"UserAuthenticationStatus", u"FALSE");
+    if (LowerCase(status) != u"true") return;
+    session.loggedOn = true;
+    SetFtpLogon(apartment_.ftp, session);
+    LookUpFtpProxy();
+    result = true;
+  });
+  if (!loggedOn) {
+    session.userName = std::move(previousUser);
+    session.password = std::move(previousPassword);
+  }
+  return loggedOn;
+}
+
+void CFileUpload::LookUpFtpProxy() {
+  FtpState& ftp = apartment_.ftp;
+  std::optional<FtpProxy> proxy = ReadFtpProxy(apartment_.platform.registry);
+  ftp.useProxy = proxy.has_value();
+  if (!proxy) return;
+  ftp.proxyHost = std::move(proxy->host);
+  ftp.proxyPort = std::move(proxy->port);
+  // Once per log-on: the rewritten values must not be rewritten again.
+  if (apartment_.session.loggedOn) RewriteForProxy(ftp);
+  apartment_.session.loggedOn = false;
+}
+
+bool CFileUpload::OpenSession() {
+  return ResultAsItStood(false, [&](bool& open) {
+    FtpState& ftp = apartment_.ftp;
+    if (ftp.connection) DisconnectFromServer();
+    ftp.internet = apartment_.platform.internet.Open(kFtpAgent);
+    if (!ftp.internet) return;
+    LookUpFtpProxy();
+    ftp.connection =
+        ftp.internet->ConnectFtp(ftp.host, ftp.useProxy ? std::uint16_t{0} : ftp.port, ftp.userName, ftp.password);
+    ftp.connected = ftp.connection != nullptr;
+    if (!ftp.connected) return;
+    const Text directory = GetFileUploadPath();
+    ftp.connected = ftp.connection->SetDirectory(directory);
+    if (ftp.connected) ftp.directory = directory;
+    open = true;
+  });
+}
+
+void CFileUpload::DisconnectFromServer() {
+  ResultAsItStood(0, [&](int&) {
+    FtpState& ftp = apartment_.ftp;
+    if (ftp.connection) ftp.connection->Command(u"QUIT");
+    // Closed whether or not the server took the farewell: a dead connection must not keep its handles.
+    ftp.connection.reset();
+    ftp.internet.reset();
+    ftp.connected = false;
+  });
+}
+
+Text CFileUpload::GetFileUploadPath() {
+  return ResultAsItStood(Text(), [&](Text& path) {
+    path = AskForText(u"PathFromRoot", u"PathFromRoot",
+                      {{u"ProductID", SessionProduct()}, {u"Username", SessionUser()}}, 0, u"PathFromRoot", u"");
+  });
+}
+
+Text CFileUpload::GetUserBasePath() {
+  return ResultAsItStood(Text(), [&](Text& url) {
+    url = u"http://" + apartment_.session.serverName + ReplaceAll(GetFileUploadPath(), u"\\", u"/");
+  });
+}
+
+Text CFileUpload::Encipher(TextView value) { return EnCodeString(EncryptParameter(value)); }
+
+Text CFileUpload::EnCodeString(TextView szString) {
+  // The percent sign goes first, so that the escapes of the others are not escaped again.
+  const Text percent = ReplaceAll(szString, u"%", u"%25");
+  return ReplaceAll(ReplaceAll(ReplaceAll(percent, u"+", u"%2B"), u"#", u"%23"), u"&", u"%26");
+}
+
+}  // namespace tarnwick

@@ -1,0 +1,158 @@
+// The operations on the files of the account.
+#include "platform/FileSystem.h"
+#include "service/CFileUpload.h"
+#include "support/PathHelpers.h"
+#include "support/RuntimeError.h"
+
+namespace tarnwick {
+namespace {
+
+// Makes a file a normal one as long as the object lives.
+class NormalAttributes {
+ public:
+  NormalAttributes(FileSystem& files, TextView path)
+      : files_(files), path_(path), saved_(files.Attributes(path)) {
+    if (saved_ != 0) files_.SetAttributes(path_, 0);
+  }
+  ~NormalAttributes() {
+    if (saved_ == 0) return;
+    ResultAsItStood(0, [&](int&) { files_.SetAttributes(path_, saved_); });
+  }
+  NormalAttributes(const NormalAttributes&) = delete;
+  NormalAttributes& operator=(const NormalAttributes&) = delete;
+
+ private:
+  FileSystem& files_;
+  const Text path_;
+  const std::uint32_t saved_;
+};
+
+// `values` is null when the reply lacks the variable, which is only missed where a file needs it.
+const Text& ElementAt(const std::vector<Text>* values, std::size_t index) {
+  if (!values || index >= values->size()) throw RuntimeError(error::kSubscriptOutOfRange);
+  return (*values)[index];
+}
+
+}  // namespace
+
+bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
+  return ResultAsItStood(false, [&](bool& listed) {
+    if (!apartment_.allFiles.IsEmpty() && apartment_.listingIsCurrent) {
+      listed = true;
+      return;
+    }
+    const Reply& reply =
+        Ask(u"ListFilesRequest", u"ListFiles",
+            {{u"Username", SessionUser()}, {u"ProductID", SessionProduct()}}, 1);
+    if (reply.ErrorOccured() == 1) return;
+    const std::vector<Text>* names = reply.GetValueByVariableName(u"FileName");
+    const std::vector<Text>* urls = reply.GetValueByVariableName(u"FileURL");
+    const std::vector<Text>* sizes = reply.GetValueByVariableName(u"FileSize");
+    const std::vector<Text>* dates = reply.GetValueByVariableName(u"FileDate");
+    if (!names) return;
+    for (std::size_t i = 0; i < names->size(); ++i) {
+      auto file = std::make_shared<CUpload>();
+      file->FileName = (*names)[i];
+      file->FilePath = ElementAt(urls, i);
+      file->FileSize = LeadingNumber(ElementAt(sizes, i));
+      file->FileDate = ElementAt(dates, i);
+      colFiles(file, file->FilePath);
+    }
+    listed = true;
+  });
+}
+
+Text CFileUpload::UploadFile(TextView szFilePath) { return RegisterFile(FileNameFromUrl(szFilePath), szFilePath); }
+
+Text CFileUpload::SaveUploadFile(TextView szFilePath) {
+  return RegisterFile(FileNameFromPath(szFilePath), szFilePath);
+}
+
+Text CFileUpload::RegisterFile(TextView fileName, TextView path) {
+  return ResultAsItStood(Text(), [&](Text& url) {
+    FileSystem& files = apartment_.platform.files;
+    const double size = GetLocalFileSize(files, path);
+    SetCUploadObject(fileName, path, size);
+    const NormalAttributes meanwhile(files, path);
+    url = AskForText(u"FileUploadRequest", u"FileUpload",
+                     {{u"FileName", EnCodeString(fileName)},
+                      {u"FileSize", TextFromNumber(static_cast<std::int64_t>(size))},
+                      {u"Username", SessionUser()},
+                      {u"ProductID", SessionProduct()}},
+                     1, u"FileURL", u"");
+  });
+}
+
+void CFileUpload::SetCUploadObject(TextView FileName, TextView FilePath, double FileSize) {
+  ResultAsItStood(0, [&](int&) {
+    CUpload& record = *GetUploadObject();
+    record.FileName = FileName;
+    record.FilePath = FilePath;
+    record.FileSize = FileSize;
+  });
+}
+
+std::int32_t CFileUpload::RenameFile(TextView ProductID, TextView Username, TextView FileToRename,
+                                     TextView NewFileName) {
+  const std::int32_t answer = AskForNumber(u"RenameFileRequest", u"RenameFile",
+                                           {{u"Username", Text(Username)},
+                                            {u"ProductID", Text(ProductID)},
+                                            {u"OldFileName", EnCodeString(FileToRename)},
+                                            {u"NewFileName", EnCodeString(NewFileName)}},
+                                           1, u"lRenameFileStatus", status::kRenameRefused);
+  return answer == status::kSuccess ? status::kSuccess : status::kRenameRefused;
+}
+
+std::int32_t CFileUpload::DeleteFileForUser(TextView FileToBeDeleted) {
+  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& result) {
+    const Reply& reply = Ask(u"DeleteFileRequest", u"DeleteFile",
+                             {{u"Username", SessionUser()},
+                              {u"ProductID", SessionProduct()},
+                              {u"FileToBeDeleted", EnCodeString(FileToBeDeleted)}},
+                             1);
+    if (reply.ErrorOccured() == 1) {
+      result = status::kFailure;
+    } else if (BooleanFromText(reply.First(u"DeleteStatus"))) {
+      result = status::kSuccess;
+    }
+  });
+}
+
+double CFileUpload::GetMaxQuota(TextView ProductID, TextView Username) {
+  return ResultAsItStood(0.0, [&](double& quota) {
+    quota = LeadingNumber(AskForText(u"GetMaxQuota", u"GetMaxUserQuota",
+                                     {{u"ProductID", Text(ProductID)}, {u"UserName", EnCodeString(Username)}}, 0,
+                                     u"MaxUserQuota", u""));
+  });
+}
+
+std::optional<double> CFileUpload::GetTotalUsedQuota(TextView ProductID, TextView Username) {
+  return ResultAsItStood(std::optional<double>(), [&](std::optional<double>& used) {
+    const Reply& reply =
+        Ask(u"GetTotalUsedQuota", u"GetTotalUsedQuota",
+            {{u"ProductID", Text(ProductID)}, {u"UserName", EnCodeString(Username)}}, 0);
+    if (reply.ErrorOccured() != 1) used = LeadingNumber(reply.First(u"UsedQuota"));
+  });
+}
+
+std::int32_t CFileUpload::CanUploadFile() {
+  return AskForNumber(u"CanUploadFile", u"CanUploadFile",
+                      {{u"UserName", SessionUser()}, {u"ProductID", SessionProduct()}}, 0, u"CanUploadFile",
+                      status::kFailure);
+}
+
+bool CFileUpload::FileExists(TextView szNewFileName) const {
+  for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i)
+    if (apartment_.allFiles.At(i)->FileName == szNewFileName) return true;
+  return false;
+}
+
+Text CFileUpload::DownloadFile(TextView szServerFileName, TextView szLocalFileName) {
+  return ResultAsItStood(Text(), [&](Text& local) {
+    FtpConnection* connection = apartment_.ftp.connection.get();
+    if (!connection || !connection->Directory()) return;
+    if (connection->GetFile(szServerFileName, szLocalFileName)) local = szLocalFileName;
+  });
+}
+
+}  // namespace tarnwick

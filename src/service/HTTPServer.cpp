@@ -1,0 +1,61 @@
+#include "service/HTTPServer.h"
+
+#include "platform/HttpTransport.h"
+#include "transfer/AcceptorPages.h"
+#include "transfer/HttpAddress.h"
+
+namespace tarnwick {
+namespace {
+
+constexpr std::size_t kMostReplyBytes = std::size_t{64} << 20;
+
+void AppendPair(std::string& form, TextView name, TextView value) {
+  if (!form.empty()) form += '&';
+  form.append(EscapeUnprintable(name)).append("=").append(EscapeUnprintable(value));
+}
+
+}  // namespace
+
+Request HTTPServer::CreateXLLDFRequest(TextView requestName, TextView page) {
+  return Request{Text(requestName), Text(page), {}};
+}
+
+void HTTPServer::AddParameter(Request& request, TextView name, TextView value) {
+  request.parameters.emplace_back(name, value);
+}
+
+Reply HTTPServer::SendRequest(const Request& request, TextView path, std::int32_t sendFlag) {
+  const auto address = SplitHttpAddress(path);
+  if (!address) return {};
+
+  std::string query;
+  AppendPair(query, u"Request", request.name);
+  AppendPair(query, u"Flag", TextFromNumber(sendFlag));
+  std::string body;
+  for (const auto& [name, value] : request.parameters) AppendPair(body, name, value);
+
+  HttpPost post;
+  post.host = address->host;
+  post.port = address->port;
+  post.target = EscapeUnprintable(address->path + u"/" + request.page) + "?" + query;
+  post.contentType = "application/x-www-form-urlencoded; charset=utf-8";
+  post.body = body;
+  const auto answer = http_.Post(post, kMostReplyBytes);
+  if (!answer || answer->status != 200) return {};
+  return Reply::FromBody(answer->body);
+}
+
+void HTTPServer::FolderActionWithEvents(TextView usersBaseUrl, TextView folder, TextView acceptorPath,
+                                        std::int32_t action, TextView user, TextView password,
+                                        TextView productGuid) {
+  const Text actionText = TextFromNumber(action);
+  PostAcceptorForm(http_, usersBaseUrl, acceptorPath,
+                   {{u"UsersBaseUrl", usersBaseUrl},
+                    {u"Folder", folder},
+                    {u"Action", actionText},
+                    {u"User", user},
+                    {u"Password", password},
+                    {u"ProductID", productGuid}});
+}
+
+}  // namespace tarnwick

@@ -1,0 +1,50 @@
+#include "transfer/AcceptorPages.h"
+
+#include "platform/HttpTransport.h"
+#include "service/Reply.h"
+#include "support/RuntimeError.h"
+#include "transfer/HttpAddress.h"
+
+namespace tarnwick {
+namespace {
+
+constexpr TextView kScheme = u"http://";
+
+// An acceptor page says one number; anything longer than this is no answer of its.
+constexpr std::size_t kMostAnswerBytes = 64 * 1024;
+
+std::int32_t ErrorNumberOf(const std::optional<HttpAnswer>& answer) {
+  return ResultAsItStood(acceptor::kUnspecified, [&](std::int32_t& number) {
+    if (!answer || answer->status != 200) return;
+    number = NumberFromText(Reply::FromBody(answer->body).First(u"ErrorNumber"));
+  });
+}
+
+}  // namespace
+
+Text UsersBaseUrl(TextView server) { return Text(kScheme).append(server).append(u"/users/"); }
+
+Text AcceptorPath(TextView page) { return Text(u"/httpupload/").append(page); }
+
+void PostAcceptorForm(HttpTransport& http, TextView usersBaseUrl, TextView acceptorPath,
+                      std::initializer_list<AcceptorField> fields) {
+  if (usersBaseUrl.starts_with(kScheme)) usersBaseUrl.remove_prefix(kScheme.size());
+  const auto address = SplitHttpAddress(usersBaseUrl);
+  if (!address) throw RuntimeError(acceptor::kUnspecified);
+
+  std::string body;
+  for (const AcceptorField& field : fields) {
+    if (!body.empty()) body += '&';
+    body.append(EscapeFormValue(field.name)).append("=").append(EscapeFormValue(field.value));
+  }
+  HttpPost post;
+  post.host = address->host;
+  post.port = address->port;
+  post.target = EscapeUnprintable(acceptorPath);
+  post.contentType = "application/x-www-form-urlencoded; charset=utf-8";
+  post.body = body;
+  const std::int32_t number = ErrorNumberOf(http.Post(post, kMostAnswerBytes));
+  if (number != 0) throw RuntimeError(number);
+}
+
+}  // namespace tarnwick

@@ -1,0 +1,42 @@
+// The acceptor pages of the hosting server, through which files and folders are put, moved and removed.
+#pragma once
+
+#include <initializer_list>
+#include <string>
+#include <string_view>
+#include <utility>
+
+#include "support/Text.h"
+
+namespace tarnwick {
+
+class HttpTransport;
+
+// Identifies this product to the acceptor pages.
+inline constexpr TextView kProductGuid = u"4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E";
+
+// Error numbers of the pages.
+namespace acceptor {
+inline constexpr std::int32_t kRefused = -2147220878;        // user name, password or product identifier
+inline constexpr std::int32_t kFolderState = -2147220840;    // to delete: not there; to create: there already
+inline constexpr std::int32_t kUnspecified = -2147467259;    // no usable answer
+}  // namespace acceptor
+
+// "http://SERVER/users/", from a server name as the host gave it; nothing is normalised.
+Text UsersBaseUrl(TextView server);
+
+// "/httpupload/PAGE".
+Text AcceptorPath(TextView page);
+
+struct AcceptorField {
+  TextView name;
+  TextView value;
+};
+
+// Posts the fields, in their order, to the page on the server that `usersBaseUrl` names. Returns when the page
+// answered that it succeeded; else throws a run-time error with the page's error number, kUnspecified when
+// there is no usable answer.
+void PostAcceptorForm(HttpTransport& http, TextView usersBaseUrl, TextView acceptorPath,
+                      std::initializer_list<AcceptorField> fields);
+
+}  // namespace tarnwick
