@@ -1,0 +1,162 @@
+# Shared by the scripts beside it: steps with logs, the two Wines, a display, servers, and an end without leftovers.
+# Sourced, never run.
+
+set -euo pipefail
+
+root=$(cd "$(dirname "${BASH_SOURCE[0]}")/.." && pwd)
+build=$root/build
+logs=$build/logs
+cd "$root"
+mkdir -p "$logs"
+
+# The 32-bit packages of Wine do not install beside the 64-bit ones, so 32-bit Wine lives in a root folder of its
+# own. It takes minutes to make and does not depend on this checkout, hence outside of it.
+wine32_root=${TARNWICK_CACHE:-/var/cache/tarnwick}/wine32
+
+# Where the Wine prefixes are, one folder for each architecture. A script that must not meet another one's prefix
+# sets its own.
+wine_home=$build/wine
+
+# ---- Steps --------------------------------------------------------------------------------------------------------
+
+# step NAME COMMAND...: runs the command with its output in build/logs/NAME.log; tells the time that it took, or the
+# log and its last lines when it fails. The result is the command's.
+step() {
+  local name=$1 log=$logs/${1// /-}.log begin=$SECONDS
+  shift
+  printf '== %s ... ' "$name"
+  # Not "if ! command": inside a condition the shell ignores errors in the middle of a function.
+  local result=0
+  set +e
+  (set -e; "$@") >"$log" 2>&1 </dev/null
+  result=$?
+  set -e
+  if ((result == 0)); then
+    printf 'done, %d s\n' $((SECONDS - begin))
+  else
+    printf 'FAILED with %d after %d s; log: %s\n' "$result" $((SECONDS - begin)) "${log#"$root"/}"
+    tail -n 25 "$log" | sed 's/^/   | /'
+  fi
+  return "$result"
+}
+
+die() {
+  printf '%s\n' "$*" >&2
+  exit 1
+}
+
+build_preset() {
+  [[ -f $build/$1/build.ninja ]] || cmake --preset "$1"
+  cmake --build --preset "$1" -j 2
+}
+
+# ---- What was started is ended -------------------------------------------------------------------------------------
+
+started=()        # process ids
+wine_started=()   # architectures
+
+stop_everything() {
+  local arch pid
+  for arch in "${wine_started[@]}"; do
+    wine_stop "$arch" || true
+  done
+  for pid in "${started[@]}"; do
+    kill "$pid" 2>/dev/null || true
+    wait "$pid" 2>/dev/null || true
+  done
+}
+trap stop_everything EXIT
+trap 'exit 130' INT
+trap 'exit 143' TERM
+
+# start_server LOG PATTERN COMMAND...: starts a server in the background and waits until its output holds a line that
+# matches PATTERN. That line is left in `server_line`.
+start_server() {
+  local log=$1 pattern=$2 i
+  shift 2
+  "$@" >"$log" 2>&1 </dev/null &
+  local pid=$!
+  started+=("$pid")
+  for ((i = 0; i < 150; i++)); do
+    # Only whole lines: the server may be in the middle of writing one.
+    server_line=$(sed -n '$!p; ${/./p}' "$log" | grep -m 1 -E "$pattern" || true)
+    [[ -n $server_line ]] && return 0
+    kill -0 "$pid" 2>/dev/null || break
+    sleep 0.1
+  done
+  printf '%s did not start; log: %s\n' "$1" "${log#"$root"/}"
+  tail -n 10 "$log"
+  return 1
+}
+
+start_display() {
+  start_server "$logs/display.log" '^[0-9]+$' Xvfb -displayfd 1 -screen 0 1280x960x24 -nolisten tcp
+  export DISPLAY=:$server_line
+}
+
+# ---- Wine ----------------------------------------------------------------------------------------------------------
+
+# Seconds after which a program under Wine counts as hanging.
+wine_limit=600
+
+# A command in the 32-bit root, with this checkout at the same path. The mounts are made in a name space of their own
+# and go when the command ends; one wineserver still serves all commands, because its socket is below /tmp.
+in_wine32() {
+  local script='
+    top=$1 checkout=$2; shift 2
+    mount --rbind /proc "$top/proc"
+    mount --rbind /dev "$top/dev"
+    mount --bind /tmp "$top/tmp"
+    mkdir -p "$top$checkout"
+    mount --bind "$checkout" "$top$checkout"
+    exec chroot "$top" /usr/bin/env --chdir="$checkout" PATH=/usr/lib/wine:/usr/sbin:/usr/bin:/sbin:/bin "$@"'
+  unshare --mount --propagation private timeout -k 10 "$wine_limit" \
+    bash -ec "$script" in_wine32 "$wine32_root" "$root" "$@"
+}
+
+# wine_command ARCH COMMAND...: a command of Wine (wine, wineserver) for the prefix of x64 or x86.
+wine_command() {
+  local arch=$1
+  shift
+  local settings=(WINEDEBUG=-all "WINEPREFIX=$wine_home/$arch" "WINEDLLOVERRIDES=mscoree,mshtml=" "DISPLAY=${DISPLAY-}")
+  case $arch in
+    x64) timeout -k 10 "$wine_limit" env "${settings[@]}" WINEARCH=win64 "$@" </dev/null ;;
+    x86) in_wine32 "${settings[@]}" WINEARCH=win32 "$@" </dev/null ;;
+    *) die "no such architecture: $arch" ;;
+  esac
+}
+
+# wine_run ARCH PROGRAM ARGUMENT...: a Windows program, in the checkout as current folder.
+wine_run() {
+  local arch=$1
+  shift
+  wine_command "$arch" wine "$@"
+}
+
+# Ends everything in the prefix; the registry is on disk afterwards.
+wine_stop() {
+  wine_command "$1" wineserver -k || true
+  wine_command "$1" wineserver -w
+}
+
+# wine_prefix ARCH: makes the prefix when it is not there whole. From here on the end of the script ends its wineserver.
+wine_prefix() {
+  local arch=$1 prefix=$wine_home/$1
+  [[ -e $prefix/complete ]] && return 0
+  rm -rf "$prefix"
+  mkdir -p "$wine_home"
+  wine_run "$arch" wineboot -i
+  # Absent in a fresh prefix, and an absent value is not the same as "no proxy" to the library.
+  wine_run "$arch" reg add 'HKCU\Software\Microsoft\Windows\CurrentVersion\Internet Settings' /v ProxyEnable \
+    /t REG_DWORD /d 0 /f
+  # A crash shall end the program, not open a window that waits for someone.
+  wine_run "$arch" reg add 'HKCU\Software\Wine\WineDbg' /v ShowCrashDialog /t REG_DWORD /d 0 /f
+  wine_stop "$arch"
+  touch "$prefix/complete"
+}
+
+# ---- The hosting server --------------------------------------------------------------------------------------------
+
+hosting_user=anna.berg@example.org
+hosting_password=Linden42
+hosting_product=7
