@@ -20,7 +20,8 @@ wine_home=$build/wine
 # ---- Steps --------------------------------------------------------------------------------------------------------
 
 # step NAME COMMAND...: runs the command with its output in build/logs/NAME.log; tells the time that it took, or the
-# log and its last lines when it fails. The result is the command's.
+# log and its last lines when it fails. The result is the command's. The command runs in a subshell: what shall outlive
+# the step (a server, a variable) is started with start_server.
 step() {
   local name=$1 log=$logs/${1// /-}.log begin=$SECONDS
   shift
@@ -52,13 +53,13 @@ build_preset() {
 
 # ---- What was started is ended -------------------------------------------------------------------------------------
 
-started=()        # process ids
-wine_started=()   # architectures
+started=()  # process ids
 
 stop_everything() {
   local arch pid
-  for arch in "${wine_started[@]}"; do
-    wine_stop "$arch" || true
+  for arch in x64 x86; do
+    # A prefix that is there may have a server, whoever was interrupted in the middle of starting it.
+    [[ ! -d $wine_home/$arch ]] || wine_stop "$arch" 2>/dev/null || true
   done
   for pid in "${started[@]}"; do
     kill "$pid" 2>/dev/null || true
@@ -69,28 +70,31 @@ trap stop_everything EXIT
 trap 'exit 130' INT
 trap 'exit 143' TERM
 
-# start_server LOG PATTERN COMMAND...: starts a server in the background and waits until its output holds a line that
-# matches PATTERN. That line is left in `server_line`.
+# start_server NAME PATTERN COMMAND...: starts a server in the background, with its output in build/logs/NAME.log, and
+# waits until that holds a line that matches PATTERN. The line is left in `server_line`.
 start_server() {
-  local log=$1 pattern=$2 i
+  local name=$1 log=$logs/${1// /-}.log pattern=$2 i
   shift 2
+  printf '== %s ... ' "$name"
   "$@" >"$log" 2>&1 </dev/null &
   local pid=$!
   started+=("$pid")
   for ((i = 0; i < 150; i++)); do
-    # Only whole lines: the server may be in the middle of writing one.
-    server_line=$(sed -n '$!p; ${/./p}' "$log" | grep -m 1 -E "$pattern" || true)
-    [[ -n $server_line ]] && return 0
+    server_line=$(grep -m 1 -E "$pattern" "$log" || true)
+    if [[ -n $server_line ]]; then
+      printf 'started\n'
+      return 0
+    fi
     kill -0 "$pid" 2>/dev/null || break
     sleep 0.1
   done
-  printf '%s did not start; log: %s\n' "$1" "${log#"$root"/}"
-  tail -n 10 "$log"
+  printf 'FAILED to start; log: %s\n' "${log#"$root"/}"
+  tail -n 10 "$log" | sed 's/^/   | /'
   return 1
 }
 
 start_display() {
-  start_server "$logs/display.log" '^[0-9]+$' Xvfb -displayfd 1 -screen 0 1280x960x24 -nolisten tcp
+  start_server "display" '^[0-9]+$' Xvfb -displayfd 1 -screen 0 1280x960x24 -nolisten tcp || return 1
   export DISPLAY=:$server_line
 }
 
@@ -139,7 +143,7 @@ wine_stop() {
   wine_command "$1" wineserver -w
 }
 
-# wine_prefix ARCH: makes the prefix when it is not there whole. From here on the end of the script ends its wineserver.
+# wine_prefix ARCH: makes the prefix when it is not there whole.
 wine_prefix() {
   local arch=$1 prefix=$wine_home/$1
   [[ -e $prefix/complete ]] && return 0
