@@ -50,20 +50,19 @@ CFileUpload::CFileUpload(Apartment& apartment) : apartment_(apartment), channel_
 
 CFileUpload::~CFileUpload() { DisconnectFromServer(); }
 
-const Reply& CFileUpload::Ask(TextView requestName, TextView clientAction,
-                              std::initializer_list<Parameter> parameters, std::int32_t sendFlag) {
-  request_ = HTTPServer::CreateXLLDFRequest(requestName, kServicePage);
-  HTTPServer::AddParameter(request_, u"ClientAction", Encipher(clientAction));
+Reply CFileUpload::Ask(TextView requestName, TextView clientAction,
+                       std::initializer_list<Parameter> parameters, std::int32_t sendFlag) {
+  Request request = HTTPServer::CreateXLLDFRequest(requestName, kServicePage);
+  HTTPServer::AddParameter(request, u"ClientAction", Encipher(clientAction));
   for (const Parameter& parameter : parameters)
-    HTTPServer::AddParameter(request_, parameter.name, parameter.value);
-  reply_ = channel_.SendRequest(request_, apartment_.session.serverName + Text(kServiceFolder), sendFlag);
-  return reply_;
+    HTTPServer::AddParameter(request, parameter.name, parameter.value);
+  return channel_.SendRequest(request, apartment_.session.serverName + Text(kServiceFolder), sendFlag);
 }
 
 Text CFileUpload::AskForText(TextView requestName, TextView clientAction,
                              std::initializer_list<Parameter> parameters, std::int32_t sendFlag,
                              TextView variable, TextView onFailure) {
-  const Reply& reply = Ask(requestName, clientAction, parameters, sendFlag);
+  const Reply reply = Ask(requestName, clientAction, parameters, sendFlag);
   return reply.ErrorOccured() == 1 ? Text(onFailure) : reply.First(variable);
 }
 

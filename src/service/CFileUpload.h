@@ -79,9 +79,12 @@ class CFileUpload {
   // --- Files -------------------------------------------------------------------------------------------------
 
   // Hands a record per file of the account to `colFiles`, with the file's address as its key, in the server's
-  // order. When the all-files list is current and not empty, returns true at once without a request and hands
-  // over nothing. An error half-way leaves what was handed over and returns false.
+  // order. When ListIsCurrent, returns true at once without a request and hands over nothing. An error half-way
+  // leaves what was handed over and returns false.
   bool ListFilesForUser(const FileSink& colFiles);
+
+  // Whether ListFilesForUser has nothing to ask: the all-files list is current and not empty. No request.
+  bool ListIsCurrent() const { return apartment_.listingIsCurrent && !apartment_.allFiles.IsEmpty(); }
 
   // Does nothing and returns false; the controls have an operation of this name.
   static bool GetFileDetails() { return false; }
@@ -175,10 +178,10 @@ class CFileUpload {
     Text value;
   };
 
-  // One exchange: composes the request, sends it and keeps the reply until the next one. `parameters` follow the
-  // enciphered action.
-  const Reply& Ask(TextView requestName, TextView clientAction, std::initializer_list<Parameter> parameters,
-                   std::int32_t sendFlag);
+  // One exchange: composes the request, sends it and reads the reply. `parameters` follow the enciphered action. The
+  // reply is the caller's own, because what takes its values may be code of the host that asks the next one.
+  Reply Ask(TextView requestName, TextView clientAction, std::initializer_list<Parameter> parameters,
+            std::int32_t sendFlag);
 
   // The first value of one reply variable, which is the whole result of an operation. `onFailure` after a failed
   // exchange; throws what a missing variable throws.
@@ -204,8 +207,6 @@ class CFileUpload {
 
   Apartment& apartment_;
   HTTPServer channel_;
-  Request request_;
-  Reply reply_;
   Text serverName_;
   std::shared_ptr<CUpload> uploadObject_;
 };

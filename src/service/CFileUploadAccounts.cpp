@@ -33,7 +33,7 @@ Text CFileUpload::AddUser(TextView ProductID, TextView Username, TextView GUID) 
   return ResultAsItStood(Text(), [&](Text& result) {
     Log(u"Inside AddUser");
     Log(u"Adding parameters");
-    const Reply& reply = Ask(
+    const Reply reply = Ask(
         u"UserKeyRequest", u"AddUser",
         {{u"UserName", EnCodeString(Username)}, {u"ProductID", Text(ProductID)}, {u"MGUID", Text(GUID)}}, 1);
     std::int32_t code = status::kFailure;
@@ -196,7 +196,7 @@ Text CFileUpload::GetCurrentDateTimeFromServer() {
 std::int32_t CFileUpload::GetAccountDetailsForMGUID(TextView MGUID, TextView Username, TextView ProductID,
                                                     const AccountSink& col) {
   return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& result) {
-    const Reply& reply = Ask(u"AccountDetails", u"BVAccountDetails",
+    const Reply reply = Ask(u"AccountDetails", u"BVAccountDetails",
                              {{u"ProductID", Text(ProductID)},
                               {u"MGUID", EnCodeString(MGUID)},
                               {u"Username", EnCodeString(Username)}},

@@ -37,11 +37,11 @@ const Text& ElementAt(const std::vector<Text>* values, std::size_t index) {
 
 bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
   return ResultAsItStood(false, [&](bool& listed) {
-    if (!apartment_.allFiles.IsEmpty() && apartment_.listingIsCurrent) {
+    if (ListIsCurrent()) {
       listed = true;
       return;
     }
-    const Reply& reply =
+    const Reply reply =
         Ask(u"ListFilesRequest", u"ListFiles",
             {{u"Username", SessionUser()}, {u"ProductID", SessionProduct()}}, 1);
     if (reply.ErrorOccured() == 1) return;
@@ -105,7 +105,7 @@ std::int32_t CFileUpload::RenameFile(TextView ProductID, TextView Username, Text
 
 std::int32_t CFileUpload::DeleteFileForUser(TextView FileToBeDeleted) {
   return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& result) {
-    const Reply& reply = Ask(u"DeleteFileRequest", u"DeleteFile",
+    const Reply reply = Ask(u"DeleteFileRequest", u"DeleteFile",
                              {{u"Username", SessionUser()},
                               {u"ProductID", SessionProduct()},
                               {u"FileToBeDeleted", EnCodeString(FileToBeDeleted)}},
@@ -128,7 +128,7 @@ double CFileUpload::GetMaxQuota(TextView ProductID, TextView Username) {
 
 std::optional<double> CFileUpload::GetTotalUsedQuota(TextView ProductID, TextView Username) {
   return ResultAsItStood(std::optional<double>(), [&](std::optional<double>& used) {
-    const Reply& reply =
+    const Reply reply =
         Ask(u"GetTotalUsedQuota", u"GetTotalUsedQuota",
             {{u"ProductID", Text(ProductID)}, {u"UserName", EnCodeString(Username)}}, 0);
     if (reply.ErrorOccured() != 1) used = LeadingNumber(reply.First(u"UsedQuota"));

@@ -42,9 +42,15 @@ class KeyedList {
   }
 
   // Throws 9 like At.
-  void Remove(std::size_t position) {
+  void Remove(std::size_t position) { Take(position); }
+
+  // Removes an item and returns it. Throws 9 like At.
+  Item Take(std::size_t position) {
     keys_.erase(EntryAt(position).key);
-    entries_.erase(entries_.begin() + static_cast<std::ptrdiff_t>(position - 1));
+    const auto entry = entries_.begin() + static_cast<std::ptrdiff_t>(position - 1);
+    Item item = std::move(entry->item);
+    entries_.erase(entry);
+    return item;
   }
 
   void Clear() {

@@ -1,0 +1,125 @@
+#include "platform/windows/WindowsFileSystem.h"
+
+#include <array>
+#include <string>
+
+#include "platform/windows/AnsiText.h"
+#include "platform/windows/Owner.h"
+#include "platform/windows/StagedFile.h"
+#include "support/RuntimeError.h"
+
+namespace tarnwick {
+namespace {
+
+// The bits that a program can set; the system numbers them as the core does.
+constexpr std::uint32_t kSettable =
+    attribute::kReadOnly | attribute::kHidden | attribute::kSystem | attribute::kArchive;
+
+// 255 characters with their terminator, as hosts know the temporary folder.
+constexpr DWORD kTempPathRoom = 255;
+
+// Wide form of `path`, for which a NUL in it is no path: it would name another file than the one that was checked.
+std::wstring WidePath(TextView path, std::int32_t errorNumber) {
+  if (path.find(u'\0') != TextView::npos) throw RuntimeError(errorNumber);
+  return WideFromText(path);
+}
+
+WIN32_FILE_ATTRIBUTE_DATA FileData(TextView path) {
+  WIN32_FILE_ATTRIBUTE_DATA data{};
+  const std::wstring widePath = WidePath(path, error::kFileNotFound);
+  if (!GetFileAttributesExW(widePath.c_str(), GetFileExInfoStandard, &data) ||
+      (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0)
+    throw RuntimeError(error::kFileNotFound);
+  return data;
+}
+
+bool NothingThere(DWORD status) {
+  return status == ERROR_FILE_NOT_FOUND || status == ERROR_PATH_NOT_FOUND || status == ERROR_INVALID_NAME;
+}
+
+}  // namespace
+
+std::uint64_t WindowsFileSystem::Length(TextView path) {
+  const WIN32_FILE_ATTRIBUTE_DATA data = FileData(path);
+  return (std::uint64_t{data.nFileSizeHigh} << 32) | data.nFileSizeLow;
+}
+
+Text WindowsFileSystem::ModifiedText(TextView path) {
+  const WIN32_FILE_ATTRIBUTE_DATA data = FileData(path);
+  SYSTEMTIME utc{};
+  SYSTEMTIME local{};
+  std::array<wchar_t, 128> date{};
+  std::array<wchar_t, 128> time{};
+  // Local time as it was in force at that date, so that the text does not change with the season.
+  if (!FileTimeToSystemTime(&data.ftLastWriteTime, &utc) ||
+      !SystemTimeToTzSpecificLocalTime(nullptr, &utc, &local) ||
+      !GetDateFormatW(LOCALE_USER_DEFAULT, DATE_SHORTDATE, &local, nullptr, date.data(),
+                      static_cast<int>(date.size())) ||
+      !GetTimeFormatW(LOCALE_USER_DEFAULT, 0, &local, nullptr, time.data(), static_cast<int>(time.size())))
+    throw RuntimeError(error::kInvalidCall);
+  return TextFromWide(date.data()) + u" " + TextFromWide(time.data());
+}
+
+std::uint32_t WindowsFileSystem::Attributes(TextView path) {
+  return FileData(path).dwFileAttributes & kSettable;
+}
+
+void WindowsFileSystem::SetAttributes(TextView path, std::uint32_t attributes) {
+  const std::wstring widePath = WidePath(path, error::kPathAccess);
+  const DWORD bits = attributes & kSettable;
+  if (!SetFileAttributesW(widePath.c_str(), bits != 0 ? bits : FILE_ATTRIBUTE_NORMAL))
+    throw RuntimeError(error::kPathAccess);
+}
+
+void WindowsFileSystem::Copy(TextView source, TextView destination) {
+  const std::wstring from = WidePath(source, error::kFileNotFound);
+  StagedFile staged(WidePath(destination, error::kPathAccess));
+  if (staged.Path().empty()) throw RuntimeError(error::kPathAccess);
+  if (!CopyFileW(from.c_str(), staged.Path().c_str(), FALSE))
+    throw RuntimeError(NothingThere(GetLastError()) ? error::kFileNotFound : error::kPathAccess);
+  if (!staged.Commit()) throw RuntimeError(error::kPathAccess);
+}
+
+Text WindowsFileSystem::FirstName(TextView pattern, bool folders) {
+  if (pattern.empty() || pattern.find(u'\0') != TextView::npos) return {};
+  std::wstring widePattern = WideFromText(pattern);
+  // A folder written with its separator means what is in it; the system would find nothing.
+  if (widePattern.back() == L'\\' || widePattern.back() == L'/') widePattern += L'*';
+  WIN32_FIND_DATAW found{};
+  const FindOwner search(FindFirstFileW(widePattern.c_str(), &found));
+  if (!search) return {};
+  const DWORD unwanted =
+      FILE_ATTRIBUTE_HIDDEN | FILE_ATTRIBUTE_SYSTEM | (folders ? 0 : DWORD{FILE_ATTRIBUTE_DIRECTORY});
+  do {
+    if ((found.dwFileAttributes & unwanted) == 0) return TextFromWide(found.cFileName);
+  } while (FindNextFileW(search.Get(), &found));
+  return {};
+}
+
+void WindowsFileSystem::MakeFolder(TextView path) {
+  const std::wstring widePath = WidePath(path, error::kPathAccess);
+  if (CreateDirectoryW(widePath.c_str(), nullptr)) return;
+  switch (GetLastError()) {
+    case ERROR_ALREADY_EXISTS:
+    case ERROR_FILE_EXISTS:
+      throw RuntimeError(error::kFileAlreadyExists);
+    case ERROR_PATH_NOT_FOUND:
+      throw RuntimeError(error::kPathNotFound);
+    default:
+      throw RuntimeError(error::kPathAccess);
+  }
+}
+
+Text WindowsFileSystem::TempPath() {
+  std::array<char, kTempPathRoom> ansi{};
+  const DWORD length = GetTempPathA(kTempPathRoom, ansi.data());
+  if (length == 0 || length >= kTempPathRoom) return {};
+  // Where the code page cannot hold the user's name the ANSI form names no folder at all.
+  std::array<wchar_t, kTempPathRoom> wide{};
+  const DWORD units = GetTempPathW(kTempPathRoom, wide.data());
+  if (units > 0 && units < kTempPathRoom && !AnsiFromText(TextFromWide({wide.data(), units})))
+    return TextFromWide({wide.data(), units});
+  return TextFromAnsi({ansi.data(), length});
+}
+
+}  // namespace tarnwick

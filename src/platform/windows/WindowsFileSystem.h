@@ -1,0 +1,19 @@
+#pragma once
+
+#include "platform/FileSystem.h"
+
+namespace tarnwick {
+
+class WindowsFileSystem : public FileSystem {
+ public:
+  std::uint64_t Length(TextView path) override;
+  Text ModifiedText(TextView path) override;
+  std::uint32_t Attributes(TextView path) override;
+  void SetAttributes(TextView path, std::uint32_t attributes) override;
+  void Copy(TextView source, TextView destination) override;
+  Text FirstName(TextView pattern, bool folders) override;
+  void MakeFolder(TextView path) override;
+  Text TempPath() override;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,30 @@
+#include "platform/windows/WindowsMessagePump.h"
+
+#include <cstdint>
+
+namespace tarnwick {
+namespace {
+
+// A window that never gets its painting done, or a handler that posts its message again, would keep the loop going
+// for ever. Messages this much younger than the call are left for the next one.
+constexpr std::int32_t kMostMs = 100;
+
+}  // namespace
+
+void WindowsMessagePump::Yield() {
+  const DWORD begin = GetTickCount();
+  MSG message{};
+  while (PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) {
+    if (message.message == WM_QUIT) {
+      // It is for the loop that the host runs.
+      PostQuitMessage(static_cast<int>(message.wParam));
+      return;
+    }
+    TranslateMessage(&message);
+    DispatchMessageW(&message);
+    // Signed, because the tick count starts again from 0.
+    if (static_cast<std::int32_t>(message.time - begin) > kMostMs) return;
+  }
+}
+
+}  // namespace tarnwick

@@ -1,0 +1,85 @@
+#include "support/surface/ClassFactory.h"
+
+#include <array>
+#include <atomic>
+
+#include "support/surface/CBVAccountObject.h"
+#include "support/surface/CFileUploadObject.h"
+#include "support/surface/ComPtr.h"
+#include "support/surface/Guard.h"
+#include "support/surface/Module.h"
+#include "support/surface/TypeLibrary.h"
+
+namespace tarnwick {
+namespace {
+
+template <typename Object>
+IUnknown* Make() {
+  return new Object;
+}
+
+const std::array kClasses = {
+    CreatableClass{CLSID_CFileUpload, L"CFileUpload", L"Tarnwick client of the hosting service",
+                   Make<CFileUploadObject>},
+    CreatableClass{CLSID_CBVAccount, L"CBVAccount", L"Tarnwick account details", Make<CBVAccountObject>},
+};
+
+class ClassFactory final : public IClassFactory {
+ public:
+  explicit ClassFactory(const CreatableClass& itsClass) : class_(itsClass) { module::Hold(); }
+
+  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override {
+    if (!object) return E_POINTER;
+    *object = interfaceId == IID_IUnknown || interfaceId == IID_IClassFactory ? this : nullptr;
+    if (!*object) return E_NOINTERFACE;
+    AddRef();
+    return S_OK;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
+  STDMETHODIMP_(ULONG) Release() override {
+    const ULONG left = --references_;
+    if (left == 0) delete this;
+    return left;
+  }
+
+  STDMETHODIMP CreateInstance(IUnknown* outer, REFIID interfaceId, void** object) override {
+    if (!object) return E_POINTER;
+    *object = nullptr;
+    if (outer) return CLASS_E_NOAGGREGATION;
+    return Guarded([&] {
+      const auto made = ComPtr<IUnknown>::Adopt(class_.make());
+      return made->QueryInterface(interfaceId, object);
+    });
+  }
+  STDMETHODIMP LockServer(BOOL lock) override {
+    lock ? module::Hold() : module::LetGo();
+    return S_OK;
+  }
+
+ private:
+  ~ClassFactory() { module::LetGo(); }
+
+  const CreatableClass& class_;
+  std::atomic<ULONG> references_{1};
+};
+
+}  // namespace
+
+std::span<const CreatableClass> CreatableClasses() {
+  return kClasses;
+}
+
+HRESULT GetClassFactory(REFCLSID classId, REFIID interfaceId, void** factory) {
+  if (!factory) return E_POINTER;
+  *factory = nullptr;
+  return Guarded([&]() -> HRESULT {
+    for (const CreatableClass& known : kClasses) {
+      if (known.id != classId) continue;
+      const auto made = ComPtr<IClassFactory>::Adopt(new ClassFactory(known));
+      return made->QueryInterface(interfaceId, factory);
+    }
+    return CLASS_E_CLASSNOTAVAILABLE;
+  });
+}
+
+}  // namespace tarnwick

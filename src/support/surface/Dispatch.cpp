@@ -1,0 +1,154 @@
+#include "support/surface/Dispatch.h"
+
+#include <cstring>
+#include <vector>
+
+#include "support/surface/Automation.h"
+#include "support/surface/ComPtr.h"
+#include "support/surface/Guard.h"
+
+namespace tarnwick {
+namespace {
+
+// The description of one member; freed with its owner.
+class MemberDescription {
+ public:
+  MemberDescription(ITypeInfo& owner, DISPID member, WORD flags) : owner_(owner) {
+    for (UINT i = 0; SUCCEEDED(owner_.GetFuncDesc(i, &function_)); ++i) {
+      if (function_->memid == member && (function_->invkind & flags)) return;
+      Free();
+    }
+    function_ = nullptr;
+  }
+  ~MemberDescription() { Free(); }
+  MemberDescription(const MemberDescription&) = delete;
+  MemberDescription& operator=(const MemberDescription&) = delete;
+
+  // Type that automation passes for the parameter, VT_BYREF included; VT_EMPTY when there is no such
+  // parameter or it is of no interest here.
+  VARTYPE ParameterType(UINT index) const {
+    if (!function_ || index >= static_cast<UINT>(function_->cParams)) return VT_EMPTY;
+    return TypeOf(function_->lprgelemdescParam[index].tdesc);
+  }
+
+ private:
+  void Free() {
+    if (function_) owner_.ReleaseFuncDesc(function_);
+    function_ = nullptr;
+  }
+
+  VARTYPE TypeOf(const TYPEDESC& type) const {
+    if (type.vt == VT_USERDEFINED) return UserDefinedType(type.hreftype);
+    if (type.vt != VT_PTR) return type.vt;
+    const VARTYPE target = TypeOf(*type.lptdesc);
+    // A pointer to an interface is a plain value.
+    if (type.lptdesc->vt == VT_USERDEFINED && target == VT_DISPATCH) return VT_DISPATCH;
+    return static_cast<VARTYPE>(target | VT_BYREF);
+  }
+
+  VARTYPE UserDefinedType(HREFTYPE reference) const {
+    ComPtr<ITypeInfo> info;
+    TYPEATTR* attributes = nullptr;
+    if (FAILED(owner_.GetRefTypeInfo(reference, info.Receive())) || FAILED(info->GetTypeAttr(&attributes)))
+      return VT_EMPTY;
+    const TYPEKIND kind = attributes->typekind;
+    info->ReleaseTypeAttr(attributes);
+    // Other kinds do not occur in our interfaces.
+    return kind == TKIND_ENUM ? VT_I4 : VT_DISPATCH;
+  }
+
+  ITypeInfo& owner_;
+  FUNCDESC* function_ = nullptr;
+};
+
+// Position in the parameter list of argument `i` (arguments come in reverse order, the named ones first).
+UINT ParameterIndex(const DISPPARAMS& arguments, UINT i) {
+  if (i >= arguments.cNamedArgs) return arguments.cArgs - 1 - i;
+  const DISPID name = arguments.rgdispidNamedArgs[i];
+  return name == DISPID_PROPERTYPUT ? 0 : static_cast<UINT>(name);
+}
+
+bool IsOmitted(const VARIANT& argument) {
+  return V_VT(&argument) == VT_ERROR && V_ERROR(&argument) == DISP_E_PARAMNOTFOUND;
+}
+
+// A value of a parameter's type that stands in for an argument of another type during a call.
+struct StandIn {
+  UINT index = 0;
+  // Where the changed value goes; null when nobody receives it.
+  VARIANT* receiver = nullptr;
+  Variant value;
+  VARIANT before = {};
+};
+
+// Fills `standIn` from an argument for a by-reference parameter of `type` (without VT_BYREF).
+HRESULT Convert(const VARIANT& argument, VARTYPE type, StandIn& standIn) {
+  const bool isVariantReference = V_VT(&argument) == (VT_VARIANT | VT_BYREF);
+  const VARIANT& source = isVariantReference ? *V_VARIANTREF(&argument) : argument;
+  if (isVariantReference) standIn.receiver = V_VARIANTREF(&argument);
+  VARIANT& value = standIn.value.Get();
+  if (type == VT_DISPATCH && (V_VT(&source) == VT_EMPTY || V_VT(&source) == VT_NULL)) {
+    // A script's fresh variable: no object yet.
+    V_VT(&value) = VT_DISPATCH;
+    V_DISPATCH(&value) = nullptr;
+  } else {
+    const HRESULT result = VariantChangeType(&value, const_cast<VARIANT*>(&source), 0, type);
+    if (FAILED(result)) return result == E_OUTOFMEMORY ? result : DISP_E_TYPEMISMATCH;
+  }
+  standIn.before = value;
+  return S_OK;
+}
+
+// Address of the value inside a VARIANT, for use as a typed reference.
+void MakeReference(VARIANT& reference, VARIANT& target) {
+  V_VT(&reference) = static_cast<VARTYPE>(V_VT(&target) | VT_BYREF);
+  V_BYREF(&reference) = &V_NONE(&target);
+}
+
+// Hands a value that the member changed to the caller's variable. What stayed as it was is not written, so
+// that the variable keeps its own type.
+void HandBack(StandIn& standIn) {
+  if (!standIn.receiver || std::memcmp(&standIn.before, &standIn.value.Get(), sizeof(VARIANT)) == 0) return;
+  VariantClear(standIn.receiver);
+  *standIn.receiver = standIn.value.Detach();
+}
+
+}  // namespace
+
+HRESULT InvokeMember(ITypeInfo& description, void* object, DISPID member, WORD flags, DISPPARAMS* arguments,
+                     VARIANT* result, EXCEPINFO* exception, UINT* argumentError) {
+  if (!arguments) return E_INVALIDARG;
+  return Guarded([&] {
+    const MemberDescription known(description, member, flags);
+    std::vector<VARIANT> values(arguments->rgvarg, arguments->rgvarg + arguments->cArgs);
+    std::vector<StandIn> standIns;
+    // References into it are taken below, so it must not move.
+    standIns.reserve(values.size());
+    for (UINT i = 0; i < values.size(); ++i) {
+      const VARTYPE type = known.ParameterType(ParameterIndex(*arguments, i));
+      if (!(type & VT_BYREF) || V_VT(&values[i]) == type || IsOmitted(values[i])) continue;
+      if (type == (VT_VARIANT | VT_BYREF)) {
+        V_VT(&values[i]) = type;
+        V_VARIANTREF(&values[i]) = &arguments->rgvarg[i];
+        continue;
+      }
+      StandIn& standIn = standIns.emplace_back();
+      standIn.index = i;
+      const HRESULT converted = Convert(values[i], type & ~VT_BYREF, standIn);
+      if (FAILED(converted)) {
+        if (argumentError) *argumentError = i;
+        return converted;
+      }
+      MakeReference(values[i], standIn.value.Get());
+    }
+    DISPPARAMS prepared = *arguments;
+    prepared.rgvarg = values.data();
+    const HRESULT called =
+        description.Invoke(object, member, flags, &prepared, result, exception, argumentError);
+    if (SUCCEEDED(called))
+      for (StandIn& standIn : standIns) HandBack(standIn);
+    return called;
+  });
+}
+
+}  // namespace tarnwick

@@ -1,0 +1,43 @@
+// What the library exports.
+#include "platform/windows/WindowsHeaders.h"
+
+#include <olectl.h>
+
+#include "support/surface/ClassFactory.h"
+#include "support/surface/Module.h"
+#include "support/surface/Registration.h"
+#include "support/surface/ThreadApartment.h"
+
+BOOL WINAPI DllMain(HINSTANCE instance, DWORD reason, LPVOID reserved) {
+  switch (reason) {
+    case DLL_PROCESS_ATTACH:
+      tarnwick::module::SetInstance(instance);
+      break;
+    case DLL_THREAD_DETACH:
+      tarnwick::FreeApartmentOfThread();
+      break;
+    case DLL_PROCESS_DETACH:
+      // Not when the process ends: other libraries that the states use may be gone already.
+      if (!reserved) tarnwick::FreeAllApartments();
+      break;
+    default:
+      break;
+  }
+  return TRUE;
+}
+
+STDAPI DllGetClassObject(REFCLSID classId, REFIID interfaceId, LPVOID* factory) {
+  return tarnwick::GetClassFactory(classId, interfaceId, factory);
+}
+
+STDAPI DllCanUnloadNow() {
+  return tarnwick::module::IsHeld() ? S_FALSE : S_OK;
+}
+
+STDAPI DllRegisterServer() {
+  return tarnwick::Register();
+}
+
+STDAPI DllUnregisterServer() {
+  return tarnwick::Unregister();
+}

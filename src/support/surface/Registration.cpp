@@ -1,0 +1,111 @@
+#include "support/surface/Registration.h"
+
+#include <olectl.h>
+
+#include <string>
+
+#include "platform/windows/Owner.h"
+#include "support/surface/ClassFactory.h"
+#include "support/surface/ComPtr.h"
+#include "support/surface/Guard.h"
+#include "support/surface/Module.h"
+#include "support/surface/TypeLibrary.h"
+
+namespace tarnwick {
+namespace {
+
+constexpr wchar_t kLibraryName[] = L"Tarnwick";
+constexpr wchar_t kVersion[] = L"1.1";
+constexpr WORD kMajor = 1;
+constexpr WORD kMinor = 1;
+constexpr LCID kLocale = 0x409;
+#ifdef _WIN64
+constexpr SYSKIND kSystem = SYS_WIN64;
+#else
+constexpr SYSKIND kSystem = SYS_WIN32;
+#endif
+
+// A failure inside a registration, as its HRESULT.
+void Check(LSTATUS status) {
+  if (status != ERROR_SUCCESS) throw RuntimeError(HRESULT_FROM_WIN32(static_cast<DWORD>(status)));
+}
+
+std::wstring GuidText(const GUID& guid) {
+  wchar_t text[39];
+  StringFromGUID2(guid, text, 39);
+  return text;
+}
+
+// Sets a value of a key below HKEY_CLASSES_ROOT, which is made when it is not there; null names the key's own
+// value.
+void SetValue(const std::wstring& key, const wchar_t* name, const std::wstring& value) {
+  Check(RegSetKeyValueW(HKEY_CLASSES_ROOT, key.c_str(), name, REG_SZ, value.c_str(),
+                        static_cast<DWORD>((value.size() + 1) * sizeof(wchar_t))));
+}
+
+// Removes a key with all below it; false when that fails for another reason than that there is none.
+bool RemoveTree(const std::wstring& key) {
+  const LSTATUS status = RegDeleteTreeW(HKEY_CLASSES_ROOT, key.c_str());
+  return status == ERROR_SUCCESS || status == ERROR_FILE_NOT_FOUND;
+}
+
+struct Names {
+  explicit Names(const CreatableClass& known)
+      : classKey(L"CLSID\\" + GuidText(known.id)),
+        general(std::wstring(kLibraryName) + L"." + known.name),
+        versioned(general + L".1") {}
+  std::wstring classKey;
+  // ProgIDs: of whatever version is installed, and of this one.
+  std::wstring general;
+  std::wstring versioned;
+};
+
+void RegisterClass(const CreatableClass& known, const std::wstring& path) {
+  const Names names(known);
+  const std::wstring classId = GuidText(known.id);
+  SetValue(names.classKey, nullptr, known.description);
+  SetValue(names.classKey + L"\\InprocServer32", nullptr, path);
+  SetValue(names.classKey + L"\\InprocServer32", L"ThreadingModel", L"Apartment");
+  SetValue(names.classKey + L"\\ProgID", nullptr, names.versioned);
+  SetValue(names.classKey + L"\\VersionIndependentProgID", nullptr, names.general);
+  SetValue(names.classKey + L"\\TypeLib", nullptr, GuidText(LIBID_Tarnwick));
+  SetValue(names.classKey + L"\\Version", nullptr, kVersion);
+  SetValue(names.classKey + L"\\Programmable", nullptr, {});
+  SetValue(names.versioned, nullptr, known.description);
+  SetValue(names.versioned + L"\\CLSID", nullptr, classId);
+  SetValue(names.general, nullptr, known.description);
+  SetValue(names.general + L"\\CLSID", nullptr, classId);
+  SetValue(names.general + L"\\CurVer", nullptr, names.versioned);
+}
+
+}  // namespace
+
+HRESULT Register() {
+  const HRESULT result = Guarded([] {
+    std::wstring path = module::Path();
+    ComPtr<ITypeLib> library;
+    HRESULT registered = LoadTypeLibEx(path.c_str(), REGKIND_NONE, library.Receive());
+    if (SUCCEEDED(registered)) registered = RegisterTypeLib(library.Get(), path.data(), nullptr);
+    if (FAILED(registered)) return registered;
+    for (const CreatableClass& known : CreatableClasses()) RegisterClass(known, path);
+    return S_OK;
+  });
+  if (FAILED(result)) Unregister();
+  return result;
+}
+
+HRESULT Unregister() {
+  return Guarded([] {
+    bool gone = true;
+    for (const CreatableClass& known : CreatableClasses()) {
+      const Names names(known);
+      for (const std::wstring& key : {names.classKey, names.general, names.versioned})
+        gone &= RemoveTree(key);
+    }
+    const HRESULT library = UnRegisterTypeLib(LIBID_Tarnwick, kMajor, kMinor, kLocale, kSystem);
+    if (FAILED(library) && library != TYPE_E_REGISTRYACCESS) gone = false;
+    return gone ? S_OK : SELFREG_E_CLASS;
+  });
+}
+
+}  // namespace tarnwick
