@@ -100,6 +100,9 @@ start_display() {
 
 # ---- Wine ----------------------------------------------------------------------------------------------------------
 
+# Variables for programs under Wine, as NAME=VALUE.
+wine_environment=()
+
 # Seconds after which a program under Wine counts as hanging.
 wine_limit=600
 
@@ -122,7 +125,8 @@ in_wine32() {
 wine_command() {
   local arch=$1
   shift
-  local settings=(WINEDEBUG=-all "WINEPREFIX=$wine_home/$arch" "WINEDLLOVERRIDES=mscoree,mshtml=" "DISPLAY=${DISPLAY-}")
+  local settings=(WINEDEBUG=-all "WINEPREFIX=$wine_home/$arch" "WINEDLLOVERRIDES=mscoree,mshtml=" "DISPLAY=${DISPLAY-}"
+    "${wine_environment[@]}")
   case $arch in
     x64) timeout -k 10 "$wine_limit" env "${settings[@]}" WINEARCH=win64 "$@" </dev/null ;;
     x86) in_wine32 "${settings[@]}" WINEARCH=win32 "$@" </dev/null ;;
@@ -159,8 +163,30 @@ wine_prefix() {
   touch "$prefix/complete"
 }
 
+# registry_of ARCH FILE: what is registered for all users, as text.
+registry_of() {
+  wine_run "$1" reg export 'HKLM\Software\Classes' "$2" /y
+}
+
 # ---- The hosting server --------------------------------------------------------------------------------------------
 
+# The account that demo and tests work with. Port 21 of the same address has an FTP server on its files.
+hosting_address=127.0.0.21
 hosting_user=anna.berg@example.org
 hosting_password=Linden42
 hosting_product=7
+
+# start_hosting NAME ADDRESS DATA OPTION...: starts a hosting server with the account seeded; its "host:port" is left in
+# `hosting_server`.
+start_hosting() {
+  local name=$1 address=$2 data=$3
+  shift 3
+  start_server "$name" '^listening on ' build/native/hosting/tarnwick-hosting --host "$address" --data "$data" \
+    --seed-user "$hosting_user" --seed-password "$hosting_password" --seed-product "$hosting_product" \
+    --seed-pictures demo/pictures "$@" || return 1
+  hosting_server=${server_line#listening on }
+}
+
+start_ftp() {
+  start_server "$1" '^listening on ' scripts/ftp-server "$hosting_address" 21 "$2" "$hosting_user" "$hosting_password"
+}

@@ -1,8 +1,10 @@
 // Scripted doubles behind the platform seam. They record what they were asked, in order.
 #pragma once
 
+#include <algorithm>
 #include <cstring>
 #include <deque>
+#include <functional>
 #include <map>
 #include <string>
 #include <utility>
@@ -25,15 +27,18 @@ struct FakeHttp : HttpTransport {
     Text host;
     std::uint16_t port;
     std::string target;
+    std::string contentType;
     std::string body;
+    std::size_t maxBodyBytes;
   };
-  std::deque<HttpAnswer> answers;
+  std::deque<std::optional<HttpAnswer>> answers;
   std::vector<Sent> sent;
 
-  std::optional<HttpAnswer> Post(const HttpPost& post, std::size_t) override {
-    sent.push_back({post.host, post.port, post.target, std::string(post.body)});
+  std::optional<HttpAnswer> Post(const HttpPost& post, std::size_t maxBodyBytes) override {
+    sent.push_back({post.host, post.port, post.target, std::string(post.contentType), std::string(post.body),
+                    maxBodyBytes});
     if (answers.empty()) return std::nullopt;
-    HttpAnswer answer = answers.front();
+    std::optional<HttpAnswer> answer = std::move(answers.front());
     answers.pop_front();
     return answer;
   }
@@ -45,7 +50,9 @@ struct FakeRegistry : Registry {
     std::string bytes;
   };
   using Values = std::map<Text, Value>;
+  // By path below HKEY_CURRENT_USER, the only hive with keys.
   std::map<Text, Values> keys;
+  int opened = 0;
 
   struct Key : RegistryKey {
     explicit Key(const Values& itsValues) : values(itsValues) {}
@@ -63,12 +70,22 @@ struct FakeRegistry : Registry {
   };
 
   std::uint32_t Open(std::uint32_t hive, TextView path, std::unique_ptr<RegistryKey>& key) override {
+    ++opened;
     const auto found = keys.find(Text(path));
     if (hive != kHiveCurrentUser || found == keys.end()) return 2;
     key = std::make_unique<Key>(found->second);
     return 0;
   }
   Text TextFromAnsi(std::string_view bytes) const override { return TextFromLatin1(bytes); }
+
+  // A text value, stored with its terminator.
+  static Value String(const std::string& text) { return {1, text + '\0'}; }
+  static Value Number(unsigned char number) {
+    return {4, std::string(1, static_cast<char>(number)) + std::string(3, '\0')};
+  }
+  Values& InternetSettings() {
+    return keys[u"Software\\Microsoft\\Windows\\CurrentVersion\\Internet Settings"];
+  }
 };
 
 struct FakeFiles : FileSystem {
@@ -78,7 +95,13 @@ struct FakeFiles : FileSystem {
   };
   std::map<Text, File> files;
   std::vector<Text> folders;
+  // Folders that no listing shows, although their names are taken.
+  std::vector<Text> hiddenFolders;
+  std::vector<Text> made;
+  // The error that creating this folder raises.
+  std::map<Text, std::int32_t> makeErrors;
   std::vector<std::uint32_t> attributesSet;
+  Text temp = u"C:\\Temp\\";
 
   File& At(TextView path) {
     const auto found = files.find(Text(path));
@@ -86,41 +109,60 @@ struct FakeFiles : FileSystem {
     return found->second;
   }
   std::uint64_t Length(TextView path) override { return At(path).length; }
-  Text ModifiedText(TextView) override { return u"1/2/2026 3:04:05 AM"; }
+  Text ModifiedText(TextView path) override {
+    At(path);
+    return u"1/2/2026 3:04:05 AM";
+  }
   std::uint32_t Attributes(TextView path) override { return At(path).attributes; }
   void SetAttributes(TextView path, std::uint32_t attributes) override {
     At(path).attributes = attributes;
     attributesSet.push_back(attributes);
   }
   void Copy(TextView source, TextView destination) override { files[Text(destination)] = At(source); }
-  Text FirstName(TextView, bool) override { return {}; }
-  void MakeFolder(TextView path) override {
-    for (const Text& folder : folders)
-      if (folder == path) throw RuntimeError(error::kFileAlreadyExists);
-    folders.emplace_back(path);
+  Text FirstName(TextView pattern, bool withFolders) override {
+    const bool found =
+        files.contains(Text(pattern)) || (withFolders && std::ranges::count(folders, pattern) > 0);
+    return found ? Text(pattern) : Text();
   }
-  Text TempPath() override { return u"C:\\Temp\\"; }
+  void MakeFolder(TextView path) override {
+    if (const auto failure = makeErrors.find(Text(path)); failure != makeErrors.end())
+      throw RuntimeError(failure->second);
+    if (std::ranges::count(folders, path) + std::ranges::count(hiddenFolders, path) > 0)
+      throw RuntimeError(error::kFileAlreadyExists);
+    folders.emplace_back(path);
+    made.emplace_back(path);
+  }
+  Text TempPath() override { return temp; }
 };
 
 struct FakeInternet : Internet {
+  // "open AGENT", "connect HOST|PORT|USER|PASSWORD", "cd PATH", "pwd", "get FILE TO", commands, "close".
   std::vector<Text> calls;
+  bool opens = true;
   bool connects = true;
+  bool changesDirectory = true;
+  bool fetches = true;
+  bool takesCommands = true;
+  std::optional<Text> directory = u"/";
 
   struct Connection : FtpConnection {
     explicit Connection(FakeInternet& itsOwner) : owner(itsOwner) {}
     ~Connection() override { owner.calls.emplace_back(u"close"); }
     bool SetDirectory(TextView path) override {
       owner.calls.push_back(u"cd " + Text(path));
-      return true;
+      return owner.changesDirectory;
     }
-    std::optional<Text> Directory() override { return Text(u"/"); }
+    std::optional<Text> Directory() override {
+      owner.calls.emplace_back(u"pwd");
+      return owner.directory;
+    }
     bool GetFile(TextView server, TextView local) override {
       owner.calls.push_back(u"get " + Text(server) + u" " + Text(local));
-      return true;
+      return owner.fetches;
     }
     bool Command(TextView command) override {
       owner.calls.emplace_back(command);
-      return true;
+      return owner.takesCommands;
     }
     FakeInternet& owner;
   };
@@ -128,22 +170,53 @@ struct FakeInternet : Internet {
     explicit Session(FakeInternet& itsOwner) : owner(itsOwner) {}
     std::unique_ptr<FtpConnection> ConnectFtp(TextView host, std::uint16_t port, TextView user,
                                               TextView password) override {
-      owner.calls.push_back(Text(host) + u"|" + TextFromNumber(port) + u"|" + Text(user) + u"|" + Text(password));
+      owner.calls.push_back(u"connect " + Text(host) + u"|" + TextFromNumber(port) + u"|" + Text(user) +
+                            u"|" + Text(password));
       if (!owner.connects) return nullptr;
       return std::make_unique<Connection>(owner);
     }
     FakeInternet& owner;
   };
-  std::unique_ptr<InternetSession> Open(TextView) override { return std::make_unique<Session>(*this); }
+  std::unique_ptr<InternetSession> Open(TextView agent) override {
+    calls.push_back(u"open " + Text(agent));
+    if (!opens) return nullptr;
+    return std::make_unique<Session>(*this);
+  }
 };
 
 struct FakeStrings : StringResources {
-  std::unique_ptr<ResourceLibrary> Load(TextView) override { return nullptr; }
-  Text OwnString(std::uint16_t identifier) override { return identifier == 487 ? Text(u"own") : Text(); }
+  using Strings = std::map<std::uint16_t, Text>;
+  static Text Find(const Strings& strings, std::uint16_t identifier) {
+    const auto found = strings.find(identifier);
+    return found == strings.end() ? Text() : found->second;
+  }
+  struct Library : ResourceLibrary {
+    explicit Library(const Strings& itsStrings) : strings(itsStrings) {}
+    Text String(std::uint16_t identifier) override { return Find(strings, identifier); }
+    const Strings& strings;
+  };
+
+  Strings own;
+  std::map<Text, Strings> libraries;
+  std::vector<Text> loads;
+
+  std::unique_ptr<ResourceLibrary> Load(TextView path) override {
+    loads.emplace_back(path);
+    const auto found = libraries.find(Text(path));
+    if (found == libraries.end()) return nullptr;
+    return std::make_unique<Library>(found->second);
+  }
+  Text OwnString(std::uint16_t identifier) override { return Find(own, identifier); }
 };
 
 struct FakePump : MessagePump {
-  void Yield() override {}
+  int yields = 0;
+  // What other code does while messages are handled.
+  std::function<void()> onYield;
+  void Yield() override {
+    ++yields;
+    if (onYield) onYield();
+  }
 };
 
 struct FakePlatform {

@@ -1,128 +1,315 @@
+// What CFileUpload does beyond single exchanges: session, registration, accounts and the FTP connection.
+#include "service/CFileUpload.h"
+
 #include <gtest/gtest.h>
 
 #include "fakes/FakePlatform.h"
-#include "service/CFileUpload.h"
-#include "service/modEnctyption.h"
 
 namespace tarnwick {
 namespace {
 
-std::string Enciphered(TextView text) { return Utf8FromText(CFileUpload::EnCodeString(EncryptParameter(text))); }
+using Calls = std::vector<Text>;
 
 class CFileUploadTest : public testing::Test {
  protected:
-  void Answer(const char* body) { fake.http.answers.push_back({200, body}); }
-  bool Logon(TextView user) { return client.LogonAs(u"7", user, u"pw", u"{M}"); }
+  CFileUploadTest() { fake.apartment.session.serverName = u"h:8080"; }
+
+  void Answer(const char* body) { fake.http.answers.push_back(HttpAnswer{200, body}); }
+  bool Logon(TextView user) {
+    Answer("UserAuthenticationStatus=TRUE");
+    return client.LogonAs(u"7", user, u"pw", u"{M}");
+  }
+  bool OpenSession() {
+    Answer("PathFromRoot=/p");
+    return client.OpenSession();
+  }
+
+  // The requests so far, by request name or acceptor page.
+  std::string Requests() const {
+    std::string names;
+    for (const FakeHttp::Sent& sent : fake.http.sent) {
+      const std::size_t name = sent.target.find("Request=");
+      names += (names.empty() ? "" : " ") +
+               (name == std::string::npos ? sent.target.substr(sent.target.rfind('/') + 1)
+                                          : sent.target.substr(name + 8, sent.target.find('&') - name - 8));
+    }
+    return names;
+  }
 
   FakePlatform fake;
   CFileUpload client{fake.apartment};
 };
 
-TEST_F(CFileUploadTest, LogonIsOneExchangeOnTheWire) {
-  client.SetHTTPServer(u"h:8080");
-  Answer("UserAuthenticationStatus=true");
-  ASSERT_TRUE(Logon(u"a+b@c.d"));
+TEST_F(CFileUploadTest, ServerName) {
+  client.SetHTTPServer(u"first");
+  client.ConnectToServer(u"second");
+  // The property keeps what was assigned to it; the apartment speaks to the latest.
+  EXPECT_EQ(client.GetHTTPServer(), u"first");
+  EXPECT_EQ(fake.apartment.session.serverName, u"second");
   ASSERT_EQ(fake.http.sent.size(), 1U);
-  EXPECT_EQ(fake.http.sent[0].port, 8080);
-  EXPECT_EQ(fake.http.sent[0].target, "/bv/bin/BVServicePage.asp?Request=ValidationRequest&Flag=0");
-  EXPECT_EQ(fake.http.sent[0].body, "ClientAction=" + Enciphered(u"UserValidate") + "&UserName=" +
-                                        Enciphered(u"a+b@c.d") + "&Password=" + Enciphered(u"pw") +
-                                        "&ProductID=7&MGUID={M}");
+  EXPECT_EQ(fake.http.sent[0].host, u"second");
+  EXPECT_EQ(fake.http.sent[0].port, 80);
+  // Nothing is sent to a name that would break the request.
+  for (const TextView name : {u"", u"h\r\nX: y", u"h:0", u"http://h"})
+    EXPECT_FALSE(client.ConnectToServer(name));
+  EXPECT_EQ(fake.http.sent.size(), 1U);
 }
 
 TEST_F(CFileUploadTest, EveryFalseLogonRestoresTheUser) {
-  client.SetHTTPServer(u"h");
-  Answer("UserAuthenticationStatus=TRUE");
   ASSERT_TRUE(Logon(u"first"));
-  for (const char* body : {"UserAuthenticationStatus=yes", "UserAuthenticationStatus", "", "ErrorOccured=1"}) {
+  for (const char* body :
+       {"UserAuthenticationStatus=yes", "UserAuthenticationStatus", "", "ErrorOccured=1"}) {
     Answer(body);
     EXPECT_FALSE(client.LogonAs(u"9", u"second", u"other", u"{N}"));
     EXPECT_EQ(fake.apartment.session.userName, u"first");
     EXPECT_EQ(fake.apartment.session.password, u"pw");
     EXPECT_EQ(fake.apartment.session.mguid, u"{N}");
     EXPECT_EQ(fake.apartment.session.productNumber, 9);
+    EXPECT_EQ(fake.apartment.ftp.userName, u"first");
   }
   EXPECT_FALSE(client.LogonAs(u"no number", u"second", u"other", u"{N}"));
   EXPECT_EQ(fake.apartment.session.userName, u"first");
 }
 
-TEST_F(CFileUploadTest, ListingKeepsWhatItReadBeforeAnError) {
-  client.SetHTTPServer(u"h");
-  std::vector<Text> keys;
-  const auto sink = [&](const std::shared_ptr<CUpload>&, TextView key) { keys.emplace_back(key); };
-  Answer("FileName=a&FileName=b&FileURL=u1&FileURL=u2&FileSize=1&FileDate=d&FileDate=d");
+TEST_F(CFileUploadTest, LogonRenewsTheListing) {
+  ASSERT_TRUE(Logon(u"first"));
+  const auto sink = [&](const std::shared_ptr<CUpload>& file, TextView key) {
+    fake.apartment.allFiles.Add(file, key);
+  };
+  // A second file of the address ends the listing; the first stays.
+  Answer("FileName=a&FileName=b&FileURL=u&FileURL=u&FileSize=1&FileSize=2&FileDate=d&FileDate=d");
   EXPECT_FALSE(client.ListFilesForUser(sink));
-  EXPECT_EQ(keys, (std::vector<Text>{u"u1"}));
-  Answer("FileName&FileURL&FileSize&FileDate");
+  EXPECT_EQ(fake.apartment.allFiles.Count(), 1U);
+  EXPECT_TRUE(client.FileExists(u"a"));
+  EXPECT_FALSE(client.FileExists(u"A"));
+
+  fake.apartment.listingIsCurrent = fake.apartment.listLoaded = true;
   EXPECT_TRUE(client.ListFilesForUser(sink));
-  Answer("FileURL=u");
-  EXPECT_FALSE(client.ListFilesForUser(sink));
-  fake.apartment.allFiles.Add(std::make_shared<CUpload>());
+  EXPECT_EQ(Requests(), "ValidationRequest ListFilesRequest");
+
+  ASSERT_TRUE(Logon(u"second"));
+  EXPECT_TRUE(client.IsAccountEmpty());
+  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_FALSE(fake.apartment.listLoaded);
+  // Current but empty: the service is asked.
   fake.apartment.listingIsCurrent = true;
-  EXPECT_TRUE(client.ListFilesForUser(sink));
-  EXPECT_EQ(fake.http.sent.size(), 3U);
+  EXPECT_FALSE(client.ListFilesForUser(sink));
+}
+
+TEST_F(CFileUploadTest, CollectionsMayCallTheClient) {
+  // A collection is code of the host, which may ask the service for more while it takes a file.
+  Answer("FileName=a&FileName=b&FileURL=u1&FileURL=u2&FileSize=1&FileSize=2&FileDate=d1&FileDate=d2");
+  Text names;
+  EXPECT_TRUE(client.ListFilesForUser([&](const std::shared_ptr<CUpload>& file, TextView key) {
+    EXPECT_EQ(client.CanUploadFile(), 1004);
+    names += file->FileName + file->FileDate + Text(key);
+  }));
+  EXPECT_EQ(names, u"ad1u1bd2u2");
 }
 
 TEST_F(CFileUploadTest, RegistrationRestoresAttributesOnEveryWayOut) {
-  client.SetHTTPServer(u"h");
-  fake.files.files[u"C:\\a b.jpg"] = {12, attribute::kReadOnly};
-  Answer("FileURL=http%3A%2F%2Fh%2Fa");
-  EXPECT_EQ(client.SaveUploadFile(u"C:\\a b.jpg"), u"http://h/a");
-  EXPECT_NE(fake.http.sent[0].body.find("&FileName=a%20b.jpg&FileSize=12&Username="), std::string::npos);
-  EXPECT_EQ(client.SaveUploadFile(u"C:\\a b.jpg"), u"");
-  EXPECT_EQ(fake.files.attributesSet, (std::vector<std::uint32_t>{0, 1, 0, 1}));
+  fake.files.files[u"C:\\a.jpg"] = {12, attribute::kReadOnly};
+  for (const auto& [body, url] : {std::pair{"FileURL=u", u"u"}, {"", u""}, {"ErrorOccured=1", u""}}) {
+    Answer(body);
+    EXPECT_EQ(client.SaveUploadFile(u"C:\\a.jpg"), url);
+  }
+  EXPECT_EQ(fake.files.attributesSet, (std::vector<std::uint32_t>{0, 1, 0, 1, 0, 1}));
+  const CUpload& record = *client.GetUploadObject();
+  EXPECT_EQ(record.FileName + u"|" + record.FilePath, u"a.jpg|C:\\a.jpg");
+  EXPECT_EQ(record.FileSize, 12);
   EXPECT_EQ(client.SaveUploadFile(u"C:\\missing.jpg"), u"");
-  EXPECT_EQ(fake.http.sent.size(), 2U);
+  EXPECT_EQ(fake.http.sent.size(), 3U);
 }
 
-TEST_F(CFileUploadTest, FailureValues) {
-  client.SetHTTPServer(u"h");
-  EXPECT_EQ(client.RenameFile(u"7", u"u", u"a", u"b"), 1033);
-  EXPECT_EQ(client.DeleteFileForUser(u"a"), 1004);
-  EXPECT_EQ(client.CanUploadFile(), 1004);
-  EXPECT_EQ(client.GetKeyForUser(u"7", u"u"), u"1004");
-  EXPECT_EQ(client.GetHardLimit(u"7"), 0);
-  EXPECT_EQ(client.ManagePassword(u"7", u"u", u"a", u"b"), 1004);
-  EXPECT_EQ(client.AddUser(u"7", u"u", u""), u"1004");
-  EXPECT_FALSE(client.GetTotalUsedQuota(u"7", u"u"));
-  EXPECT_FALSE(client.ConnectToServer(u"h"));
+// --- Accounts
+// ------------------------------------------------------------------------------------------------
+
+struct Transcript {
+  std::vector<const char*> answers;
+  const char* requests;
+  const char* result;
+};
+
+constexpr const char* kLoggedOn = "UserAuthenticationStatus=TRUE";
+constexpr const char* kRefused = "UserAuthenticationStatus=FALSE";
+constexpr const char* kDone = "ErrorNumber=0";
+
+TEST_F(CFileUploadTest, AddUserBranches) {
+  const char* added = "AddUser=1001&BasePath=b&UserFolder=f&Password=p&MGUID=%7Bm%7D";
+  const char* addedWithoutMguid = "AddUser=1001&BasePath=b%5C&UserFolder=f&Password=p&MGUID=";
+  const char* finished = "UserKeyRequest ValidationRequest CreateFolderAcceptor.asp EmailKeyRequest";
+  const char* folderFailed =
+      "UserKeyRequest ValidationRequest CreateFolderAcceptor.asp "
+      "ValidUserID DeleteFolderAcceptor.asp ValidationRequest DeleteUserRequest";
+  const Transcript transcripts[] = {
+      {{added, kLoggedOn, kDone, "SendMail=1001"}, finished, "{m}"},
+      {{added, kLoggedOn, "ErrorNumber=-2147220840", "SendMail=1001"}, finished, "{m}"},
+      {{added, kLoggedOn, kDone, "ErrorOccured=1"}, finished, "{m}"},
+      {{addedWithoutMguid, kLoggedOn, kDone, "SendMail=1001"}, finished, "1002"},
+      {{added, kRefused, "ValidUser=TRUE", kDone, kLoggedOn, "DeleteUser=1001"},
+       "UserKeyRequest ValidationRequest ValidUserID DeleteFolderAcceptor.asp ValidationRequest "
+       "DeleteUserRequest",
+       "1004"},
+      {{added, kLoggedOn, "ErrorNumber=-2147220878", "ValidUser=TRUE", kDone, kLoggedOn, "DeleteUser=1001"},
+       folderFailed,
+       "1004"},
+      {{added, kLoggedOn, "<html>", "ValidUser=TRUE", kDone, kLoggedOn, "DeleteUser=1001"},
+       folderFailed,
+       "1004"},
+      {{"AddUser=1003"}, "UserKeyRequest", "1003"},
+      {{"AddUser=1004"}, "UserKeyRequest", "1004"},
+      {{"AddUser=1011"}, "UserKeyRequest", "1011"},
+      {{"AddUser=x"}, "UserKeyRequest", ""},
+      {{"ErrorOccured=1"}, "UserKeyRequest", "1004"},
+      {{"AddUser=1001&BasePath=b&UserFolder=f&MGUID=m"}, "UserKeyRequest", ""},
+  };
+  for (const Transcript& transcript : transcripts) {
+    for (const char* body : transcript.answers) Answer(body);
+    EXPECT_EQ(Utf8FromText(client.AddUser(u"7", u"a+1@b.c", u"{g}")), transcript.result)
+        << transcript.answers[0];
+    EXPECT_EQ(Requests(), transcript.requests);
+    EXPECT_TRUE(fake.http.answers.empty());
+    fake.http.sent.clear();
+    fake.http.answers.clear();
+  }
 }
 
-TEST_F(CFileUploadTest, AddUserRollsBackWhenTheNewUserCannotLogOn) {
-  client.SetHTTPServer(u"h");
-  Answer("AddUser=1001&BasePath=x&UserFolder=f&Password=p&MGUID=m");
-  Answer("UserAuthenticationStatus=FALSE");
-  Answer("ValidUser=TRUE");
-  Answer("ErrorNumber=0");
-  Answer("UserAuthenticationStatus=TRUE");
-  Answer("DeleteUser=1001");
-  EXPECT_EQ(client.AddUser(u"7", u"a@b.c", u""), u"1004");
-  EXPECT_TRUE(fake.http.answers.empty());
-  EXPECT_EQ(fake.http.sent[3].target, "/httpupload/DeleteFolderAcceptor.asp");
-  EXPECT_EQ(fake.http.sent[3].body,
-            "UsersBaseUrl=http%3A%2F%2Fh%2Fusers%2F&Folder=a%40b-c&Action=6&User=a%40b.c&Password=p&"
-            "ProductID=4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E");
+TEST_F(CFileUploadTest, AddUserSendsWhatTheServiceIssued) {
+  for (const char* body :
+       {"AddUser=1001&BasePath=b&UserFolder=f+1&Password=p%26w&MGUID=m", kLoggedOn, kDone, "SendMail=1001"})
+    Answer(body);
+  ASSERT_EQ(client.AddUser(u"7", u"a+b@c.d", u"{g&}"), u"m");
+  EXPECT_EQ(fake.http.sent[0].body, "ClientAction=dLJT4bA&UserName=a%2Bb@c.d&ProductID=7&MGUID={g&}");
+  EXPECT_EQ(fake.http.sent[1].body,
+            "ClientAction=l_-7S$0$LM@A&UserName=DCuKqB&Password=52&ProductID=7&MGUID=m");
+  EXPECT_EQ(fake.http.sent[2].target, "/httpupload/CreateFolderAcceptor.asp");
+  EXPECT_EQ(fake.http.sent[2].host, u"h");
+  EXPECT_EQ(fake.http.sent[2].port, 8080);
+  EXPECT_EQ(fake.http.sent[2].body,
+            "UsersBaseUrl=http%3A%2F%2Fh%3A8080%2Fusers%2F&Folder=f%201&Action=5&User=a%2Bb%40c.d&"
+            "Password=p%26w&ProductID=4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E");
+  EXPECT_EQ(fake.http.sent[3].body, "ClientAction=VASOQCb$$0&UserName=a%2Bb@c.d&ProductID=7&NewUser=1");
+  EXPECT_EQ(fake.apartment.session.userName, u"a+b@c.d");
 }
 
-TEST_F(CFileUploadTest, FtpSessionGoesThroughTheProxyOncePerLogon) {
-  client.SetHTTPServer(u"h:8080");
-  auto& settings = fake.registry.keys[u"Software\\Microsoft\\Windows\\CurrentVersion\\Internet Settings"];
-  settings[u"ProxyEnable"] = {1, std::string("1") + '\0'};
-  settings[u"ProxyServer"] = {1, std::string("Proxy:3128") + '\0'};
-  Answer("UserAuthenticationStatus=TRUE");
+TEST_F(CFileUploadTest, DeleteUserBranches) {
+  const char* valid = "ValidUser=TRUE";
+  const char* asFarAsTheFolder = "ValidUserID DeleteFolderAcceptor.asp";
+  const char* whole = "ValidUserID DeleteFolderAcceptor.asp ValidationRequest DeleteUserRequest";
+  const Transcript transcripts[] = {
+      {{valid, kDone, kLoggedOn, "DeleteUser=1001"}, whole, "1001"},
+      {{valid, "ErrorNumber=-2147220840", kLoggedOn, "DeleteUser=1002"}, whole, "1002"},
+      {{valid, kDone, kLoggedOn, "ErrorOccured=1"}, whole, "1004"},
+      {{valid, kDone, kLoggedOn, "Other=1"}, whole, "0"},
+      {{valid, kDone, kRefused}, "ValidUserID DeleteFolderAcceptor.asp ValidationRequest", "1002"},
+      {{valid, "ErrorNumber=-2147220878"}, asFarAsTheFolder, "1002"},
+      {{valid, "ErrorNumber=-2147220881"}, asFarAsTheFolder, "1004"},
+      {{valid, "ErrorNumber=x"}, asFarAsTheFolder, "1004"},
+      {{valid, ""}, asFarAsTheFolder, "1004"},
+      {{"ValidUser=FALSE"}, "ValidUserID", "1003"},
+      {{"ErrorOccured=1"}, "ValidUserID", "1003"},
+  };
+  fake.apartment.session.mguid = u"{S}";
+  for (const Transcript& transcript : transcripts) {
+    for (const char* body : transcript.answers) Answer(body);
+    EXPECT_EQ(std::to_string(client.DeleteUser(u"7", u"a+b@c.d.e", u"p&w")), transcript.result);
+    EXPECT_EQ(Requests(), transcript.requests);
+    for (const FakeHttp::Sent& sent : fake.http.sent) {
+      if (sent.target == "/httpupload/DeleteFolderAcceptor.asp") {
+        EXPECT_EQ(sent.body,
+                  "UsersBaseUrl=http%3A%2F%2Fh%3A8080%2Fusers%2F&Folder=a%2Bb%40c-d-e&Action=6&"
+                  "User=a%2Bb%40c.d.e&Password=p%26w&ProductID=4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E");
+      } else if (sent.target.find("ValidationRequest") != std::string::npos) {
+        EXPECT_TRUE(sent.body.ends_with("&ProductID=7&MGUID={S}")) << sent.body;
+      } else if (sent.target.find("DeleteUserRequest") != std::string::npos) {
+        EXPECT_TRUE(sent.target.ends_with("&Flag=1"));
+        EXPECT_EQ(sent.body, "ClientAction=kAUN1CTu_4&UserName=a%2Bb@c.d.e&ProductID=7&Password=p&w");
+      }
+    }
+    fake.http.sent.clear();
+    fake.http.answers.clear();
+  }
+}
+
+// --- FTP
+// -----------------------------------------------------------------------------------------------------
+
+TEST_F(CFileUploadTest, FtpSessionInOrder) {
   ASSERT_TRUE(Logon(u"u"));
-  Answer("PathFromRoot=%2Fusers%2Fu");
-  ASSERT_TRUE(client.OpenSession());
+  EXPECT_EQ(client.DownloadFile(u"a", u"b"), u"");
+  ASSERT_TRUE(OpenSession());
+  EXPECT_TRUE(fake.apartment.ftp.connected);
+  EXPECT_EQ(fake.apartment.ftp.directory, u"/p");
   EXPECT_EQ(client.DownloadFile(u"a", u"b"), u"b");
+  // Opening again closes the connection first, whatever the server makes of the farewell. A refused folder
+  // leaves the connection open.
+  fake.internet.takesCommands = fake.internet.changesDirectory = false;
+  ASSERT_TRUE(OpenSession());
+  EXPECT_FALSE(fake.apartment.ftp.connected);
+  fake.internet.fetches = false;
+  EXPECT_EQ(client.DownloadFile(u"a", u"b"), u"");
+  fake.internet.directory.reset();
+  EXPECT_EQ(client.DownloadFile(u"a", u"b"), u"");
+  client.DisconnectFromServer();
   client.DisconnectFromServer();
   EXPECT_EQ(client.DownloadFile(u"a", u"b"), u"");
-  EXPECT_EQ(fake.internet.calls, (std::vector<Text>{u"proxy|0|u@h:21|pw", u"cd /users/u", u"get a b", u"QUIT",
-                                                    u"close"}));
+  EXPECT_EQ(fake.internet.calls,
+            (Calls{u"open FileUploadClient", u"connect h|21|u|pw", u"cd /p", u"pwd", u"get a b", u"QUIT",
+                   u"close", u"open FileUploadClient", u"connect h|21|u|pw", u"cd /p", u"pwd", u"get a b",
+                   u"pwd", u"QUIT", u"close"}));
 }
 
-TEST(EnCodeString, EscapesFourCharacters) {
-  EXPECT_EQ(CFileUpload::EnCodeString(u"100%+#& =?"), u"100%25%2B%23%26 =?");
-  EXPECT_EQ(CFileUpload::EnCodeString(u"%2B"), u"%252B");
+TEST_F(CFileUploadTest, FtpSessionThatDoesNotOpen) {
+  ASSERT_TRUE(Logon(u"u"));
+  for (bool* working : {&fake.internet.opens, &fake.internet.connects}) {
+    *working = false;
+    EXPECT_FALSE(client.OpenSession());
+    EXPECT_FALSE(fake.apartment.ftp.connected);
+    *working = true;
+  }
+  EXPECT_EQ(Requests(), "ValidationRequest");
+  fake.internet.calls.clear();
+  {
+    // The object that goes takes the apartment's connection along.
+    CFileUpload other(fake.apartment);
+    EXPECT_TRUE(other.OpenSession());
+  }
+  EXPECT_EQ(fake.internet.calls,
+            (Calls{u"open FileUploadClient", u"connect h|21|u|pw", u"cd ", u"QUIT", u"close"}));
+}
+
+TEST_F(CFileUploadTest, FtpProxy) {
+  const auto connectedTo = [&] {
+    fake.internet.calls.clear();
+    EXPECT_TRUE(OpenSession());
+    client.DisconnectFromServer();
+    return Utf8FromText(fake.internet.calls.at(1)).substr(8);
+  };
+  FakeRegistry::Values& settings = fake.registry.InternetSettings();
+  settings[u"ProxyServer"] = FakeRegistry::String("http=H1:80;FTP=Proxy:2121");
+  for (const FakeRegistry::Value& enabled : {FakeRegistry::String("1"), FakeRegistry::Number(1),
+                                             FakeRegistry::Value{3, std::string("\1\0\0\0", 4)}}) {
+    settings[u"ProxyEnable"] = enabled;
+    fake.apartment.ftp.proxyStyle = ProxyStyle::kUserAtHostColonPort;
+    ASSERT_TRUE(Logon(u"u"));
+    EXPECT_EQ(connectedTo(), "proxy|0|u@h:21|pw");
+    // Rewritten once per log-on, not once per connection.
+    EXPECT_EQ(connectedTo(), "proxy|0|u@h:21|pw");
+    EXPECT_EQ(fake.apartment.ftp.proxyPort, u"2121");
+    fake.apartment.ftp.proxyStyle = ProxyStyle::kUserAtHostBlankPort;
+    ASSERT_TRUE(Logon(u"v"));
+    EXPECT_EQ(connectedTo(), "proxy|0|v@h 21|pw");
+  }
+  settings[u"ProxyServer"] = FakeRegistry::String("Plain:3128");
+  ASSERT_TRUE(Logon(u"u"));
+  EXPECT_EQ(connectedTo(), "plain|0|u@h 21|pw");
+
+  settings[u"ProxyEnable"] = FakeRegistry::Number(0);
+  ASSERT_TRUE(Logon(u"u"));
+  EXPECT_EQ(connectedTo(), "h|21|u|pw");
+  fake.registry.keys.clear();
+  ASSERT_TRUE(Logon(u"u"));
+  EXPECT_EQ(connectedTo(), "h|21|u|pw");
 }
 
 }  // namespace

@@ -1,33 +1,18 @@
 #include <gtest/gtest.h>
 
 #include "fakes/FakePlatform.h"
+#include "service/CFileUpload.h"
 #include "service/Reply.h"
-#include "service/modEnctyption.h"
 #include "support/CRegistry.h"
 #include "support/PathHelpers.h"
 #include "support/ProxySettings.h"
+#include "support/RegistryValues.h"
+#include "support/ResourceStrings.h"
 #include "support/UserFolder.h"
 #include "transfer/HttpAddress.h"
 
 namespace tarnwick {
 namespace {
-
-TEST(Cipher, IsItsOwnInverseOnTheStrippedText) {
-  Text text;
-  for (char16_t unit = 1; unit < 300; ++unit) {
-    text.push_back(unit);
-    Text once = text;
-    ApplyCipher(once);
-    EXPECT_EQ(once.size(), StripToAlphabet(text).size());
-    EXPECT_EQ(EncryptParameter(once), StripToAlphabet(text));
-  }
-}
-
-TEST(Cipher, KnownVector) {
-  // One letter uses the key's second character: "a" is 26, so A becomes the one at 69 - 26 = 43.
-  EXPECT_EQ(EncryptParameter(u"A"), u"r");
-  EXPECT_EQ(EncryptParameter(u"/ \\"), u"");
-}
 
 TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
   const Reply reply = Reply::FromBody("A=1&A=b+c&&Bare&E=&U=%C3%A9\r\n");
@@ -58,59 +43,211 @@ TEST(Numbers, FromText) {
   EXPECT_EQ(LeadingNumber(u"12.5 Bytes"), 12.5);
   EXPECT_EQ(LeadingNumber(u"nan"), 0);
   EXPECT_TRUE(BooleanFromText(u"tRuE") && BooleanFromText(u"-1") && !BooleanFromText(u"0"));
-  for (const TextView bad : {u"", u"1x", u"+-1", u"2147483648"}) EXPECT_THROW(NumberFromText(bad), RuntimeError);
+  for (const TextView bad : {u"", u"1x", u"+-1", u"2147483648"})
+    EXPECT_THROW(NumberFromText(bad), RuntimeError);
   EXPECT_THROW(BooleanFromText(u"yes"), RuntimeError);
 }
 
 TEST(PathHelpers, Names) {
-  EXPECT_EQ(FileNameFromUrl(u"dir/a/b.jpg"), u"b.jpg");
-  EXPECT_EQ(FileNameFromUrl(u"a\\b"), u"a\\b");
-  EXPECT_EQ(FileNameFromPath(u"C:\\x\\"), u"");
-  EXPECT_EQ(UserFolderName(u"a.b@c.d.e"), u"a.b@c-d-e");
-  EXPECT_EQ(UserFolderName(u"a.b"), u"a-b");
+  const std::pair<TextView, TextView> urls[] = {
+      {u"dir/a/b.jpg", u"b.jpg"}, {u"b.jpg", u"b.jpg"}, {u"a/", u""},
+      {u"a\\b", u"a\\b"},         {u"/ b ", u" b "},    {u"", u""}};
+  for (const auto& [url, name] : urls) EXPECT_EQ(FileNameFromUrl(url), name);
+  const std::pair<TextView, TextView> paths[] = {
+      {u"C:\\x\\b.jpg", u"b.jpg"}, {u"b.jpg", u"b.jpg"}, {u"C:\\x\\", u""}, {u"a/b", u"a/b"}};
+  for (const auto& [path, name] : paths) EXPECT_EQ(FileNameFromPath(path), name);
+  const std::pair<TextView, TextView> users[] = {{u"a.b@c.d.e", u"a.b@c-d-e"}, {u"a.b", u"a-b"},
+                                                 {u"a.b@c", u"a.b@c"},         {u"a@b.c@d.e", u"a@b-c@d-e"},
+                                                 {u"@a.b", u"@a-b"},           {u"", u""}};
+  for (const auto& [user, folder] : users) EXPECT_EQ(UserFolderName(user), folder);
+}
+
+TEST(PathHelpers, Files) {
+  FakeFiles files;
+  files.files[u"a"] = {0x7FFFFFFF, 0};
+  files.files[u"big"] = {0x80000000, 0};
+  files.folders = {u"d"};
+  EXPECT_EQ(GetLocalFileSize(files, u"a"), 2147483647.0);
+  // A 32-bit length wraps.
+  EXPECT_EQ(GetLocalFileSize(files, u"big"), -2147483648.0);
+  EXPECT_EQ(GetLocalFileDate(files, u"a"), u"1/2/2026 3:04:05 AM");
+  EXPECT_TRUE(FileExists(files, u"a") && FolderExists(files, u"a") && FolderExists(files, u"d"));
+  EXPECT_FALSE(FileExists(files, u"d") || FolderExists(files, u"x"));
+  EXPECT_FALSE(CreateFolder(files, u"new"));
+  EXPECT_TRUE(FolderExists(files, u"new"));
+  CopyLocalFile(files, u"a", u"copy");
+  CopyLocalFile(files, u"missing", u"copy");
+  EXPECT_EQ(files.files[u"copy"].length, 0x7FFFFFFFU);
+  EXPECT_THROW(GetLocalFileSize(files, u"missing"), RuntimeError);
+  EXPECT_THROW(GetLocalFileDate(files, u"missing"), RuntimeError);
+  EXPECT_THROW(CreateFolder(files, u"d"), RuntimeError);
 }
 
 TEST(CRegistry, OddRules) {
   FakeRegistry registry;
-  registry.keys[u"A\\C"] = {{u"s", {1, std::string(255, 'x') + '\0'}},
-                            {u"long", {1, std::string(256, 'x') + '\0'}},
-                            {u"n", {4, std::string("\x2A\0\0\0", 4)}},
+  registry.keys[u"A"] = {{u"s", FakeRegistry::String("base")}};
+  registry.keys[u"A\\C"] = {{u"s", FakeRegistry::String(std::string(255, 'x'))},
+                            {u"long", FakeRegistry::String(std::string(256, 'x'))},
+                            {u"expand", {2, std::string("%P%") + '\0'}},
+                            {u"n", FakeRegistry::Number(42)},
+                            {u"binary", {3, "abcd"}},
                             {u"empty", {1, ""}}};
+  const Text longest(255, u'x');
   CRegistry reader(registry);
   std::uint32_t type = 0;
   EXPECT_EQ(reader.getRegSetting(u"s", u"C", type), u"");
   reader.setBaseRegKey(kHiveCurrentUser, u"A");
-  EXPECT_EQ(reader.getRegSetting(u"s", u"C", type), Text(255, u'x'));
-  EXPECT_EQ(reader.getRegSetting(u"long", u"C", type), u"");
-  EXPECT_EQ(reader.getRegSetting(u"empty", u"C", type), u"");
-  // A number found where a text was asked for yields the text that was read last.
-  EXPECT_EQ(reader.getRegSetting(u"n", u"C", type), Text(255, u'x'));
-  type = 2;
-  reader.getRegSetting(u"n", u"C", type);
-  EXPECT_EQ(type, 4U);
-  EXPECT_EQ(reader.getRegSetting(u"n", u"C", type), u"42");
-  type = 3;
-  EXPECT_EQ(reader.getRegSetting(u"s", u"C", type), u"");
+  EXPECT_EQ(reader.getRegSetting(u"s", u"", type), u"base");
+
+  // In this order: what was read before shows through where a value is of another type than asked for.
+  struct Query {
+    TextView name;
+    std::uint32_t type;
+    TextView result;
+    std::uint32_t typeAfter;
+  };
+  const Query queries[] = {
+      {u"s", 4, u"0", 1},        {u"s", 0, longest, 0},     {u"s", 1, longest, 1},   {u"s", 2, longest, 1},
+      {u"n", 1, longest, 1},     {u"n", 2, longest, 4},     {u"n", 4, u"42", 4},     {u"s", 4, u"42", 1},
+      {u"expand", 0, u"%P%", 0}, {u"expand", 2, u"%P%", 2}, {u"long", 1, u"", 1},    {u"binary", 1, u"", 1},
+      {u"binary", 2, u"", 3},    {u"empty", 1, u"", 1},     {u"missing", 1, u"", 1}, {u"missing", 4, u"", 4},
+  };
+  for (const Query& query : queries) {
+    type = query.type;
+    EXPECT_EQ(reader.getRegSetting(query.name, u"C", type), query.result)
+        << Utf8FromText(query.name) << " as " << query.type;
+    EXPECT_EQ(type, query.typeAfter) << Utf8FromText(query.name) << " as " << query.type;
+  }
+  const int opened = registry.opened;
+  for (std::uint32_t other : {3U, 5U, 0xFFFFFFFFU}) {
+    EXPECT_EQ(reader.getRegSetting(u"s", u"C", other), u"");
+    type = 0;
+  }
+  EXPECT_EQ(registry.opened, opened);
 }
 
-TEST(ProxySettings, BothReadings) {
+TEST(RegistryValues, OfPathsThatNameTheirHive) {
+  FakeRegistry registry;
+  registry.keys[u"A"] = {{u"s", FakeRegistry::String("text")},
+                         {u"binary", {3, std::string("\1\0z", 3)}},
+                         {u"short", {4, "ab"}},
+                         {u"list", {7, "ab"}}};
+  const RegistryValues values(registry, u"\\HKEY_CURRENT_USER\\A");
+  EXPECT_EQ(values.Get(u"s").text, u"text");
+  EXPECT_EQ(values.Get(u"binary").text, Text(u"\1\0z", 3));
+  for (const TextView name : {u"missing", u"short", u"list"}) EXPECT_THROW(values.Get(name), RuntimeError);
+  for (const TextView path :
+       {u"", u"HKEY_CURRENT_USER\\A", u"\\HKEY_CURRENT_USER", u"\\HKEY_NONE\\A", u"\\HKEY_USERS\\A"})
+    EXPECT_THROW(RegistryValues(registry, path), RuntimeError) << Utf8FromText(path);
+}
+
+TEST(ProxySettings, OfTheBrowser) {
+  struct Setting {
+    FakeRegistry::Value enable;
+    const char* server;
+    TextView host;
+    TextView port;
+    TextView raw;
+  };
+  const std::string one("\1\0\0\0", 4);
+  const Setting settings[] = {
+      {FakeRegistry::Number(1), "H:80", u"H", u"80", u"H:80"},
+      {{3, one}, "ftp=h1:21;x=h2:80", u"ftp=h1", u"21;x=h2", u"ftp=h1:21;x=h2:80"},
+      {{3, "1"}, "h:80", u"h", u"80", u"h:80"},
+      // Not enabled: host empty, all else as it was.
+      {FakeRegistry::Number(0), "h:80", u"", u"old", u"old"},
+      {FakeRegistry::Number(2), "h:80", u"", u"old", u"old"},
+      {FakeRegistry::String("1"), "h:80", u"", u"old", u"old"},
+      {{3, std::string(4, '\0')}, "h:80", u"", u"old", u"old"},
+      {{3, ""}, "h:80", u"", u"old", u"old"},
+  };
   FakePlatform fake;
-  EXPECT_THROW(GetProxySettings(fake.apartment), RuntimeError);
-  PrepareUserFolder(fake.apartment);
-  EXPECT_EQ(fake.apartment.UserFolderPath, u"");
-  auto& settings = fake.registry.keys[u"Software\\Microsoft\\Windows\\CurrentVersion\\Internet Settings"];
-  settings[u"ProxyEnable"] = {3, std::string("\1", 1)};
-  settings[u"ProxyServer"] = {1, std::string("ftp=h1:21;x=h2:80") + '\0'};
-  EXPECT_EQ(GetProxySettings(fake.apartment), u"ftp=h1");
-  EXPECT_EQ(fake.apartment.proxy.ProxyPort, u"21;x=h2");
-  EXPECT_EQ(ReadFtpProxy(fake.registry)->host, u"h1");
-  settings[u"ProxyEnable"] = {4, std::string(4, '\0')};
-  EXPECT_EQ(GetProxySettings(fake.apartment), u"");
-  EXPECT_EQ(fake.apartment.proxy.ProxyPort, u"21;x=h2");
-  EXPECT_FALSE(ReadFtpProxy(fake.registry));
-  fake.apartment.session.userName = u"a@b.c";
-  PrepareUserFolder(fake.apartment);
-  EXPECT_EQ(fake.apartment.UserFolderPath, u"C:\\Temp\\bv\\a@b-c");
+  FakeRegistry::Values& values = fake.registry.InternetSettings();
+  for (const Setting& setting : settings) {
+    fake.apartment.proxy = {u"old", u"old", u"old"};
+    values[u"ProxyEnable"] = setting.enable;
+    values[u"ProxyServer"] = FakeRegistry::String(setting.server);
+    EXPECT_EQ(GetProxySettings(fake.apartment), setting.host);
+    EXPECT_EQ(fake.apartment.proxy.ProxyHost, setting.host);
+    EXPECT_EQ(fake.apartment.proxy.ProxyPort, setting.port);
+    EXPECT_EQ(fake.apartment.proxy.ProxyServerSetting, setting.raw);
+  }
+  // A setting without a port raises 9, a missing one 5.
+  values[u"ProxyEnable"] = FakeRegistry::Number(1);
+  values[u"ProxyServer"] = FakeRegistry::String("h");
+  for (const std::int32_t number : {error::kSubscriptOutOfRange, error::kInvalidCall}) {
+    try {
+      GetProxySettings(fake.apartment);
+      ADD_FAILURE() << number;
+    } catch (const RuntimeError& failure) {
+      EXPECT_EQ(failure.Number(), number);
+    }
+    values.erase(u"ProxyServer");
+  }
+  EXPECT_EQ(fake.apartment.proxy.ProxyPort, u"old");
+}
+
+TEST(UserFolder, Branches) {
+  const Text service = u"C:\\Temp\\bv";
+  const Text user = service + u"\\a@b-c";
+  using Folders = std::vector<Text>;
+  struct Case {
+    const char* name;
+    Folders present;
+    Folders hidden;
+    std::map<Text, std::int32_t> makeErrors;
+    bool proxyReadable;
+    Folders made;
+    bool prepared;
+  };
+  const Case cases[] = {
+      {"fresh", {}, {}, {}, true, {service, user}, true},
+      {"both present", {service, user}, {}, {}, true, {}, true},
+      {"both taken meanwhile", {}, {service, user}, {}, true, {}, true},
+      {"no access to the first", {}, {}, {{service, error::kPathAccess}}, true, {}, false},
+      {"no access to the second", {}, {}, {{user, error::kPathNotFound}}, true, {service}, false},
+      {"no proxy settings", {}, {}, {}, false, {service, user}, false},
+  };
+  for (const Case& test : cases) {
+    for (const TextView temp : {u"C:\\Temp\\", u"C:\\Temp"}) {
+      FakePlatform fake;
+      fake.apartment.session.userName = u"a@b.c";
+      fake.apartment.UserFolderPath = u"old";
+      fake.files.temp = temp;
+      fake.files.folders = test.present;
+      fake.files.hiddenFolders = test.hidden;
+      fake.files.makeErrors = test.makeErrors;
+      if (test.proxyReadable) {
+        fake.registry.InternetSettings() = {{u"ProxyEnable", FakeRegistry::Number(1)},
+                                            {u"ProxyServer", FakeRegistry::String("h:80")}};
+      }
+      PrepareUserFolder(fake.apartment);
+      EXPECT_EQ(fake.files.made, test.made) << test.name;
+      EXPECT_EQ(fake.apartment.UserFolderPath, test.prepared ? user : u"old") << test.name;
+      EXPECT_EQ(fake.apartment.proxy.ProxyHost, test.prepared ? u"h" : u"") << test.name;
+    }
+  }
+}
+
+TEST(ResourceStrings, HostProductFirst) {
+  FakePlatform fake;
+  fake.strings.own = {{1, u"own 1"}, {2, u"own 2"}};
+  fake.strings.libraries[u"C:\\Orv\\ORVRES.dll"] = {{1, u"host 1"}};
+  EXPECT_EQ(GetResourceString(fake.apartment, 1), u"own 1");
+  fake.registry.keys[u"Software\\Drennick Software\\Orvanta 2.0\\Paths"][u"Install Path"] =
+      FakeRegistry::String("C:\\Orv");
+  // Tried once per apartment, with the first service client.
+  CFileUpload first(fake.apartment);
+  CFileUpload second(fake.apartment);
+  EXPECT_EQ(fake.strings.loads, std::vector<Text>{u"C:\\Orv\\ORVRES.dll"});
+  EXPECT_EQ(GetResourceString(fake.apartment, 1), u"host 1");
+  EXPECT_EQ(GetResourceString(fake.apartment, 2), u"own 2");
+  EXPECT_THROW(GetResourceString(fake.apartment, 3), RuntimeError);
+
+  // Without an install path nothing is loaded, and certainly not from the root folder.
+  FakePlatform bare;
+  CFileUpload client(bare.apartment);
+  EXPECT_TRUE(bare.strings.loads.empty());
 }
 
 }  // namespace

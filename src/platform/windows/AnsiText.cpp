@@ -13,8 +13,8 @@ std::optional<std::string> AnsiFromText(TextView text) {
   const int size = WideCharToMultiByte(CP_ACP, 0, wide.data(), units, nullptr, 0, nullptr, nullptr);
   bytes.resize(static_cast<std::size_t>(size));
   WideCharToMultiByte(CP_ACP, 0, wide.data(), units, bytes.data(), size, nullptr, nullptr);
-  // Compared on the way back, because a code page that is UTF-8 does not take the flags that would tell, and a
-  // look-alike character is a loss as well.
+  // Compared on the way back, because a code page that is UTF-8 does not take the flags that would tell, and
+  // a look-alike character is a loss as well.
   if (TextFromAnsi(bytes) != text) return std::nullopt;
   return bytes;
 }

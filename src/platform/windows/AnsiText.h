@@ -1,5 +1,5 @@
-// Text at the system's border: ANSI bytes (the process's code page) for the calls that take them, wide text for the
-// others.
+// Text at the system's border: ANSI bytes (the process's code page) for the calls that take them, wide text
+// for the others.
 #pragma once
 
 #include <optional>
@@ -15,8 +15,12 @@ std::optional<std::string> AnsiFromText(TextView text);
 
 Text TextFromAnsi(std::string_view bytes);
 
-inline std::wstring WideFromText(TextView text) { return {text.begin(), text.end()}; }
+inline std::wstring WideFromText(TextView text) {
+  return {text.begin(), text.end()};
+}
 
-inline Text TextFromWide(std::wstring_view wide) { return {wide.begin(), wide.end()}; }
+inline Text TextFromWide(std::wstring_view wide) {
+  return {wide.begin(), wide.end()};
+}
 
 }  // namespace tarnwick

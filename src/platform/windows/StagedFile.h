@@ -18,8 +18,8 @@ class StagedFile {
   // Full name of the file; empty when it could not be created.
   const std::wstring& Path() const { return path_; }
 
-  // Renames the file to the target, over a file of that name unless it is read-only. On failure what was there stays. The file must not be
-  // open.
+  // Renames the file to the target, over a file of that name unless it is read-only. On failure what was
+  // there stays. The file must not be open.
   bool Commit();
 
  private:

@@ -18,7 +18,8 @@ constexpr std::uint32_t kSettable =
 // 255 characters with their terminator, as hosts know the temporary folder.
 constexpr DWORD kTempPathRoom = 255;
 
-// Wide form of `path`, for which a NUL in it is no path: it would name another file than the one that was checked.
+// Wide form of `path`, for which a NUL in it is no path: it would name another file than the one that was
+// checked.
 std::wstring WidePath(TextView path, std::int32_t errorNumber) {
   if (path.find(u'\0') != TextView::npos) throw RuntimeError(errorNumber);
   return WideFromText(path);

@@ -9,8 +9,8 @@
 #endif
 #include <windows.h>
 
-// The header maps these names to their ...A or ...W forms, or away altogether, by macro, and with them every member
-// of ours that is called the same. Calls into the system name their form, so nobody misses the macros.
+// The header maps these names to their ...A or ...W forms, or away altogether, by macro, and with them every
+// member of ours that is called the same. Calls into the system name their form, so nobody misses the macros.
 #undef CopyFile
 #undef CreateFile
 #undef CreateWindow

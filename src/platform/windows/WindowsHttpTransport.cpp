@@ -18,7 +18,9 @@ constexpr DWORD kRequestFlags = INTERNET_FLAG_NO_AUTO_REDIRECT | INTERNET_FLAG_R
 
 constexpr std::size_t kFirstRoom = 16 * 1024;
 
-std::wstring WideFromAscii(std::string_view ascii) { return {ascii.begin(), ascii.end()}; }
+std::wstring WideFromAscii(std::string_view ascii) {
+  return {ascii.begin(), ascii.end()};
+}
 
 std::optional<std::wstring> Header(HINTERNET request, DWORD which) {
   std::array<wchar_t, 64> value{};
@@ -44,7 +46,8 @@ std::optional<std::uint64_t> AnnouncedLength(HINTERNET request) {
   return length;
 }
 
-// Reads the whole body into `body`; false when it is cut short, too long or silent.
+// Reads the whole body into `body`; false when it is cut short, too long or silent. In chunks, some versions
+// of the system do not tell a body that is cut short from a whole one.
 bool ReadBody(HINTERNET request, std::size_t maxBytes, std::string& body) {
   const auto announced = AnnouncedLength(request);
   if (announced && *announced > maxBytes) return false;
@@ -55,7 +58,8 @@ bool ReadBody(HINTERNET request, std::size_t maxBytes, std::string& body) {
       if (announced) return true;
       // One byte beyond the bound tells a body that just fits from one that does not.
       if (used > maxBytes) return false;
-      body.resize(used < maxBytes ? used + std::min(std::max(used, kFirstRoom), maxBytes - used) : maxBytes + 1);
+      body.resize(used < maxBytes ? used + std::min(std::max(used, kFirstRoom), maxBytes - used)
+                                  : maxBytes + 1);
     }
     const auto room = static_cast<DWORD>(std::min<std::size_t>(body.size() - used, 1U << 30));
     DWORD received = 0;
@@ -85,10 +89,11 @@ std::optional<HttpAnswer> WindowsHttpTransport::Post(const HttpPost& post, std::
   if (!request) return std::nullopt;
   SetTimeouts(request.Get(), connectMs_, silenceMs_);
 
-  // A post may have been carried out although its answer was lost, so it is sent exactly once. On a kept connection
-  // that the server has closed meanwhile, the system would either fail or send it again on its own, and could not
-  // tell which of the two is right. Hence a connection for each post.
-  const std::wstring headers = L"Content-Type: " + WideFromAscii(post.contentType) + L"\r\nConnection: close\r\n";
+  // A post may have been carried out although its answer was lost, so it is sent exactly once. On a kept
+  // connection that the server has closed meanwhile, the system would either fail or send it again on its
+  // own, and could not tell which of the two is right. Hence a connection for each post.
+  const std::wstring headers =
+      L"Content-Type: " + WideFromAscii(post.contentType) + L"\r\nConnection: close\r\n";
   // The system only reads the body, whatever its declaration says.
   if (!HttpSendRequestW(request.Get(), headers.c_str(), static_cast<DWORD>(headers.size()),
                         const_cast<char*>(post.body.data()), static_cast<DWORD>(post.body.size())))
@@ -97,7 +102,8 @@ std::optional<HttpAnswer> WindowsHttpTransport::Post(const HttpPost& post, std::
   DWORD status = 0;
   DWORD statusSize = sizeof status;
   if (!HttpQueryInfoW(request.Get(), HTTP_QUERY_STATUS_CODE | HTTP_QUERY_FLAG_NUMBER, &status, &statusSize,
-                      nullptr))
+                      nullptr) ||
+      status < 100)  // a connection that ended before it said anything has a status of 0 in some versions
     return std::nullopt;
   HttpAnswer answer;
   answer.status = static_cast<int>(status);

@@ -16,8 +16,8 @@ namespace {
 // 255 characters with their terminator, as hosts know the current folder.
 constexpr DWORD kDirectoryRoom = 255;
 
-// ANSI form of what goes into a command line. nullopt as well for a control character, which could end the line and
-// begin another command.
+// ANSI form of what goes into a command line. nullopt as well for a control character, which could end the
+// line and begin another command.
 std::optional<std::string> Argument(TextView text) {
   if (std::any_of(text.begin(), text.end(), [](char16_t unit) { return unit < 0x20 || unit == 0x7F; }))
     return std::nullopt;
@@ -56,8 +56,8 @@ class WindowsFtpConnection : public FtpConnection {
 
   bool Command(TextView command) override {
     const auto ansiCommand = Argument(command);
-    return ansiCommand && FtpCommandA(connection_.Get(), FALSE, FTP_TRANSFER_TYPE_ASCII, ansiCommand->c_str(), 0,
-                                      nullptr);
+    return ansiCommand &&
+           FtpCommandA(connection_.Get(), FALSE, FTP_TRANSFER_TYPE_ASCII, ansiCommand->c_str(), 0, nullptr);
   }
 
  private:

@@ -5,8 +5,8 @@
 namespace tarnwick {
 namespace {
 
-// A window that never gets its painting done, or a handler that posts its message again, would keep the loop going
-// for ever. Messages this much younger than the call are left for the next one.
+// A window that never gets its painting done, or a handler that posts its message again, would keep the loop
+// going for ever. Messages this much younger than the call are left for the next one.
 constexpr std::int32_t kMostMs = 100;
 
 }  // namespace

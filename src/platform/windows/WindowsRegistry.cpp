@@ -45,6 +45,8 @@ std::uint32_t WindowsRegistry::Open(std::uint32_t hive, TextView path, std::uniq
   return static_cast<std::uint32_t>(status);
 }
 
-Text WindowsRegistry::TextFromAnsi(std::string_view bytes) const { return tarnwick::TextFromAnsi(bytes); }
+Text WindowsRegistry::TextFromAnsi(std::string_view bytes) const {
+  return tarnwick::TextFromAnsi(bytes);
+}
 
 }  // namespace tarnwick

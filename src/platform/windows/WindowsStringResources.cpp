@@ -32,11 +32,13 @@ std::unique_ptr<ResourceLibrary> WindowsStringResources::Load(TextView path) {
   const auto ansiPath = AnsiFromText(path);
   if (!ansiPath || ansiPath->empty()) return nullptr;
   // As data: the strings are the same whatever processor the file is for, and none of its code runs.
-  LibraryOwner library(LoadLibraryExA(ansiPath->c_str(), nullptr,
-                                      LOAD_LIBRARY_AS_DATAFILE | LOAD_LIBRARY_AS_IMAGE_RESOURCE));
+  LibraryOwner library(
+      LoadLibraryExA(ansiPath->c_str(), nullptr, LOAD_LIBRARY_AS_DATAFILE | LOAD_LIBRARY_AS_IMAGE_RESOURCE));
   return library ? std::make_unique<WindowsResourceLibrary>(std::move(library)) : nullptr;
 }
 
-Text WindowsStringResources::OwnString(std::uint16_t identifier) { return StringOf(module_, identifier); }
+Text WindowsStringResources::OwnString(std::uint16_t identifier) {
+  return StringOf(module_, identifier);
+}
 
 }  // namespace tarnwick

@@ -1,0 +1,249 @@
+#include "hosting/Connection.h"
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <netinet/tcp.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <array>
+#include <cerrno>
+#include <charconv>
+#include <chrono>
+#include <cstring>
+
+namespace tarnwick::hosting {
+namespace {
+
+using Kind = Fault::Kind;
+
+constexpr std::size_t kBlock = 64 * 1024;
+constexpr std::uint64_t kLongestHead = 64 * 1024;
+constexpr int kPatience = 30'000;  // milliseconds without a byte
+constexpr int kForEver = -1;
+
+// How long a closed connection waits for its client to have read the answer, and how much it still takes from
+// it: closing with unread bytes would reset the connection and lose the answer.
+constexpr int kLingerPatience = 1'000;
+constexpr std::uint64_t kLingerBytes = std::uint64_t{8} << 20;
+
+constexpr std::string_view kHeadTooLong =
+    "HTTP/1.1 431 Request Header Fields Too Large\r\nConnection: close\r\nContent-Length: 0\r\n\r\n";
+constexpr std::string_view kLengthName = "\r\nContent-Length: ";
+
+std::uint64_t AnnouncedLength(std::string_view head) {
+  std::uint64_t length = 0;
+  if (const std::size_t at = head.find(kLengthName); at != std::string_view::npos)
+    std::from_chars(head.data() + at + kLengthName.size(), head.data() + head.size(), length);
+  return length;
+}
+
+void ReplaceLength(std::string& head, std::uint64_t length) {
+  const std::size_t at = head.find(kLengthName);
+  if (at == std::string::npos) return;
+  const std::size_t digits = at + kLengthName.size();
+  head.replace(digits, head.find("\r\n", digits) - digits, std::to_string(length));
+}
+
+void AddressOf(const sockaddr_storage& address, std::string& ip, int& port) {
+  std::array<char, INET6_ADDRSTRLEN> text{};
+  if (address.ss_family == AF_INET) {
+    sockaddr_in four{};
+    std::memcpy(&four, &address, sizeof four);
+    inet_ntop(AF_INET, &four.sin_addr, text.data(), text.size());
+    port = ntohs(four.sin_port);
+  } else if (address.ss_family == AF_INET6) {
+    sockaddr_in6 six{};
+    std::memcpy(&six, &address, sizeof six);
+    inet_ntop(AF_INET6, &six.sin6_addr, text.data(), text.size());
+    port = ntohs(six.sin6_port);
+  }
+  ip = text.data();
+}
+
+}  // namespace
+
+Connection::Connection(int socket, int stopEvent) : socket_(socket), stopEvent_(stopEvent) {
+  // Head and body are sent apart: without this the second one waits for the client's late acknowledgement.
+  const int on = 1;
+  setsockopt(socket_, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
+}
+
+Connection::~Connection() {
+  if (end_ == End::kReset) {
+    const linger hard{1, 0};
+    setsockopt(socket_, SOL_SOCKET, SO_LINGER, &hard, sizeof hard);
+  } else if (end_ != End::kLost) {
+    shutdown(socket_, SHUT_WR);
+    const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(kLingerPatience);
+    std::uint64_t taken = 0;
+    buffer_.resize(kBlock);
+    while (taken < kLingerBytes && std::chrono::steady_clock::now() < deadline &&
+           Wait(POLLIN, kLingerPatience)) {
+      const ssize_t got = recv(socket_, buffer_.data(), buffer_.size(), MSG_DONTWAIT);
+      if (got <= 0) break;
+      taken += static_cast<std::uint64_t>(got);
+    }
+  }
+  close(socket_);
+}
+
+bool Connection::AwaitRequest(int milliseconds) {
+  faults_.clear();
+  isHeadRead_ = isHeadSent_ = false;
+  readBytes_ = sentBytes_ = 0;
+  status_ = 0;
+  bodyLimit_.reset();
+  if (IsOver()) return false;
+  return position_ < buffer_.size() || (Wait(POLLIN, milliseconds) && Fill());
+}
+
+void Connection::Show(const std::vector<Fault>& faults) {
+  faults_.insert(faults_.end(), faults.begin(), faults.end());
+  if (Shown(Kind::kRefuse)) end_ = End::kClosed;
+  if (Shown(Kind::kResetRequest)) end_ = End::kReset;
+}
+
+ssize_t Connection::read(char* bytes, size_t size) {
+  if (IsOver()) return -1;
+  if (position_ == buffer_.size() && !(Wait(POLLIN, kPatience) && Fill())) return IsOver() ? -1 : 0;
+  const std::size_t got = std::min(size, buffer_.size() - position_);
+  std::memcpy(bytes, buffer_.data() + position_, got);
+  position_ += got;
+  readBytes_ += got;
+  if (!isHeadRead_ && readBytes_ > kLongestHead) {
+    SendAtOnce(kHeadTooLong);
+    status_ = 431;
+    end_ = End::kClosed;
+    return -1;
+  }
+  return static_cast<ssize_t>(got);
+}
+
+ssize_t Connection::write(const char* bytes, size_t size) {
+  const std::string_view text(bytes, size);
+  if (IsOver()) return -1;
+  // The library sends the head in one piece, after an interim "100 Continue" where the client asked for it.
+  bool isSent = false;
+  if (isHeadSent_)
+    isSent = SendBody(text);
+  else if (text.starts_with("HTTP/1.1 100"))
+    isSent = Send(text);
+  else
+    isSent = SendHead(text);
+  return isSent ? static_cast<ssize_t>(size) : -1;
+}
+
+void Connection::get_remote_ip_and_port(std::string& ip, int& port) const {
+  sockaddr_storage address{};
+  socklen_t size = sizeof address;
+  if (getpeername(socket_, reinterpret_cast<sockaddr*>(&address), &size) == 0) AddressOf(address, ip, port);
+}
+
+void Connection::get_local_ip_and_port(std::string& ip, int& port) const {
+  sockaddr_storage address{};
+  socklen_t size = sizeof address;
+  if (getsockname(socket_, reinterpret_cast<sockaddr*>(&address), &size) == 0) AddressOf(address, ip, port);
+}
+
+// Waits until the socket is ready (a lost connection is too). False after the time or when the server stops.
+bool Connection::Wait(short events, int milliseconds) {
+  std::array<pollfd, 2> watched{pollfd{socket_, events, 0}, pollfd{stopEvent_, POLLIN, 0}};
+  const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(milliseconds);
+  int ready = 0;
+  int left = milliseconds;
+  do {
+    ready = poll(watched.data(), watched.size(), left);
+    if (milliseconds >= 0)
+      left = static_cast<int>(std::max<std::int64_t>(0, std::chrono::duration_cast<std::chrono::milliseconds>(
+                                                            deadline - std::chrono::steady_clock::now())
+                                                            .count()));
+  } while (ready < 0 && errno == EINTR);
+  if (watched[1].revents != 0) {
+    end_ = End::kLost;
+    return false;
+  }
+  return ready > 0;
+}
+
+bool Connection::Fill() {
+  buffer_.resize(kBlock);
+  position_ = 0;
+  const ssize_t got = recv(socket_, buffer_.data(), buffer_.size(), MSG_DONTWAIT);
+  buffer_.resize(got > 0 ? static_cast<std::size_t>(got) : 0);
+  if (got < 0 && errno != EAGAIN) end_ = End::kLost;
+  return got > 0;
+}
+
+bool Connection::SendHead(std::string_view head) {
+  isHeadSent_ = true;
+  if (const Fault* stall = Shown(Kind::kStall)) {
+    // Only the client's end shows on a socket from which nothing is expected.
+    const int delay = stall->amount ? static_cast<int>(*stall->amount * 1000) : kForEver;
+    if (Wait(POLLRDHUP, delay) || IsOver()) {
+      if (!IsOver()) end_ = End::kClosed;
+      return false;
+    }
+  }
+  constexpr std::size_t kStatusAt = std::string_view("HTTP/1.1 ").size();
+  if (head.size() > kStatusAt) std::from_chars(head.data() + kStatusAt, head.data() + head.size(), status_);
+
+  const std::uint64_t length = AnnouncedLength(head);
+  if (const Fault* cut = Shown(Kind::kCut)) bodyLimit_ = cut->amount.value_or(length / 2);
+  if (Shown(Kind::kResetBody)) bodyLimit_ = length / 2;
+  if (Shown(Kind::kResetHead)) {
+    Send(head.substr(0, head.size() / 2));
+    end_ = End::kReset;
+    return false;
+  }
+  std::string sent(head);
+  if (const Fault* lie = Shown(Kind::kLength)) ReplaceLength(sent, *lie->amount);
+  return Send(sent) && SendBody({});
+}
+
+bool Connection::SendBody(std::string_view body) {
+  const bool ends = bodyLimit_ && body.size() >= *bodyLimit_ - sentBytes_;
+  if (ends) body = body.substr(0, *bodyLimit_ - sentBytes_);
+  if (!Send(body)) return false;
+  sentBytes_ += body.size();
+  if (ends) end_ = Shown(Kind::kResetBody) ? End::kReset : End::kClosed;
+  return !ends;
+}
+
+bool Connection::Send(std::string_view bytes) {
+  const Fault* drip = Shown(Kind::kDrip);
+  if (!drip) return SendAtOnce(bytes);
+  for (std::size_t i = 0; i < bytes.size(); ++i) {
+    if (Wait(POLLRDHUP, static_cast<int>(*drip->amount)) && !IsOver()) end_ = End::kClosed;
+    if (IsOver() || !SendAtOnce(bytes.substr(i, 1))) return false;
+  }
+  return true;
+}
+
+bool Connection::SendAtOnce(std::string_view bytes) {
+  while (!bytes.empty()) {
+    const ssize_t sent = send(socket_, bytes.data(), bytes.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
+    if (sent > 0) {
+      bytes.remove_prefix(static_cast<std::size_t>(sent));
+    } else if (errno == EAGAIN) {
+      if (!Wait(POLLOUT, kPatience)) {
+        end_ = End::kLost;
+        return false;
+      }
+    } else if (errno != EINTR) {
+      end_ = End::kLost;
+      return false;
+    }
+  }
+  return true;
+}
+
+const Fault* Connection::Shown(Kind kind) const {
+  const auto found =
+      std::find_if(faults_.begin(), faults_.end(), [&](const Fault& fault) { return fault.kind == kind; });
+  return found == faults_.end() ? nullptr : &*found;
+}
+
+}  // namespace tarnwick::hosting

@@ -1,0 +1,44 @@
+// What the server is started with.
+#pragma once
+
+#include <cstdint>
+#include <filesystem>
+#include <stdexcept>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "hosting/Faults.h"
+
+namespace tarnwick::hosting {
+
+struct Options {
+  std::string host = "127.0.0.1";
+  int port = 0;  // 0: any free one
+  std::filesystem::path data;
+
+  std::string seedUser;  // empty: none
+  std::string seedPassword;
+  std::int64_t seedProduct = 0;
+  std::filesystem::path seedPictures;  // empty: none
+
+  std::int64_t softLimit = 900;                    // of accounts; only told
+  std::int64_t hardLimit = 1000;                   // of accounts
+  std::uint64_t quota = std::uint64_t{100} << 20;  // of each account, in bytes
+  std::int64_t expireDays = 365;
+  std::vector<Fault> faults;
+
+  bool help = false;
+};
+
+class OptionError : public std::runtime_error {
+  using std::runtime_error::runtime_error;
+};
+
+// Reads the arguments after the program's name. Throws OptionError with a sentence for the user.
+Options ParseOptions(const std::vector<std::string_view>& arguments);
+
+// The text of --help.
+std::string_view HelpText();
+
+}  // namespace tarnwick::hosting

@@ -1,0 +1,60 @@
+#include <pthread.h>
+#include <signal.h>
+
+#include <cstdio>
+#include <exception>
+#include <string>
+#include <string_view>
+#include <vector>
+
+#include "hosting/Options.h"
+#include "hosting/Server.h"
+
+namespace {
+
+namespace hosting = tarnwick::hosting;
+
+constexpr int kFailed = 1;
+constexpr int kBadOptions = 2;
+
+void PrintLine(const std::string& line) {
+  std::fputs((line + "\n").c_str(), stdout);
+  std::fflush(stdout);
+}
+
+int Serve(const hosting::Options& options) {
+  // Blocked before any thread starts, so that none but this one takes them.
+  sigset_t ends;
+  sigemptyset(&ends);
+  sigaddset(&ends, SIGINT);
+  sigaddset(&ends, SIGTERM);
+  pthread_sigmask(SIG_BLOCK, &ends, nullptr);
+
+  hosting::Server server(options, PrintLine);
+  PrintLine("listening on " + options.host + ":" + std::to_string(server.Listen()));
+  server.Start();
+  int signal = 0;
+  sigwait(&ends, &signal);
+  server.Stop();
+  return 0;
+}
+
+}  // namespace
+
+int main(int count, char** arguments) {
+  try {
+    const hosting::Options options =
+        hosting::ParseOptions(std::vector<std::string_view>(arguments + 1, arguments + count));
+    if (options.help) {
+      std::fputs(std::string(hosting::HelpText()).c_str(), stdout);
+      return 0;
+    }
+    return Serve(options);
+  } catch (const hosting::OptionError& error) {
+    std::fprintf(stderr, "tarnwick-hosting: %s (see --help)\n", error.what());
+    return kBadOptions;
+  } catch (const std::exception& error) {
+    std::fprintf(stderr, "tarnwick-hosting: %s\n", error.what());
+    return kFailed;
+  }
+}

@@ -1,0 +1,286 @@
+#include <regex>
+
+#include "HostingFixture.h"
+
+namespace tarnwick::hosting {
+namespace {
+
+constexpr const char* kDate = R"(\d{1,2}/\d{1,2}/\d{4} (1[0-2]|[1-9]):\d\d:\d\d [AP]M)";
+constexpr const char* kError = "(error)";
+
+class ServicePageTest : public HostingTest {};
+
+TEST_F(ServicePageTest, EveryActionAnswersKnownAndUnknownUsers) {
+  ASSERT_EQ(Client().Upload("a.jpg", "12345"), kStored);
+  struct Row {
+    const char* action;
+    Fields parameters;  // "*" stands for the user
+    const char* variable;
+    const char* known;  // regular expressions
+    const char* unknown;
+  };
+  const Row rows[] = {
+      {"PathFromRoot",
+       {{"ProductID", "1"}, {"Username", "*"}},
+       "PathFromRoot",
+       "/users/.*@mail-example-com",
+       kError},
+      {"FileUpload",
+       {{"FileName", "new one.jpg"}, {"FileSize", "5"}, {"Username", "*"}, {"ProductID", "1"}},
+       "FileURL",
+       "http://127\\.0\\.0\\.1:\\d+/users/pat\\.lee\\+x@mail-example-com/new one\\.jpg",
+       kError},
+      {"GetMaxUserQuota", {{"ProductID", "1"}, {"UserName", "*"}}, "MaxUserQuota", "104857600", kError},
+      {"GetTotalUsedQuota", {{"ProductID", "1"}, {"UserName", "*"}}, "UsedQuota", "5", kError},
+      {"CanUploadFile", {{"UserName", "*"}, {"ProductID", "1"}}, "CanUploadFile", "1001", kError},
+      {"ListFiles", {{"Username", "*"}, {"ProductID", "1"}}, "FileDate", kDate, kError},
+      {"GetMeKey", {{"UserName", "*"}, {"ProductID", "1"}}, "GetKey", kPassword, kError},
+      {"ValidUserID", {{"UserName", "*"}, {"ProductID", "1"}}, "ValidUser", "TRUE", "FALSE"},
+      {"SendMeMail", {{"UserName", "*"}, {"ProductID", "1"}, {"NewUser", "0"}}, "SendMail", "1001", "1002"},
+      {"GetMGUIDForUser", {{"ProductID", "1"}, {"UserName", "*"}}, "MGUID", "[0-9A-F-]{36}", kError},
+      {"GetCreationDateForMGUID", {{"ProductID", "1"}, {"UserName", "*"}}, "CreationDate", kDate, kError},
+      {"HasUserExpired", {{"UserName", "*"}}, "HasUserExpired", "1001", kError},
+      {"PremiumAccountSize", {{"UserName", "*"}}, "PremiumAccountSize", "104857600", kError},
+      {"ReRegister",
+       {{"ProductID", "1"}, {"Username", "*"}, {"Password", kPassword}},
+       "MGUID",
+       "[0-9A-F-]{36}",
+       ""},
+      {"RenameFile",
+       {{"Username", "*"}, {"ProductID", "1"}, {"OldFileName", "a.jpg"}, {"NewFileName", "b.jpg"}},
+       "lRenameFileStatus",
+       "1001",
+       kError},
+      {"DeleteFile",
+       {{"Username", "*"}, {"ProductID", "1"}, {"FileToBeDeleted", "b.jpg"}},
+       "DeleteStatus",
+       "TRUE",
+       kError},
+      {"UserValidate",
+       {{"UserName", Enciphered(kUser)},
+        {"Password", Enciphered(kPassword)},
+        {"ProductID", "1"},
+        {"MGUID", "no"}},
+       "UserAuthenticationStatus",
+       "TRUE",
+       nullptr},
+      {"EstablishConnection", {}, "EstablishConnection", "TRUE", nullptr},
+      {"HardLimit", {{"ProductID", "1"}}, "HardLimit", "1000", nullptr},
+      {"SoftLimit", {{"ProductID", "1"}}, "SoftLimit", "900", nullptr},
+      {"GetCurrentDateTimeFromServer", {}, "CurrentDate", kDate, nullptr},
+      {"DeleteUser",
+       {{"UserName", "*"}, {"ProductID", "1"}, {"Password", "wrong"}},
+       "DeleteUser",
+       "1002",
+       "1002"},
+  };
+  for (const Row& row : rows) {
+    const auto answerFor = [&](const char* user) {
+      Fields parameters = row.parameters;
+      for (auto& [name, value] : parameters)
+        if (value == "*") value = user;
+      return Client().AskFor(row.variable, row.action, parameters);
+    };
+    const std::string known = answerFor(kUser);
+    EXPECT_TRUE(std::regex_match(known, std::regex(row.known))) << row.action << ": " << known;
+    if (row.unknown) {
+      EXPECT_EQ(answerFor("nobody@x.y"), row.unknown) << row.action;
+    }
+    // Without its last parameter each request is a malformed one.
+    if (row.parameters.size() > 1 && std::string_view(row.parameters.back().first) != "ProductID" &&
+        std::string_view(row.parameters.back().first) != "MGUID") {
+      Fields fewer = row.parameters;
+      for (auto& [name, value] : fewer)
+        if (value == "*") value = kUser;
+      fewer.pop_back();
+      EXPECT_EQ(Client().AskFor(row.variable, row.action, fewer), kError) << row.action;
+    }
+  }
+}
+
+TEST_F(ServicePageTest, DetailsAreFoundByMguidAndUserTogether) {
+  const std::string mguid =
+      Client().AskFor("MGUID", "GetMGUIDForUser", {{"ProductID", "1"}, {"UserName", kUser}});
+  const Reply details =
+      Client().Ask("BVAccountDetails", {{"ProductID", "1"}, {"MGUID", mguid}, {"Username", kUser}});
+  EXPECT_EQ(details.First(u"EmailAddress"), TextFromUtf8(kUser).value());
+  EXPECT_EQ(details.First(u"ExpiryPeriod"), u"365");
+  EXPECT_EQ(details.First(u"UsedQuota"), u"0");
+  EXPECT_EQ(details.First(u"Quota"), u"104857600");
+  EXPECT_EQ(details.First(u"StartDate").back(), u'M');
+  EXPECT_EQ(details.First(u"CurrentDate").back(), u'M');
+  EXPECT_FALSE(details.First(u"ServiceLevelName").empty());
+  for (const Fields& wrong :
+       {Fields{{"MGUID", mguid}, {"Username", "x@y.z"}}, {{"MGUID", "?"}, {"Username", kUser}}})
+    EXPECT_EQ(Client().Ask("BVAccountDetails", wrong).ErrorOccured(), 1);
+}
+
+TEST_F(ServicePageTest, LogOnAndPasswordChangeCompareWithoutTheCharactersThatTheCipherDrops) {
+  const auto validate = [&](const char* user, const char* password) {
+    return Client().AskFor(
+        "UserAuthenticationStatus", "UserValidate",
+        {{"UserName", Enciphered(user)}, {"Password", Enciphered(password)}, {"ProductID", "1"}});
+  };
+  EXPECT_EQ(validate(kUser, "pa55wrd"), "TRUE");
+  EXPECT_EQ(validate("pat.lee x@mail.example.com", kPassword), "TRUE");
+  EXPECT_EQ(validate(kUser, "pa55wOrd"), "FALSE");
+  EXPECT_EQ(validate(kUser, ""), "FALSE");
+  EXPECT_EQ(validate("pat.lee@mail.example.com", kPassword), "FALSE");
+  EXPECT_EQ(Client().Upload("a.jpg", "1", kUser, "pa55wrd"), kRefused);
+
+  const auto change = [&](const char* user, const char* password, const char* newPassword) {
+    return Client().AskFor("UpdatePassword", "ManagePassword",
+                           {{"Username", user},
+                            {"ProductID", "1"},
+                            {"Password", Enciphered(password)},
+                            {"NewPassword", Enciphered(newPassword)}});
+  };
+  EXPECT_EQ(change(kUser, "wrong", "new"), "1002");
+  EXPECT_EQ(change("nobody@x.y", kPassword, "new"), "1002");
+  EXPECT_EQ(change(kUser, kPassword, "!?"), "1002");
+  EXPECT_EQ(change(kUser, kPassword, "ne w!pass"), "1001");
+  EXPECT_EQ(validate(kUser, kPassword), "FALSE");
+  EXPECT_EQ(validate(kUser, "newpass"), "TRUE");
+  EXPECT_EQ(Client().Upload("a.jpg", "1", kUser, "ne w!pass"), kRefused);
+  EXPECT_EQ(Client().Upload("a.jpg", "1", kUser, "newpass"), kStored);
+}
+
+TEST_F(ServicePageTest, AProductNumberOfTheAccountMustFit) {
+  End();
+  Begin([&](Options& options) {
+    options.data /= "other";
+    options.seedProduct = 7;
+  });
+  const auto validate = [&](const char* product) {
+    return Client().AskFor(
+        "UserAuthenticationStatus", "UserValidate",
+        {{"UserName", Enciphered(kUser)}, {"Password", Enciphered(kPassword)}, {"ProductID", product}});
+  };
+  EXPECT_EQ(validate("7"), "TRUE");
+  EXPECT_EQ(validate("8"), "FALSE");
+}
+
+TEST_F(ServicePageTest, AccountsAreAddedUpToTheLimitAndRemovedWithTheirFiles) {
+  End();
+  Begin([](Options& options) { options.hardLimit = 3; });
+  const auto add = [&](const char* user) {
+    return Client().Ask("AddUser", {{"UserName", user}, {"ProductID", "1"}, {"MGUID", "{0}"}});
+  };
+  const auto addCode = [&](const char* user) { return Utf8FromText(add(user).First(u"AddUser")); };
+  const char* user = "new.one@b.c";
+  const Reply added = add(user);
+  ASSERT_EQ(added.First(u"AddUser"), u"1001");
+  EXPECT_EQ(added.First(u"UserFolder"), u"new.one@b-c");
+  EXPECT_FALSE(added.First(u"BasePath").empty());
+  const std::string password = Utf8FromText(added.First(u"Password"));
+  EXPECT_TRUE(std::regex_match(password, std::regex("[A-Za-z0-9]{8,}")));
+  EXPECT_EQ(Client().AskFor("MGUID", "GetMGUIDForUser", {{"ProductID", "1"}, {"UserName", user}}),
+            Utf8FromText(added.First(u"MGUID")));
+
+  for (const char* taken : {user, "new.one@b-c", "new.one!@b.c"}) EXPECT_EQ(addCode(taken), "1003") << taken;
+  for (const char* refused : {"", ".", "..", "a/b", "a\\b", "a\tb", "\xC3\xA4\xC3\xB6"})
+    EXPECT_EQ(addCode(refused), "1004") << refused;
+  EXPECT_EQ(addCode("third@b.c"), "1001");
+  EXPECT_EQ(addCode("fourth@b.c"), "1011");
+
+  // Without a folder: an empty listing, and file pages that say so.
+  EXPECT_TRUE(Client().CheckedListing(user).empty());
+  EXPECT_EQ(Client().Upload("a.jpg", "1", user, password), kFolderState);
+  const auto folderPage = [&](const char* page, const char* folder, const char* action,
+                              const std::string& key) {
+    return Client().Form(page, {{"Folder", folder}, {"Action", action}}, user, key);
+  };
+  EXPECT_EQ(folderPage("DeleteFolderAcceptor.asp", "new.one@b-c", "6", password), kFolderState);
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", kFolder, "5", password), kRefused);
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", "new.one@b-c", "5", "wrong"), kRefused);
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", "new.one@b-c", "5", password), kStored);
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", "new.one@b-c", "5", password), kFolderState);
+  EXPECT_EQ(Client().Upload("a.jpg", "1", user, password), kStored);
+  EXPECT_EQ(Client().CheckedListing(user).size(), 1U);
+  EXPECT_EQ(folderPage("DeleteFolderAcceptor.asp", "new.one@b-c", "6", password), kStored);
+  EXPECT_TRUE(Client().CheckedListing(user).empty());
+  EXPECT_FALSE(std::filesystem::exists(Data() / "users" / "new.one@b-c"));
+
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", "new.one@b-c", "5", password), kStored);
+  EXPECT_EQ(Client().Upload("b.jpg", "1", user, password), kStored);
+  EXPECT_EQ(Client().AskFor("DeleteUser", "DeleteUser",
+                            {{"UserName", user}, {"ProductID", "1"}, {"Password", password}}),
+            "1001");
+  EXPECT_FALSE(std::filesystem::exists(Data() / "users" / "new.one@b-c"));
+  EXPECT_EQ(Client().AskFor("ValidUser", "ValidUserID", {{"UserName", user}, {"ProductID", "1"}}), "FALSE");
+  EXPECT_EQ(addCode(user), "1001");
+}
+
+TEST_F(ServicePageTest, KeyMailsArriveInTheOutboxAndNoKeyIsPrinted) {
+  for (const char* isNew : {"1", "0"})
+    EXPECT_EQ(Client().AskFor("SendMail", "SendMeMail",
+                              {{"UserName", kUser}, {"ProductID", "1"}, {"NewUser", isNew}}),
+              "1001");
+  Client().AskFor("GetKey", "GetMeKey", {{"UserName", kUser}, {"ProductID", "1"}});
+  Client().AskFor("MGUID", "ReRegister", {{"ProductID", "1"}, {"Username", kUser}, {"Password", kPassword}});
+  int mails = 0;
+  for (const auto& entry : std::filesystem::directory_iterator(Data() / "outbox")) {
+    const std::string mail = ReadFile(entry.path());
+    EXPECT_NE(mail.find(std::string("To: ") + kUser), std::string::npos);
+    EXPECT_NE(mail.find(kPassword), std::string::npos);
+    ++mails;
+  }
+  EXPECT_EQ(mails, 2);
+  End();
+  EXPECT_EQ(LogText().find("pa55"), std::string::npos);
+  EXPECT_NE(LogText().find(std::string("SendMeMail user=") + kUser + " status=200 result=1001"),
+            std::string::npos)
+      << LogText();
+}
+
+TEST_F(ServicePageTest, QuotaAndExpiryAreTold) {
+  const auto canUpload = [&] {
+    return Client().AskFor("CanUploadFile", "CanUploadFile", {{"UserName", kUser}, {"ProductID", "1"}});
+  };
+  End();
+  Begin([](Options& options) { options.quota = 10; });
+  EXPECT_EQ(Client().Upload("a.jpg", "12345678901"), kName);
+  EXPECT_EQ(Client().Upload("a.jpg", "123456"), kStored);
+  EXPECT_EQ(Client().Upload("b.jpg", "12345"), kName);
+  EXPECT_EQ(canUpload(), "1001");
+  EXPECT_EQ(Client().Upload("a.jpg", "1234567890"), kStored);  // a replaced file gives its room back
+  EXPECT_EQ(canUpload(), "1002");
+  EXPECT_EQ(Client().CheckedListing().size(), 1U);
+  EXPECT_TRUE(std::filesystem::is_empty(Data() / "work"));
+  End();
+  Begin([](Options& options) { options.expireDays = 0; });
+  EXPECT_EQ(canUpload(), "1004");
+  EXPECT_EQ(Client().AskFor("HasUserExpired", "HasUserExpired", {{"UserName", kUser}}), "1002");
+}
+
+TEST_F(ServicePageTest, FileRequestsFinishOrRepeatWhatAnAcceptorPageBegan) {
+  const auto rename = [&](const char* from, const char* to) {
+    return Client().AskFor(
+        "lRenameFileStatus", "RenameFile",
+        {{"Username", kUser}, {"ProductID", "1"}, {"OldFileName", from}, {"NewFileName", to}});
+  };
+  const auto remove = [&](const char* name) {
+    return Client().AskFor("DeleteStatus", "DeleteFile",
+                           {{"Username", kUser}, {"ProductID", "1"}, {"FileToBeDeleted", name}});
+  };
+  ASSERT_EQ(Client().Upload("a.jpg", "1"), kStored);
+  ASSERT_EQ(Client().Upload("x.jpg", "2"), kStored);
+  ASSERT_EQ(Client().Rename("a.jpg", "b.jpg"), kStored);
+  EXPECT_EQ(rename("a.jpg", "b.jpg"), "1001");    // done by the page
+  EXPECT_EQ(rename("b.jpg", "c d.jpg"), "1001");  // moved by the request
+  EXPECT_NE(rename("gone.jpg", "new.jpg"), "1001");
+  EXPECT_NE(rename("c d.jpg", "x.jpg"), "1001");
+  EXPECT_NE(rename("c d.jpg", "../x.jpg"), "1001");
+  EXPECT_EQ(Client().CheckedListing(),
+            (std::map<std::string, std::string>{{"c d.jpg", "1"}, {"x.jpg", "2"}}));
+
+  ASSERT_EQ(Client().Delete("x.jpg"), kStored);
+  EXPECT_EQ(remove("x.jpg"), "TRUE");
+  EXPECT_EQ(remove("c d.jpg"), "TRUE");
+  EXPECT_EQ(remove("c d.jpg"), "FALSE");
+  EXPECT_EQ(remove("never.jpg"), "FALSE");
+  EXPECT_TRUE(Client().CheckedListing().empty());
+}
+
+}  // namespace
+}  // namespace tarnwick::hosting

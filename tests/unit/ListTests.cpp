@@ -1,0 +1,116 @@
+#include <gtest/gtest.h>
+
+#include "fakes/FakePlatform.h"
+#include "support/KeyedList.h"
+#include "support/TransferLists.h"
+
+namespace tarnwick {
+namespace {
+
+TEST(KeyedList, KeepsOrderAndUniqueKeys) {
+  KeyedList<int> list;
+  list.Add(1, u"one");
+  list.Add(3, u"three");
+  list.Insert(2, 2);
+  list.Insert(4, 4);
+  for (int i = 1; i <= 4; ++i) EXPECT_EQ(list.At(static_cast<std::size_t>(i)), i);
+  EXPECT_EQ(list.PositionOf(u"three"), 3U);
+  for (const TextView key : {u"Three", u"", u"none"}) EXPECT_EQ(list.PositionOf(key), 0U);
+
+  const auto errorOf = [](auto&& call) {
+    try {
+      call();
+    } catch (const RuntimeError& failure) {
+      return failure.Number();
+    }
+    return 0;
+  };
+  EXPECT_EQ(errorOf([&] { list.Add(5, u"one"); }), error::kDuplicateKey);
+  EXPECT_EQ(errorOf([&] { list.Insert(1, 5, u"one"); }), error::kDuplicateKey);
+  for (const std::size_t position : {std::size_t{0}, std::size_t{6}}) {
+    EXPECT_EQ(errorOf([&] { list.Insert(position, 5, u"new"); }), error::kSubscriptOutOfRange);
+    EXPECT_EQ(errorOf([&] { list.At(position); }), error::kSubscriptOutOfRange);
+    EXPECT_EQ(errorOf([&] { list.Remove(position); }), error::kSubscriptOutOfRange);
+  }
+  EXPECT_EQ(list.Count(), 4U);
+
+  // What goes frees its key.
+  list.Remove(1);
+  list.Add(5, u"one");
+  EXPECT_EQ(list.PositionOf(u"one"), 4U);
+  list.Clear();
+  EXPECT_TRUE(list.IsEmpty());
+  list.Add(6, u"one");
+  EXPECT_EQ(list.Count(), 1U);
+}
+
+class TransferListsTest : public testing::Test {
+ protected:
+  static std::shared_ptr<CUpload> Record(TextView name) {
+    auto record = std::make_shared<CUpload>();
+    record->FileName = name;
+    return record;
+  }
+  static void Fill(FileList& list, std::initializer_list<TextView> names) {
+    list.Clear();
+    for (const TextView name : names) list.Add(Record(name));
+  }
+  static std::string Names(const FileList& list) {
+    std::string names;
+    for (std::size_t i = 1; i <= list.Count(); ++i) names += Utf8FromText(list.At(i)->FileName) + ",";
+    return names;
+  }
+
+  FakePlatform fake;
+  FileList& all = fake.apartment.allFiles;
+  FileList& shown = fake.apartment.shownFiles;
+};
+
+TEST_F(TransferListsTest, RemovesTheFirstOfEach) {
+  Fill(all, {u"x", u" a ", u"a", u"A"});
+  Fill(shown, {u"a", u"a"});
+  RemoveFromTransferLists(fake.apartment, u"http://h/users/u/ a ");
+  EXPECT_EQ(Names(all), "x,a,A,");
+  EXPECT_EQ(Names(shown), "a,");
+  // Two records looked at, one removed; one removed.
+  EXPECT_EQ(fake.pump.yields, 4);
+  // A name that only the shown-files list has, or that differs in letter case, stays.
+  Fill(shown, {u"only"});
+  for (const TextView name : {u"only", u"X", u"x/", u""}) RemoveFromTransferLists(fake.apartment, name);
+  EXPECT_EQ(Names(all) + Names(shown), "x,a,A,only,");
+  RemoveFromTransferLists(fake.apartment, u"x");
+  EXPECT_EQ(Names(all) + Names(shown), "a,A,only,");
+}
+
+TEST_F(TransferListsTest, SurvivesListsThatChangeMeanwhile) {
+  // At each possible moment, what goes is the file of the name or nothing, never a neighbour.
+  const auto runWith = [&](int moment, const std::function<void()>& change) {
+    Fill(all, {u"x", u"y", u"a", u"z"});
+    Fill(shown, {u"x", u"a", u"z"});
+    fake.pump.yields = 0;
+    fake.pump.onYield = [&, moment] {
+      if (fake.pump.yields == moment) change();
+    };
+    RemoveFromTransferLists(fake.apartment, u"a");
+  };
+  for (int moment = 1; moment <= 5; ++moment) {
+    runWith(moment, [&] {
+      all.Clear();
+      shown.Clear();
+    });
+    EXPECT_EQ(Names(all) + Names(shown), "") << moment;
+    // A file that moves to a place that was passed is not found.
+    runWith(moment, [&] { all.Remove(1); });
+    EXPECT_EQ(Names(all), moment == 2 ? "y,a,z," : "y,z,") << moment;
+    runWith(moment, [&] {
+      all.Insert(1, Record(u"new"));
+      shown.Insert(1, Record(u"new"));
+    });
+    for (const char* kept : {"new,", "x,", "z,"})
+      EXPECT_TRUE(Names(all).find(kept) != std::string::npos && Names(shown).find(kept) != std::string::npos)
+          << moment;
+  }
+}
+
+}  // namespace
+}  // namespace tarnwick

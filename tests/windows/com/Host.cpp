@@ -1,0 +1,62 @@
+#include "Host.h"
+
+#include <gtest/gtest.h>
+
+#include <cstdio>
+
+namespace tarnwick::test {
+namespace {
+
+std::wstring Variable(const wchar_t* name) {
+  wchar_t value[256] = L"";
+  if (GetEnvironmentVariableW(name, value, 256) == 0) {
+    std::fprintf(stderr, "%ls is not set: these tests are started by scripts/test\n", name);
+    ExitProcess(2);
+  }
+  return value;
+}
+
+}  // namespace
+
+const Server& TheServer() {
+  static const Server server = {Variable(L"TARNWICK_SERVER"), Variable(L"TARNWICK_FAULTY_SERVER"),
+                                Variable(L"TARNWICK_USER"), Variable(L"TARNWICK_PASSWORD"),
+                                Variable(L"TARNWICK_PRODUCT")};
+  return server;
+}
+
+ComPtr<_CFileUpload> LoggedOnClient() {
+  const Server& server = TheServer();
+  ComPtr<_CFileUpload> client = NewClient();
+  if (!client) return {};
+  VARIANT_BOOL done = VARIANT_FALSE;
+  client->ConnectToServer(Bstr(server.name), &done);
+  EXPECT_TRUE(done);
+  client->LogonAs(Bstr(server.product), Bstr(server.user), Bstr(server.password), Bstr(L""), &done);
+  EXPECT_TRUE(done);
+  return client;
+}
+
+VARIANT Get(IDispatch* object, const wchar_t* member, const VARIANT* argument) {
+  VARIANT result;
+  V_VT(&result) = VT_ERROR;
+  std::wstring name = member;
+  LPOLESTR names = name.data();
+  DISPID id = 0;
+  DISPPARAMS arguments = {const_cast<VARIANT*>(argument), nullptr, argument ? 1U : 0U, 0};
+  if (FAILED(object->GetIDsOfNames(IID_NULL, &names, 1, LOCALE_USER_DEFAULT, &id)) ||
+      FAILED(object->Invoke(id, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD | DISPATCH_PROPERTYGET,
+                            &arguments, &result, nullptr, nullptr)))
+    V_VT(&result) = VT_ERROR;
+  return result;
+}
+
+}  // namespace tarnwick::test
+
+int main(int count, char** arguments) {
+  testing::InitGoogleTest(&count, arguments);
+  CoInitialize(nullptr);
+  const int result = RUN_ALL_TESTS();
+  CoUninitialize();
+  return result;
+}

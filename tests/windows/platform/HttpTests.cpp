@@ -1,0 +1,128 @@
+#include "LoopbackServer.h"
+// LoopbackServer.h comes first: see there.
+#include <gtest/gtest.h>
+
+#include "platform/windows/Owner.h"
+#include "platform/windows/WindowsHttpTransport.h"
+
+namespace tarnwick {
+namespace {
+
+using End = LoopbackServer::End;
+
+constexpr std::size_t kBound = 20;
+
+std::optional<HttpAnswer> PostTo(std::uint16_t port, std::string target = "/",
+                                 std::string_view body = "a=1") {
+  // Short time-outs, so that the silent cases end soon.
+  WindowsHttpTransport http(1500, 400);
+  HttpPost post;
+  post.host = u"127.0.0.1";
+  post.port = port;
+  post.target = std::move(target);
+  post.contentType = "application/x-www-form-urlencoded; charset=utf-8";
+  post.body = body;
+  return http.Post(post, kBound);
+}
+
+TEST(WindowsHttpTransport, SendsWhatItWasGivenUnchanged) {
+  // The printable characters, and escapes that a careless client would undo or redo.
+  std::string target = "/a//b/c%20d%zz%2F%25/";
+  for (char character = 0x21; character < 0x7F; ++character)
+    if (character != '\\') target += character;  // which some versions of the system turn round
+  target += "?Request=x&Flag=0&y=%2e?/%41";
+  std::string body("a=1&b=\0\xFF\r\n\r\n", 13);
+  body += std::string(100'000, 'x');
+  LoopbackServer server({{"HTTP/1.1 200 OK\r\nContent-Length: 2\r\n\r\nok"}});
+  const auto answer = PostTo(server.Port(), target, body);
+  ASSERT_TRUE(answer);
+  EXPECT_EQ(answer->status, 200);
+  EXPECT_EQ(answer->body, "ok");
+
+  ASSERT_EQ(server.Requests().size(), 1U);
+  const std::string& request = server.Requests()[0];
+  const std::size_t headEnd = request.find("\r\n\r\n");
+  const std::string head = request.substr(0, headEnd + 2);
+  EXPECT_EQ(head.substr(0, head.find("\r\n")), "POST " + target + " HTTP/1.1");
+  EXPECT_EQ(request.substr(headEnd + 4), body);
+  for (const std::string& line :
+       {"Host: 127.0.0.1:" + std::to_string(server.Port()),
+        std::string("Content-Type: application/x-www-form-urlencoded; charset=utf-8"),
+        "Content-Length: " + std::to_string(body.size()), std::string("Connection: close")})
+    EXPECT_NE(head.find("\r\n" + line + "\r\n"), std::string::npos) << line << " in\n" << head;
+  EXPECT_EQ(head.find("Cookie"), std::string::npos);
+}
+
+TEST(WindowsHttpTransport, CollectsWholeAnswersOnly) {
+  const struct {
+    const char* name;
+    const char* answer;  // after the protocol
+    End end;
+    int status;  // -1 when there is to be no answer
+    const char* body;
+  } kCases[] = {
+      {"empty", " 200 OK\r\nConnection: close\r\nContent-Length: 0\r\n\r\n", End::kSilence, 200, ""},
+      {"chunks",
+       " 200 OK\r\nConnection: close\r\nTransfer-Encoding: "
+       "chunked\r\n\r\n3\r\nabc\r\n2;x=y\r\nde\r\n0\r\n\r\n",
+       End::kSilence, 200, "abcde"},
+      {"until the end", " 200 OK\r\n\r\nabc", End::kClose, 200, "abc"},
+      {"redirect", " 302 Found\r\nLocation: /else\r\nContent-Length: 2\r\n\r\nto", End::kClose, 302, "to"},
+      {"same redirect", " 307 T\r\nLocation: /else\r\nContent-Length: 0\r\n\r\n", End::kClose, 307, ""},
+      {"log-on wanted", " 401 No\r\nWWW-Authenticate: Basic realm=\"x\"\r\nContent-Length: 0\r\n\r\n",
+       End::kClose, 401, ""},
+      {"server error", " 500 Oops\r\nContent-Length: 3\r\n\r\nbad", End::kClose, 500, "bad"},
+      {"just the bound", " 200 OK\r\nContent-Length: 20\r\n\r\n12345678901234567890", End::kClose, 200,
+       "12345678901234567890"},
+      {"just the bound, unannounced", " 200 OK\r\n\r\n12345678901234567890", End::kClose, 200,
+       "12345678901234567890"},
+      {"over the bound", " 200 OK\r\nContent-Length: 21\r\n\r\n", End::kSilence, -1, ""},
+      {"far over the bound", " 200 OK\r\nContent-Length: 99999999999999999999\r\n\r\n", End::kSilence, -1,
+       ""},
+      {"over the bound, unannounced", " 200 OK\r\n\r\n123456789012345678901", End::kClose, -1, ""},
+      {"cut body", " 200 OK\r\nContent-Length: 9\r\n\r\nabc", End::kClose, -1, ""},
+      {"reset in the body", " 200 OK\r\nContent-Length: 9\r\n\r\nabc", End::kReset, -1, ""},
+      {"nothing", "", End::kClose, -1, ""},
+      {"reset", "", End::kReset, -1, ""},
+      {"silence", "", End::kSilence, -1, ""},
+      {"silence in the body", " 200 OK\r\nContent-Length: 9\r\n\r\nabc", End::kSilence, -1, ""},
+  };
+  for (const auto& item : kCases) {
+    SCOPED_TRACE(item.name);
+    LoopbackServer server({{*item.answer ? std::string("HTTP/1.1") + item.answer : "", item.end}});
+    const DWORD begin = GetTickCount();
+    const auto answer = PostTo(server.Port());
+    EXPECT_LT(GetTickCount() - begin, 1500U);
+    EXPECT_EQ(answer ? answer->status : -1, item.status);
+    EXPECT_EQ(answer ? answer->body : "", item.body);
+    // Neither a redirect followed nor a post sent again.
+    EXPECT_EQ(server.Requests().size(), 1U);
+  }
+  EXPECT_EQ(ownedObjects, 0);
+}
+
+// The server ends each connection, although its answers promise to keep them.
+TEST(WindowsHttpTransport, PostsAgainAfterTheServerHasClosed) {
+  const std::string answer =
+      "HTTP/1.1 200 OK\r\nConnection: keep-alive\r\nKeep-Alive: timeout=60\r\nContent-Length: 2\r\n\r\nok";
+  LoopbackServer server({{answer}, {answer, End::kReset}, {answer}});
+  for (int i = 0; i < 3; ++i) {
+    EXPECT_TRUE(PostTo(server.Port())) << i;
+    Sleep(50);
+  }
+  EXPECT_EQ(server.Requests().size(), 3U);
+}
+
+TEST(WindowsHttpTransport, FailsWhenNobodyListens) {
+  std::uint16_t port = 0;
+  {
+    LoopbackServer gone({});
+    port = gone.Port();
+  }
+  const DWORD begin = GetTickCount();
+  EXPECT_FALSE(PostTo(port));
+  EXPECT_LT(GetTickCount() - begin, 3000U);
+}
+
+}  // namespace
+}  // namespace tarnwick

@@ -1,0 +1,323 @@
+// Registry, files, string resources and message pump against the real system.
+#include <gtest/gtest.h>
+
+#include <functional>
+
+#include "platform/windows/AnsiText.h"
+#include "platform/windows/Owner.h"
+#include "platform/windows/WindowsPlatform.h"
+#include "support/CRegistry.h"
+#include "support/RuntimeError.h"
+
+namespace tarnwick {
+namespace {
+
+template <typename Body>
+std::int32_t ErrorOf(Body body) {
+  try {
+    body();
+    return 0;
+  } catch (const RuntimeError& failure) {
+    return failure.Number();
+  }
+}
+
+TEST(AnsiText, ReportsWhatTheCodePageCannotHold) {
+  // Windows-1252, as the test systems have it.
+  EXPECT_EQ(AnsiFromText(u"Gr\u00FC\u20AC"), "Gr\xFC\x80");
+  EXPECT_EQ(TextFromAnsi("Gr\xFC\x80"), u"Gr\u00FC\u20AC");
+  EXPECT_EQ(AnsiFromText(u""), "");
+  EXPECT_FALSE(AnsiFromText(u"\u65E5"));
+  EXPECT_FALSE(AnsiFromText(u"\u0101"));  // would become a plain "a"
+  EXPECT_FALSE(AnsiFromText(TextView(u"a\0b", 3)));
+}
+
+constexpr TextView kKey = u"Software\\Tarnwick platform test";
+
+class RegistryTest : public testing::Test {
+ protected:
+  RegistryTest() {
+    RegCreateKeyExW(HKEY_CURRENT_USER, WideFromText(kKey).c_str(), 0, nullptr, 0, KEY_ALL_ACCESS, nullptr,
+                    &key_, nullptr);
+  }
+  ~RegistryTest() override {
+    RegCloseKey(key_);
+    RegDeleteKeyW(HKEY_CURRENT_USER, WideFromText(kKey).c_str());
+  }
+
+  void Set(const wchar_t* name, DWORD type, const void* data, std::size_t size) {
+    RegSetValueExW(key_, name, 0, type, static_cast<const BYTE*>(data), static_cast<DWORD>(size));
+  }
+  void SetText(const wchar_t* name, const std::wstring& text, bool terminated = true) {
+    Set(name, REG_SZ, text.c_str(), (text.size() + (terminated ? 1 : 0)) * sizeof(wchar_t));
+  }
+
+  HKEY key_ = nullptr;
+  WindowsRegistry registry_;
+};
+
+TEST_F(RegistryTest, QueriesAsTheSystemDoes) {
+  const DWORD number = 42;
+  SetText(L"longest", std::wstring(254, L'x') + L"\u00FC");
+  SetText(L"too long", std::wstring(256, L'x'));
+  SetText(L"open", L"abc", false);
+  SetText(L"", L"default");
+  Set(L"number", REG_DWORD, &number, sizeof number);
+  Set(L"binary", REG_BINARY, "\1\2\3", 3);
+
+  std::unique_ptr<RegistryKey> key;
+  ASSERT_EQ(registry_.Open(kHiveCurrentUser, kKey, key), kRegistrySuccess);
+  const struct {
+    TextView name;
+    DWORD status, type, size;
+  } kCases[] = {{u"longest", 0, REG_SZ, 256},
+                {u"too long", ERROR_MORE_DATA, REG_SZ, 257},
+                {u"", 0, REG_SZ, 8},
+                {u"number", 0, REG_DWORD, 4},
+                {u"binary", 0, REG_BINARY, 3}};
+  for (const auto& item : kCases) {
+    std::uint8_t data[256] = {};
+    std::uint32_t type = 0;
+    std::uint32_t size = 0;
+    EXPECT_EQ(key->Query(item.name, type, data, size), item.status) << Utf8FromText(item.name);
+    EXPECT_EQ(type, item.type) << Utf8FromText(item.name);
+    EXPECT_EQ(size, item.size) << Utf8FromText(item.name);
+  }
+  std::uint8_t data[256] = "????";
+  std::uint32_t type = 0;
+  std::uint32_t size = 0;
+  // The system ends the text; whether it counts the terminator as well depends on its version.
+  EXPECT_EQ(key->Query(u"open", type, data, size), kRegistrySuccess);
+  EXPECT_STREQ(reinterpret_cast<const char*>(data), "abc");
+  for (TextView missing : {u"missing", u"\u65E5"})
+    EXPECT_EQ(key->Query(missing, type, data, size), DWORD{ERROR_FILE_NOT_FOUND});
+
+  CRegistry settings(registry_);
+  settings.setBaseRegKey(kHiveCurrentUser, u"Software");
+  EXPECT_EQ(settings.getRegSetting(u"longest", kKey.substr(9), type = 1), Text(254, u'x') + u"\u00FC");
+  EXPECT_EQ(settings.getRegSetting(u"too long", kKey.substr(9), type = 1), u"");
+  EXPECT_EQ(settings.getRegSetting(u"number", kKey.substr(9), type = 4), u"42");
+}
+
+TEST_F(RegistryTest, DoesNotOpenWhatIsNotThere) {
+  std::unique_ptr<RegistryKey> key;
+  EXPECT_EQ(registry_.Open(kHiveCurrentUser, Text(kKey) + u"\\none", key), DWORD{ERROR_FILE_NOT_FOUND});
+  EXPECT_EQ(registry_.Open(kHiveCurrentUser, u"\u65E5", key), DWORD{ERROR_FILE_NOT_FOUND});
+  EXPECT_NE(registry_.Open(0, kKey, key), kRegistrySuccess);
+  EXPECT_FALSE(key);
+  EXPECT_EQ(registry_.Open(kHiveLocalMachine, u"Software", key), kRegistrySuccess);
+  EXPECT_EQ(ownedObjects, 1);
+  key.reset();
+  EXPECT_EQ(ownedObjects, 0);
+}
+
+class FilesTest : public testing::Test {
+ protected:
+  FilesTest() : folder_(files_.TempPath() + u"tarnwick-\u65E5") { Remove(), files_.MakeFolder(folder_); }
+  ~FilesTest() override { Remove(); }
+
+  Text In(TextView name) const { return folder_ + u"\\" + Text(name); }
+  void Write(TextView name, std::string_view bytes) {
+    HANDLE file =
+        CreateFileW(WideFromText(In(name)).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr);
+    DWORD written = 0;
+    WriteFile(file, bytes.data(), static_cast<DWORD>(bytes.size()), &written, nullptr);
+    CloseHandle(file);
+  }
+  std::string Read(TextView name) {
+    char bytes[100];
+    HANDLE file = CreateFileW(WideFromText(In(name)).c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
+                              OPEN_EXISTING, 0, nullptr);
+    DWORD size = 0;
+    ReadFile(file, bytes, sizeof bytes, &size, nullptr);
+    CloseHandle(file);
+    return {bytes, size};
+  }
+  // All names in the folder, hidden ones included; with `erase` they go.
+  std::size_t Each(bool erase) {
+    WIN32_FIND_DATAW found{};
+    std::size_t count = 0;
+    const FindOwner search(FindFirstFileW(WideFromText(In(u"*")).c_str(), &found));
+    for (BOOL more = search ? TRUE : FALSE; more; more = FindNextFileW(search.Get(), &found)) {
+      const std::wstring path = WideFromText(In(TextFromWide(found.cFileName)));
+      if (found.cFileName[0] == L'.') continue;
+      ++count;
+      if (!erase) continue;
+      SetFileAttributesW(path.c_str(), FILE_ATTRIBUTE_NORMAL);
+      if (!DeleteFileW(path.c_str())) RemoveDirectoryW(path.c_str());
+    }
+    return count;
+  }
+  void Remove() {
+    Each(true);
+    RemoveDirectoryW(WideFromText(folder_).c_str());
+  }
+
+  WindowsFileSystem files_;
+  Text folder_;
+};
+
+TEST_F(FilesTest, TellsLengthTimeAndAttributes) {
+  Write(u"\u65E5.jpg", "12345");
+  const Text path = In(u"\u65E5.jpg");
+  EXPECT_EQ(files_.Length(path), 5U);
+  for (std::uint32_t bits : {attribute::kReadOnly | attribute::kHidden, attribute::kSystem, 0U}) {
+    EXPECT_EQ(ErrorOf([&] { files_.SetAttributes(path, bits | FILE_ATTRIBUTE_TEMPORARY); }), 0);
+    // Not every system keeps the archive bit: it may be set always.
+    EXPECT_EQ(files_.Attributes(path) & ~attribute::kArchive, bits);
+  }
+  HANDLE file = CreateFileW(WideFromText(path).c_str(), GENERIC_WRITE, 0, nullptr, OPEN_EXISTING, 0, nullptr);
+  const SYSTEMTIME noon{2026, 1, 0, 2, 15, 4, 5, 0};
+  SYSTEMTIME utc{};
+  FILETIME time{};
+  TzSpecificLocalTimeToSystemTime(nullptr, &noon, &utc);
+  SystemTimeToFileTime(&utc, &time);
+  SetFileTime(file, nullptr, nullptr, &time);
+  CloseHandle(file);
+  EXPECT_EQ(files_.ModifiedText(path), u"1/2/2026 3:04:05 PM");
+
+  for (const Text& nothing :
+       {In(u"none"), In(u"none\\x"), In(u"*"), folder_, Text(), path + Text(1, u'\0')}) {
+    EXPECT_EQ(ErrorOf([&] { files_.Length(nothing); }), 53) << Utf8FromText(nothing);
+    EXPECT_EQ(ErrorOf([&] { files_.ModifiedText(nothing); }), 53);
+    EXPECT_EQ(ErrorOf([&] { files_.Attributes(nothing); }), 53);
+  }
+  EXPECT_EQ(ErrorOf([&] { files_.SetAttributes(In(u"none"), 0); }), 75);
+}
+
+TEST_F(FilesTest, ListsWhatIsNeitherHiddenNorSystem) {
+  EXPECT_EQ(files_.FirstName(In(u"*"), false), u"");
+  EXPECT_EQ(files_.FirstName(In(u"*"), true), u".");
+  Write(u"a.jpg", "");
+  Write(u"b.jpg", "");
+  Write(u"c.gif", "");
+  files_.SetAttributes(In(u"a.jpg"), attribute::kHidden);
+  files_.SetAttributes(In(u"b.jpg"), attribute::kReadOnly);
+  files_.SetAttributes(In(u"c.gif"), attribute::kSystem);
+  files_.MakeFolder(In(u"folder"));
+  const struct {
+    Text pattern;
+    TextView name, nameWithFolders;
+  } kCases[] = {{In(u"*.jpg"), u"b.jpg", u"b.jpg"},
+                {In(u"a.jpg"), u"", u""},
+                {In(u"*.gif"), u"", u""},
+                {In(u"B.JPG"), u"b.jpg", u"b.jpg"},
+                {In(u"none"), u"", u""},
+                {In(u"none\\x"), u"", u""},
+                {In(u"folder"), u"", u"folder"},
+                {In(u"folder\\"), u"", u"."},
+                {In(u""), u"b.jpg", u"."},
+                {Text(), u"", u""}};
+  for (const auto& item : kCases) {
+    EXPECT_EQ(files_.FirstName(item.pattern, false), item.name) << Utf8FromText(item.pattern);
+    EXPECT_EQ(files_.FirstName(item.pattern, true), item.nameWithFolders) << Utf8FromText(item.pattern);
+  }
+  EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"folder")); }), 58);
+  EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"b.jpg")); }), 58);
+  EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"none\\x")); }), 76);
+  EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"a?")); }), 75);
+  EXPECT_EQ(ownedObjects, 0);
+}
+
+TEST_F(FilesTest, CopiesWholeOrNotAtAll) {
+  Write(u"source", "new");
+  Write(u"old", "old");
+  Write(u"locked", "old");
+  Write(u"held", "old");
+  files_.SetAttributes(In(u"locked"), attribute::kReadOnly);
+  files_.MakeFolder(In(u"folder"));
+  HANDLE held = CreateFileW(WideFromText(In(u"held")).c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
+                            OPEN_EXISTING, 0, nullptr);
+  const struct {
+    TextView source, destination;
+    std::int32_t error;
+    const char* content;
+  } kCases[] = {{u"source", u"\u65E5", 0, "new"},       {u"source", u"\u65E5", 0, "new"},
+                {u"none", u"old", 53, "old"},           {u"folder", u"old", 75, "old"},
+                {u"source", u"old", 0, "new"},          {u"source", u"locked", 75, "old"},
+                {u"source", u"held", 75, "old"},        {u"source", u"folder", 75, nullptr},
+                {u"source", u"none\\file", 75, nullptr}};
+  for (const auto& item : kCases) {
+    SCOPED_TRACE(Utf8FromText(item.source) + " " + Utf8FromText(item.destination));
+    EXPECT_EQ(ErrorOf([&] { files_.Copy(In(item.source), In(item.destination)); }), item.error);
+    if (item.content) {
+      EXPECT_EQ(Read(item.destination), item.content);
+    }
+  }
+  CloseHandle(held);
+  EXPECT_EQ(Each(false), 6U) << "a file in between was left over";
+}
+
+TEST(WindowsStringResources, ReadsOwnAndLoadedStrings) {
+  WindowsStringResources strings(GetModuleHandleW(nullptr));
+  wchar_t self[MAX_PATH];
+  GetModuleFileNameW(nullptr, self, MAX_PATH);
+  auto library = strings.Load(TextFromWide(self));
+  ASSERT_TRUE(library);
+  const std::function<Text(std::uint16_t)> kSources[] = {
+      [&](std::uint16_t identifier) { return strings.OwnString(identifier); },
+      [&](std::uint16_t identifier) { return library->String(identifier); }};
+  for (const auto& string : kSources) {
+    EXPECT_EQ(string(1), u"Speicherplatz f\u00FCr Bilder");
+    EXPECT_EQ(string(2).size(), 511U);
+    EXPECT_EQ(string(3), u"");
+  }
+  for (TextView path : {u"", u"C:\\none.dll", u"C:\\\u65E5.dll"}) EXPECT_FALSE(strings.Load(path));
+  EXPECT_EQ(ownedObjects, 1);
+  library.reset();
+  EXPECT_EQ(ownedObjects, 0);
+}
+
+int handled = 0;
+bool repeats = false;
+
+LRESULT CALLBACK CountMessages(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  if (message != WM_APP) return DefWindowProcW(window, message, wParam, lParam);
+  ++handled;
+  if (repeats) PostMessageW(window, WM_APP, 0, 0);
+  return 0;
+}
+
+TEST(WindowsMessagePump, HandlesWhatWaitsAndPutsQuitBack) {
+  WindowsMessagePump pump;
+  WNDCLASSW windowClass{};
+  windowClass.lpfnWndProc = CountMessages;
+  windowClass.lpszClassName = L"Tarnwick pump test";
+  RegisterClassW(&windowClass);
+  HWND window = CreateWindowExW(0, windowClass.lpszClassName, L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr,
+                                nullptr, nullptr);
+  ASSERT_TRUE(window);
+  for (int i = 0; i < 3; ++i) PostMessageW(window, WM_APP, 0, 0);
+  pump.Yield();
+  EXPECT_EQ(handled, 3);
+
+  PostMessageW(window, WM_APP, 0, 0);
+  PostQuitMessage(7);
+  pump.Yield();
+  pump.Yield();
+  EXPECT_EQ(handled, 4);
+  MSG message{};
+  ASSERT_TRUE(PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE));
+  EXPECT_EQ(message.message, UINT{WM_QUIT});
+  EXPECT_EQ(message.wParam, WPARAM{7});
+
+  // A handler that posts its message again does not keep the pump for ever.
+  repeats = true;
+  PostMessageW(window, WM_APP, 0, 0);
+  pump.Yield();
+  repeats = false;
+  pump.Yield();
+  DestroyWindow(window);
+}
+
+TEST(WindowsPlatform, GivesAllOfThem) {
+  WindowsPlatform platform(GetModuleHandleW(nullptr));
+  const Platform view = platform.View();
+  EXPECT_FALSE(view.strings.OwnString(1).empty());
+  EXPECT_TRUE(view.files.TempPath().ends_with(u'\\'));
+  EXPECT_FALSE(view.internet.Open(u"\u65E5"));
+  EXPECT_TRUE(view.internet.Open(u"FileUploadClient"));
+}
+
+}  // namespace
+}  // namespace tarnwick
