@@ -276,7 +276,10 @@ Sub Report(what, result, expected)
 End Sub
 
 Sub Tell(what, result)
-  WScript.Echo "  " & PadRight(what, 52) & "  " & result
+  Dim shown
+  shown = result
+  If CStr(shown) = "" Then shown = "(nothing)"
+  WScript.Echo "  " & PadRight(what, 52) & "  " & shown
 End Sub
 
 Function PadRight(text, width)

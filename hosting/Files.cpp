@@ -74,6 +74,11 @@ void SyncFolder(const std::filesystem::path& folder) {
   if (!handle || fsync(handle.Get()) != 0) ThrowLastError(folder);
 }
 
+void SyncFileSystem(const std::filesystem::path& folder) {
+  const FileHandle handle(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
+  if (!handle || syncfs(handle.Get()) != 0) ThrowLastError(folder);
+}
+
 FileHandle OpenRegularFile(const std::filesystem::path& path) {
   // Without O_NONBLOCK, opening a pipe that someone put there would wait for ever.
   FileHandle file(open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));

@@ -62,6 +62,9 @@ class TemporaryFile {
 // Puts the entries of a folder on the disk: what was created, renamed or removed in it.
 void SyncFolder(const std::filesystem::path& folder);
 
+// Puts everything on the disk that `folder` is on: for many files, much faster than one after the other.
+void SyncFileSystem(const std::filesystem::path& folder);
+
 // Opens a regular file for reading; follows no link and never throws. None when there is no such file.
 FileHandle OpenRegularFile(const std::filesystem::path& path);
 

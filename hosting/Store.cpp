@@ -185,16 +185,9 @@ bool Store::SeedAccount(std::string_view name, std::string_view password, std::i
   const fs::path prepared = NewWorkPath();
   fs::create_directory(prepared);
   if (!pictures.empty()) {
-    std::vector<char> block(256 * 1024);
-    for (const auto& [fileName, facts] : FilesIn(pictures)) {
-      const FileHandle from = OpenRegularFile(pictures / fileName);
-      TemporaryFile to(NewWorkPath());
-      for (std::uint64_t offset = 0; std::size_t got = ReadAt(from, block.data(), block.size(), offset);
-           offset += got)
-        to.Append({block.data(), got});
-      to.Sync();
-      to.MoveTo(prepared / fileName);
-    }
+    for (const auto& [fileName, facts] : FilesIn(pictures))
+      fs::copy_file(pictures / fileName, prepared / fileName);
+    SyncFileSystem(prepared);
   }
   // Doomed until the account is there: a kill in between leaves no folder that nobody owns.
   Execute(*database_, "INSERT INTO doomed(folder) VALUES(?)", account.folder);

@@ -55,16 +55,24 @@ build_preset() {
 
 started=()  # process ids
 
+# stop_servers N: ends the last N that were started.
+stop_servers() {
+  local i pid
+  for ((i = 0; i < $1; i++)); do
+    pid=${started[-1]}
+    unset 'started[-1]'
+    kill "$pid" 2>/dev/null || true
+    wait "$pid" 2>/dev/null || true
+  done
+}
+
 stop_everything() {
-  local arch pid
+  local arch
   for arch in x64 x86; do
     # A prefix that is there may have a server, whoever was interrupted in the middle of starting it.
     [[ ! -d $wine_home/$arch ]] || wine_stop "$arch" 2>/dev/null || true
   done
-  for pid in "${started[@]}"; do
-    kill "$pid" 2>/dev/null || true
-    wait "$pid" 2>/dev/null || true
-  done
+  stop_servers "${#started[@]}"
 }
 trap stop_everything EXIT
 trap 'exit 130' INT
@@ -80,7 +88,7 @@ start_server() {
   local pid=$!
   started+=("$pid")
   for ((i = 0; i < 150; i++)); do
-    server_line=$(grep -m 1 -E "$pattern" "$log" || true)
+    server_line=$(grep -s -m 1 -E "$pattern" "$log" || true)
     if [[ -n $server_line ]]; then
       printf 'started\n'
       return 0

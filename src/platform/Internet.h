@@ -19,8 +19,8 @@ class FtpConnection {
   // nullopt when the server does not say, or says more than 254 bytes.
   virtual std::optional<Text> Directory() = 0;
 
-  // Fetches `serverFile` (binary) into `localFile`, replacing a file of that name. On failure it returns false
-  // and leaves what was there.
+  // Fetches `serverFile` (binary) into `localFile`, replacing a file of that name. On failure it returns
+  // false and leaves what was there.
   virtual bool GetFile(TextView serverFile, TextView localFile) = 0;
 
   // Sends the command; no reply with data is expected.

@@ -1,5 +1,5 @@
-// Construction, the exchange that all operations use, session and FTP connection. The operations on files and on
-// accounts are in CFileUploadFiles.cpp and CFileUploadAccounts.cpp.
+// Construction, the exchange that all operations use, session and FTP connection. The operations on files and
+// on accounts are in CFileUploadFiles.cpp and CFileUploadAccounts.cpp.
 #include "service/CFileUpload.h"
 
 #include "service/Log.h"
@@ -48,7 +48,9 @@ CFileUpload::CFileUpload(Apartment& apartment) : apartment_(apartment), channel_
   Log(u"Logging ORV2 BV component for tracking Password reminder mailer error");
 }
 
-CFileUpload::~CFileUpload() { DisconnectFromServer(); }
+CFileUpload::~CFileUpload() {
+  DisconnectFromServer();
+}
 
 Reply CFileUpload::Ask(TextView requestName, TextView clientAction,
                        std::initializer_list<Parameter> parameters, std::int32_t sendFlag) {
@@ -148,8 +150,8 @@ bool CFileUpload::OpenSession() {
     ftp.internet = apartment_.platform.internet.Open(kFtpAgent);
     if (!ftp.internet) return;
     LookUpFtpProxy();
-    ftp.connection =
-        ftp.internet->ConnectFtp(ftp.host, ftp.useProxy ? std::uint16_t{0} : ftp.port, ftp.userName, ftp.password);
+    ftp.connection = ftp.internet->ConnectFtp(ftp.host, ftp.useProxy ? std::uint16_t{0} : ftp.port,
+                                              ftp.userName, ftp.password);
     ftp.connected = ftp.connection != nullptr;
     if (!ftp.connected) return;
     const Text directory = GetFileUploadPath();
@@ -172,8 +174,9 @@ void CFileUpload::DisconnectFromServer() {
 
 Text CFileUpload::GetFileUploadPath() {
   return ResultAsItStood(Text(), [&](Text& path) {
-    path = AskForText(u"PathFromRoot", u"PathFromRoot",
-                      {{u"ProductID", SessionProduct()}, {u"Username", SessionUser()}}, 0, u"PathFromRoot", u"");
+    path =
+        AskForText(u"PathFromRoot", u"PathFromRoot",
+                   {{u"ProductID", SessionProduct()}, {u"Username", SessionUser()}}, 0, u"PathFromRoot", u"");
   });
 }
 
@@ -183,7 +186,9 @@ Text CFileUpload::GetUserBasePath() {
   });
 }
 
-Text CFileUpload::Encipher(TextView value) { return EnCodeString(EncryptParameter(value)); }
+Text CFileUpload::Encipher(TextView value) {
+  return EnCodeString(EncryptParameter(value));
+}
 
 Text CFileUpload::EnCodeString(TextView szString) {
   // The percent sign goes first, so that the escapes of the others are not escaped again.

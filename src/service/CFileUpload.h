@@ -2,8 +2,8 @@
 // asks for quotas and administers accounts.
 //
 // Every public operation is one exchange with the service page unless it says otherwise. None of them throws:
-// on any failure an operation returns its result as it stood, which is 0, an empty text or false where no other
-// failure value is named. They block without pumping messages.
+// on any failure an operation returns its result as it stood, which is 0, an empty text or false where no
+// other failure value is named. They block without pumping messages.
 #pragma once
 
 #include <cstdint>
@@ -43,7 +43,8 @@ class CFileUpload {
   CFileUpload(const CFileUpload&) = delete;
   CFileUpload& operator=(const CFileUpload&) = delete;
 
-  // --- Session -----------------------------------------------------------------------------------------------
+  // --- Session
+  // -----------------------------------------------------------------------------------------------
 
   // The server name as last set on this object. Setting it changes the name for the whole apartment.
   const Text& GetHTTPServer() const { return serverName_; }
@@ -56,12 +57,12 @@ class CFileUpload {
   // Sets the apartment's server name ("host" or "host:port") and asks whether the service is there.
   bool ConnectToServer(TextView szServer);
 
-  // Logs the user on. Whenever the result is false, the previous user name and password stand again; the MGUID
-  // and the product number keep their new values.
+  // Logs the user on. Whenever the result is false, the previous user name and password stand again; the
+  // MGUID and the product number keep their new values.
   bool LogonAs(TextView ProductID, TextView Username, TextView Password, TextView MGUID);
 
-  // Opens the FTP connection (no service request but for the folder's path) and goes to the user's folder. True
-  // when the connection is open, even when the folder is not there.
+  // Opens the FTP connection (no service request but for the folder's path) and goes to the user's folder.
+  // True when the connection is open, even when the folder is not there.
   bool OpenSession();
 
   // Closes the FTP connection. No service request.
@@ -76,11 +77,12 @@ class CFileUpload {
   // `szString` with "%", "+", "#" and "&" escaped, the characters that break a form value. No request.
   static Text EnCodeString(TextView szString);
 
-  // --- Files -------------------------------------------------------------------------------------------------
+  // --- Files
+  // -------------------------------------------------------------------------------------------------
 
   // Hands a record per file of the account to `colFiles`, with the file's address as its key, in the server's
-  // order. When ListIsCurrent, returns true at once without a request and hands over nothing. An error half-way
-  // leaves what was handed over and returns false.
+  // order. When ListIsCurrent, returns true at once without a request and hands over nothing. An error
+  // half-way leaves what was handed over and returns false.
   bool ListFilesForUser(const FileSink& colFiles);
 
   // Whether ListFilesForUser has nothing to ask: the all-files list is current and not empty. No request.
@@ -89,9 +91,9 @@ class CFileUpload {
   // Does nothing and returns false; the controls have an operation of this name.
   static bool GetFileDetails() { return false; }
 
-  // Register the file `szFilePath`, whose bytes went to the server through its acceptor page, and return its web
-  // address. The file's attributes are cleared meanwhile and stand again afterwards. UploadFile takes the name
-  // after the last "/", SaveUploadFile the one after the last "\".
+  // Register the file `szFilePath`, whose bytes went to the server through its acceptor page, and return its
+  // web address. The file's attributes are cleared meanwhile and stand again afterwards. UploadFile takes the
+  // name after the last "/", SaveUploadFile the one after the last "\".
   Text UploadFile(TextView szFilePath);
   Text SaveUploadFile(TextView szFilePath);
 
@@ -127,15 +129,16 @@ class CFileUpload {
   // Stores the apartment's abort flag. No request.
   void AbortFileTransfer(bool bAbortStatus) { apartment_.abortTransfer = bAbortStatus; }
 
-  // --- Accounts ----------------------------------------------------------------------------------------------
+  // --- Accounts
+  // ----------------------------------------------------------------------------------------------
 
-  // Creates an account and its folder, logs the new user on and has the key mailed. Returns the new MGUID, or a
-  // status as text: 1002 (no MGUID), 1003 (user exists), 1004 (failed, and the account was removed again), 1011
-  // (limit of accounts), or what else the service said.
+  // Creates an account and its folder, logs the new user on and has the key mailed. Returns the new MGUID, or
+  // a status as text: 1002 (no MGUID), 1003 (user exists), 1004 (failed, and the account was removed again),
+  // 1011 (limit of accounts), or what else the service said.
   Text AddUser(TextView ProductID, TextView Username, TextView GUID);
 
-  // Removes an account with its folder. 1001 when done, 1002 when the password was refused, 1003 when there is
-  // no such user, 1004 on failure. The folder always goes too.
+  // Removes an account with its folder. 1001 when done, 1002 when the password was refused, 1003 when there
+  // is no such user, 1004 on failure. The folder always goes too.
   std::int32_t DeleteUser(TextView ProductID, TextView Username, TextView Password);
 
   bool IsValidUserID(TextView Username, TextView ProductID);
@@ -143,7 +146,8 @@ class CFileUpload {
   // The user's key, "1004" after a failed exchange.
   Text GetKeyForUser(TextView ProductID, TextView Username);
 
-  // Has the service mail the key; `blnNewUser` is passed on. The service's status, 1004 after a failed exchange.
+  // Has the service mail the key; `blnNewUser` is passed on. The service's status, 1004 after a failed
+  // exchange.
   std::int32_t EmailKeyToUser(TextView ProductID, TextView Username, std::int32_t blnNewUser);
 
   // 1001 when the password was changed, else 1004.
@@ -178,13 +182,14 @@ class CFileUpload {
     Text value;
   };
 
-  // One exchange: composes the request, sends it and reads the reply. `parameters` follow the enciphered action. The
-  // reply is the caller's own, because what takes its values may be code of the host that asks the next one.
+  // One exchange: composes the request, sends it and reads the reply. `parameters` follow the enciphered
+  // action. The reply is the caller's own, because what takes its values may be code of the host that asks
+  // the next one.
   Reply Ask(TextView requestName, TextView clientAction, std::initializer_list<Parameter> parameters,
             std::int32_t sendFlag);
 
-  // The first value of one reply variable, which is the whole result of an operation. `onFailure` after a failed
-  // exchange; throws what a missing variable throws.
+  // The first value of one reply variable, which is the whole result of an operation. `onFailure` after a
+  // failed exchange; throws what a missing variable throws.
   Text AskForText(TextView requestName, TextView clientAction, std::initializer_list<Parameter> parameters,
                   std::int32_t sendFlag, TextView variable, TextView onFailure);
 
@@ -195,7 +200,8 @@ class CFileUpload {
 
   Text RegisterFile(TextView fileName, TextView path);
   // Logs the new user on and creates the user's folder; false when either fails.
-  bool SetUpAccount(TextView ProductID, TextView Username, TextView password, TextView mguid, TextView folder);
+  bool SetUpAccount(TextView ProductID, TextView Username, TextView password, TextView mguid,
+                    TextView folder);
   void LookUpFtpProxy();
 
   // A value as it goes into the form when it is enciphered.

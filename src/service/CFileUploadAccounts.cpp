@@ -50,7 +50,7 @@ Text CFileUpload::AddUser(TextView ProductID, TextView Username, TextView GUID) 
       // The base path is told for older services; folders are named without it.
       Log(u"Checking base path for '\\'");
       Log(reply.First(u"BasePath").ends_with(u'\\') ? u"'\\' found" : u"'\\' not found, adding '\\'");
-      const Text folder = reply.First(u"UserFolder");
+      const Text& folder = reply.First(u"UserFolder");
       password = reply.First(u"Password");
       mguid = reply.First(u"MGUID");
       if (!SetUpAccount(ProductID, Username, password, mguid, folder)) code = status::kFailure;
@@ -99,8 +99,8 @@ std::int32_t CFileUpload::DeleteUser(TextView ProductID, TextView Username, Text
     const SessionValues& session = apartment_.session;
     const std::int32_t folderError = ErrorNumberOf([&] {
       channel_.FolderActionWithEvents(UsersBaseUrl(session.serverName), UserFolderName(Username),
-                                      AcceptorPath(u"DeleteFolderAcceptor.asp"), kDeleteFolderAction, Username,
-                                      Password, kProductGuid);
+                                      AcceptorPath(u"DeleteFolderAcceptor.asp"), kDeleteFolderAction,
+                                      Username, Password, kProductGuid);
     });
     if (!FolderActionIsDone(folderError)) {
       result = folderError == acceptor::kRefused ? status::kNegative : status::kFailure;
@@ -118,9 +118,9 @@ std::int32_t CFileUpload::DeleteUser(TextView ProductID, TextView Username, Text
 
 bool CFileUpload::IsValidUserID(TextView Username, TextView ProductID) {
   return ResultAsItStood(false, [&](bool& valid) {
-    valid = BooleanFromText(AskForText(u"ValidUserID", u"ValidUserID",
-                                       {{u"UserName", EnCodeString(Username)}, {u"ProductID", Text(ProductID)}},
-                                       0, u"ValidUser", u"FALSE"));
+    valid = BooleanFromText(AskForText(
+        u"ValidUserID", u"ValidUserID",
+        {{u"UserName", EnCodeString(Username)}, {u"ProductID", Text(ProductID)}}, 0, u"ValidUser", u"FALSE"));
   });
 }
 
@@ -163,18 +163,20 @@ Text CFileUpload::ActivateAccount(TextView szProductID, TextView szUserName, Tex
 }
 
 std::int32_t CFileUpload::GetHardLimit(TextView szProductID) {
-  return AskForNumber(u"HardLimitRequest", u"HardLimit", {{u"ProductID", Text(szProductID)}}, 1, u"HardLimit", 0);
+  return AskForNumber(u"HardLimitRequest", u"HardLimit", {{u"ProductID", Text(szProductID)}}, 1, u"HardLimit",
+                      0);
 }
 
 std::int32_t CFileUpload::GetSoftLimit(TextView szProductID) {
-  return AskForNumber(u"SoftLimitRequest", u"SoftLimit", {{u"ProductID", Text(szProductID)}}, 1, u"SoftLimit", 0);
+  return AskForNumber(u"SoftLimitRequest", u"SoftLimit", {{u"ProductID", Text(szProductID)}}, 1, u"SoftLimit",
+                      0);
 }
 
 Text CFileUpload::GetMGUIDForUser(TextView szProductID, TextView szUserName) {
   return ResultAsItStood(Text(), [&](Text& mguid) {
     mguid = AskForText(u"MGUIDRequest", u"GetMGUIDForUser",
-                       {{u"ProductID", Text(szProductID)}, {u"UserName", EnCodeString(szUserName)}}, 1, u"MGUID",
-                       kFailureText);
+                       {{u"ProductID", Text(szProductID)}, {u"UserName", EnCodeString(szUserName)}}, 1,
+                       u"MGUID", kFailureText);
   });
 }
 
@@ -197,10 +199,10 @@ std::int32_t CFileUpload::GetAccountDetailsForMGUID(TextView MGUID, TextView Use
                                                     const AccountSink& col) {
   return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& result) {
     const Reply reply = Ask(u"AccountDetails", u"BVAccountDetails",
-                             {{u"ProductID", Text(ProductID)},
-                              {u"MGUID", EnCodeString(MGUID)},
-                              {u"Username", EnCodeString(Username)}},
-                             1);
+                            {{u"ProductID", Text(ProductID)},
+                             {u"MGUID", EnCodeString(MGUID)},
+                             {u"Username", EnCodeString(Username)}},
+                            1);
     if (reply.ErrorOccured() == 1) {
       result = status::kFailure;
       return;
@@ -219,8 +221,8 @@ std::int32_t CFileUpload::GetAccountDetailsForMGUID(TextView MGUID, TextView Use
 }
 
 std::int32_t CFileUpload::HasUserAccountExpired(TextView Username) {
-  return AskForNumber(u"HasUserExpired", u"HasUserExpired", {{u"UserName", Text(Username)}}, 1, u"HasUserExpired",
-                      status::kFailure);
+  return AskForNumber(u"HasUserExpired", u"HasUserExpired", {{u"UserName", Text(Username)}}, 1,
+                      u"HasUserExpired", status::kFailure);
 }
 
 std::int32_t CFileUpload::GetPremiumBaseAccountSize(TextView Username) {

@@ -41,9 +41,8 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
       listed = true;
       return;
     }
-    const Reply reply =
-        Ask(u"ListFilesRequest", u"ListFiles",
-            {{u"Username", SessionUser()}, {u"ProductID", SessionProduct()}}, 1);
+    const Reply reply = Ask(u"ListFilesRequest", u"ListFiles",
+                            {{u"Username", SessionUser()}, {u"ProductID", SessionProduct()}}, 1);
     if (reply.ErrorOccured() == 1) return;
     const std::vector<Text>* names = reply.GetValueByVariableName(u"FileName");
     const std::vector<Text>* urls = reply.GetValueByVariableName(u"FileURL");
@@ -62,7 +61,9 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
   });
 }
 
-Text CFileUpload::UploadFile(TextView szFilePath) { return RegisterFile(FileNameFromUrl(szFilePath), szFilePath); }
+Text CFileUpload::UploadFile(TextView szFilePath) {
+  return RegisterFile(FileNameFromUrl(szFilePath), szFilePath);
+}
 
 Text CFileUpload::SaveUploadFile(TextView szFilePath) {
   return RegisterFile(FileNameFromPath(szFilePath), szFilePath);
@@ -106,10 +107,10 @@ std::int32_t CFileUpload::RenameFile(TextView ProductID, TextView Username, Text
 std::int32_t CFileUpload::DeleteFileForUser(TextView FileToBeDeleted) {
   return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& result) {
     const Reply reply = Ask(u"DeleteFileRequest", u"DeleteFile",
-                             {{u"Username", SessionUser()},
-                              {u"ProductID", SessionProduct()},
-                              {u"FileToBeDeleted", EnCodeString(FileToBeDeleted)}},
-                             1);
+                            {{u"Username", SessionUser()},
+                             {u"ProductID", SessionProduct()},
+                             {u"FileToBeDeleted", EnCodeString(FileToBeDeleted)}},
+                            1);
     if (reply.ErrorOccured() == 1) {
       result = status::kFailure;
     } else if (BooleanFromText(reply.First(u"DeleteStatus"))) {
@@ -121,16 +122,15 @@ std::int32_t CFileUpload::DeleteFileForUser(TextView FileToBeDeleted) {
 double CFileUpload::GetMaxQuota(TextView ProductID, TextView Username) {
   return ResultAsItStood(0.0, [&](double& quota) {
     quota = LeadingNumber(AskForText(u"GetMaxQuota", u"GetMaxUserQuota",
-                                     {{u"ProductID", Text(ProductID)}, {u"UserName", EnCodeString(Username)}}, 0,
-                                     u"MaxUserQuota", u""));
+                                     {{u"ProductID", Text(ProductID)}, {u"UserName", EnCodeString(Username)}},
+                                     0, u"MaxUserQuota", u""));
   });
 }
 
 std::optional<double> CFileUpload::GetTotalUsedQuota(TextView ProductID, TextView Username) {
   return ResultAsItStood(std::optional<double>(), [&](std::optional<double>& used) {
-    const Reply reply =
-        Ask(u"GetTotalUsedQuota", u"GetTotalUsedQuota",
-            {{u"ProductID", Text(ProductID)}, {u"UserName", EnCodeString(Username)}}, 0);
+    const Reply reply = Ask(u"GetTotalUsedQuota", u"GetTotalUsedQuota",
+                            {{u"ProductID", Text(ProductID)}, {u"UserName", EnCodeString(Username)}}, 0);
     if (reply.ErrorOccured() != 1) used = LeadingNumber(reply.First(u"UsedQuota"));
   });
 }

@@ -1,9 +1,10 @@
 // The request component: carries one request to the service page and reads its reply, and calls the acceptor
 // pages for folders.
 //
-// Wire form of an exchange: an HTTP POST to PATH/PAGE?Request=NAME&Flag=FLAG whose body is name=value joined by
-// "&", in the order of adding. Values come escaped or enciphered, so the only further escape is %XX (upper-case
-// hex) for each byte of the UTF-8 form outside 0x21 to 0x7E.
+// Wire form of an exchange: an HTTP POST to PATH/PAGE?Request=NAME&Flag=FLAG whose body is name=value joined
+// by
+// "&", in the order of adding. Values come escaped or enciphered, so the only further escape is %XX
+// (upper-case hex) for each byte of the UTF-8 form outside 0x21 to 0x7E.
 #pragma once
 
 #include <cstdint>
@@ -40,10 +41,10 @@ class HTTPServer {
   // is 1.
   Reply SendRequest(const Request& request, TextView path, std::int32_t sendFlag);
 
-  // Asks the acceptor page for `action` on `folder` (a bare name). Throws a run-time error with the page's error
-  // number, see PostAcceptorForm.
-  void FolderActionWithEvents(TextView usersBaseUrl, TextView folder, TextView acceptorPath, std::int32_t action,
-                              TextView user, TextView password, TextView productGuid);
+  // Asks the acceptor page for `action` on `folder` (a bare name). Throws a run-time error with the page's
+  // error number, see PostAcceptorForm.
+  void FolderActionWithEvents(TextView usersBaseUrl, TextView folder, TextView acceptorPath,
+                              std::int32_t action, TextView user, TextView password, TextView productGuid);
 
  private:
   HttpTransport& http_;

@@ -4,7 +4,8 @@
 
 namespace tarnwick {
 
-// Takes the progress texts of the service client. A hook that is empty on purpose: nothing is written anywhere.
+// Takes the progress texts of the service client. A hook that is empty on purpose: nothing is written
+// anywhere.
 inline void Log(TextView /*progress*/) noexcept {}
 
 }  // namespace tarnwick

@@ -16,15 +16,15 @@ class Reply {
   // A failed exchange without variables.
   Reply() = default;
 
-  // Reads an `application/x-www-form-urlencoded` body in UTF-8. A broken escape or invalid UTF-8 anywhere makes
-  // the exchange a failed one, as does a variable ErrorOccured of 1.
+  // Reads an `application/x-www-form-urlencoded` body in UTF-8. A broken escape or invalid UTF-8 anywhere
+  // makes the exchange a failed one, as does a variable ErrorOccured of 1.
   static Reply FromBody(std::string_view body);
 
   // 1 when the exchange failed, else 0.
   std::int32_t ErrorOccured() const { return failed_ ? 1 : 0; }
 
-  // Every value that the server sent under `name` (letter case counts), in its order; a bare name has none. Null
-  // when the name did not occur. Owned by the reply.
+  // Every value that the server sent under `name` (letter case counts), in its order; a bare name has none.
+  // Null when the name did not occur. Owned by the reply.
   const std::vector<Text>* GetValueByVariableName(TextView name) const;
 
   // Element 0 of the above. Throws run-time error 9 when there is none.

@@ -39,7 +39,8 @@ Text ApplyCipher(Text& value) {
   Text text = StripToAlphabet(value);
   std::size_t keyIndex = text.size() % kKey.size();
   for (char16_t& character : text) {
-    const std::size_t shifted = (PositionOf(kKey[keyIndex]) + std::size_t{PositionOf(character)}) % kAlphabet.size();
+    const std::size_t shifted =
+        (PositionOf(kKey[keyIndex]) + std::size_t{PositionOf(character)}) % kAlphabet.size();
     character = kAlphabet[(kAlphabet.size() - shifted) % kAlphabet.size()];
     keyIndex = (keyIndex + 1) % kKey.size();
   }

@@ -17,10 +17,10 @@ class CRegistry {
   // Stores hive (a predefined key) and path; nothing is opened or checked.
   void setBaseRegKey(std::uint32_t regHive, TextView regSubKeys);
 
-  // Data of value `RegNameValue` in `Subkey` of the base key (the base key itself when empty), or an empty text.
-  // `Datatype` (a RegistryType) says how to read: 0 and 1 as text, 2 as text, 4 as the decimal text of a number.
-  // For 2 and 4 it receives the value's actual type. Anything else yields an empty text without a query.
-  // A text longer than 255 bytes is not read.
+  // Data of value `RegNameValue` in `Subkey` of the base key (the base key itself when empty), or an empty
+  // text. `Datatype` (a RegistryType) says how to read: 0 and 1 as text, 2 as text, 4 as the decimal text of
+  // a number. For 2 and 4 it receives the value's actual type. Anything else yields an empty text without a
+  // query. A text longer than 255 bytes is not read.
   Text getRegSetting(TextView RegNameValue, TextView Subkey, std::uint32_t& Datatype);
 
  private:

@@ -15,30 +15,42 @@ TextView AfterLast(TextView text, char16_t separator) {
 
 }  // namespace
 
-TextView FileNameFromUrl(TextView url) { return AfterLast(url, u'/'); }
+TextView FileNameFromUrl(TextView url) {
+  return AfterLast(url, u'/');
+}
 
-TextView FileNameFromPath(TextView path) { return AfterLast(path, u'\\'); }
+TextView FileNameFromPath(TextView path) {
+  return AfterLast(path, u'\\');
+}
 
 double GetLocalFileSize(FileSystem& files, TextView path) {
   return static_cast<std::int32_t>(static_cast<std::uint32_t>(files.Length(path)));
 }
 
-Text GetLocalFileDate(FileSystem& files, TextView path) { return files.ModifiedText(path); }
+Text GetLocalFileDate(FileSystem& files, TextView path) {
+  return files.ModifiedText(path);
+}
 
 void CopyLocalFile(FileSystem& files, TextView source, TextView destination) {
   ResultAsItStood(0, [&](int&) { files.Copy(source, destination); });
 }
 
-bool FileExists(FileSystem& files, TextView path) { return !files.FirstName(path, false).empty(); }
+bool FileExists(FileSystem& files, TextView path) {
+  return !files.FirstName(path, false).empty();
+}
 
-bool FolderExists(FileSystem& files, TextView path) { return !files.FirstName(path, true).empty(); }
+bool FolderExists(FileSystem& files, TextView path) {
+  return !files.FirstName(path, true).empty();
+}
 
 bool CreateFolder(FileSystem& files, TextView path) {
   files.MakeFolder(path);
   return false;
 }
 
-Text GetTempFolder(FileSystem& files) { return files.TempPath(); }
+Text GetTempFolder(FileSystem& files) {
+  return files.TempPath();
+}
 
 Text UserFolderName(TextView userName) {
   const std::size_t afterAt = userName.find(u'@') + 1;

@@ -17,9 +17,9 @@ constexpr TextView kProxyServer = u"ProxyServer";
 Text GetProxySettings(Apartment& apartment) {
   const RegistryValues settings(apartment.platform.registry, kInternetSettings);
   const RegistryValues::Value enable = settings.Get(kProxyEnable);
-  const bool enabled = (enable.type == RegistryType::kNumber && enable.number == 1) ||
-                       (enable.type == RegistryType::kBinary &&
-                        (enable.text.starts_with(u'\1') || enable.text == u"1"));
+  const bool enabled =
+      (enable.type == RegistryType::kNumber && enable.number == 1) ||
+      (enable.type == RegistryType::kBinary && (enable.text.starts_with(u'\1') || enable.text == u"1"));
   if (!enabled) return apartment.proxy.ProxyHost = {};
 
   const Text server = settings.Get(kProxyServer).text;

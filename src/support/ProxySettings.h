@@ -10,9 +10,10 @@ namespace tarnwick {
 
 struct Apartment;
 
-// Reads the browser's proxy for picture downloads into the apartment's proxy values and returns ProxyHost, empty
-// when none is enabled. A list of proxies by protocol is not picked apart. Throws run-time error 9 when the
-// setting has no port (ProxyPort keeps what it held), 5 when a value cannot be read (both keep what they held).
+// Reads the browser's proxy for picture downloads into the apartment's proxy values and returns ProxyHost,
+// empty when none is enabled. A list of proxies by protocol is not picked apart. Throws run-time error 9 when
+// the setting has no port (ProxyPort keeps what it held), 5 when a value cannot be read (both keep what they
+// held).
 Text GetProxySettings(Apartment& apartment);
 
 // The proxy that the FTP session uses: the entry "ftp" of a list by protocol, else the whole setting.

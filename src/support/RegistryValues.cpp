@@ -42,7 +42,8 @@ RegistryValues::Value RegistryValues::Get(TextView name) const {
   std::uint32_t type = 0;
   std::uint32_t size = 0;
   if (key_->Query(name, type, data, size) != kRegistrySuccess) throw RuntimeError(error::kInvalidCall);
-  const std::string_view bytes(reinterpret_cast<const char*>(data.data()), std::min<std::size_t>(size, kMostBytes));
+  const std::string_view bytes(reinterpret_cast<const char*>(data.data()),
+                               std::min<std::size_t>(size, kMostBytes));
 
   Value value;
   value.type = static_cast<RegistryType>(type);

@@ -10,8 +10,12 @@ namespace {
 
 constexpr char32_t kReplacement = 0xFFFD;
 
-bool IsHighSurrogate(char32_t unit) { return unit >= 0xD800 && unit <= 0xDBFF; }
-bool IsLowSurrogate(char32_t unit) { return unit >= 0xDC00 && unit <= 0xDFFF; }
+bool IsHighSurrogate(char32_t unit) {
+  return unit >= 0xD800 && unit <= 0xDBFF;
+}
+bool IsLowSurrogate(char32_t unit) {
+  return unit >= 0xDC00 && unit <= 0xDFFF;
+}
 
 void AppendUtf8(std::string& bytes, char32_t point) {
   const auto tail = [&](unsigned shift) {
@@ -126,7 +130,9 @@ std::vector<TextView> Split(TextView text, char16_t separator) {
   return pieces;
 }
 
-Text TextFromNumber(std::int64_t number) { return TextFromLatin1(std::to_string(number)); }
+Text TextFromNumber(std::int64_t number) {
+  return TextFromLatin1(std::to_string(number));
+}
 
 std::int32_t NumberFromText(TextView text) {
   std::string ascii = Ascii(Trim(text));

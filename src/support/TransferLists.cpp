@@ -31,7 +31,8 @@ bool RemoveFirst(FileList& list, MessagePump& pump, TextView name, bool yieldPer
 void RemoveFromTransferLists(Apartment& apartment, TextView name) {
   const Text wanted(Trim(FileNameFromUrl(name)));
   MessagePump& pump = apartment.platform.pump;
-  if (RemoveFirst(apartment.allFiles, pump, wanted, true)) RemoveFirst(apartment.shownFiles, pump, wanted, false);
+  if (RemoveFirst(apartment.allFiles, pump, wanted, true))
+    RemoveFirst(apartment.shownFiles, pump, wanted, false);
 }
 
 }  // namespace tarnwick

@@ -22,9 +22,13 @@ std::int32_t ErrorNumberOf(const std::optional<HttpAnswer>& answer) {
 
 }  // namespace
 
-Text UsersBaseUrl(TextView server) { return Text(kScheme).append(server).append(u"/users/"); }
+Text UsersBaseUrl(TextView server) {
+  return Text(kScheme).append(server).append(u"/users/");
+}
 
-Text AcceptorPath(TextView page) { return Text(u"/httpupload/").append(page); }
+Text AcceptorPath(TextView page) {
+  return Text(u"/httpupload/").append(page);
+}
 
 void PostAcceptorForm(HttpTransport& http, TextView usersBaseUrl, TextView acceptorPath,
                       std::initializer_list<AcceptorField> fields) {

@@ -17,9 +17,9 @@ inline constexpr TextView kProductGuid = u"4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E"
 
 // Error numbers of the pages.
 namespace acceptor {
-inline constexpr std::int32_t kRefused = -2147220878;        // user name, password or product identifier
-inline constexpr std::int32_t kFolderState = -2147220840;    // to delete: not there; to create: there already
-inline constexpr std::int32_t kUnspecified = -2147467259;    // no usable answer
+inline constexpr std::int32_t kRefused = -2147220878;      // user name, password or product identifier
+inline constexpr std::int32_t kFolderState = -2147220840;  // to delete: not there; to create: there already
+inline constexpr std::int32_t kUnspecified = -2147467259;  // no usable answer
 }  // namespace acceptor
 
 // "http://SERVER/users/", from a server name as the host gave it; nothing is normalised.
@@ -33,9 +33,9 @@ struct AcceptorField {
   TextView value;
 };
 
-// Posts the fields, in their order, to the page on the server that `usersBaseUrl` names. Returns when the page
-// answered that it succeeded; else throws a run-time error with the page's error number, kUnspecified when
-// there is no usable answer.
+// Posts the fields, in their order, to the page on the server that `usersBaseUrl` names. Returns when the
+// page answered that it succeeded; else throws a run-time error with the page's error number, kUnspecified
+// when there is no usable answer.
 void PostAcceptorForm(HttpTransport& http, TextView usersBaseUrl, TextView acceptorPath,
                       std::initializer_list<AcceptorField> fields);
 

@@ -37,7 +37,8 @@ std::optional<HttpAddress> SplitHttpAddress(TextView address) {
   HttpAddress parts;
   parts.path = address.substr(pathStart);
   // The colons inside an IPv6 literal's brackets belong to the host.
-  const std::size_t colon = host.find(u':', host.starts_with(u'[') ? std::min(host.find(u']'), host.size()) : 0);
+  const std::size_t colon =
+      host.find(u':', host.starts_with(u'[') ? std::min(host.find(u']'), host.size()) : 0);
   if (colon != TextView::npos) {
     const TextView digits = host.substr(colon + 1);
     if (digits.empty() || digits.find_first_not_of(u"0123456789") != TextView::npos) return std::nullopt;

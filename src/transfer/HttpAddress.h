@@ -15,8 +15,8 @@ struct HttpAddress {
   Text path;
 };
 
-// Splits "host[:port][/path]". nullopt when the host is empty or holds a blank, the port is not 1 to 65535, or a
-// control character stands anywhere, which could otherwise end a request line.
+// Splits "host[:port][/path]". nullopt when the host is empty or holds a blank, the port is not 1 to 65535,
+// or a control character stands anywhere, which could otherwise end a request line.
 std::optional<HttpAddress> SplitHttpAddress(TextView address);
 
 // `text` in UTF-8 with %XX (upper-case hex) for each byte outside 0x21 to 0x7E.

@@ -44,6 +44,29 @@ TEST(KeyedList, KeepsOrderAndUniqueKeys) {
   EXPECT_EQ(list.Count(), 1U);
 }
 
+TEST(KeyedList, FindsKeysAmongMany) {
+  // Against a plain list of the keys, while keys come and go in a fixed disorder.
+  KeyedList<int> list;
+  std::vector<Text> keys;
+  std::uint32_t random = 1;
+  for (int step = 0; step < 4'000; ++step) {
+    random = random * 1664525 + 1013904223;
+    const std::size_t at = (random >> 8) % (keys.size() + 1);
+    if (at < keys.size() && (step > 2'000 || step % 4 == 0)) {
+      list.Remove(at + 1);
+      keys.erase(keys.begin() + static_cast<std::ptrdiff_t>(at));
+    } else {
+      keys.insert(keys.begin() + static_cast<std::ptrdiff_t>(at), u"key" + TextFromNumber(step));
+      list.Insert(at + 1, step, keys[at]);
+      EXPECT_THROW(list.Add(step, keys[at]), RuntimeError);
+    }
+    ASSERT_EQ(list.Count(), keys.size());
+    if (step % 97 != 0) continue;
+    for (std::size_t i = 0; i < keys.size(); ++i) ASSERT_EQ(list.PositionOf(keys[i]), i + 1);
+    ASSERT_EQ(list.PositionOf(u"key"), 0U);
+  }
+}
+
 class TransferListsTest : public testing::Test {
  protected:
   static std::shared_ptr<CUpload> Record(TextView name) {

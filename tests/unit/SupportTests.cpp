@@ -15,12 +15,16 @@ namespace tarnwick {
 namespace {
 
 TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
-  const Reply reply = Reply::FromBody("A=1&A=b+c&&Bare&E=&U=%C3%A9\r\n");
+  const Reply reply = Reply::FromBody("A=1&&Bare&E=&A=b+c&U=%C3%A9&V=%f0%9F%98%80\r\n");
   EXPECT_EQ(reply.ErrorOccured(), 0);
-  EXPECT_EQ(*reply.GetValueByVariableName(u"A"), (std::vector<Text>{u"1", u"b c"}));
+  const auto& values = *reply.GetValueByVariableName(u"A");
+  ASSERT_EQ(values.size(), 2U);
+  EXPECT_EQ(values[0], u"1");
+  EXPECT_EQ(values[1], u"b c");
   EXPECT_TRUE(reply.GetValueByVariableName(u"Bare")->empty());
   EXPECT_EQ(reply.First(u"E"), u"");
   EXPECT_EQ(reply.First(u"U"), u"\u00e9");
+  EXPECT_EQ(reply.First(u"V"), u"\U0001F600");
   EXPECT_EQ(reply.GetValueByVariableName(u"a"), nullptr);
   for (const char* broken : {"A=%", "A=%4", "A=%zz", "A=%FF", "A=%C0%80", "A=%ED%A0%80", "ErrorOccured=1"})
     EXPECT_EQ(Reply::FromBody(broken).ErrorOccured(), 1) << broken;

@@ -1,6 +1,5 @@
 #include "support/surface/Dispatch.h"
 
-#include <cstring>
 #include <vector>
 
 #include "support/surface/Automation.h"
@@ -105,10 +104,10 @@ void MakeReference(VARIANT& reference, VARIANT& target) {
   V_BYREF(&reference) = &V_NONE(&target);
 }
 
-// Hands a value that the member changed to the caller's variable. What stayed as it was is not written, so
+// Hands a value that the member changed to the caller's variable; the type of a stand-in never changes. What stayed as it was is not written, so
 // that the variable keeps its own type.
 void HandBack(StandIn& standIn) {
-  if (!standIn.receiver || std::memcmp(&standIn.before, &standIn.value.Get(), sizeof(VARIANT)) == 0) return;
+  if (!standIn.receiver || V_I8(&standIn.before) == V_I8(&standIn.value.Get())) return;
   VariantClear(standIn.receiver);
   *standIn.receiver = standIn.value.Detach();
 }
