@@ -34,8 +34,7 @@ namespace {
 constexpr double kLimit = 1.20;
 constexpr int kRuns = 15;
 
-// --- A platform that has nothing but one reply
-// -------------------------------------------------------------------
+// --- A platform that has nothing but one reply ---
 
 struct OneReply : HttpTransport {
   std::string body;
@@ -74,8 +73,7 @@ struct NoPump : MessagePump {
   void Yield() override {}
 };
 
-// --- What is measured
-// --------------------------------------------------------------------------------------------
+// --- What is measured ---
 
 // Processor seconds that `work` takes. It waits for nothing, and other programs' turns do not count.
 double Seconds(const std::function<void()>& work) {
@@ -147,8 +145,7 @@ double ListingRun(const std::string& reply, std::size_t files) {
   return seconds;
 }
 
-// --- The table
-// ---------------------------------------------------------------------------------------------------
+// --- The table ---
 
 struct Row {
   const char* what;

@@ -8,11 +8,11 @@
 '   PRODUCT    product number, for example 7
 '   MGUID      of that account; - asks the service for it
 '   PICTURES   local folder with the pictures that the account holds, to register one of them
-'   DOWNLOADS  local folder to fetch a picture into over FTP; without it the FTP part is skipped, since not every
-'              service has an FTP server
+'   DOWNLOADS  local folder to fetch a picture into over FTP; without it the FTP part is skipped, since not
+'              every service has an FTP server
 '
-' Ends with 0 when all went as expected, else with 1. It leaves the account as it found it, but for one picture that it
-' deletes as long as the account holds more than three.
+' Ends with 0 when all went as expected, else with 1. It leaves the account as it found it, but for one picture
+' that it deletes as long as the account holds more than three.
 Option Explicit
 
 Const DONE = 1001
@@ -54,6 +54,7 @@ WScript.Echo "Not as expected:" & failures
 WScript.Quit 1
 
 Sub Walk()
+  WScript.Echo "Status codes: 1001 done, 1002 no, 1003 user exists or unknown, 1033 not renamed, 0 not done."
   Set client = CreateObject("Tarnwick.CFileUpload")
   LogOn
   If failures <> "" Then Exit Sub
@@ -67,7 +68,7 @@ Sub Walk()
   client.DisconnectFromServer
 End Sub
 
-' --- The parts of the walk --------------------------------------------------------------------------------------
+' --- The parts of the walk ----------------------------------------------------------------------------------
 
 Sub LogOn()
   Headline "Log-on"
@@ -92,7 +93,8 @@ Sub ShowFiles()
   WScript.Echo "  " & PadRight("Name", width) & PadLeft("Bytes", 12) & "  Date"
   total = 0
   For Each file In files
-    WScript.Echo "  " & PadRight(file.FileName, width) & PadLeft(Grouped(file.FileSize), 12) & "  " & file.FileDate
+    WScript.Echo "  " & PadRight(file.FileName, width) & PadLeft(Grouped(file.FileSize), 12) & _
+      "  " & file.FileDate
     total = total + file.FileSize
   Next
   WScript.Echo "  " & PadRight(files.Count & " files", width) & PadLeft(Grouped(total), 12)
@@ -103,7 +105,8 @@ Sub ShowAccount()
   Dim accounts, account, most, used
   Headline "Account"
   Set accounts = Nothing
-  Report "Ask for the account's details", client.GetAccountDetailsForMGUID(mguid, user, product, accounts), DONE
+  Report "Ask for the account's details", _
+    client.GetAccountDetailsForMGUID(mguid, user, product, accounts), DONE
   If Not accounts Is Nothing Then
     Report "Accounts of that name", accounts.Count, 1
     For Each account In accounts
@@ -112,13 +115,14 @@ Sub ShowAccount()
       Tell "Started", account.StartDate
       Tell "Expires after", account.ExpiryPeriod & " days"
       Tell "Today at the server", account.CurrentDate
-      Tell "Quota and its use, as the account says", Grouped(account.Quota) & " and " & Grouped(account.UsedQuota)
+      Tell "Quota and its use, as the account says", _
+        Grouped(account.Quota) & " and " & Grouped(account.UsedQuota)
     Next
   End If
   most = client.GetMaxQuota(product, user)
   used = client.GetTotalUsedQuota(product, user)
   Report "The account has a quota", most > 0, True
-  Report "The service tells how much is used", IsEmpty(used), False
+  Report "The service tells how much is used", Not IsEmpty(used), True
   Tell "Quota", PadLeft(Grouped(most), 12) & " bytes"
   Tell "Used", PadLeft(Grouped(used), 12) & " bytes"
   Tell "Free", PadLeft(Grouped(most - used), 12) & " bytes"
@@ -233,7 +237,7 @@ Sub SecondAccount()
   Report "Log on as " & user & " again", client.LogonAs(product, user, password, mguid), True
 End Sub
 
-' --- Help ---------------------------------------------------------------------------------------------------------
+' --- Help ---------------------------------------------------------------------------------------------------
 
 ' The account's files, in a collection that the library makes; an empty one after a failure.
 Function ListFiles()

@@ -216,7 +216,7 @@ bool Connection::Send(std::string_view bytes) {
   const Fault* drip = Shown(Kind::kDrip);
   if (!drip) return SendAtOnce(bytes);
   for (std::size_t i = 0; i < bytes.size(); ++i) {
-    if (Wait(POLLRDHUP, static_cast<int>(*drip->amount)) && !IsOver()) end_ = End::kClosed;
+    if (Wait(0, static_cast<int>(*drip->amount)) && !IsOver()) end_ = End::kClosed;
     if (IsOver() || !SendAtOnce(bytes.substr(i, 1))) return false;
   }
   return true;

@@ -8,15 +8,14 @@
 #include <cctype>
 #include <charconv>
 #include <chrono>
-#include <map>
 #include <mutex>
 #include <stdexcept>
 #include <thread>
 
 #include "hosting/AcceptorRoutes.h"
+#include "hosting/Answers.h"
 #include "hosting/Connection.h"
 #include "hosting/Exchange.h"
-#include "hosting/FormBody.h"
 #include "hosting/ServicePage.h"
 #include "service/Reply.h"
 
@@ -29,7 +28,6 @@ constexpr int kIdlePatience = 10;  // seconds that a connection may stay open be
 
 constexpr std::uint64_t kMostFormBytes = std::uint64_t{1} << 20;
 constexpr std::uint64_t kMostUploadBytes = std::uint64_t{1} << 30;
-constexpr std::size_t kPictureBlock = 256 * 1024;
 
 constexpr const char* kOnlyRoute = "/";
 
@@ -37,14 +35,6 @@ std::string LowerAscii(std::string text) {
   for (char& character : text)
     character = static_cast<char>(std::tolower(static_cast<unsigned char>(character)));
   return text;
-}
-
-std::string PictureType(std::string_view name) {
-  static const std::map<std::string, std::string> types = {{"jpg", "image/jpeg"}, {"jpeg", "image/jpeg"},
-                                                           {"gif", "image/gif"},  {"png", "image/png"},
-                                                           {"bmp", "image/bmp"},  {"tif", "image/tiff"}};
-  const auto type = types.find(LowerAscii(std::string(name.substr(name.rfind('.') + 1))));
-  return type == types.end() ? "application/octet-stream" : type->second;
 }
 
 // One request while it is served.
@@ -236,7 +226,7 @@ class Server::Http : public httplib::Server {
         return;
       }
       exchange.note.result = std::to_string(*number);
-      AnswerForm(answer, {"ErrorNumber", exchange.note.result});
+      SetForm(answer, {"ErrorNumber", exchange.note.result}, exchange.faults);
     } else if (IsService()) {
       const Reply form = ReadForm(answer, reader);
       if (answer.status == 413) return;
@@ -248,7 +238,7 @@ class Server::Http : public httplib::Server {
         exchange.note.action = action;
         return;
       }
-      AnswerForm(answer, service_.Answer(action, form, exchange.head.hostName, exchange.note));
+      SetForm(answer, service_.Answer(action, form, exchange.head.hostName, exchange.note), exchange.faults);
     } else {
       answer.status = 404;
       Close();
@@ -292,73 +282,8 @@ class Server::Http : public httplib::Server {
       return;
     }
     if (segments.size() != 3 || segments[0] != "users") return;
-    auto file = std::make_shared<FileHandle>(store_.OpenPicture(segments[1], segments[2]));
-    if (!*file) return;
-    answer.status = 200;
-    const std::uint64_t size = FactsOf(*file).size;
-    if (SpoilBody(answer, {})) return;
-    const std::string type = PictureType(segments[2]);
-    if (size == 0) {  // the library takes a provider of nothing for none
-      answer.set_content("", type);
-      return;
-    }
-    answer.set_content_provider(size, type,
-                                [file](std::size_t offset, std::size_t length, httplib::DataSink& sink) {
-                                  std::string block(std::min(length, kPictureBlock), '\0');
-                                  const std::size_t got = ReadAt(*file, block.data(), block.size(), offset);
-                                  return got > 0 && sink.write(block.data(), got);
-                                });
-  }
-
-  static void AnswerForm(httplib::Response& answer, FormBody form) {
-    answer.status = 200;
-    for (const Fault& fault : currentExchange->faults)
-      if (fault.kind == Fault::Kind::kWrong) form = WrongForm(form);
-    const std::string text = form.Text();
-    if (!SpoilBody(answer, text)) answer.set_content(text, kFormType);
-  }
-
-  // Sets status and body as the faults want them; false when the body is to be what it was.
-  static bool SpoilBody(httplib::Response& answer, const std::string& text) {
-    const auto& segments = currentExchange->head.segments;
-    const bool isPicture = !segments.empty() && segments[0] == "users";
-    bool isSpoilt = false;
-    for (const Fault& fault : currentExchange->faults) {
-      switch (fault.kind) {
-        case Fault::Kind::kStatus:
-          answer.status = static_cast<int>(*fault.amount);
-          break;
-        case Fault::Kind::kEmpty:
-          answer.set_content("", kFormType);
-          isSpoilt = true;
-          break;
-        case Fault::Kind::kWrong:  // no variables in a picture
-        case Fault::Kind::kGarbage:
-          if (fault.kind == Fault::Kind::kWrong && !isPicture) break;
-          answer.set_content(GarbageBody(), kFormType);
-          isSpoilt = true;
-          break;
-        case Fault::Kind::kHuge:
-          AnswerHuge(answer, text, HugeLength(fault));
-          isSpoilt = true;
-          break;
-        default:
-          break;  // the connection shows it
-      }
-    }
-    return isSpoilt;
-  }
-
-  // A form that is right but for its size.
-  static void AnswerHuge(httplib::Response& answer, const std::string& text, std::uint64_t length) {
-    const std::string start = text + "&Filler=";
-    answer.body.clear();
-    answer.set_content_provider(
-        length, kFormType, [start](std::size_t offset, std::size_t left, httplib::DataSink& sink) {
-          std::string block = offset < start.size() ? start.substr(offset) : std::string(kPictureBlock, 'x');
-          block.resize(std::min(block.size(), left));
-          return sink.write(block.data(), block.size());
-        });
+    if (FileHandle file = store_.OpenPicture(segments[1], segments[2]))
+      SetPicture(answer, std::move(file), segments[2], exchange.faults);
   }
 
   void WriteLog(const Exchange& exchange, const Connection& connection,

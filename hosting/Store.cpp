@@ -69,7 +69,12 @@ std::string NewMguid() {
   return guid;
 }
 
-std::optional<Account> OneAccount(Statement statement) {
+std::optional<Account> FindAccount(Database& database, const char* column, std::string_view value) {
+  const std::string sql =
+      std::string("SELECT id, name, folder, password, mguid, product, created, started FROM accounts WHERE ")
+          .append(column)
+          .append(" = ?");
+  Statement statement(database, sql.c_str(), value);
   if (!statement.Step()) return std::nullopt;
   Account account;
   account.id = statement.NumberAt(0);
@@ -137,26 +142,17 @@ Store::Store(fs::path data)
 
 std::optional<Account> Store::FindByName(std::string_view name) {
   const std::lock_guard lock(mutex_);
-  return OneAccount({*database_,
-                     "SELECT id, name, folder, password, mguid, product, created, started FROM accounts"
-                     " WHERE name = ?",
-                     name});
+  return FindAccount(*database_, "name", name);
 }
 
 std::optional<Account> Store::FindByStrippedName(std::string_view stripped) {
   const std::lock_guard lock(mutex_);
-  return OneAccount({*database_,
-                     "SELECT id, name, folder, password, mguid, product, created, started FROM accounts"
-                     " WHERE stripped = ?",
-                     stripped});
+  return FindAccount(*database_, "stripped", stripped);
 }
 
 std::optional<Account> Store::FindByMguid(std::string_view mguid) {
   const std::lock_guard lock(mutex_);
-  return OneAccount({*database_,
-                     "SELECT id, name, folder, password, mguid, product, created, started FROM accounts"
-                     " WHERE mguid = ?",
-                     mguid});
+  return FindAccount(*database_, "mguid", mguid);
 }
 
 Addition Store::AddAccount(std::string_view name, std::int64_t product, std::int64_t mostAccounts,

@@ -65,7 +65,7 @@ Text CFileUpload::AskForText(TextView requestName, TextView clientAction,
                              std::initializer_list<Parameter> parameters, std::int32_t sendFlag,
                              TextView variable, TextView onFailure) {
   const Reply reply = Ask(requestName, clientAction, parameters, sendFlag);
-  return reply.ErrorOccured() == 1 ? Text(onFailure) : reply.First(variable);
+  return Text(reply.ErrorOccured() == 1 ? onFailure : reply.First(variable));
 }
 
 std::int32_t CFileUpload::AskForNumber(TextView requestName, TextView clientAction,

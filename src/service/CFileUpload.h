@@ -43,8 +43,7 @@ class CFileUpload {
   CFileUpload(const CFileUpload&) = delete;
   CFileUpload& operator=(const CFileUpload&) = delete;
 
-  // --- Session
-  // -----------------------------------------------------------------------------------------------
+  // --- Session ---
 
   // The server name as last set on this object. Setting it changes the name for the whole apartment.
   const Text& GetHTTPServer() const { return serverName_; }
@@ -77,8 +76,7 @@ class CFileUpload {
   // `szString` with "%", "+", "#" and "&" escaped, the characters that break a form value. No request.
   static Text EnCodeString(TextView szString);
 
-  // --- Files
-  // -------------------------------------------------------------------------------------------------
+  // --- Files ---
 
   // Hands a record per file of the account to `colFiles`, with the file's address as its key, in the server's
   // order. When ListIsCurrent, returns true at once without a request and hands over nothing. An error
@@ -129,8 +127,7 @@ class CFileUpload {
   // Stores the apartment's abort flag. No request.
   void AbortFileTransfer(bool bAbortStatus) { apartment_.abortTransfer = bAbortStatus; }
 
-  // --- Accounts
-  // ----------------------------------------------------------------------------------------------
+  // --- Accounts ---
 
   // Creates an account and its folder, logs the new user on and has the key mailed. Returns the new MGUID, or
   // a status as text: 1002 (no MGUID), 1003 (user exists), 1004 (failed, and the account was removed again),

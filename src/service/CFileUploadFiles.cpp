@@ -27,10 +27,9 @@ class NormalAttributes {
   const std::uint32_t saved_;
 };
 
-// `values` is null when the reply lacks the variable, which is only missed where a file needs it.
-const Text& ElementAt(const std::vector<Text>* values, std::size_t index) {
-  if (!values || index >= values->size()) throw RuntimeError(error::kSubscriptOutOfRange);
-  return (*values)[index];
+TextView ElementAt(const std::vector<TextView>& values, std::size_t index) {
+  if (index >= values.size()) throw RuntimeError(error::kSubscriptOutOfRange);
+  return values[index];
 }
 
 }  // namespace
@@ -44,17 +43,18 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
     const Reply reply = Ask(u"ListFilesRequest", u"ListFiles",
                             {{u"Username", SessionUser()}, {u"ProductID", SessionProduct()}}, 1);
     if (reply.ErrorOccured() == 1) return;
-    const std::vector<Text>* names = reply.GetValueByVariableName(u"FileName");
-    const std::vector<Text>* urls = reply.GetValueByVariableName(u"FileURL");
-    const std::vector<Text>* sizes = reply.GetValueByVariableName(u"FileSize");
-    const std::vector<Text>* dates = reply.GetValueByVariableName(u"FileDate");
-    if (!names) return;
+    const std::vector<TextView>* names = reply.GetValueByVariableName(u"FileName");
+    const std::vector<TextView>* urls = reply.GetValueByVariableName(u"FileURL");
+    const std::vector<TextView>* sizes = reply.GetValueByVariableName(u"FileSize");
+    const std::vector<TextView>* dates = reply.GetValueByVariableName(u"FileDate");
+    // An account without files has them all, empty.
+    if (!names || !urls || !sizes || !dates) return;
     for (std::size_t i = 0; i < names->size(); ++i) {
       auto file = std::make_shared<CUpload>();
       file->FileName = (*names)[i];
-      file->FilePath = ElementAt(urls, i);
-      file->FileSize = LeadingNumber(ElementAt(sizes, i));
-      file->FileDate = ElementAt(dates, i);
+      file->FilePath = ElementAt(*urls, i);
+      file->FileSize = LeadingNumber(ElementAt(*sizes, i));
+      file->FileDate = ElementAt(*dates, i);
       colFiles(file, file->FilePath);
     }
     listed = true;

@@ -15,57 +15,83 @@ int HexDigit(char digit) {
   return -1;
 }
 
-// Unescapes one name or value; nullopt when an escape is broken or the bytes are not UTF-8.
-std::optional<Text> Unescape(std::string_view escaped) {
-  std::string bytes;
-  bytes.reserve(escaped.size());
-  for (std::size_t i = 0; i < escaped.size(); ++i) {
-    if (escaped[i] == '+') {
-      bytes.push_back(' ');
-    } else if (escaped[i] != '%') {
-      bytes.push_back(escaped[i]);
-    } else {
-      if (escaped.size() - i < 3) return std::nullopt;
-      const int high = HexDigit(escaped[i + 1]);
-      const int low = HexDigit(escaped[i + 2]);
-      if (high < 0 || low < 0) return std::nullopt;
-      bytes.push_back(static_cast<char>(high * 16 + low));
-      i += 2;
+// Unescapes names and values one after the other into room that is made once.
+class Unescaper {
+ public:
+  // `texts` keeps its address; it has room for a character for each byte.
+  Unescaper(std::vector<char16_t>& texts, std::size_t bytes) : texts_(texts) { texts_.reserve(bytes); }
+
+  // nullopt when an escape is broken or the bytes are not UTF-8.
+  std::optional<TextView> Unescape(std::string_view escaped) {
+    const std::size_t begin = texts_.size();
+    bool ascii = true;
+    for (std::size_t i = 0; i < escaped.size(); ++i) {
+      int byte = static_cast<unsigned char>(escaped[i]);
+      if (byte == '+') {
+        byte = ' ';
+      } else if (byte == '%') {
+        if (escaped.size() - i < 3) return std::nullopt;
+        const int high = HexDigit(escaped[i + 1]);
+        const int low = HexDigit(escaped[i + 2]);
+        if (high < 0 || low < 0) return std::nullopt;
+        byte = high * 16 + low;
+        i += 2;
+      }
+      ascii = ascii && byte < 0x80;
+      texts_.push_back(static_cast<char16_t>(byte));
     }
+    if (!ascii) {
+      const std::string bytes(texts_.begin() + static_cast<std::ptrdiff_t>(begin), texts_.end());
+      const std::optional<Text> text = TextFromUtf8(bytes);
+      if (!text) return std::nullopt;
+      // Never longer than the bytes were.
+      texts_.resize(begin);
+      texts_.insert(texts_.end(), text->begin(), text->end());
+    }
+    return TextView(texts_.data() + begin, texts_.size() - begin);
   }
-  return TextFromUtf8(bytes);
-}
+
+ private:
+  std::vector<char16_t>& texts_;
+};
 
 }  // namespace
 
 Reply Reply::FromBody(std::string_view body) {
   if (body.ends_with("\r\n")) body.remove_suffix(2);
   Reply reply;
+  Unescaper unescaper(reply.texts_, body.size());
+  // Arrays come in a row, so the name seldom changes.
+  std::string_view lastName;
+  std::vector<TextView>* values = nullptr;
   while (!body.empty()) {
     const std::string_view piece = body.substr(0, body.find('&'));
     body.remove_prefix(std::min(piece.size() + 1, body.size()));
     if (piece.empty()) continue;
     const std::size_t equals = piece.find('=');
-    const std::optional<Text> name = Unescape(piece.substr(0, equals));
-    if (!name) return {};
-    std::vector<Text>& values = reply.variables_[*name];
+    if (const std::string_view name = piece.substr(0, equals); !values || name != lastName) {
+      const std::optional<TextView> variable = unescaper.Unescape(name);
+      if (!variable) return {};
+      values = &reply.variables_[*variable];
+      lastName = name;
+    }
     if (equals == std::string_view::npos) continue;
-    std::optional<Text> value = Unescape(piece.substr(equals + 1));
+    const std::optional<TextView> value = unescaper.Unescape(piece.substr(equals + 1));
     if (!value) return {};
-    values.push_back(*std::move(value));
+    values->push_back(*value);
   }
   const auto error = reply.variables_.find(u"ErrorOccured");
   reply.failed_ = error != reply.variables_.end() && !error->second.empty() && error->second.front() == u"1";
   return reply;
 }
 
-const std::vector<Text>* Reply::GetValueByVariableName(TextView name) const {
-  const auto variable = variables_.find(Text(name));
+const std::vector<TextView>* Reply::GetValueByVariableName(TextView name) const {
+  const auto variable = variables_.find(name);
   return variable == variables_.end() ? nullptr : &variable->second;
 }
 
-const Text& Reply::First(TextView name) const {
-  const std::vector<Text>* values = GetValueByVariableName(name);
+TextView Reply::First(TextView name) const {
+  const std::vector<TextView>* values = GetValueByVariableName(name);
   if (!values || values->empty()) throw RuntimeError(error::kSubscriptOutOfRange);
   return values->front();
 }

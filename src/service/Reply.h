@@ -15,6 +15,8 @@ class Reply {
  public:
   // A failed exchange without variables.
   Reply() = default;
+  Reply(Reply&&) = default;
+  Reply& operator=(Reply&&) = default;
 
   // Reads an `application/x-www-form-urlencoded` body in UTF-8. A broken escape or invalid UTF-8 anywhere
   // makes the exchange a failed one, as does a variable ErrorOccured of 1.
@@ -25,13 +27,15 @@ class Reply {
 
   // Every value that the server sent under `name` (letter case counts), in its order; a bare name has none.
   // Null when the name did not occur. Owned by the reply.
-  const std::vector<Text>* GetValueByVariableName(TextView name) const;
+  const std::vector<TextView>* GetValueByVariableName(TextView name) const;
 
   // Element 0 of the above. Throws run-time error 9 when there is none.
-  const Text& First(TextView name) const;
+  TextView First(TextView name) const;
 
  private:
-  std::unordered_map<Text, std::vector<Text>> variables_;
+  // All texts in one piece, which the views below point into: a listing has four of them for each file.
+  std::vector<char16_t> texts_;
+  std::unordered_map<TextView, std::vector<TextView>> variables_;
   bool failed_ = true;
 };
 

@@ -36,6 +36,11 @@ Text StripToAlphabet(TextView value) {
 }
 
 Text ApplyCipher(Text& value) {
+  value = EncryptParameter(value);
+  return value;
+}
+
+Text EncryptParameter(TextView value) {
   Text text = StripToAlphabet(value);
   std::size_t keyIndex = text.size() % kKey.size();
   for (char16_t& character : text) {
@@ -44,13 +49,7 @@ Text ApplyCipher(Text& value) {
     character = kAlphabet[(kAlphabet.size() - shifted) % kAlphabet.size()];
     keyIndex = (keyIndex + 1) % kKey.size();
   }
-  value = text;
   return text;
-}
-
-Text EncryptParameter(TextView value) {
-  Text copy(value);
-  return ApplyCipher(copy);
 }
 
 }  // namespace tarnwick

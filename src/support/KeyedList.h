@@ -3,10 +3,11 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <unordered_set>
+#include <memory>
 #include <utility>
 #include <vector>
 
+#include "support/KeyIndex.h"
 #include "support/RuntimeError.h"
 #include "support/Text.h"
 
@@ -25,9 +26,11 @@ class KeyedList {
   // Puts the item at `position` (1 to Count() + 1). Throws 9 for another position, 457 like Add.
   void Insert(std::size_t position, Item item, TextView key = {}) {
     if (position < 1 || position > Count() + 1) throw RuntimeError(error::kSubscriptOutOfRange);
-    if (!key.empty() && !keys_.emplace(key).second) throw RuntimeError(error::kDuplicateKey);
-    entries_.insert(entries_.begin() + static_cast<std::ptrdiff_t>(position - 1),
-                    Entry{std::move(item), Text(key)});
+    if (!key.empty() && keys_.Find(key)) throw RuntimeError(error::kDuplicateKey);
+    if (!key.empty()) keys_.MakeRoom();
+    const auto place = entries_.begin() + static_cast<std::ptrdiff_t>(position - 1);
+    const auto entry = entries_.insert(place, std::make_unique<Entry>(Entry{std::move(item), Text(key)}));
+    if (!key.empty()) keys_.Add(entry->get());
   }
 
   // Throws 9 when `position` is not 1 to Count().
@@ -35,9 +38,10 @@ class KeyedList {
 
   // Position of the item with that key, 0 when there is none.
   std::size_t PositionOf(TextView key) const {
-    if (key.empty() || !keys_.contains(Text(key))) return 0;
+    const Entry* found = key.empty() ? nullptr : keys_.Find(key);
+    if (!found) return 0;
     for (std::size_t i = 0; i < entries_.size(); ++i)
-      if (entries_[i].key == key) return i + 1;
+      if (entries_[i].get() == found) return i + 1;
     return 0;
   }
 
@@ -46,16 +50,17 @@ class KeyedList {
 
   // Removes an item and returns it. Throws 9 like At.
   Item Take(std::size_t position) {
-    keys_.erase(EntryAt(position).key);
+    const Entry& gone = EntryAt(position);
+    if (!gone.key.empty()) keys_.Remove(&gone);
     const auto entry = entries_.begin() + static_cast<std::ptrdiff_t>(position - 1);
-    Item item = std::move(entry->item);
+    Item item = std::move((*entry)->item);
     entries_.erase(entry);
     return item;
   }
 
   void Clear() {
+    keys_ = {};
     entries_.clear();
-    keys_.clear();
   }
 
  private:
@@ -66,11 +71,11 @@ class KeyedList {
 
   const Entry& EntryAt(std::size_t position) const {
     if (position < 1 || position > Count()) throw RuntimeError(error::kSubscriptOutOfRange);
-    return entries_[position - 1];
+    return *entries_[position - 1];
   }
 
-  std::vector<Entry> entries_;
-  std::unordered_set<Text> keys_;
+  std::vector<std::unique_ptr<Entry>> entries_;
+  KeyIndex<Entry> keys_;
 };
 
 }  // namespace tarnwick

@@ -16,7 +16,7 @@ bool RemoveFirst(FileList& list, MessagePump& pump, TextView name, bool yieldPer
     if (Trim(record->FileName) != name) continue;
     pump.Yield();
     // The list may have moved while messages were handled; what goes is the record that matched.
-    for (std::size_t at = std::min(i, list.Count()); at >= 1; --at) {
+    for (std::size_t at = 1; at <= list.Count(); ++at) {
       if (list.At(at) != record) continue;
       list.Remove(at);
       break;

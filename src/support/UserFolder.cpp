@@ -24,6 +24,8 @@ void PrepareUserFolder(Apartment& apartment) noexcept {
   ResultAsItStood(0, [&](int&) {
     FileSystem& files = apartment.platform.files;
     Text path = GetTempFolder(files);
+    // Without one the folder would come to lie in the root of whatever drive is current.
+    if (path.empty()) return;
     if (path.ends_with(u'\\')) path.pop_back();
     path += u"\\bv";
     EnsureFolder(files, path);

@@ -121,8 +121,7 @@ TEST_F(CFileUploadTest, RegistrationRestoresAttributesOnEveryWayOut) {
   EXPECT_EQ(fake.http.sent.size(), 3U);
 }
 
-// --- Accounts
-// ------------------------------------------------------------------------------------------------
+// --- Accounts ---
 
 struct Transcript {
   std::vector<const char*> answers;
@@ -231,8 +230,7 @@ TEST_F(CFileUploadTest, DeleteUserBranches) {
   }
 }
 
-// --- FTP
-// -----------------------------------------------------------------------------------------------------
+// --- FTP ---
 
 TEST_F(CFileUploadTest, FtpSessionInOrder) {
   ASSERT_TRUE(Logon(u"u"));

@@ -36,8 +36,7 @@ CFileUploadObject::~CFileUploadObject() {
   LetGoOfApartment();
 }
 
-// --- Session
-// -------------------------------------------------------------------------------------------------------
+// --- Session ---
 
 STDMETHODIMP CFileUploadObject::get_HTTPServer(BSTR* value) {
   return GetText(client_.GetHTTPServer(), value);
@@ -109,8 +108,7 @@ STDMETHODIMP CFileUploadObject::EnCodeString(BSTR szString, BSTR* result) {
   return AnsweredText(result, [&] { return CFileUpload::EnCodeString(ViewOf(szString)); });
 }
 
-// --- Files
-// ---------------------------------------------------------------------------------------------------------
+// --- Files ---
 
 STDMETHODIMP CFileUploadObject::ListFilesForUser(IDispatch** colFiles, VARIANT_BOOL* result) {
   return AnsweredBoolean(result, [&] {
@@ -204,8 +202,7 @@ STDMETHODIMP CFileUploadObject::AbortFileTransfer(VARIANT* bAbortStatus, VARIANT
   });
 }
 
-// --- Accounts
-// ------------------------------------------------------------------------------------------------------
+// --- Accounts ---
 
 STDMETHODIMP CFileUploadObject::AddUser(BSTR ProductID, BSTR Username, VARIANT GUID, BSTR* result) {
   return AnsweredText(

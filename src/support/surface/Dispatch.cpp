@@ -104,8 +104,8 @@ void MakeReference(VARIANT& reference, VARIANT& target) {
   V_BYREF(&reference) = &V_NONE(&target);
 }
 
-// Hands a value that the member changed to the caller's variable; the type of a stand-in never changes. What stayed as it was is not written, so
-// that the variable keeps its own type.
+// Hands a value that the member changed to the caller's variable; the type of a stand-in never changes. What
+// stayed as it was is not written, so that the variable keeps its own type.
 void HandBack(StandIn& standIn) {
   if (!standIn.receiver || V_I8(&standIn.before) == V_I8(&standIn.value.Get())) return;
   VariantClear(standIn.receiver);
