@@ -93,7 +93,7 @@ double CipherRun(std::size_t length) {
   Text text;
   for (std::size_t i = 0; i < length; ++i) text.push_back(kUnits[i % kUnits.size()]);
   // Short texts are repeated, so that the clock's grain does not count.
-  const std::size_t repeats = std::max<std::size_t>(1, 1'000'000 / length);
+  const std::size_t repeats = 1 + 1'000'000 / std::max<std::size_t>(1, length);
   std::size_t kept = 0;
   const double seconds = Seconds([&] {
     for (std::size_t i = 0; i < repeats; ++i) kept += EncryptParameter(text).size();

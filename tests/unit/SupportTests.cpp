@@ -123,10 +123,7 @@ TEST(CRegistry, OddRules) {
     EXPECT_EQ(type, query.typeAfter) << Utf8FromText(query.name) << " as " << query.type;
   }
   const int opened = registry.opened;
-  for (std::uint32_t other : {3U, 5U, 0xFFFFFFFFU}) {
-    EXPECT_EQ(reader.getRegSetting(u"s", u"C", other), u"");
-    type = 0;
-  }
+  for (std::uint32_t other : {3U, 5U, 0xFFFFFFFFU}) EXPECT_EQ(reader.getRegSetting(u"s", u"C", other), u"");
   EXPECT_EQ(registry.opened, opened);
 }
 
