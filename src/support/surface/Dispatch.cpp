@@ -67,13 +67,22 @@ UINT ParameterIndex(const DISPPARAMS& arguments, UINT i) {
   return name == DISPID_PROPERTYPUT ? 0 : static_cast<UINT>(name);
 }
 
+// What scripts pass for an object that is none.
+bool MeansNoObject(const VARIANT& argument) {
+  return V_VT(&argument) == VT_EMPTY || V_VT(&argument) == VT_NULL;
+}
+
+void MakeNoObject(VARIANT& value) {
+  V_VT(&value) = VT_DISPATCH;
+  V_DISPATCH(&value) = nullptr;
+}
+
 bool IsOmitted(const VARIANT& argument) {
   return V_VT(&argument) == VT_ERROR && V_ERROR(&argument) == DISP_E_PARAMNOTFOUND;
 }
 
 // A value of a parameter's type that stands in for an argument of another type during a call.
 struct StandIn {
-  UINT index = 0;
   // Where the changed value goes; null when nobody receives it.
   VARIANT* receiver = nullptr;
   Variant value;
@@ -86,10 +95,8 @@ HRESULT Convert(const VARIANT& argument, VARTYPE type, StandIn& standIn) {
   const VARIANT& source = isVariantReference ? *V_VARIANTREF(&argument) : argument;
   if (isVariantReference) standIn.receiver = V_VARIANTREF(&argument);
   VARIANT& value = standIn.value.Get();
-  if (type == VT_DISPATCH && (V_VT(&source) == VT_EMPTY || V_VT(&source) == VT_NULL)) {
-    // A script's fresh variable: no object yet.
-    V_VT(&value) = VT_DISPATCH;
-    V_DISPATCH(&value) = nullptr;
+  if (type == VT_DISPATCH && MeansNoObject(source)) {
+    MakeNoObject(value);
   } else {
     const HRESULT result = VariantChangeType(&value, const_cast<VARIANT*>(&source), 0, type);
     if (FAILED(result)) return result == E_OUTOFMEMORY ? result : DISP_E_TYPEMISMATCH;
@@ -125,6 +132,7 @@ HRESULT InvokeMember(ITypeInfo& description, void* object, DISPID member, WORD f
     standIns.reserve(values.size());
     for (UINT i = 0; i < values.size(); ++i) {
       const VARTYPE type = known.ParameterType(ParameterIndex(*arguments, i));
+      if (type == VT_DISPATCH && MeansNoObject(values[i])) MakeNoObject(values[i]);
       if (!(type & VT_BYREF) || V_VT(&values[i]) == type || IsOmitted(values[i])) continue;
       if (type == (VT_VARIANT | VT_BYREF)) {
         V_VT(&values[i]) = type;
@@ -132,7 +140,6 @@ HRESULT InvokeMember(ITypeInfo& description, void* object, DISPID member, WORD f
         continue;
       }
       StandIn& standIn = standIns.emplace_back();
-      standIn.index = i;
       const HRESULT converted = Convert(values[i], type & ~VT_BYREF, standIn);
       if (FAILED(converted)) {
         if (argumentError) *argumentError = i;
