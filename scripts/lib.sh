@@ -133,7 +133,8 @@ in_wine32() {
 wine_command() {
   local arch=$1
   shift
-  local settings=(WINEDEBUG=-all "WINEPREFIX=$wine_home/$arch" "WINEDLLOVERRIDES=mscoree,mshtml=" "DISPLAY=${DISPLAY-}"
+  # The locale decides which file names Wine can make.
+  local settings=(LC_ALL=C.UTF-8 WINEDEBUG=-all "WINEPREFIX=$wine_home/$arch" "WINEDLLOVERRIDES=mscoree,mshtml=" "DISPLAY=${DISPLAY-}"
     "${wine_environment[@]}")
   case $arch in
     x64) timeout -k 10 "$wine_limit" env "${settings[@]}" WINEARCH=win64 "$@" </dev/null ;;
