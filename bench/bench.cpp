@@ -17,61 +17,16 @@
 #include <malloc.h>
 #endif
 
-#include "platform/FileSystem.h"
-#include "platform/HttpTransport.h"
-#include "platform/Internet.h"
-#include "platform/Platform.h"
-#include "platform/Registry.h"
-#include "platform/StringResources.h"
+#include "fakes/FakePlatform.h"
 #include "service/CFileUpload.h"
 #include "service/modEnctyption.h"
 #include "support/Apartment.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {
 
 constexpr double kLimit = 1.20;
 constexpr int kRuns = 15;
-
-// --- A platform that has nothing but one reply ---
-
-struct OneReply : HttpTransport {
-  std::string body;
-  std::optional<HttpAnswer> Post(const HttpPost&, std::size_t) override {
-    return HttpAnswer{200, std::move(body)};
-  }
-};
-
-struct NoRegistry : Registry {
-  std::uint32_t Open(std::uint32_t, TextView, std::unique_ptr<RegistryKey>&) override { return 2; }
-  Text TextFromAnsi(std::string_view) const override { return {}; }
-};
-
-struct NoInternet : Internet {
-  std::unique_ptr<InternetSession> Open(TextView) override { return nullptr; }
-};
-
-struct NoFiles : FileSystem {
-  [[noreturn]] static void Fail() { throw RuntimeError(error::kFileNotFound); }
-  std::uint64_t Length(TextView) override { Fail(); }
-  Text ModifiedText(TextView) override { Fail(); }
-  std::uint32_t Attributes(TextView) override { Fail(); }
-  void SetAttributes(TextView, std::uint32_t) override { Fail(); }
-  void Copy(TextView, TextView) override { Fail(); }
-  Text FirstName(TextView, bool) override { return {}; }
-  void MakeFolder(TextView) override { Fail(); }
-  Text TempPath() override { return {}; }
-};
-
-struct NoStrings : StringResources {
-  std::unique_ptr<ResourceLibrary> Load(TextView) override { return nullptr; }
-  Text OwnString(std::uint16_t) override { return {}; }
-};
-
-struct NoPump : MessagePump {
-  void Yield() override {}
-};
 
 // --- What is measured ---
 
@@ -122,15 +77,10 @@ std::string ListingReply(std::size_t files) {
 
 // Seconds from the reply's bytes to records in a list with keys.
 double ListingRun(const std::string& reply, std::size_t files) {
-  NoRegistry registry;
-  OneReply http;
-  NoInternet internet;
-  NoFiles noFiles;
-  NoStrings strings;
-  NoPump pump;
-  Apartment apartment(Platform{registry, http, internet, noFiles, strings, pump});
-  apartment.session.serverName = u"127.0.0.1";
-  http.body = reply;
+  FakePlatform platform;
+  platform.apartment.session.serverName = u"127.0.0.1";
+  platform.http.answers.push_back(HttpAnswer{200, reply});
+  Apartment& apartment = platform.apartment;
   CFileUpload client(apartment);
 #ifdef __GLIBC__
   // Fresh memory, as for the first listing of a host; else the heap that the run before left is measured too.

@@ -1,10 +1,10 @@
 #include "hosting/AcceptorRoutes.h"
 
-#include <algorithm>
 #include <array>
-#include <map>
+#include <memory>
+#include <string>
+#include <vector>
 
-#include "hosting/Names.h"
 #include "support/RuntimeError.h"
 #include "transfer/AcceptorPages.h"
 
@@ -15,6 +15,7 @@ constexpr std::int32_t kNothingChanged = -2147220891;
 constexpr std::int32_t kNameRefused = -2147220881;  // or taken, or the quota exceeded
 constexpr std::int32_t kFileNotThere = -2147220880;
 
+// Of an upload. Who may upload is known before the first byte of the file.
 constexpr std::array<std::string_view, 6> kUploadFields = {"UsersBaseUrl", "Flag",      "User",
                                                            "Password",     "ProductID", "File"};
 constexpr std::size_t kUser = 2;
@@ -41,109 +42,113 @@ std::int32_t NumberOf(Change change) {
   return kFileNotThere;
 }
 
+std::optional<Account> Admit(Store& store, std::string_view user, std::string_view password,
+                             std::string_view product, LogNote& note) {
+  note.user = user;
+  if (LowerCase(TextFromUtf8(product).value_or(Text())) != LowerCase(kProductGuid)) return std::nullopt;
+  auto account = store.FindByName(user);
+  if (!account || account->password != password) return std::nullopt;
+  return account;
+}
+
+// One upload as its parts arrive.
+class Upload {
+ public:
+  Upload(Store& store, std::uint64_t quota, LogNote& note) : store_(store), quota_(quota), note_(note) {}
+
+  // The next part. False when it is not the one that belongs there.
+  bool Begin(const httplib::MultipartFormData& part) {
+    if (fields_.size() == kUploadFields.size() || part.name != kUploadFields[fields_.size()]) return false;
+    fields_.emplace_back();
+    if (fields_.size() <= kFile) return true;
+    fields_[kFile] = part.filename;
+    for (const std::string& field : fields_)
+      if (!TextFromUtf8(field)) return false;
+    account_ = Admit(store_, fields_[kUser], fields_[kPassword], fields_[kProduct], note_);
+    if (account_)
+      bytes_ = store_.BeginUpload();
+    else
+      refusal_ = acceptor::kRefused;
+    return true;
+  }
+
+  // The next bytes of the part.
+  bool Take(std::string_view bytes) {
+    if (fields_.size() <= kFile) {
+      fields_.back().append(bytes);
+      return fields_.back().size() <= kLongestField;
+    }
+    // What is refused anyway is read to its end, since clients send all before they listen, but not kept.
+    if (refusal_ != 0) return true;
+    if (bytes.size() > quota_ - bytes_->Size()) {
+      refusal_ = kNameRefused;
+      bytes_.reset();
+      return true;
+    }
+    bytes_->Append(bytes);
+    return true;
+  }
+
+  // After the last byte.
+  ErrorNumber Finish() {
+    if (fields_.size() <= kFile) return std::nullopt;
+    if (refusal_ != 0) return refusal_;
+    return NumberOf(store_.FinishUpload(*account_, fields_[kFile], quota_, *bytes_));
+  }
+
+ private:
+  Store& store_;
+  std::uint64_t quota_;
+  LogNote& note_;
+  std::vector<std::string> fields_;  // the last one is the name of the file
+  std::int32_t refusal_ = 0;
+  std::optional<Account> account_;
+  std::unique_ptr<TemporaryFile> bytes_;
+};
+
 }  // namespace
 
-bool AcceptorRoutes::IsForm(std::string_view page) {
+bool IsFormPage(std::string_view page) {
   return page == "DeleteAcceptor.asp" || page == "RenameAcceptor.asp" || page == "CreateFolderAcceptor.asp" ||
          page == "DeleteFolderAcceptor.asp";
 }
 
-ErrorNumber AcceptorRoutes::Answer(std::string_view page, const Reply& form, LogNote& note) {
+ErrorNumber AnswerFormPage(Store& store, std::string_view page, const Reply& form, LogNote& note) {
   if (form.ErrorOccured() == 1) return std::nullopt;
   try {
     const auto value = [&](TextView name) { return Utf8FromText(form.First(name)); };
     value(u"UsersBaseUrl");
-    const auto account = Admit(value(u"User"), value(u"Password"), value(u"ProductID"), note);
+    const auto account = Admit(store, value(u"User"), value(u"Password"), value(u"ProductID"), note);
     if (page == "DeleteAcceptor.asp") {
       const std::string name = value(u"FileName");
-      return account ? NumberOf(store_.DeleteFile(*account, name, true)) : acceptor::kRefused;
+      return account ? NumberOf(store.DeleteFile(*account, name, true)) : acceptor::kRefused;
     }
     if (page == "RenameAcceptor.asp") {
       const std::string oldName = value(u"OldFileName");
       const std::string newName = value(u"NewFileName");
       if (!account) return acceptor::kRefused;
-      const Change change = store_.RenameFile(*account, oldName, newName);
+      const Change change = store.RenameFile(*account, oldName, newName);
       return NumberOf(change == Change::kUnchanged ? Change::kNotThere : change);
     }
     const bool creates = page == "CreateFolderAcceptor.asp";
     if (value(u"Action") != (creates ? "5" : "6")) return std::nullopt;
     const std::string folder = value(u"Folder");
     if (!account || folder != account->folder) return acceptor::kRefused;
-    return NumberOf(creates ? store_.CreateFolder(*account) : store_.DeleteFolder(*account));
+    return NumberOf(creates ? store.CreateFolder(*account) : store.DeleteFolder(*account));
   } catch (const RuntimeError&) {
     return std::nullopt;  // a field is missing
   }
 }
 
-std::optional<Account> AcceptorRoutes::Admit(std::string_view user, std::string_view password,
-                                             std::string_view product, LogNote& note) {
-  note.user = user;
-  if (LowerCase(TextFromUtf8(product).value_or(Text())) != LowerCase(kProductGuid)) return std::nullopt;
-  auto account = store_.FindByName(user);
-  if (!account || account->password != password) return std::nullopt;
-  return account;
-}
-
-UploadRequest::UploadRequest(AcceptorRoutes& routes, std::string_view contentType, LogNote& note)
-    : routes_(routes), note_(note) {
-  if (const auto boundary = MultipartReader::BoundaryOf(contentType))
-    reader_.emplace(
-        *boundary, [this](const MultipartReader::Part& part) { return BeginPart(part); },
-        [this](std::string_view bytes) { return TakeContent(bytes); });
-}
-
-bool UploadRequest::Take(std::string_view bytes) {
-  return reader_ && reader_->Take(bytes);
-}
-
-ErrorNumber UploadRequest::Finish() {
-  if (!reader_ || !reader_->IsComplete() || !hasFile_) return std::nullopt;
-  if (!TextFromUtf8(fileName_)) return std::nullopt;
-  if (refusal_ != 0) return refusal_;
-  return NumberOf(routes_.store_.FinishUpload(*account_, fileName_, routes_.options_.quota, *bytes_));
-}
-
-bool UploadRequest::BeginPart(const MultipartReader::Part& part) {
-  // The order is fixed, so that who may upload is known before the first byte of the file.
-  if (hasFile_ || part.name != kUploadFields[fields_.size()]) return false;
-  if (fields_.size() < kFile) {
-    fields_.emplace_back();
-    return true;
-  }
-  if (!part.fileName) return false;
-  if (std::any_of(fields_.begin(), fields_.end(),
-                  [](const std::string& field) { return !TextFromUtf8(field); }))
-    return false;
-  hasFile_ = true;
-  fileName_ = *part.fileName;
-  account_ = routes_.Admit(fields_[kUser], fields_[kPassword], fields_[kProduct], note_);
-  if (!account_) {
-    refusal_ = acceptor::kRefused;
-  } else if (!routes_.store_.HasFolder(*account_)) {
-    refusal_ = acceptor::kFolderState;
-  } else if (IsRefusedFileName(fileName_)) {
-    refusal_ = kNameRefused;
-  } else {
-    room_ = routes_.store_.RoomFor(*account_, fileName_, routes_.options_.quota);
-    bytes_ = routes_.store_.BeginUpload();
-  }
-  return true;
-}
-
-bool UploadRequest::TakeContent(std::string_view bytes) {
-  if (!hasFile_) {
-    fields_.back().append(bytes);
-    return fields_.back().size() <= kLongestField;
-  }
-  // What is refused anyway is read to its end, since clients send all before they listen, but not kept.
-  if (refusal_ != 0) return true;
-  if (bytes.size() > room_ - bytes_->Size()) {
-    refusal_ = kNameRefused;
-    bytes_.reset();
-    return true;
-  }
-  bytes_->Append(bytes);
-  return true;
+ErrorNumber TakeUpload(Store& store, std::uint64_t quota, const httplib::Request& request,
+                       const httplib::ContentReader& reader, LogNote& note) {
+  if (!request.is_multipart_form_data()) return std::nullopt;
+  Upload upload(store, quota, note);
+  const bool isWhole = reader([&](const httplib::MultipartFormData& part) { return upload.Begin(part); },
+                              [&](const char* bytes, std::size_t size) {
+                                return upload.Take({bytes, size});
+                              });
+  return isWhole ? upload.Finish() : std::nullopt;
 }
 
 }  // namespace tarnwick::hosting

@@ -13,6 +13,10 @@ namespace {
 using Kind = Fault::Kind;
 
 constexpr std::size_t kBlock = 256 * 1024;
+constexpr std::uint64_t kHugeBytes = (std::uint64_t{64} << 20) + 4096;
+
+// Broken escapes, bytes that are no UTF-8, names without text.
+constexpr const char* kGarbage = "%zz=%&%E9%4=\xFF\xC0&=&\x01\x7F\x80;\n\xFE&ErrorNumber=&%";
 
 std::string PictureType(std::string_view name) {
   static const std::map<std::string, std::string> types = {{"jpg", "image/jpeg"}, {"jpeg", "image/jpeg"},
@@ -46,9 +50,9 @@ bool Spoil(httplib::Response& answer, const std::string& text, const std::vector
     if (fault.kind == Kind::kEmpty)
       answer.set_content("", kFormType);
     else if (fault.kind == Kind::kGarbage)
-      answer.set_content(GarbageBody(), kFormType);
+      answer.set_content(kGarbage, kFormType);
     else if (fault.kind == Kind::kHuge)
-      SetHuge(answer, text, HugeLength(fault));
+      SetHuge(answer, text, fault.amount.value_or(kHugeBytes));
     else
       continue;
     isSpoilt = true;
@@ -70,7 +74,7 @@ void SetPicture(httplib::Response& answer, FileHandle file, std::string_view nam
                 const std::vector<Fault>& faults) {
   answer.status = 200;
   if (Spoil(answer, {}, faults)) return;
-  const std::uint64_t size = FactsOf(file).size;
+  const std::uint64_t size = SizeOf(file);
   if (size == 0) {  // the library takes a provider of nothing for none
     answer.set_content("", PictureType(name));
     return;

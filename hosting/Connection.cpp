@@ -1,6 +1,5 @@
 #include "hosting/Connection.h"
 
-#include <arpa/inet.h>
 #include <netinet/in.h>
 #include <netinet/tcp.h>
 #include <poll.h>
@@ -45,22 +44,6 @@ void ReplaceLength(std::string& head, std::uint64_t length) {
   if (at == std::string::npos) return;
   const std::size_t digits = at + kLengthName.size();
   head.replace(digits, head.find("\r\n", digits) - digits, std::to_string(length));
-}
-
-void AddressOf(const sockaddr_storage& address, std::string& ip, int& port) {
-  std::array<char, INET6_ADDRSTRLEN> text{};
-  if (address.ss_family == AF_INET) {
-    sockaddr_in four{};
-    std::memcpy(&four, &address, sizeof four);
-    inet_ntop(AF_INET, &four.sin_addr, text.data(), text.size());
-    port = ntohs(four.sin_port);
-  } else if (address.ss_family == AF_INET6) {
-    sockaddr_in6 six{};
-    std::memcpy(&six, &address, sizeof six);
-    inet_ntop(AF_INET6, &six.sin6_addr, text.data(), text.size());
-    port = ntohs(six.sin6_port);
-  }
-  ip = text.data();
 }
 
 }  // namespace
@@ -136,30 +119,12 @@ ssize_t Connection::write(const char* bytes, size_t size) {
   return isSent ? static_cast<ssize_t>(size) : -1;
 }
 
-void Connection::get_remote_ip_and_port(std::string& ip, int& port) const {
-  sockaddr_storage address{};
-  socklen_t size = sizeof address;
-  if (getpeername(socket_, reinterpret_cast<sockaddr*>(&address), &size) == 0) AddressOf(address, ip, port);
-}
-
-void Connection::get_local_ip_and_port(std::string& ip, int& port) const {
-  sockaddr_storage address{};
-  socklen_t size = sizeof address;
-  if (getsockname(socket_, reinterpret_cast<sockaddr*>(&address), &size) == 0) AddressOf(address, ip, port);
-}
-
 // Waits until the socket is ready (a lost connection is too). False after the time or when the server stops.
 bool Connection::Wait(short events, int milliseconds) {
   std::array<pollfd, 2> watched{pollfd{socket_, events, 0}, pollfd{stopEvent_, POLLIN, 0}};
-  const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(milliseconds);
   int ready = 0;
-  int left = milliseconds;
   do {
-    ready = poll(watched.data(), watched.size(), left);
-    if (milliseconds >= 0)
-      left = static_cast<int>(std::max<std::int64_t>(0, std::chrono::duration_cast<std::chrono::milliseconds>(
-                                                            deadline - std::chrono::steady_clock::now())
-                                                            .count()));
+    ready = poll(watched.data(), watched.size(), milliseconds);
   } while (ready < 0 && errno == EINTR);
   if (watched[1].revents != 0) {
     end_ = End::kLost;

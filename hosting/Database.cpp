@@ -70,18 +70,4 @@ std::int64_t Statement::NumberAt(int column) const {
   return sqlite3_column_int64(statement_.get(), column);
 }
 
-Transaction::~Transaction() {
-  if (!open_) return;
-  try {
-    database_.Run("ROLLBACK");
-  } catch (const std::runtime_error&) {
-    // SQLite has rolled back by itself.
-  }
-}
-
-void Transaction::Commit() {
-  database_.Run("COMMIT");
-  open_ = false;
-}
-
 }  // namespace tarnwick::hosting

@@ -64,19 +64,4 @@ void Execute(Database& database, const char* sql, const Values&... values) {
   Statement(database, sql, values...).Step();
 }
 
-// Takes back on destruction what was not committed.
-class Transaction {
- public:
-  explicit Transaction(Database& database) : database_(database) { database_.Run("BEGIN IMMEDIATE"); }
-  Transaction(const Transaction&) = delete;
-  Transaction& operator=(const Transaction&) = delete;
-  ~Transaction();
-
-  void Commit();
-
- private:
-  Database& database_;
-  bool open_ = true;
-};
-
 }  // namespace tarnwick::hosting

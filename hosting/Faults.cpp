@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <charconv>
 #include <iterator>
-#include <random>
 
 namespace tarnwick::hosting {
 namespace {
@@ -106,18 +105,6 @@ FormBody WrongForm(const FormBody& form) {
       wrong.Add(name, std::vector<std::string>(values.begin(), std::prev(values.end())));
   }
   return wrong;
-}
-
-std::string GarbageBody() {
-  // The same every time, so that a failure seen once is seen again.
-  std::minstd_rand numbers(1);
-  std::string body = "%zz=%&%E9%4=\xFF\xC0&=&ErrorNumber=&";
-  for (int i = 0; i < 512; ++i) body += static_cast<char>(numbers() & 0xFF);
-  return body + "%";
-}
-
-std::uint64_t HugeLength(const Fault& fault) {
-  return fault.amount.value_or((std::uint64_t{64} << 20) + 4096);
 }
 
 }  // namespace tarnwick::hosting

@@ -2,7 +2,6 @@
 // a fault says otherwise the request is carried out and only its answer is spoilt.
 #pragma once
 
-#include <chrono>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -44,11 +43,7 @@ std::vector<Fault> FaultsForPath(const std::vector<Fault>& faults, std::string_v
 // Those for an action word.
 std::vector<Fault> FaultsForAction(const std::vector<Fault>& faults, std::string_view action);
 
-// What kWrong and kGarbage answer instead of `form`.
+// What kWrong answers instead of `form`.
 FormBody WrongForm(const FormBody& form);
-std::string GarbageBody();
-
-// Body length of kHuge.
-std::uint64_t HugeLength(const Fault& fault);
 
 }  // namespace tarnwick::hosting

@@ -44,15 +44,14 @@ void TemporaryFile::Append(std::string_view bytes) {
   }
 }
 
-FileFacts TemporaryFile::Sync() {
+void TemporaryFile::Sync() {
   if (fsync(file_.Get()) != 0) ThrowLastError(path_);
-  return FactsOf(file_);
 }
 
 bool TemporaryFile::HasBytesOf(const std::filesystem::path& other) const {
   const FileHandle first = OpenRegularFile(path_);
   const FileHandle second = OpenRegularFile(other);
-  if (!first || !second) return false;
+  if (!first || !second || SizeOf(second) != size_) return false;
   std::vector<char> left(kBlock);
   std::vector<char> right(kBlock);
   for (std::uint64_t offset = 0;; offset += kBlock) {
@@ -74,11 +73,6 @@ void SyncFolder(const std::filesystem::path& folder) {
   if (!handle || fsync(handle.Get()) != 0) ThrowLastError(folder);
 }
 
-void SyncFileSystem(const std::filesystem::path& folder) {
-  const FileHandle handle(open(folder.c_str(), O_RDONLY | O_DIRECTORY | O_CLOEXEC));
-  if (!handle || syncfs(handle.Get()) != 0) ThrowLastError(folder);
-}
-
 FileHandle OpenRegularFile(const std::filesystem::path& path) {
   // Without O_NONBLOCK, opening a pipe that someone put there would wait for ever.
   FileHandle file(open(path.c_str(), O_RDONLY | O_NOFOLLOW | O_NONBLOCK | O_CLOEXEC));
@@ -87,10 +81,10 @@ FileHandle OpenRegularFile(const std::filesystem::path& path) {
   return file;
 }
 
-FileFacts FactsOf(const FileHandle& file) {
+std::uint64_t SizeOf(const FileHandle& file) {
   struct stat facts {};
   if (fstat(file.Get(), &facts) != 0) ThrowLastError("fstat");
-  return {static_cast<std::uint64_t>(facts.st_size), facts.st_mtime};
+  return static_cast<std::uint64_t>(facts.st_size);
 }
 
 std::size_t ReadAt(const FileHandle& file, char* buffer, std::size_t size, std::uint64_t offset) {

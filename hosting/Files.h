@@ -28,11 +28,6 @@ class FileHandle {
   int descriptor_ = -1;
 };
 
-struct FileFacts {
-  std::uint64_t size = 0;
-  std::int64_t date = 0;  // of the last change, in seconds since 1970
-};
-
 // A file of its own for bytes that arrive; removed again with the object unless it was moved to its place.
 class TemporaryFile {
  public:
@@ -45,7 +40,7 @@ class TemporaryFile {
   std::uint64_t Size() const { return size_; }
 
   // Puts the bytes on the disk.
-  FileFacts Sync();
+  void Sync();
 
   // Whether the file `other` holds the same bytes.
   bool HasBytesOf(const std::filesystem::path& other) const;
@@ -62,13 +57,10 @@ class TemporaryFile {
 // Puts the entries of a folder on the disk: what was created, renamed or removed in it.
 void SyncFolder(const std::filesystem::path& folder);
 
-// Puts everything on the disk that `folder` is on: for many files, much faster than one after the other.
-void SyncFileSystem(const std::filesystem::path& folder);
-
 // Opens a regular file for reading; follows no link and never throws. None when there is no such file.
 FileHandle OpenRegularFile(const std::filesystem::path& path);
 
-FileFacts FactsOf(const FileHandle& file);
+std::uint64_t SizeOf(const FileHandle& file);
 
 // Reads up to `size` bytes from `offset` on; fewer only at the end of the file.
 std::size_t ReadAt(const FileHandle& file, char* buffer, std::size_t size, std::uint64_t offset);

@@ -38,22 +38,14 @@ void Check(const Options& options) {
 
 Options ParseOptions(const std::vector<std::string_view>& arguments) {
   Options options;
-  for (std::size_t i = 0; i < arguments.size(); ++i) {
-    std::string_view name = arguments[i];
+  for (std::size_t i = 0; i < arguments.size(); i += 2) {
+    const std::string_view name = arguments[i];
     if (name == "--help") {
       options.help = true;
       return options;
     }
-    std::string_view value;
-    if (const std::size_t equals = name.find('=');
-        name.starts_with("--") && equals != std::string_view::npos) {
-      value = name.substr(equals + 1);
-      name = name.substr(0, equals);
-    } else if (i + 1 < arguments.size()) {
-      value = arguments[++i];
-    } else {
-      throw OptionError(std::string(name) + " is unknown or lacks its value");
-    }
+    if (i + 1 == arguments.size()) throw OptionError(std::string(name) + " is unknown or lacks its value");
+    const std::string_view value = arguments[i + 1];
 
     if (name == "--host") {
       options.host = value;

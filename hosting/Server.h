@@ -1,23 +1,30 @@
 // The hosting server: the service page, the acceptor pages and the pictures, over one port.
 #pragma once
 
-#include <functional>
-#include <memory>
-#include <string>
+#include <httplib.h>
 
+#include <functional>
+#include <mutex>
+#include <string>
+#include <thread>
+
+#include "hosting/Files.h"
 #include "hosting/Options.h"
+#include "hosting/ServicePage.h"
 #include "hosting/Store.h"
 
 namespace tarnwick::hosting {
 
-class Server {
+struct Exchange;
+
+class Server : private httplib::Server {
  public:
   // Takes one line, without its end, for each request. Called by any thread, by one at a time.
   using Log = std::function<void(const std::string& line)>;
 
   // Opens the data folder and seeds it. Throws std::exception when that fails.
-  Server(Options options, Log log);
-  ~Server();
+  Server(hosting::Options options, Log log);
+  ~Server() override;
 
   // Takes the port, to which clients can connect from then on, and returns it. Throws std::runtime_error when
   // it cannot.
@@ -30,11 +37,20 @@ class Server {
   void Stop();
 
  private:
-  class Http;
+  bool process_and_close_socket(socket_t socket) override;
+  void Prepare(Exchange& exchange, httplib::Request& request);
+  void AnswerGet(Exchange& exchange, httplib::Response& answer);
+  void AnswerPost(Exchange& exchange, httplib::Response& answer, const httplib::ContentReader& reader);
+  void AnswerService(Exchange& exchange, httplib::Response& answer, const httplib::ContentReader& reader);
+  void AnswerAcceptor(Exchange& exchange, httplib::Response& answer, const httplib::ContentReader& reader);
 
-  Options options_;
+  hosting::Options options_;
   Store store_;
-  std::unique_ptr<Http> http_;
+  ServicePage service_;
+  Log log_;
+  std::mutex logMutex_;
+  FileHandle stopEvent_;
+  std::thread thread_;
 };
 
 }  // namespace tarnwick::hosting

@@ -1,6 +1,8 @@
 #include "hosting/ServicePage.h"
 
 #include <algorithm>
+#include <array>
+#include <cstdio>
 #include <ctime>
 #include <limits>
 #include <map>
@@ -18,9 +20,8 @@ constexpr std::string_view kExists = "1003";
 constexpr std::string_view kFailed = "1004";
 constexpr std::string_view kLimitReached = "1011";
 constexpr std::string_view kRenameRefused = "1033";
-constexpr std::int64_t kSecondsOfDay = 86400;
 
-// Ends the action with the answer to an unknown user.
+// Ends an action with the answer to an unknown user.
 struct UnknownUser {};
 
 std::string BooleanText(bool value) {
@@ -31,20 +32,20 @@ std::string DateText(std::int64_t seconds) {
   const std::time_t time = seconds;
   std::tm local{};
   localtime_r(&time, &local);
-  const auto twoDigits = [](int number) { return (number < 10 ? "0" : "") + std::to_string(number); };
-  const int hour = local.tm_hour % 12 == 0 ? 12 : local.tm_hour % 12;
-  return std::to_string(local.tm_mon + 1) + '/' + std::to_string(local.tm_mday) + '/' +
-         std::to_string(local.tm_year + 1900) + ' ' + std::to_string(hour) + ':' + twoDigits(local.tm_min) +
-         ':' + twoDigits(local.tm_sec) + (local.tm_hour < 12 ? " AM" : " PM");
+  std::array<char, 96> text{};
+  std::snprintf(text.data(), text.size(), "%d/%d/%d %d:%02d:%02d %s", local.tm_mon + 1, local.tm_mday,
+                local.tm_year + 1900, local.tm_hour % 12 == 0 ? 12 : local.tm_hour % 12, local.tm_min,
+                local.tm_sec, local.tm_hour < 12 ? "AM" : "PM");
+  return text.data();
 }
 
 std::int64_t Now() {
   return std::time(nullptr);
 }
 
-}  // namespace
-
-struct ServicePage::Call {
+struct Call {
+  Store& store;
+  const Options& options;
   const Reply& form;
   const std::string& hostName;
   LogNote& note;
@@ -54,14 +55,29 @@ struct ServicePage::Call {
 
   // A user name. None holds a blank; some requests carry names unescaped, and a form turns "+" into a blank.
   std::string User(TextView name) const {
-    note.user = Utf8FromText(ReplaceAll(form.First(name), u" ", u"+"));
-    return note.user;
+    return note.user = Utf8FromText(ReplaceAll(form.First(name), u" ", u"+"));
+  }
+
+  // The account of a user name.
+  Account Known(TextView name) const {
+    auto account = store.FindByName(User(name));
+    if (!account) throw UnknownUser{};
+    return *std::move(account);
   }
 
   // A parameter that was sent enciphered, without what the cipher drops.
   std::string Deciphered(TextView name) const { return Utf8FromText(EncryptParameter(form.First(name))); }
 
-  std::int64_t Product() const { return static_cast<std::int64_t>(LeadingNumber(form.First(u"ProductID"))); }
+  std::int64_t Product() const { return NumberFromText(form.First(u"ProductID")); }
+
+  std::string FileUrl(const Account& account, const std::string& name) const {
+    return "http://" + hostName + "/users/" + account.folder + "/" + name;
+  }
+
+  bool HasExpired(const Account& account) const {
+    constexpr std::int64_t kSecondsOfDay = 86400;
+    return Now() >= account.started + options.expireDays * kSecondsOfDay;
+  }
 
   // An answer of one variable that may be printed.
   FormBody Result(std::string_view name, std::string_view value) const {
@@ -70,125 +86,53 @@ struct ServicePage::Call {
   }
 };
 
-ServicePage::Action ServicePage::Find(const std::string& action) {
-  static const std::map<std::string_view, Action> actions = {
-      {"EstablishConnection", &ServicePage::EstablishConnection},
-      {"UserValidate", &ServicePage::UserValidate},
-      {"PathFromRoot", &ServicePage::PathFromRoot},
-      {"RenameFile", &ServicePage::RenameFile},
-      {"FileUpload", &ServicePage::FileUpload},
-      {"GetMaxUserQuota", &ServicePage::GetMaxUserQuota},
-      {"GetTotalUsedQuota", &ServicePage::GetTotalUsedQuota},
-      {"CanUploadFile", &ServicePage::CanUploadFile},
-      {"DeleteFile", &ServicePage::DeleteFile},
-      {"ListFiles", &ServicePage::ListFiles},
-      {"GetMeKey", &ServicePage::GetMeKey},
-      {"AddUser", &ServicePage::AddUser},
-      {"DeleteUser", &ServicePage::DeleteUser},
-      {"ValidUserID", &ServicePage::ValidUserID},
-      {"SendMeMail", &ServicePage::SendMeMail},
-      {"HardLimit", &ServicePage::HardLimit},
-      {"SoftLimit", &ServicePage::SoftLimit},
-      {"GetMGUIDForUser", &ServicePage::GetMGUIDForUser},
-      {"GetCreationDateForMGUID", &ServicePage::GetCreationDateForMGUID},
-      {"GetCurrentDateTimeFromServer", &ServicePage::GetCurrentDateTimeFromServer},
-      {"ManagePassword", &ServicePage::ManagePassword},
-      {"ReRegister", &ServicePage::ReRegister},
-      {"BVAccountDetails", &ServicePage::BVAccountDetails},
-      {"HasUserExpired", &ServicePage::HasUserExpired},
-      {"PremiumAccountSize", &ServicePage::PremiumAccountSize},
-  };
-  const auto found = actions.find(action);
-  return found == actions.end() ? nullptr : found->second;
-}
-
-std::string ServicePage::ActionOf(const Reply& form) {
-  const auto* values = form.ErrorOccured() == 1 ? nullptr : form.GetValueByVariableName(u"ClientAction");
-  if (!values || values->empty()) return {};
-  const std::string action = Utf8FromText(EncryptParameter(values->front()));
-  return Find(action) ? action : std::string();
-}
-
-FormBody ServicePage::Answer(const std::string& action, const Reply& form, const std::string& hostName,
-                             LogNote& note) {
-  const Action found = form.ErrorOccured() == 1 ? nullptr : Find(action);
-  note.action = found ? action : "unknown";
-  note.result = "error";
-  if (!found) return Error();
-  try {
-    note.result = "ok";
-    return (this->*found)(Call{form, hostName, note});
-  } catch (const UnknownUser&) {
-    note.result = "unknown-user";
-  } catch (const RuntimeError&) {
-    note.result = "malformed";
-  }
-  return Error();
-}
-
-FormBody ServicePage::EstablishConnection(const Call& call) {
-  return call.Result("EstablishConnection", "TRUE");
-}
-
-FormBody ServicePage::UserValidate(const Call& call) {
-  const std::string user = call.Deciphered(u"UserName");
+FormBody UserValidate(const Call& call) {
+  const std::string user = call.note.user = call.Deciphered(u"UserName");
   const std::string password = call.Deciphered(u"Password");
   const std::int64_t product = call.Product();
-  call.note.user = user;
-  const auto account = store_.FindByStrippedName(user);
+  const auto account = call.store.FindByStrippedName(user);
   const bool fits = account && (account->product == 0 || account->product == product);
   return call.Result("UserAuthenticationStatus", BooleanText(fits && Strip(account->password) == password));
 }
 
-FormBody ServicePage::PathFromRoot(const Call& call) {
-  return {"PathFromRoot", "/users/" + Known(call, u"Username").folder};
-}
-
-FormBody ServicePage::RenameFile(const Call& call) {
-  const Account account = Known(call, u"Username");
-  const Change change = store_.RenameFile(account, call.Value(u"OldFileName"), call.Value(u"NewFileName"));
+FormBody RenameFile(const Call& call) {
+  const Account account = call.Known(u"Username");
+  const Change change =
+      call.store.RenameFile(account, call.Value(u"OldFileName"), call.Value(u"NewFileName"));
   const bool isRenamed = change == Change::kDone || change == Change::kUnchanged;
   return call.Result("lRenameFileStatus", isRenamed ? kSuccess : kRenameRefused);
 }
 
-FormBody ServicePage::FileUpload(const Call& call) {
-  const Account account = Known(call, u"Username");
+FormBody FileUpload(const Call& call) {
+  const Account account = call.Known(u"Username");
   call.Value(u"FileSize");
-  return {"FileURL", FileUrl(call, account, call.Value(u"FileName"))};
+  return {"FileURL", call.FileUrl(account, call.Value(u"FileName"))};
 }
 
-FormBody ServicePage::GetMaxUserQuota(const Call& call) {
-  Known(call, u"UserName");
-  return call.Result("MaxUserQuota", std::to_string(options_.quota));
+FormBody CanUploadFile(const Call& call) {
+  const Account account = call.Known(u"UserName");
+  if (call.HasExpired(account)) return call.Result("CanUploadFile", kFailed);
+  return call.Result("CanUploadFile",
+                     call.store.UsedBytes(account) < call.options.quota ? kSuccess : kNegative);
 }
 
-FormBody ServicePage::GetTotalUsedQuota(const Call& call) {
-  return call.Result("UsedQuota", std::to_string(store_.UsedBytes(Known(call, u"UserName"))));
-}
-
-FormBody ServicePage::CanUploadFile(const Call& call) {
-  const Account account = Known(call, u"UserName");
-  if (HasExpired(account)) return call.Result("CanUploadFile", kFailed);
-  return call.Result("CanUploadFile", store_.UsedBytes(account) < options_.quota ? kSuccess : kNegative);
-}
-
-FormBody ServicePage::DeleteFile(const Call& call) {
-  const Account account = Known(call, u"Username");
+FormBody DeleteFile(const Call& call) {
+  const Account account = call.Known(u"Username");
   const std::string name = call.Value(u"FileToBeDeleted");
   const bool isGone =
-      store_.DeleteFile(account, name, false) == Change::kDone || store_.WasDeleted(account, name);
+      call.store.DeleteFile(account, name, false) == Change::kDone || call.store.WasDeleted(account, name);
   return call.Result("DeleteStatus", BooleanText(isGone));
 }
 
-FormBody ServicePage::ListFiles(const Call& call) {
-  const Account account = Known(call, u"Username");
+FormBody ListFiles(const Call& call) {
+  const Account account = call.Known(u"Username");
   std::vector<std::string> names;
   std::vector<std::string> urls;
   std::vector<std::string> sizes;
   std::vector<std::string> dates;
-  for (const StoredFile& file : store_.List(account)) {
+  for (const StoredFile& file : call.store.List(account)) {
     names.push_back(file.name);
-    urls.push_back(FileUrl(call, account, file.name));
+    urls.push_back(call.FileUrl(account, file.name));
     sizes.push_back(std::to_string(file.size));
     dates.push_back(DateText(file.date));
   }
@@ -199,15 +143,11 @@ FormBody ServicePage::ListFiles(const Call& call) {
   return answer;
 }
 
-FormBody ServicePage::GetMeKey(const Call& call) {
-  return {"GetKey", Known(call, u"UserName").password};
-}
-
-FormBody ServicePage::AddUser(const Call& call) {
-  const std::string user = call.User(u"UserName");
+FormBody AddUser(const Call& call) {
+  const std::string user = call.note.user = call.Value(u"UserName");  // escaped: a blank is none of ours
   call.Value(u"MGUID");
   std::optional<Account> account;
-  switch (store_.AddAccount(user, call.Product(), options_.hardLimit, account)) {
+  switch (call.store.AddAccount(user, call.Product(), call.options.hardLimit, account)) {
     case Addition::kTaken:
       return call.Result("AddUser", kExists);
     case Addition::kRefused:
@@ -223,108 +163,144 @@ FormBody ServicePage::AddUser(const Call& call) {
   return answer;
 }
 
-FormBody ServicePage::DeleteUser(const Call& call) {
-  const auto account = store_.FindByName(call.User(u"UserName"));
-  if (!account || account->password != call.Value(u"Password")) return call.Result("DeleteUser", kNegative);
-  store_.RemoveAccount(*account);
+FormBody DeleteUser(const Call& call) {
+  const auto account = call.store.FindByName(call.User(u"UserName"));
+  const std::string password = call.Value(u"Password");
+  if (!account || account->password != password) return call.Result("DeleteUser", kNegative);
+  call.store.RemoveAccount(*account);
   return call.Result("DeleteUser", kSuccess);
 }
 
-FormBody ServicePage::ValidUserID(const Call& call) {
-  return call.Result("ValidUser", BooleanText(store_.FindByName(call.User(u"UserName")).has_value()));
-}
-
-FormBody ServicePage::SendMeMail(const Call& call) {
-  const auto account = store_.FindByName(call.User(u"UserName"));
+FormBody SendMeMail(const Call& call) {
+  const auto account = call.store.FindByName(call.User(u"UserName"));
   const bool isNew = NumberFromText(call.form.First(u"NewUser")) != 0;
   if (!account) return call.Result("SendMail", kNegative);
-  store_.SendMail(
+  call.store.SendMail(
       account->name, isNew ? "Your new account" : "Your key",
       (isNew ? "Welcome. The key of your new account is\n\n    " : "You asked for your key. It is\n\n    ") +
           account->password + "\n");
   return call.Result("SendMail", kSuccess);
 }
 
-FormBody ServicePage::HardLimit(const Call& call) {
-  return call.Result("HardLimit", std::to_string(options_.hardLimit));
-}
-
-FormBody ServicePage::SoftLimit(const Call& call) {
-  return call.Result("SoftLimit", std::to_string(options_.softLimit));
-}
-
-FormBody ServicePage::GetMGUIDForUser(const Call& call) {
-  return {"MGUID", Known(call, u"UserName").mguid};
-}
-
-FormBody ServicePage::GetCreationDateForMGUID(const Call& call) {
-  return call.Result("CreationDate", DateText(Known(call, u"UserName").created));
-}
-
-FormBody ServicePage::GetCurrentDateTimeFromServer(const Call& call) {
-  return call.Result("CurrentDate", DateText(Now()));
-}
-
-FormBody ServicePage::ManagePassword(const Call& call) {
-  const auto account = store_.FindByStrippedName(Strip(call.User(u"Username")));
+FormBody ManagePassword(const Call& call) {
+  const auto account = call.store.FindByStrippedName(Strip(call.User(u"Username")));
   const std::string password = call.Deciphered(u"Password");
   const std::string newPassword = call.Deciphered(u"NewPassword");
   // Nobody could log on with an empty password, and everybody could who sends none.
   if (!account || Strip(account->password) != password || newPassword.empty())
     return call.Result("UpdatePassword", kNegative);
-  store_.SetPassword(*account, newPassword);
+  call.store.SetPassword(*account, newPassword);
   return call.Result("UpdatePassword", kSuccess);
 }
 
-FormBody ServicePage::ReRegister(const Call& call) {
-  const auto account = store_.FindByName(call.User(u"Username"));
-  if (!account || account->password != call.Value(u"Password")) {
+FormBody ReRegister(const Call& call) {
+  const auto account = call.store.FindByName(call.User(u"Username"));
+  const std::string password = call.Value(u"Password");
+  if (!account || account->password != password) {
     call.note.result = "refused";
     return {"MGUID", ""};
   }
-  store_.Restart(*account);
+  call.store.Restart(*account);
   return {"MGUID", account->mguid};
 }
 
-FormBody ServicePage::BVAccountDetails(const Call& call) {
-  const auto account = store_.FindByMguid(call.Value(u"MGUID"));
-  if (!account || account->name != call.User(u"Username")) throw UnknownUser{};
+FormBody BVAccountDetails(const Call& call) {
+  const auto account = call.store.FindByMguid(call.Value(u"MGUID"));
+  const std::string user = call.User(u"Username");
+  if (!account || account->name != user) throw UnknownUser{};
   FormBody answer("EmailAddress", account->name);
-  answer.Add("ExpiryPeriod", std::to_string(options_.expireDays))
-      .Add("StartDate", DateText(account->started));
-  answer.Add("CurrentDate", DateText(Now())).Add("UsedQuota", std::to_string(store_.UsedBytes(*account)));
-  answer.Add("Quota", std::to_string(options_.quota)).Add("ServiceLevelName", "Standard");
+  answer.Add("ExpiryPeriod", std::to_string(call.options.expireDays));
+  answer.Add("StartDate", DateText(account->started)).Add("CurrentDate", DateText(Now()));
+  answer.Add("UsedQuota", std::to_string(call.store.UsedBytes(*account)));
+  answer.Add("Quota", std::to_string(call.options.quota)).Add("ServiceLevelName", "Standard");
   return answer;
 }
 
-FormBody ServicePage::HasUserExpired(const Call& call) {
-  return call.Result("HasUserExpired", HasExpired(Known(call, u"UserName")) ? kNegative : kSuccess);
-}
-
-FormBody ServicePage::PremiumAccountSize(const Call& call) {
-  Known(call, u"UserName");
+FormBody PremiumAccountSize(const Call& call) {
+  call.Known(u"UserName");
   // Clients read a 32-bit number.
   constexpr std::uint64_t kMost = std::numeric_limits<std::int32_t>::max();
-  return call.Result("PremiumAccountSize", std::to_string(std::min(options_.quota, kMost)));
+  return call.Result("PremiumAccountSize", std::to_string(std::min(call.options.quota, kMost)));
 }
 
-Account ServicePage::Known(const Call& call, TextView parameter) {
-  auto account = store_.FindByName(call.User(parameter));
-  if (!account) throw UnknownUser{};
-  return *std::move(account);
+using Action = FormBody (*)(const Call&);
+
+Action Find(const std::string& action) {
+  static const std::map<std::string_view, Action> actions = {
+      {"EstablishConnection", [](const Call& call) { return call.Result("EstablishConnection", "TRUE"); }},
+      {"UserValidate", UserValidate},
+      {"PathFromRoot",
+       [](const Call& call) { return FormBody("PathFromRoot", "/users/" + call.Known(u"Username").folder); }},
+      {"RenameFile", RenameFile},
+      {"FileUpload", FileUpload},
+      {"GetMaxUserQuota",
+       [](const Call& call) {
+         call.Known(u"UserName");
+         return call.Result("MaxUserQuota", std::to_string(call.options.quota));
+       }},
+      {"GetTotalUsedQuota",
+       [](const Call& call) {
+         return call.Result("UsedQuota", std::to_string(call.store.UsedBytes(call.Known(u"UserName"))));
+       }},
+      {"CanUploadFile", CanUploadFile},
+      {"DeleteFile", DeleteFile},
+      {"ListFiles", ListFiles},
+      {"GetMeKey", [](const Call& call) { return FormBody("GetKey", call.Known(u"UserName").password); }},
+      {"AddUser", AddUser},
+      {"DeleteUser", DeleteUser},
+      {"ValidUserID",
+       [](const Call& call) {
+         const bool isThere = call.store.FindByName(call.User(u"UserName")).has_value();
+         return call.Result("ValidUser", BooleanText(isThere));
+       }},
+      {"SendMeMail", SendMeMail},
+      {"HardLimit",
+       [](const Call& call) { return call.Result("HardLimit", std::to_string(call.options.hardLimit)); }},
+      {"SoftLimit",
+       [](const Call& call) { return call.Result("SoftLimit", std::to_string(call.options.softLimit)); }},
+      {"GetMGUIDForUser", [](const Call& call) { return FormBody("MGUID", call.Known(u"UserName").mguid); }},
+      {"GetCreationDateForMGUID",
+       [](const Call& call) {
+         return call.Result("CreationDate", DateText(call.Known(u"UserName").created));
+       }},
+      {"GetCurrentDateTimeFromServer",
+       [](const Call& call) { return call.Result("CurrentDate", DateText(Now())); }},
+      {"ManagePassword", ManagePassword},
+      {"ReRegister", ReRegister},
+      {"BVAccountDetails", BVAccountDetails},
+      {"HasUserExpired",
+       [](const Call& call) {
+         return call.Result("HasUserExpired",
+                            call.HasExpired(call.Known(u"UserName")) ? kNegative : kSuccess);
+       }},
+      {"PremiumAccountSize", PremiumAccountSize},
+  };
+  const auto found = actions.find(action);
+  return found == actions.end() ? nullptr : found->second;
 }
 
-bool ServicePage::HasExpired(const Account& account) const {
-  return Now() >= account.started + options_.expireDays * kSecondsOfDay;
+}  // namespace
+
+std::string ServicePage::ActionOf(const Reply& form) {
+  const auto* values = form.ErrorOccured() == 1 ? nullptr : form.GetValueByVariableName(u"ClientAction");
+  if (!values || values->empty()) return {};
+  const std::string action = Utf8FromText(EncryptParameter(values->front()));
+  return Find(action) ? action : std::string();
 }
 
-std::string ServicePage::FileUrl(const Call& call, const Account& account, std::string_view name) const {
-  return std::string("http://")
-      .append(call.hostName)
-      .append("/users/")
-      .append(account.folder)
-      .append("/")
-      .append(name);
+FormBody ServicePage::Answer(const std::string& action, const Reply& form, const std::string& hostName,
+                             LogNote& note) const {
+  const Action found = Find(action);
+  note.action = found ? action : "unknown";
+  note.result = found ? "ok" : "error";
+  try {
+    if (found) return found(Call{store_, options_, form, hostName, note});
+  } catch (const UnknownUser&) {
+    note.result = "unknown-user";
+  } catch (const RuntimeError&) {
+    note.result = "malformed";
+  }
+  return {"ErrorOccured", "1"};
 }
 
 }  // namespace tarnwick::hosting

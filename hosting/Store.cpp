@@ -3,11 +3,13 @@
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/random.h>
+#include <sys/stat.h>
+#include <unistd.h>
 
+#include <algorithm>
 #include <array>
 #include <cerrno>
 #include <chrono>
-#include <map>
 #include <stdexcept>
 #include <system_error>
 
@@ -24,15 +26,9 @@ CREATE TABLE IF NOT EXISTS accounts(
   name TEXT NOT NULL UNIQUE, stripped TEXT NOT NULL UNIQUE, folder TEXT NOT NULL UNIQUE,
   password TEXT NOT NULL, mguid TEXT NOT NULL UNIQUE, product INTEGER NOT NULL,
   created INTEGER NOT NULL, started INTEGER NOT NULL);
-CREATE TABLE IF NOT EXISTS files(
-  account INTEGER NOT NULL REFERENCES accounts(id) ON DELETE CASCADE,
-  name TEXT NOT NULL, folded TEXT NOT NULL, size INTEGER NOT NULL, date INTEGER NOT NULL,
-  PRIMARY KEY(account, name)) WITHOUT ROWID;
-CREATE INDEX IF NOT EXISTS files_folded ON files(account, folded);
 CREATE TABLE IF NOT EXISTS deleted(
   account INTEGER NOT NULL REFERENCES accounts(id) ON DELETE CASCADE,
   name TEXT NOT NULL, PRIMARY KEY(account, name)) WITHOUT ROWID;
-CREATE TABLE IF NOT EXISTS doomed(folder TEXT PRIMARY KEY) WITHOUT ROWID;
 )";
 
 constexpr std::string_view kLettersAndDigits =
@@ -107,16 +103,29 @@ Account NewAccount(std::string_view name, std::string_view password, std::int64_
   return account;
 }
 
-// The regular files of a folder that may be a user's files, by name.
-std::map<std::string, FileFacts> FilesIn(const fs::path& folder) {
-  std::map<std::string, FileFacts> files;
-  std::error_code none;
-  for (const fs::directory_entry& entry : fs::directory_iterator(folder, none)) {
-    const std::string name = entry.path().filename().string();
-    if (IsRefusedFileName(name)) continue;
-    if (const FileHandle file = OpenRegularFile(entry.path())) files.emplace(name, FactsOf(file));
+// The regular files of a folder that may be a user's files; none when there is no such folder.
+std::vector<StoredFile> FilesIn(const fs::path& folder) {
+  std::vector<StoredFile> files;
+  if (!fs::is_directory(folder)) return files;
+  for (const fs::directory_entry& entry : fs::directory_iterator(folder)) {
+    std::string name = entry.path().filename().string();
+    struct stat facts {};
+    if (!IsRefusedFileName(name) && lstat(entry.path().c_str(), &facts) == 0 && S_ISREG(facts.st_mode))
+      files.push_back({std::move(name), static_cast<std::uint64_t>(facts.st_size), facts.st_mtime});
   }
   return files;
+}
+
+// Whether another file than `except` has the name, letter case apart.
+bool IsTaken(const std::vector<StoredFile>& files, std::string_view name, std::string_view except) {
+  const std::string folded = FoldCase(name);
+  return std::any_of(files.begin(), files.end(), [&](const StoredFile& file) {
+    return file.name != except && FoldCase(file.name) == folded;
+  });
+}
+
+bool IsFile(const fs::path& path) {
+  return fs::is_regular_file(fs::symlink_status(path));
 }
 
 }  // namespace
@@ -133,10 +142,12 @@ Store::Store(fs::path data)
   // Keys are in the mails and in the database (whose helper files take over its rights): for the owner alone.
   fs::permissions(outbox_, fs::perms::owner_all);
   const fs::path database = data_ / "hosting.sqlite";
-  FileHandle(open(database.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
+  {
+    // Closed before SQLite opens the file: closing it later would drop SQLite's locks.
+    const FileHandle created(open(database.c_str(), O_RDWR | O_CREAT | O_CLOEXEC, 0600));
+  }
   database_ = std::make_unique<Database>(database);
   database_->Run(kSchema);
-  Recover();
   SyncFolder(data_);
 }
 
@@ -160,9 +171,7 @@ Addition Store::AddAccount(std::string_view name, std::int64_t product, std::int
   if (IsRefusedUserName(name)) return Addition::kRefused;
   const Account account = NewAccount(name, NewPassword(), product);
   const std::lock_guard lock(mutex_);
-  Statement taken(*database_, "SELECT 1 FROM accounts WHERE stripped = ? OR folder = ?", Strip(name),
-                  account.folder);
-  if (taken.Step() || fs::exists(FolderPath(account.folder))) return Addition::kTaken;
+  if (IsAccountTaken(account) || fs::exists(FolderPath(account))) return Addition::kTaken;
   Statement count(*database_, "SELECT COUNT(*) FROM accounts");
   if (count.Step() && count.NumberAt(0) >= mostAccounts) return Addition::kLimitReached;
   InsertAccount(*database_, account);
@@ -174,39 +183,29 @@ bool Store::SeedAccount(std::string_view name, std::string_view password, std::i
                         const fs::path& pictures) {
   const Account account = NewAccount(name, password, product);
   const std::lock_guard lock(mutex_);
-  Statement taken(*database_, "SELECT 1 FROM accounts WHERE stripped = ? OR folder = ?", Strip(name),
-                  account.folder);
-  if (taken.Step() || fs::exists(FolderPath(account.folder))) return false;
-
-  const fs::path prepared = NewWorkPath();
-  fs::create_directory(prepared);
-  if (!pictures.empty()) {
-    for (const auto& [fileName, facts] : FilesIn(pictures))
-      fs::copy_file(pictures / fileName, prepared / fileName);
-    SyncFileSystem(prepared);
+  if (IsAccountTaken(account)) return false;
+  // The folder comes before its account: a kill in between leaves one that the next start takes over.
+  if (!fs::exists(FolderPath(account))) {
+    const fs::path prepared = NewWorkPath();
+    fs::create_directory(prepared);
+    if (!pictures.empty())
+      for (const StoredFile& file : FilesIn(pictures))
+        fs::copy_file(pictures / file.name, prepared / file.name);
+    // Much faster for many files than one after the other.
+    if (syncfs(lock_.Get()) != 0) throw std::system_error(errno, std::generic_category(), data_.string());
+    fs::rename(prepared, FolderPath(account));
+    SyncFolder(users_);
   }
-  // Doomed until the account is there: a kill in between leaves no folder that nobody owns.
-  Execute(*database_, "INSERT INTO doomed(folder) VALUES(?)", account.folder);
-  fs::rename(prepared, FolderPath(account.folder));
-  SyncFolder(users_);
-  Transaction transaction(*database_);
   InsertAccount(*database_, account);
-  Statement id(*database_, "SELECT id FROM accounts WHERE name = ?", name);
-  id.Step();
-  for (const auto& [fileName, facts] : FilesIn(FolderPath(account.folder)))
-    PutRow(id.NumberAt(0), {fileName, facts.size, facts.date});
-  Execute(*database_, "DELETE FROM doomed WHERE folder = ?", account.folder);
-  transaction.Commit();
   return true;
 }
 
 void Store::RemoveAccount(const Account& account) {
   const std::lock_guard lock(mutex_);
-  Transaction transaction(*database_);
+  if (!IsThere(account)) return;  // and its folder may be another one's by now
+  // The folder goes first: it would outlive a kill in between without an owner and keep its name taken.
+  if (fs::exists(FolderPath(account))) RemoveFolder(account);
   Execute(*database_, "DELETE FROM accounts WHERE id = ?", account.id);
-  Execute(*database_, "INSERT OR IGNORE INTO doomed(folder) VALUES(?)", account.folder);
-  transaction.Commit();
-  RemoveDoomed(account.folder);
 }
 
 void Store::SetPassword(const Account& account, std::string_view password) {
@@ -221,48 +220,32 @@ void Store::Restart(const Account& account) {
 
 std::vector<StoredFile> Store::List(const Account& account) {
   const std::lock_guard lock(mutex_);
-  std::vector<StoredFile> files;
-  Statement rows(*database_, "SELECT name, size, date FROM files WHERE account = ? ORDER BY name",
-                 account.id);
-  while (rows.Step())
-    files.push_back({rows.TextAt(0), static_cast<std::uint64_t>(rows.NumberAt(1)), rows.NumberAt(2)});
+  std::vector<StoredFile> files = FilesIn(FolderPath(account));
+  std::sort(files.begin(), files.end(),
+            [](const StoredFile& one, const StoredFile& other) { return one.name < other.name; });
   return files;
 }
 
 std::uint64_t Store::UsedBytes(const Account& account) {
   const std::lock_guard lock(mutex_);
-  Statement sum(*database_, "SELECT SUM(size) FROM files WHERE account = ?", account.id);
-  return sum.Step() ? static_cast<std::uint64_t>(sum.NumberAt(0)) : 0;
-}
-
-bool Store::HasFolder(const Account& account) {
-  const std::lock_guard lock(mutex_);
-  return fs::is_directory(FolderPath(account.folder));
+  std::uint64_t used = 0;
+  for (const StoredFile& file : FilesIn(FolderPath(account))) used += file.size;
+  return used;
 }
 
 Change Store::CreateFolder(const Account& account) {
   const std::lock_guard lock(mutex_);
   if (!IsThere(account)) return Change::kNoAccount;
-  if (!fs::create_directory(FolderPath(account.folder))) return Change::kFolderState;
+  if (!fs::create_directory(FolderPath(account))) return Change::kFolderState;
   SyncFolder(users_);
   return Change::kDone;
 }
 
 Change Store::DeleteFolder(const Account& account) {
   const std::lock_guard lock(mutex_);
-  if (!IsThere(account)) return Change::kNoAccount;
-  if (!fs::is_directory(FolderPath(account.folder))) return Change::kFolderState;
-  Transaction transaction(*database_);
-  Execute(*database_, "DELETE FROM files WHERE account = ?", account.id);
-  Execute(*database_, "INSERT OR IGNORE INTO doomed(folder) VALUES(?)", account.folder);
-  transaction.Commit();
-  RemoveDoomed(account.folder);
-  return Change::kDone;
-}
-
-std::uint64_t Store::RoomFor(const Account& account, std::string_view name, std::uint64_t quota) {
-  const std::lock_guard lock(mutex_);
-  return Room(account, name, quota);
+  const Change obstacle = Obstacle(account, {});
+  if (obstacle == Change::kDone) RemoveFolder(account);
+  return obstacle;
 }
 
 std::unique_ptr<TemporaryFile> Store::BeginUpload() {
@@ -271,56 +254,42 @@ std::unique_ptr<TemporaryFile> Store::BeginUpload() {
 
 Change Store::FinishUpload(const Account& account, std::string_view name, std::uint64_t quota,
                            TemporaryFile& bytes) {
-  if (IsRefusedFileName(name)) return Change::kNameRefused;
-  const FileFacts facts = bytes.Sync();
+  bytes.Sync();
   const std::lock_guard lock(mutex_);
-  if (!IsThere(account)) return Change::kNoAccount;
-  const fs::path folder = FolderPath(account.folder);
-  if (!fs::is_directory(folder)) return Change::kFolderState;
-  if (IsTakenByOther(account, name, name) || facts.size > Room(account, name, quota))
-    return Change::kNameRefused;
-  const auto old = Row(account, name);
-  if (old && old->size == facts.size && bytes.HasBytesOf(folder / name)) return Change::kUnchanged;
-  bytes.MoveTo(folder / name);
-  Transaction transaction(*database_);
-  PutRow(account.id, {std::string(name), facts.size, facts.date});
-  transaction.Commit();
+  if (const Change obstacle = Obstacle(account, {name}); obstacle != Change::kDone) return obstacle;
+  const std::vector<StoredFile> files = FilesIn(FolderPath(account));
+  if (IsTaken(files, name, name)) return Change::kNameRefused;
+  std::uint64_t used = bytes.Size();
+  for (const StoredFile& file : files)
+    if (file.name != name) used += file.size;
+  if (used > quota) return Change::kNameRefused;
+  const fs::path path = FolderPath(account) / name;
+  if (bytes.HasBytesOf(path)) return Change::kUnchanged;
+  bytes.MoveTo(path);
   return Change::kDone;
 }
 
 Change Store::RenameFile(const Account& account, std::string_view oldName, std::string_view newName) {
-  if (IsRefusedFileName(oldName) || IsRefusedFileName(newName)) return Change::kNameRefused;
   const std::lock_guard lock(mutex_);
-  if (!IsThere(account)) return Change::kNoAccount;
-  const fs::path folder = FolderPath(account.folder);
-  if (!fs::is_directory(folder)) return Change::kFolderState;
-  const auto file = Row(account, oldName);
-  if (!file) return Row(account, newName) ? Change::kUnchanged : Change::kNotThere;
-  if (oldName == newName) return Change::kDone;
-  if (IsTakenByOther(account, newName, oldName)) return Change::kNameRefused;
+  if (const Change obstacle = Obstacle(account, {oldName, newName}); obstacle != Change::kDone)
+    return obstacle;
+  const fs::path folder = FolderPath(account);
+  if (!IsFile(folder / oldName)) return IsFile(folder / newName) ? Change::kUnchanged : Change::kNotThere;
+  if (IsTaken(FilesIn(folder), newName, oldName)) return Change::kNameRefused;
   fs::rename(folder / oldName, folder / newName);
   SyncFolder(folder);
-  Transaction transaction(*database_);
-  Execute(*database_, "DELETE FROM files WHERE account = ? AND name = ?", account.id, oldName);
-  PutRow(account.id, {std::string(newName), file->size, file->date});
-  transaction.Commit();
   return Change::kDone;
 }
 
 Change Store::DeleteFile(const Account& account, std::string_view name, bool remember) {
-  if (IsRefusedFileName(name)) return Change::kNameRefused;
   const std::lock_guard lock(mutex_);
-  if (!IsThere(account)) return Change::kNoAccount;
-  const fs::path folder = FolderPath(account.folder);
-  if (!fs::is_directory(folder)) return Change::kFolderState;
-  if (!Row(account, name)) return Change::kNotThere;
-  fs::remove(folder / name);
-  SyncFolder(folder);
-  Transaction transaction(*database_);
-  Execute(*database_, "DELETE FROM files WHERE account = ? AND name = ?", account.id, name);
+  if (const Change obstacle = Obstacle(account, {name}); obstacle != Change::kDone) return obstacle;
+  const fs::path folder = FolderPath(account);
+  if (!IsFile(folder / name)) return Change::kNotThere;
   if (remember)
     Execute(*database_, "INSERT OR IGNORE INTO deleted(account, name) VALUES(?, ?)", account.id, name);
-  transaction.Commit();
+  fs::remove(folder / name);
+  SyncFolder(folder);
   return Change::kDone;
 }
 
@@ -333,8 +302,9 @@ bool Store::WasDeleted(const Account& account, std::string_view name) {
 FileHandle Store::OpenPicture(std::string_view folder, std::string_view name) const {
   const bool leaves = folder.empty() || folder == "." || folder == ".." ||
                       folder.find_first_of(std::string_view("/\0", 2)) != std::string_view::npos;
-  if (leaves || IsRefusedFileName(name) || fs::is_symlink(FolderPath(folder))) return {};
-  return OpenRegularFile(FolderPath(folder) / name);
+  std::error_code ignored;  // of a name that is too long, say; opening fails then too
+  if (leaves || IsRefusedFileName(name) || fs::is_symlink(users_ / folder, ignored)) return {};
+  return OpenRegularFile(users_ / folder / name);
 }
 
 void Store::SendMail(std::string_view to, std::string_view subject, std::string_view text) {
@@ -353,71 +323,25 @@ bool Store::IsThere(const Account& account) {
   return Statement(*database_, "SELECT 1 FROM accounts WHERE id = ?", account.id).Step();
 }
 
-std::uint64_t Store::Room(const Account& account, std::string_view name, std::uint64_t quota) {
-  Statement sum(*database_, "SELECT SUM(size) FROM files WHERE account = ? AND name <> ?", account.id, name);
-  const std::uint64_t others = sum.Step() ? static_cast<std::uint64_t>(sum.NumberAt(0)) : 0;
-  return quota > others ? quota - others : 0;
-}
-
-std::optional<StoredFile> Store::Row(const Account& account, std::string_view name) {
-  Statement row(*database_, "SELECT size, date FROM files WHERE account = ? AND name = ?", account.id, name);
-  if (!row.Step()) return std::nullopt;
-  return StoredFile{std::string(name), static_cast<std::uint64_t>(row.NumberAt(0)), row.NumberAt(1)};
-}
-
-bool Store::IsTakenByOther(const Account& account, std::string_view name, std::string_view exceptName) {
-  return Statement(*database_, "SELECT 1 FROM files WHERE account = ? AND folded = ? AND name <> ?",
-                   account.id, FoldCase(name), exceptName)
+bool Store::IsAccountTaken(const Account& account) {
+  return Statement(*database_, "SELECT 1 FROM accounts WHERE stripped = ? OR folder = ?", Strip(account.name),
+                   account.folder)
       .Step();
 }
 
-void Store::PutRow(std::int64_t account, const StoredFile& file) {
-  Execute(*database_, "INSERT OR REPLACE INTO files(account, name, folded, size, date) VALUES(?, ?, ?, ?, ?)",
-          account, file.name, FoldCase(file.name), static_cast<std::int64_t>(file.size), file.date);
-  Execute(*database_, "DELETE FROM deleted WHERE account = ? AND name = ?", account, file.name);
+Change Store::Obstacle(const Account& account, std::initializer_list<std::string_view> names) {
+  if (!IsThere(account)) return Change::kNoAccount;
+  if (!fs::is_directory(FolderPath(account))) return Change::kFolderState;
+  return std::any_of(names.begin(), names.end(), IsRefusedFileName) ? Change::kNameRefused : Change::kDone;
 }
 
-void Store::RemoveDoomed(const std::string& folder) {
-  // Out of sight in one step; what a kill leaves in the work folder goes when the store is opened.
+void Store::RemoveFolder(const Account& account) {
+  // Out of sight in one step. What is left in the work folder goes when the store is opened.
   const fs::path away = NewWorkPath();
-  std::error_code absent;
-  fs::rename(FolderPath(folder), away, absent);
+  fs::rename(FolderPath(account), away);
   SyncFolder(users_);
-  Execute(*database_, "DELETE FROM doomed WHERE folder = ?", folder);
-  fs::remove_all(away);
-}
-
-void Store::Recover() {
-  std::vector<std::string> doomed;
-  for (Statement rows(*database_, "SELECT folder FROM doomed"); rows.Step();)
-    doomed.push_back(rows.TextAt(0));
-  for (const std::string& folder : doomed) RemoveDoomed(folder);
-
-  std::vector<std::pair<std::int64_t, std::string>> accounts;
-  for (Statement rows(*database_, "SELECT id, folder FROM accounts"); rows.Step();)
-    accounts.emplace_back(rows.NumberAt(0), rows.TextAt(1));
-  Transaction transaction(*database_);
-  for (const auto& [account, folder] : accounts) Reconcile(account, FolderPath(folder));
-  transaction.Commit();
-}
-
-void Store::Reconcile(std::int64_t account, const fs::path& folder) {
-  std::map<std::string, FileFacts> files = FilesIn(folder);
-  std::vector<std::string> gone;
-  Statement rows(*database_, "SELECT name, size, date FROM files WHERE account = ?", account);
-  while (rows.Step()) {
-    const auto file = files.find(rows.TextAt(0));
-    if (file == files.end())
-      gone.push_back(rows.TextAt(0));
-    else if (static_cast<std::int64_t>(file->second.size) == rows.NumberAt(1) &&
-             file->second.date == rows.NumberAt(2))
-      files.erase(file);
-  }
-  for (const std::string& name : gone) {
-    Execute(*database_, "DELETE FROM files WHERE account = ? AND name = ?", account, name);
-    Execute(*database_, "INSERT OR IGNORE INTO deleted(account, name) VALUES(?, ?)", account, name);
-  }
-  for (const auto& [name, facts] : files) PutRow(account, {name, facts.size, facts.date});
+  std::error_code ignored;
+  fs::remove_all(away, ignored);
 }
 
 }  // namespace tarnwick::hosting

@@ -1,15 +1,15 @@
-// The accounts and their files. Accounts and listings are in DATA/hosting.sqlite, the bytes are plain files
+// The accounts and their files. Accounts are in DATA/hosting.sqlite, the files are plain files
 // DATA/users/FOLDER/NAME (an FTP server is rooted at DATA), mails to users are text files in DATA/outbox.
 //
-// A change is on the disk when its function returns. Bytes move first and the database follows, so after a
-// kill in between the folders hold the truth and opening the store makes the listings agree with them; whole
-// folders are first named in the database as doomed, so that opening the store ends their removal. Names and
-// texts are UTF-8. Any thread may call. Failures of disk or database throw std::exception.
+// A change is on the disk when its function returns, and each is one step on the disk, so a kill leaves the
+// state before it or after it. Names and texts are UTF-8. Any thread may call. Failures of disk or database
+// throw std::exception.
 #pragma once
 
 #include <atomic>
 #include <cstdint>
 #include <filesystem>
+#include <initializer_list>
 #include <memory>
 #include <mutex>
 #include <optional>
@@ -52,7 +52,7 @@ enum class Addition { kDone, kTaken, kRefused, kLimitReached };
 
 class Store {
  public:
-  // Opens or creates the data folder and ends what a kill interrupted. One program at a time.
+  // Opens or creates the data folder. One program at a time.
   explicit Store(std::filesystem::path data);
 
   std::optional<Account> FindByName(std::string_view name);
@@ -63,8 +63,8 @@ class Store {
   Addition AddAccount(std::string_view name, std::int64_t product, std::int64_t mostAccounts,
                       std::optional<Account>& result);
 
-  // Makes an account with its folder and the regular files of `pictures` (may be empty: none). False when the
-  // name or its folder is taken, which changes nothing.
+  // Makes an account with its folder and the regular files of `pictures` (may be empty: none), or with the
+  // folder that is there and nobody's. False when another account has the name or the folder.
   bool SeedAccount(std::string_view name, std::string_view password, std::int64_t product,
                    const std::filesystem::path& pictures);
 
@@ -80,19 +80,17 @@ class Store {
   std::vector<StoredFile> List(const Account& account);
   std::uint64_t UsedBytes(const Account& account);
 
-  bool HasFolder(const Account& account);
   Change CreateFolder(const Account& account);
   Change DeleteFolder(const Account& account);
 
-  // What an upload of this name may hold, in bytes.
-  std::uint64_t RoomFor(const Account& account, std::string_view name, std::uint64_t quota);
+  // Begins with a file for the bytes; all checks come when they are there.
   std::unique_ptr<TemporaryFile> BeginUpload();
   Change FinishUpload(const Account& account, std::string_view name, std::uint64_t quota,
                       TemporaryFile& bytes);
 
   Change RenameFile(const Account& account, std::string_view oldName, std::string_view newName);
 
-  // `remember` makes WasDeleted true for the name until a file of that name comes again.
+  // `remember` makes WasDeleted true for the name.
   Change DeleteFile(const Account& account, std::string_view name, bool remember);
   bool WasDeleted(const Account& account, std::string_view name);
 
@@ -103,24 +101,22 @@ class Store {
   void SendMail(std::string_view to, std::string_view subject, std::string_view text);
 
  private:
-  std::filesystem::path FolderPath(std::string_view folder) const { return users_ / folder; }
+  std::filesystem::path FolderPath(const Account& account) const { return users_ / account.folder; }
   std::filesystem::path NewWorkPath();
   // The following expect the mutex to be held.
   bool IsThere(const Account& account);
-  std::uint64_t Room(const Account& account, std::string_view name, std::uint64_t quota);
-  std::optional<StoredFile> Row(const Account& account, std::string_view name);
-  bool IsTakenByOther(const Account& account, std::string_view name, std::string_view exceptName);
-  void PutRow(std::int64_t account, const StoredFile& file);
-  void RemoveDoomed(const std::string& folder);
-  void Recover();
-  void Reconcile(std::int64_t account, const std::filesystem::path& folder);
+  // Whether the name or the folder is another account's.
+  bool IsAccountTaken(const Account& account);
+  // What forbids a change of these files; kDone: nothing.
+  Change Obstacle(const Account& account, std::initializer_list<std::string_view> names);
+  void RemoveFolder(const Account& account);
 
   std::filesystem::path data_;
   std::filesystem::path users_;
   std::filesystem::path outbox_;
   std::filesystem::path work_;  // bytes that arrive, folders on their way out; emptied on opening
   FileHandle lock_;
-  std::mutex mutex_;  // one change or look-up at a time: guards the database and the order of the steps
+  std::mutex mutex_;  // one change or look-up at a time: guards the database and the folders
   std::unique_ptr<Database> database_;
   std::atomic<std::uint64_t> workNumber_{0};
 };

@@ -1,7 +1,11 @@
 // The seam to the local files. Paths are full paths or relative to the process's folder.
 #pragma once
 
+#include <cstddef>
 #include <cstdint>
+#include <memory>
+#include <span>
+#include <string_view>
 
 #include "support/Text.h"
 
@@ -14,6 +18,15 @@ inline constexpr std::uint32_t kHidden = 0x02;
 inline constexpr std::uint32_t kSystem = 0x04;
 inline constexpr std::uint32_t kArchive = 0x20;
 }  // namespace attribute
+
+// A file that is read from its start to its end; closed by its destructor.
+class FileReader {
+ public:
+  virtual ~FileReader() = default;
+
+  // Fills `room` as long as there are bytes; how many. Throws 75 on failure.
+  virtual std::size_t Read(std::span<char> room) = 0;
+};
 
 class FileSystem {
  public:
@@ -33,6 +46,15 @@ class FileSystem {
 
   // Copies over an existing destination, whole or not at all. Throws 53 or 75.
   virtual void Copy(TextView source, TextView destination) = 0;
+
+  // Throws 53 when there is no such file, 75 when it cannot be read.
+  virtual std::unique_ptr<FileReader> Open(TextView path) = 0;
+
+  // Writes a file of these bytes over an existing one, whole or not at all. Throws 75.
+  virtual void Write(TextView path, std::string_view bytes) = 0;
+
+  // Throws 53 when there is no such file, 75 when it cannot be removed.
+  virtual void Remove(TextView path) = 0;
 
   // First name that matches `pattern` (wildcards in the last part): files that are neither hidden nor system
   // files, and with `folders` folders too. Empty when there is none.

@@ -4,6 +4,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <optional>
+#include <span>
 #include <string>
 #include <string_view>
 
@@ -29,9 +30,31 @@ struct HttpAnswer {
   std::string body;
 };
 
+// The bytes of a long body, one piece after the other.
+class BodySource {
+ public:
+  virtual ~BodySource() = default;
+
+  // Bytes of the whole body.
+  virtual std::uint64_t Length() const = 0;
+
+  // The next bytes, which fill `room` as long as there are enough; how many. Throws a run-time error when the
+  // source fails or holds fewer bytes than its length.
+  virtual std::size_t Read(std::span<char> room) = 0;
+
+  // Told when `sent` bytes have left, first with 0 before the first one. May pump messages.
+  virtual void Sent(std::uint64_t sent) = 0;
+};
+
 class HttpTransport {
  public:
   virtual ~HttpTransport() = default;
+
+  // The same as Post with the body from `source` (post.body is empty), which is called on the calling thread.
+  // Handles messages while it waits, so that windows are painted even when the server is silent. A quit
+  // message ends it with nullopt. What the source throws ends it too, and is passed on.
+  virtual std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source,
+                                               std::size_t maxBodyBytes) = 0;
 
   // Sends the post through the system's proxy settings and collects the whole answer; blocks without pumping
   // messages. Redirects are not followed, nothing is cached. Returns nullopt when the connection fails, stays

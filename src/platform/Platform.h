@@ -16,6 +16,10 @@ class MessagePump {
 
   // Handles the messages that wait now and returns; a quit message is put back.
   virtual void Yield() = 0;
+
+  // Sleeps, without using the processor, until there is a message, then does the same as Yield. False when
+  // there is a quit message: whoever waits has to stop, because the sleep would end at once each time.
+  virtual bool Wait() = 0;
 };
 
 // The implementations outlive whatever is handed this.

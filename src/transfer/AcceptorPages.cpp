@@ -10,8 +10,7 @@ namespace {
 
 constexpr TextView kScheme = u"http://";
 
-// An acceptor page says one number; anything longer than this is no answer of its.
-constexpr std::size_t kMostAnswerBytes = 64 * 1024;
+}  // namespace
 
 std::int32_t ErrorNumberOf(const std::optional<HttpAnswer>& answer) {
   return ResultAsItStood(acceptor::kUnspecified, [&](std::int32_t& number) {
@@ -20,7 +19,16 @@ std::int32_t ErrorNumberOf(const std::optional<HttpAnswer>& answer) {
   });
 }
 
-}  // namespace
+HttpPost AcceptorPost(TextView usersBaseUrl, TextView acceptorPath) {
+  if (usersBaseUrl.starts_with(kScheme)) usersBaseUrl.remove_prefix(kScheme.size());
+  auto address = SplitHttpAddress(usersBaseUrl);
+  if (!address) throw RuntimeError(acceptor::kUnspecified);
+  HttpPost post;
+  post.host = std::move(address->host);
+  post.port = address->port;
+  post.target = EscapeUnprintable(acceptorPath);
+  return post;
+}
 
 Text UsersBaseUrl(TextView server) {
   return Text(kScheme).append(server).append(u"/users/");
@@ -32,22 +40,15 @@ Text AcceptorPath(TextView page) {
 
 void PostAcceptorForm(HttpTransport& http, TextView usersBaseUrl, TextView acceptorPath,
                       std::initializer_list<AcceptorField> fields) {
-  if (usersBaseUrl.starts_with(kScheme)) usersBaseUrl.remove_prefix(kScheme.size());
-  const auto address = SplitHttpAddress(usersBaseUrl);
-  if (!address) throw RuntimeError(acceptor::kUnspecified);
-
+  HttpPost post = AcceptorPost(usersBaseUrl, acceptorPath);
   std::string body;
   for (const AcceptorField& field : fields) {
     if (!body.empty()) body += '&';
     body.append(EscapeFormValue(field.name)).append("=").append(EscapeFormValue(field.value));
   }
-  HttpPost post;
-  post.host = address->host;
-  post.port = address->port;
-  post.target = EscapeUnprintable(acceptorPath);
   post.contentType = "application/x-www-form-urlencoded; charset=utf-8";
   post.body = body;
-  const std::int32_t number = ErrorNumberOf(http.Post(post, kMostAnswerBytes));
+  const std::int32_t number = ErrorNumberOf(http.Post(post, kMostAcceptorAnswerBytes));
   if (number != 0) throw RuntimeError(number);
 }
 

@@ -6,18 +6,18 @@
 #include <string_view>
 #include <utility>
 
+#include "platform/HttpTransport.h"
 #include "support/Text.h"
 
 namespace tarnwick {
-
-class HttpTransport;
 
 // Identifies this product to the acceptor pages.
 inline constexpr TextView kProductGuid = u"4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E";
 
 // Error numbers of the pages.
 namespace acceptor {
-inline constexpr std::int32_t kRefused = -2147220878;      // user name, password or product identifier
+inline constexpr std::int32_t kNothingChanged = -2147220891;  // the same bytes were there already
+inline constexpr std::int32_t kRefused = -2147220878;         // user name, password or product identifier
 inline constexpr std::int32_t kFolderState = -2147220840;  // to delete: not there; to create: there already
 inline constexpr std::int32_t kUnspecified = -2147467259;  // no usable answer
 }  // namespace acceptor
@@ -32,6 +32,17 @@ struct AcceptorField {
   TextView name;
   TextView value;
 };
+
+// A post to the page on the server that `usersBaseUrl` names, without a body. Throws acceptor::kUnspecified
+// when the address names none.
+HttpPost AcceptorPost(TextView usersBaseUrl, TextView acceptorPath);
+
+// What the page answered: 0 when it succeeded, else its error number; kUnspecified when there is no usable
+// answer.
+std::int32_t ErrorNumberOf(const std::optional<HttpAnswer>& answer);
+
+// An acceptor page says one number; anything longer than this is no answer of its.
+inline constexpr std::size_t kMostAcceptorAnswerBytes = 64 * 1024;
 
 // Posts the fields, in their order, to the page on the server that `usersBaseUrl` names. Returns when the
 // page answered that it succeeded; else throws a run-time error with the page's error number, kUnspecified

@@ -33,14 +33,28 @@ struct FakeHttp : HttpTransport {
   };
   std::deque<std::optional<HttpAnswer>> answers;
   std::vector<Sent> sent;
+  // Called with each post before it is answered.
+  std::function<void(const Sent&)> onPost;
 
   std::optional<HttpAnswer> Post(const HttpPost& post, std::size_t maxBodyBytes) override {
     sent.push_back({post.host, post.port, post.target, std::string(post.contentType), std::string(post.body),
                     maxBodyBytes});
+    if (onPost) onPost(sent.back());
     if (answers.empty()) return std::nullopt;
     std::optional<HttpAnswer> answer = std::move(answers.front());
     answers.pop_front();
     return answer;
+  }
+  // Takes the whole body at once and is answered like any post.
+  std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source,
+                                       std::size_t maxBodyBytes) override {
+    source.Sent(0);
+    std::string body(static_cast<std::size_t>(source.Length()), '\0');
+    body.resize(source.Read(body));
+    source.Sent(body.size());
+    HttpPost whole = post;
+    whole.body = body;
+    return Post(whole, maxBodyBytes);
   }
 };
 
@@ -92,6 +106,7 @@ struct FakeFiles : FileSystem {
   struct File {
     std::uint64_t length = 0;
     std::uint32_t attributes = 0;
+    std::string bytes = {};
   };
   std::map<Text, File> files;
   std::vector<Text> folders;
@@ -119,6 +134,24 @@ struct FakeFiles : FileSystem {
     attributesSet.push_back(attributes);
   }
   void Copy(TextView source, TextView destination) override { files[Text(destination)] = At(source); }
+  struct Reader : FileReader {
+    explicit Reader(std::string itsBytes) : bytes(std::move(itsBytes)) {}
+    std::size_t Read(std::span<char> room) override {
+      const std::size_t count = bytes.copy(room.data(), room.size(), at);
+      at += count;
+      return count;
+    }
+    const std::string bytes;
+    std::size_t at = 0;
+  };
+  std::unique_ptr<FileReader> Open(TextView path) override { return std::make_unique<Reader>(At(path).bytes); }
+  void Write(TextView path, std::string_view bytes) override {
+    files[Text(path)] = {bytes.size(), 0, std::string(bytes)};
+  }
+  void Remove(TextView path) override {
+    At(path);
+    files.erase(Text(path));
+  }
   Text FirstName(TextView pattern, bool withFolders) override {
     const bool found =
         files.contains(Text(pattern)) || (withFolders && std::ranges::count(folders, pattern) > 0);
@@ -217,6 +250,9 @@ struct FakePump : MessagePump {
     ++yields;
     if (onYield) onYield();
   }
+  // What happens while a wait sleeps; false for a quit message. Without it there is only that.
+  std::function<bool()> onWait;
+  bool Wait() override { return onWait && onWait(); }
 };
 
 struct FakePlatform {

@@ -109,7 +109,7 @@ TEST_F(AcceptorTest, MalformedRequestsAreRefusedAndChangeNothing) {
   EXPECT_EQ(form("DeleteAcceptor.asp", std::string((1 << 20) + 1, 'a')), 413);
   EXPECT_EQ(form("OtherAcceptor.asp", ""), 404);
   Client().Http().set_compress(true);
-  EXPECT_EQ(form("DeleteAcceptor.asp", std::string((1 << 20) + 1, 'a')), 413);
+  EXPECT_EQ(form("DeleteAcceptor.asp", std::string((1 << 20) + 1, 'a')), 415);
   Client().Http().set_compress(false);
 
   EXPECT_TRUE(std::filesystem::is_empty(Data() / "work"));

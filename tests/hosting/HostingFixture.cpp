@@ -168,8 +168,11 @@ int HostingClient::NumberIn(const httplib::Result& result) {
 std::string UploadBody(const Fields& fields, const std::string& fileName, const std::string& bytes) {
   std::string body;
   for (const auto& [name, value] : fields)
-    body +=
-        "------b0undary\r\nContent-Disposition: form-data; name=\"" + name + "\"\r\n\r\n" + value + "\r\n";
+    body.append("------b0undary\r\nContent-Disposition: form-data; name=\"")
+        .append(name)
+        .append("\"\r\n\r\n")
+        .append(value)
+        .append("\r\n");
   body += "------b0undary\r\nContent-Disposition: form-data; name=\"File\"; filename=\"" + fileName +
           "\"\r\nContent-Type: application/octet-stream\r\n\r\n" + bytes + "\r\n------b0undary--\r\n";
   return body;

@@ -158,6 +158,7 @@ TEST_F(ServicePageTest, AProductNumberOfTheAccountMustFit) {
   };
   EXPECT_EQ(validate("7"), "TRUE");
   EXPECT_EQ(validate("8"), "FALSE");
+  EXPECT_EQ(validate("1e300"), kError);
 }
 
 TEST_F(ServicePageTest, AccountsAreAddedUpToTheLimitAndRemovedWithTheirFiles) {
@@ -178,7 +179,7 @@ TEST_F(ServicePageTest, AccountsAreAddedUpToTheLimitAndRemovedWithTheirFiles) {
             Utf8FromText(added.First(u"MGUID")));
 
   for (const char* taken : {user, "new.one@b-c", "new.one!@b.c"}) EXPECT_EQ(addCode(taken), "1003") << taken;
-  for (const char* refused : {"", ".", "..", "a/b", "a\\b", "a\tb", "\xC3\xA4\xC3\xB6"})
+  for (const char* refused : {"", ".", "..", "a b", "a/b", "a\\b", "a\tb", "\xC3\xA4\xC3\xB6"})
     EXPECT_EQ(addCode(refused), "1004") << refused;
   EXPECT_EQ(addCode("third@b.c"), "1001");
   EXPECT_EQ(addCode("fourth@b.c"), "1011");

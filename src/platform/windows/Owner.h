@@ -58,6 +58,13 @@ struct LibraryKind {
 };
 using LibraryOwner = Owner<LibraryKind>;
 
+struct FileKind {
+  using Handle = HANDLE;
+  static Handle None() { return INVALID_HANDLE_VALUE; }
+  static void Close(Handle handle) { CloseHandle(handle); }
+};
+using FileOwner = Owner<FileKind>;
+
 struct FindKind {
   using Handle = HANDLE;
   static Handle None() { return INVALID_HANDLE_VALUE; }

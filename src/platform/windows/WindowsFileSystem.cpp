@@ -1,7 +1,9 @@
 #include "platform/windows/WindowsFileSystem.h"
 
+#include <algorithm>
 #include <array>
 #include <string>
+#include <utility>
 
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/Owner.h"
@@ -33,6 +35,21 @@ WIN32_FILE_ATTRIBUTE_DATA FileData(TextView path) {
     throw RuntimeError(error::kFileNotFound);
   return data;
 }
+
+class WindowsFileReader : public FileReader {
+ public:
+  explicit WindowsFileReader(FileOwner file) : file_(std::move(file)) {}
+
+  std::size_t Read(std::span<char> room) override {
+    DWORD count = 0;
+    const auto most = static_cast<DWORD>(std::min<std::size_t>(room.size(), 1U << 30));
+    if (!ReadFile(file_.Get(), room.data(), most, &count, nullptr)) throw RuntimeError(error::kPathAccess);
+    return count;
+  }
+
+ private:
+  FileOwner file_;
+};
 
 bool NothingThere(DWORD status) {
   return status == ERROR_FILE_NOT_FOUND || status == ERROR_PATH_NOT_FOUND || status == ERROR_INVALID_NAME;
@@ -79,6 +96,38 @@ void WindowsFileSystem::Copy(TextView source, TextView destination) {
   if (!CopyFileW(from.c_str(), staged.Path().c_str(), FALSE))
     throw RuntimeError(NothingThere(GetLastError()) ? error::kFileNotFound : error::kPathAccess);
   if (!staged.Commit()) throw RuntimeError(error::kPathAccess);
+}
+
+std::unique_ptr<FileReader> WindowsFileSystem::Open(TextView path) {
+  FileOwner file(CreateFileW(WidePath(path, error::kFileNotFound).c_str(), GENERIC_READ,
+                             FILE_SHARE_READ | FILE_SHARE_DELETE, nullptr, OPEN_EXISTING,
+                             FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
+  if (!file) throw RuntimeError(NothingThere(GetLastError()) ? error::kFileNotFound : error::kPathAccess);
+  return std::make_unique<WindowsFileReader>(std::move(file));
+}
+
+void WindowsFileSystem::Write(TextView path, std::string_view bytes) {
+  StagedFile staged(WidePath(path, error::kPathAccess));
+  if (staged.Path().empty()) throw RuntimeError(error::kPathAccess);
+  {
+    const FileOwner file(
+        CreateFileW(staged.Path().c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr));
+    if (!file) throw RuntimeError(error::kPathAccess);
+    while (!bytes.empty()) {
+      DWORD count = 0;
+      const auto most = static_cast<DWORD>(std::min<std::size_t>(bytes.size(), 1U << 30));
+      if (!WriteFile(file.Get(), bytes.data(), most, &count, nullptr) || count == 0)
+        throw RuntimeError(error::kPathAccess);
+      bytes.remove_prefix(count);
+    }
+  }
+  if (!staged.Commit()) throw RuntimeError(error::kPathAccess);
+}
+
+void WindowsFileSystem::Remove(TextView path) {
+  const std::wstring widePath = WidePath(path, error::kFileNotFound);
+  if (!DeleteFileW(widePath.c_str()))
+    throw RuntimeError(NothingThere(GetLastError()) ? error::kFileNotFound : error::kPathAccess);
 }
 
 Text WindowsFileSystem::FirstName(TextView pattern, bool folders) {

@@ -11,6 +11,9 @@ class WindowsFileSystem : public FileSystem {
   std::uint32_t Attributes(TextView path) override;
   void SetAttributes(TextView path, std::uint32_t attributes) override;
   void Copy(TextView source, TextView destination) override;
+  std::unique_ptr<FileReader> Open(TextView path) override;
+  void Write(TextView path, std::string_view bytes) override;
+  void Remove(TextView path) override;
   Text FirstName(TextView pattern, bool folders) override;
   void MakeFolder(TextView path) override;
   Text TempPath() override;

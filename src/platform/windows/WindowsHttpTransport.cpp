@@ -2,12 +2,16 @@
 
 #include <algorithm>
 #include <array>
+#include <atomic>
 #include <charconv>
 #include <limits>
 #include <string>
+#include <thread>
+#include <utility>
 
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/InternetOwner.h"
+#include "platform/windows/WindowsMessagePump.h"
 
 namespace tarnwick {
 namespace {
@@ -17,6 +21,9 @@ constexpr DWORD kRequestFlags = INTERNET_FLAG_NO_AUTO_REDIRECT | INTERNET_FLAG_R
                                 INTERNET_FLAG_NO_COOKIES | INTERNET_FLAG_NO_AUTH | INTERNET_FLAG_NO_UI;
 
 constexpr std::size_t kFirstRoom = 16 * 1024;
+
+// Of a streamed body; a host hears of the progress after each.
+constexpr std::size_t kBlock = 64 * 1024;
 
 std::wstring WideFromAscii(std::string_view ascii) {
   return {ascii.begin(), ascii.end()};
@@ -72,43 +79,176 @@ bool ReadBody(HINTERNET request, std::size_t maxBytes, std::string& body) {
   return true;
 }
 
-}  // namespace
+// A request that is ready to be sent; the request goes first.
+struct OpenedRequest {
+  InternetOwner session;
+  InternetOwner connection;
+  InternetOwner request;
+};
 
-std::optional<HttpAnswer> WindowsHttpTransport::Post(const HttpPost& post, std::size_t maxBodyBytes) {
-  if (post.body.size() > std::numeric_limits<DWORD>::max()) return std::nullopt;
+// Opens session, connection and request, of which none goes over the network yet. The request is empty on
+// failure.
+OpenedRequest OpenRequest(const HttpPost& post, std::uint32_t connectMs, std::uint32_t silenceMs) {
+  OpenedRequest opened;
   // Opened for each post, which costs little: so a change of the system's proxy settings counts at once.
-  const InternetOwner session(InternetOpenW(L"Tarnwick", INTERNET_OPEN_TYPE_PRECONFIG, nullptr, nullptr, 0));
-  if (!session) return std::nullopt;
-  SetTimeouts(session.Get(), connectMs_, silenceMs_);
-  const InternetOwner connection(InternetConnectW(session.Get(), WideFromText(post.host).c_str(), post.port,
-                                                  nullptr, nullptr, INTERNET_SERVICE_HTTP, 0, 0));
-  if (!connection) return std::nullopt;
+  opened.session =
+      InternetOwner(InternetOpenW(L"Tarnwick", INTERNET_OPEN_TYPE_PRECONFIG, nullptr, nullptr, 0));
+  if (!opened.session) return opened;
+  SetTimeouts(opened.session.Get(), connectMs, silenceMs);
+  opened.connection =
+      InternetOwner(InternetConnectW(opened.session.Get(), WideFromText(post.host).c_str(), post.port,
+                                     nullptr, nullptr, INTERNET_SERVICE_HTTP, 0, 0));
+  if (!opened.connection) return opened;
   const wchar_t* acceptTypes[] = {L"*/*", nullptr};
-  const InternetOwner request(HttpOpenRequestW(connection.Get(), L"POST", WideFromAscii(post.target).c_str(),
-                                               L"HTTP/1.1", nullptr, acceptTypes, kRequestFlags, 0));
-  if (!request) return std::nullopt;
-  SetTimeouts(request.Get(), connectMs_, silenceMs_);
+  opened.request =
+      InternetOwner(HttpOpenRequestW(opened.connection.Get(), L"POST", WideFromAscii(post.target).c_str(),
+                                     L"HTTP/1.1", nullptr, acceptTypes, kRequestFlags, 0));
+  if (opened.request) SetTimeouts(opened.request.Get(), connectMs, silenceMs);
+  return opened;
+}
 
-  // A post may have been carried out although its answer was lost, so it is sent exactly once. On a kept
-  // connection that the server has closed meanwhile, the system would either fail or send it again on its
-  // own, and could not tell which of the two is right. Hence a connection for each post.
-  const std::wstring headers =
-      L"Content-Type: " + WideFromAscii(post.contentType) + L"\r\nConnection: close\r\n";
-  // The system only reads the body, whatever its declaration says.
-  if (!HttpSendRequestW(request.Get(), headers.c_str(), static_cast<DWORD>(headers.size()),
-                        const_cast<char*>(post.body.data()), static_cast<DWORD>(post.body.size())))
-    return std::nullopt;
+// A post may have been carried out although its answer was lost, so it is sent exactly once. On a kept
+// connection that the server has closed meanwhile, the system would either fail or send it again on its own,
+// and could not tell which of the two is right. Hence a connection for each post.
+std::wstring HeadersOf(const HttpPost& post) {
+  return L"Content-Type: " + WideFromAscii(post.contentType) + L"\r\nConnection: close\r\n";
+}
 
+// The answer to a request that has been sent.
+std::optional<HttpAnswer> ReadAnswer(HINTERNET request, std::size_t maxBodyBytes) {
   DWORD status = 0;
   DWORD statusSize = sizeof status;
-  if (!HttpQueryInfoW(request.Get(), HTTP_QUERY_STATUS_CODE | HTTP_QUERY_FLAG_NUMBER, &status, &statusSize,
+  if (!HttpQueryInfoW(request, HTTP_QUERY_STATUS_CODE | HTTP_QUERY_FLAG_NUMBER, &status, &statusSize,
                       nullptr) ||
       status < 100)  // a connection that ended before it said anything has a status of 0 in some versions
     return std::nullopt;
   HttpAnswer answer;
   answer.status = static_cast<int>(status);
-  if (!ReadBody(request.Get(), maxBodyBytes, answer.body)) return std::nullopt;
+  if (!ReadBody(request, maxBodyBytes, answer.body)) return std::nullopt;
   return answer;
+}
+
+// The network's side of a streamed post. The calls that send block, so they run on a thread of their own,
+// which is given one block after the other and knows nothing of where they come from.
+class PostWorker {
+ public:
+  PostWorker(HINTERNET request, std::wstring headers, std::uint64_t length, std::size_t maxBodyBytes)
+      : request_(request), headers_(std::move(headers)), length_(length), maxBodyBytes_(maxBodyBytes) {
+    thread_ = std::thread([this] {
+      Run();
+      SetEvent(done_.Get());
+    });
+  }
+  // The request has been closed before, unless the worker is done.
+  ~PostWorker() {
+    aborted_ = true;
+    SetEvent(given_.Get());
+    thread_.join();
+  }
+  PostWorker(const PostWorker&) = delete;
+  PostWorker& operator=(const PostWorker&) = delete;
+
+  // Signalled when the next block is wanted, and when all is over.
+  std::array<HANDLE, 2> Events() const { return {wanted_.Get(), done_.Get()}; }
+  void Give(std::string block) {
+    block_ = std::move(block);
+    SetEvent(given_.Get());
+  }
+  std::optional<HttpAnswer> TakeAnswer() { return std::move(answer_); }
+
+ private:
+  void Run() {
+    INTERNET_BUFFERSW buffers = {};
+    buffers.dwStructSize = sizeof buffers;
+    buffers.lpcszHeader = headers_.c_str();
+    buffers.dwHeadersLength = static_cast<DWORD>(headers_.size());
+    buffers.dwBufferTotal = static_cast<DWORD>(length_);
+    if (!HttpSendRequestExW(request_, &buffers, nullptr, 0, 0)) return;
+    for (std::uint64_t sent = 0; sent < length_;) {
+      SetEvent(wanted_.Get());
+      WaitForSingleObject(given_.Get(), INFINITE);
+      if (aborted_) return;
+      std::string_view rest = block_;
+      while (!rest.empty()) {
+        DWORD written = 0;
+        if (!InternetWriteFile(request_, rest.data(), static_cast<DWORD>(rest.size()), &written) ||
+            written == 0)
+          return;
+        rest.remove_prefix(written);
+      }
+      sent += block_.size();
+    }
+    // The last block has left.
+    SetEvent(wanted_.Get());
+    WaitForSingleObject(given_.Get(), INFINITE);
+    if (aborted_ || !HttpEndRequestW(request_, nullptr, 0, 0)) return;
+    answer_ = ReadAnswer(request_, maxBodyBytes_);
+  }
+
+  struct EventKind {
+    using Handle = HANDLE;
+    static Handle None() { return nullptr; }
+    static void Close(Handle handle) { CloseHandle(handle); }
+  };
+  using EventOwner = Owner<EventKind>;
+
+  const HINTERNET request_;
+  const std::wstring headers_;
+  const std::uint64_t length_;
+  const std::size_t maxBodyBytes_;
+  const EventOwner wanted_{CreateEventW(nullptr, FALSE, FALSE, nullptr)};
+  const EventOwner given_{CreateEventW(nullptr, FALSE, FALSE, nullptr)};
+  const EventOwner done_{CreateEventW(nullptr, TRUE, FALSE, nullptr)};
+  std::atomic<bool> aborted_ = false;
+  // Handed over by the events.
+  std::string block_;
+  std::optional<HttpAnswer> answer_;
+  std::thread thread_;
+};
+
+}  // namespace
+
+std::optional<HttpAnswer> WindowsHttpTransport::Post(const HttpPost& post, std::size_t maxBodyBytes) {
+  if (post.body.size() > std::numeric_limits<DWORD>::max()) return std::nullopt;
+  const OpenedRequest opened = OpenRequest(post, connectMs_, silenceMs_);
+  if (!opened.request) return std::nullopt;
+  const std::wstring headers = HeadersOf(post);
+  // The system only reads the body, whatever its declaration says.
+  if (!HttpSendRequestW(opened.request.Get(), headers.c_str(), static_cast<DWORD>(headers.size()),
+                        const_cast<char*>(post.body.data()), static_cast<DWORD>(post.body.size())))
+    return std::nullopt;
+  return ReadAnswer(opened.request.Get(), maxBodyBytes);
+}
+
+std::optional<HttpAnswer> WindowsHttpTransport::PostStream(const HttpPost& post, BodySource& source,
+                                                           std::size_t maxBodyBytes) {
+  const std::uint64_t length = source.Length();
+  if (length > std::numeric_limits<DWORD>::max()) return std::nullopt;
+  OpenedRequest opened = OpenRequest(post, connectMs_, silenceMs_);
+  if (!opened.request) return std::nullopt;
+  PostWorker worker(opened.request.Get(), HeadersOf(post), length, maxBodyBytes);
+  // Goes before the worker: a request that is closed ends the call that the worker is in.
+  const OpenedRequest closing = std::move(opened);
+  const std::array<HANDLE, 2> events = worker.Events();
+  WindowsMessagePump pump;
+  std::uint64_t sent = 0;
+  for (;;) {
+    const DWORD woken = MsgWaitForMultipleObjectsEx(static_cast<DWORD>(events.size()), events.data(),
+                                                    INFINITE, QS_ALLINPUT, MWMO_INPUTAVAILABLE);
+    if (woken == WAIT_OBJECT_0) {
+      source.Sent(sent);
+      std::string block(static_cast<std::size_t>(std::min<std::uint64_t>(kBlock, length - sent)), '\0');
+      if (source.Read(block) != block.size()) return std::nullopt;
+      sent += block.size();
+      worker.Give(std::move(block));
+    } else if (woken == WAIT_OBJECT_0 + 1) {
+      return worker.TakeAnswer();
+    } else {
+      MSG message = {};
+      if (PeekMessageW(&message, nullptr, WM_QUIT, WM_QUIT, PM_NOREMOVE)) return std::nullopt;
+      pump.Yield();
+    }
+  }
 }
 
 }  // namespace tarnwick

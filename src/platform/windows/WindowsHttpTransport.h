@@ -12,6 +12,8 @@ class WindowsHttpTransport : public HttpTransport {
       : connectMs_(connectMs), silenceMs_(silenceMs) {}
 
   std::optional<HttpAnswer> Post(const HttpPost& post, std::size_t maxBodyBytes) override;
+  std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source,
+                                       std::size_t maxBodyBytes) override;
 
  private:
   std::uint32_t connectMs_;

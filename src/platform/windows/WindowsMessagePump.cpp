@@ -27,4 +27,12 @@ void WindowsMessagePump::Yield() {
   }
 }
 
+bool WindowsMessagePump::Wait() {
+  MSG message{};
+  // MWMO_INPUTAVAILABLE: also for messages that somebody has looked at already.
+  MsgWaitForMultipleObjectsEx(0, nullptr, INFINITE, QS_ALLINPUT, MWMO_INPUTAVAILABLE);
+  Yield();
+  return !PeekMessageW(&message, nullptr, WM_QUIT, WM_QUIT, PM_NOREMOVE);
+}
+
 }  // namespace tarnwick

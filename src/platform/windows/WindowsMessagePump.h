@@ -10,6 +10,7 @@ namespace tarnwick {
 class WindowsMessagePump : public MessagePump {
  public:
   void Yield() override;
+  bool Wait() override;
 };
 
 }  // namespace tarnwick

@@ -2,6 +2,8 @@
 // operation fails to the host; what goes wrong is told by the result.
 #pragma once
 
+#include <memory>
+
 #include "service/CFileUpload.h"
 #include "support/surface/CUploadObject.h"
 #include "support/surface/DualObject.h"
@@ -11,8 +13,15 @@ namespace tarnwick {
 
 class CFileUploadObject final : public DualObject<_CFileUpload> {
  public:
-  // Works on the calling thread's apartment.
+  // A new client of the calling thread's apartment.
   CFileUploadObject();
+  // Shows `client`, which the object shares with a control.
+  explicit CFileUploadObject(std::shared_ptr<CFileUpload> client);
+
+  const std::shared_ptr<CFileUpload>& Client() const { return client_; }
+
+  // The object behind an interface that a host hands in; null when it is not one of ours.
+  static ComPtr<CFileUploadObject> From(IUnknown* object);
 
   STDMETHODIMP get_HTTPServer(BSTR* value) override;
   STDMETHODIMP put_HTTPServer(BSTR value) override;
@@ -65,8 +74,9 @@ class CFileUploadObject final : public DualObject<_CFileUpload> {
 
  private:
   ~CFileUploadObject() override;
+  void* FindInterface(REFIID interfaceId) override;
 
-  CFileUpload client_;
+  std::shared_ptr<CFileUpload> client_;
   // What the host was last given for the client's record, so that it gets the same object again.
   ComPtr<CUploadObject> uploadObject_;
 };

@@ -9,19 +9,25 @@
 #include "support/surface/Guard.h"
 #include "support/surface/Module.h"
 #include "support/surface/TypeLibrary.h"
+#include "support/surface/ctrlListImageObject.h"
 
 namespace tarnwick {
 namespace {
 
+// In Tarnwick.rc.
+constexpr int kListImageBitmap = 101;
+
 template <typename Object>
 IUnknown* Make() {
-  return new Object;
+  return static_cast<IUnknown*>(static_cast<IDispatch*>(new Object));
 }
 
 const std::array kClasses = {
-    CreatableClass{CLSID_CFileUpload, L"CFileUpload", L"Tarnwick client of the hosting service",
+    CreatableClass{CLSID_CFileUpload, L"CFileUpload", L"Tarnwick client of the hosting service", 0,
                    Make<CFileUploadObject>},
-    CreatableClass{CLSID_CBVAccount, L"CBVAccount", L"Tarnwick account details", Make<CBVAccountObject>},
+    CreatableClass{CLSID_CBVAccount, L"CBVAccount", L"Tarnwick account details", 0, Make<CBVAccountObject>},
+    CreatableClass{CLSID_ctrlListImage, L"ctrlListImage", L"Tarnwick list of the account's files",
+                   kListImageBitmap, Make<ctrlListImageObject>},
 };
 
 class ClassFactory final : public IClassFactory {

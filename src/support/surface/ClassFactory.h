@@ -12,6 +12,8 @@ struct CreatableClass {
   // As in the ProgID, Tarnwick.NAME.
   const wchar_t* name;
   const wchar_t* description;
+  // Number of the picture for tool boxes; 0 when the class is no control.
+  int toolboxBitmap;
   // A new object with one reference; may throw.
   IUnknown* (*make)();
 };

@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "support/RuntimeError.h"
+#include "support/surface/ComEnumerator.h"
 #include "support/surface/Guard.h"
 #include "support/surface/Module.h"
 
@@ -29,66 +30,6 @@ constexpr std::array<const OLECHAR*, 4> kAddParameters = {L"Item", L"Key", L"Bef
 bool SameName(const OLECHAR* left, const OLECHAR* right) {
   return lstrcmpiW(left, right) == 0;
 }
-
-// What "For Each" walks: the items as they were when it began.
-class Enumerator final : public IEnumVARIANT {
- public:
-  explicit Enumerator(std::vector<Variant> items) : items_(std::move(items)) { module::Hold(); }
-
-  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override {
-    if (!object) return E_POINTER;
-    *object = interfaceId == IID_IUnknown || interfaceId == IID_IEnumVARIANT ? this : nullptr;
-    if (!*object) return E_NOINTERFACE;
-    AddRef();
-    return S_OK;
-  }
-  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
-  STDMETHODIMP_(ULONG) Release() override {
-    const ULONG left = --references_;
-    if (left == 0) delete this;
-    return left;
-  }
-  STDMETHODIMP Next(ULONG count, VARIANT* values, ULONG* fetched) override {
-    if (!values || (!fetched && count != 1)) return E_POINTER;
-    ULONG done = 0;
-    const HRESULT result = Guarded([&] {
-      for (; done < count && next_ < items_.size(); ++done, ++next_)
-        values[done] = Variant(items_[next_].Get()).Detach();
-      return done == count ? S_OK : S_FALSE;
-    });
-    if (fetched) *fetched = done;
-    return result;
-  }
-  STDMETHODIMP Skip(ULONG count) override {
-    const std::size_t step = std::min<std::size_t>(count, items_.size() - next_);
-    next_ += step;
-    return step == count ? S_OK : S_FALSE;
-  }
-  STDMETHODIMP Reset() override {
-    next_ = 0;
-    return S_OK;
-  }
-  STDMETHODIMP Clone(IEnumVARIANT** clone) override {
-    if (!clone) return E_POINTER;
-    *clone = nullptr;
-    return Guarded([&] {
-      std::vector<Variant> items;
-      items.reserve(items_.size());
-      for (const Variant& item : items_) items.emplace_back(item.Get());
-      auto* copy = new Enumerator(std::move(items));
-      copy->next_ = next_;
-      *clone = copy;
-      return S_OK;
-    });
-  }
-
- private:
-  ~Enumerator() { module::LetGo(); }
-
-  std::atomic<ULONG> references_{1};
-  std::vector<Variant> items_;
-  std::size_t next_ = 0;
-};
 
 const OLECHAR* DescriptionOf(std::int32_t number) {
   switch (number) {
@@ -221,11 +162,12 @@ HRESULT CollectionObject::Call(DISPID member, WORD flags, const DISPPARAMS& argu
       break;
     }
     case DISPID_NEWENUM: {
-      std::vector<Variant> items;
+      // "For Each" walks the items as they are now.
+      std::vector<VARIANT> items;
       items.reserve(items_.Count());
-      for (std::size_t i = 1; i <= items_.Count(); ++i) items.emplace_back(items_.At(i).Get());
+      for (std::size_t i = 1; i <= items_.Count(); ++i) items.push_back(items_.At(i).Get());
       V_VT(&value.Get()) = VT_UNKNOWN;
-      V_UNKNOWN(&value.Get()) = new Enumerator(std::move(items));
+      V_UNKNOWN(&value.Get()) = new ComEnumerator<IEnumVARIANT, VARIANT>(std::move(items));
       break;
     }
     default:

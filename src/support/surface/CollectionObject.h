@@ -19,6 +19,9 @@ class CollectionObject final : public IDispatch {
   CollectionObject(const CollectionObject&) = delete;
   CollectionObject& operator=(const CollectionObject&) = delete;
 
+  // Adds an item without a key.
+  void Append(Variant item) { items_.Add(std::move(item)); }
+
   STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;
   STDMETHODIMP_(ULONG) AddRef() override;
   STDMETHODIMP_(ULONG) Release() override;

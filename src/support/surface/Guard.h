@@ -40,6 +40,23 @@ HRESULT AnsweredText(BSTR* result, Body&& body) noexcept {
   return Answered(result, nullptr, [&] { *result = NewBstr(std::forward<Body>(body)()); });
 }
 
+// The same for a Boolean, a VARIANT (Empty when it throws) and nothing at all.
+template <typename Body>
+HRESULT AnsweredBoolean(VARIANT_BOOL* result, Body&& body) noexcept {
+  return Answered(result, VARIANT_FALSE, [&] { *result = AutomationBoolean(std::forward<Body>(body)()); });
+}
+
+template <typename Body>
+HRESULT AnsweredVariant(VARIANT* result, Body&& body) noexcept {
+  return Answered(result, VARIANT{}, [&] { *result = std::forward<Body>(body)(); });
+}
+
+template <typename Body>
+HRESULT Done(Body&& body) noexcept {
+  ResultAsItStood(0, [&](int&) { std::forward<Body>(body)(); });
+  return S_OK;
+}
+
 // The two methods of a text property that is nothing but `text`.
 inline HRESULT GetText(const Text& text, BSTR* value) noexcept {
   if (!value) return E_POINTER;
@@ -56,11 +73,23 @@ inline HRESULT PutText(Text& text, BSTR value) noexcept {
   });
 }
 
-// Reads a property that is nothing but a number.
+// The two methods of a property that is nothing but a number or a Boolean.
 template <typename Number>
 HRESULT GetNumber(Number number, std::type_identity_t<Number>* value) noexcept {
   if (!value) return E_POINTER;
   *value = number;
+  return S_OK;
+}
+template <typename Number, typename Value>
+HRESULT PutNumber(Number& number, Value value) noexcept {
+  number = static_cast<Number>(value);
+  return S_OK;
+}
+inline HRESULT GetBoolean(bool boolean, VARIANT_BOOL* value) noexcept {
+  return GetNumber<VARIANT_BOOL>(AutomationBoolean(boolean), value);
+}
+inline HRESULT PutBoolean(bool& boolean, VARIANT_BOOL value) noexcept {
+  boolean = value != VARIANT_FALSE;
   return S_OK;
 }
 

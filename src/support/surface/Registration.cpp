@@ -1,5 +1,6 @@
 #include "support/surface/Registration.h"
 
+#include <comcat.h>
 #include <olectl.h>
 
 #include <string>
@@ -9,6 +10,7 @@
 #include "support/surface/ComPtr.h"
 #include "support/surface/Guard.h"
 #include "support/surface/Module.h"
+#include "support/surface/OleControl.h"
 #include "support/surface/TypeLibrary.h"
 
 namespace tarnwick {
@@ -60,6 +62,16 @@ struct Names {
   std::wstring versioned;
 };
 
+// What containers look for in a control. It claims no safety for scripts of web pages: it deletes and uploads
+// files.
+void RegisterControl(const std::wstring& classKey, const std::wstring& path, int toolboxBitmap) {
+  SetValue(classKey + L"\\Control", nullptr, {});
+  SetValue(classKey + L"\\MiscStatus", nullptr, L"0");
+  SetValue(classKey + L"\\MiscStatus\\1", nullptr, std::to_wstring(kControlMiscStatus));
+  SetValue(classKey + L"\\ToolboxBitmap32", nullptr, path + L", " + std::to_wstring(toolboxBitmap));
+  SetValue(classKey + L"\\Implemented Categories\\" + GuidText(CATID_Control), nullptr, {});
+}
+
 void RegisterClass(const CreatableClass& known, const std::wstring& path) {
   const Names names(known);
   const std::wstring classId = GuidText(known.id);
@@ -71,6 +83,7 @@ void RegisterClass(const CreatableClass& known, const std::wstring& path) {
   SetValue(names.classKey + L"\\TypeLib", nullptr, GuidText(LIBID_Tarnwick));
   SetValue(names.classKey + L"\\Version", nullptr, kVersion);
   SetValue(names.classKey + L"\\Programmable", nullptr, {});
+  if (known.toolboxBitmap != 0) RegisterControl(names.classKey, path, known.toolboxBitmap);
   SetValue(names.versioned, nullptr, known.description);
   SetValue(names.versioned + L"\\CLSID", nullptr, classId);
   SetValue(names.general, nullptr, known.description);

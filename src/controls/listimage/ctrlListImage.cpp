@@ -1,0 +1,334 @@
+// Construction, listing, selection, and what the user does. The operations on files are in
+// ctrlListImageFiles.cpp.
+#include "controls/listimage/ctrlListImage.h"
+
+#include <array>
+#include <utility>
+
+#include "controls/listimage/FileNames.h"
+#include "support/PathHelpers.h"
+#include "support/ResourceStrings.h"
+#include "support/RuntimeError.h"
+#include "support/UserFolder.h"
+#include "transfer/FileNameGuard.h"
+
+namespace tarnwick {
+namespace {
+
+constexpr std::array<ListColumn, 3> kColumns{
+    {{u"filename", u"File Name"}, {u"filepath", u"File Path"}, {u"filesize", u"File Size"}}};
+constexpr std::uint16_t kNoImagesString = 3582;
+
+constexpr std::int32_t kUpKey = 38;
+constexpr std::int32_t kDownKey = 40;
+
+constexpr ItemPicture kGifPicture{2, 4};
+constexpr ItemPicture kJpegPicture{4, 5};
+
+bool IsGif(const CUpload& record) {
+  return EndsWithIgnoringCase(record.FileName, u"gif");
+}
+bool IsJpg(const CUpload& record) {
+  return EndsWithIgnoringCase(record.FileName, u"jpg");
+}
+
+}  // namespace
+
+ctrlListImage::ctrlListImage(const Parts& parts)
+    : mobjFileupload(std::make_shared<CFileUpload>(parts.apartment)),
+      apartment_(parts.apartment),
+      view_(parts.view),
+      events_(parts.events),
+      uploader_(parts.uploader),
+      downloader_(parts.downloader) {
+  downloader_.SetEvents(this);
+  view_.SetLabelText(
+      ResultAsItStood(Text(), [&](Text& label) { label = GetResourceString(apartment_, kNoImagesString); }));
+}
+
+ctrlListImage::~ctrlListImage() {
+  Close();
+  apartment_.listingIsCurrent = false;
+}
+
+void ctrlListImage::Close() {
+  closed_ = true;
+  downloader_.SetEvents(nullptr);
+  downloader_.Cancel();
+}
+
+void ctrlListImage::Raise(std::int16_t code, TextView description) {
+  events_.FileManagerEvent(code, description);
+}
+
+void ctrlListImage::RaiseCurrentItem() {
+  Raise(event::kCurrentItem, SelectedKey());
+}
+
+// --- Listing ---
+
+bool ctrlListImage::Init(TextView szFileFilter) {
+  Text filter(szFileFilter);
+  if (!apartment_.listingIsCurrent) apartment_.allFiles.Clear();
+  if (!mobjFileupload) throw RuntimeError(list_error::kNoClient);
+  PrepareUserFolder(apartment_);
+  const bool listed = mobjFileupload->ListFilesForUser(
+      [&](const std::shared_ptr<CUpload>& record, TextView key) { apartment_.allFiles.Add(record, key); });
+  if (!listed) throw RuntimeError(list_error::kListingFailed);
+  ShowListOrLabel();
+  view_.SetColumns(kColumns);
+  currentFilter_ = std::move(filter);
+  // Letter case counts here, other than in ChangeFileFilter: hosts rely on both.
+  if (currentFilter_ == u"*") {
+    Fill([](const CUpload&) { return true; });
+  } else if (currentFilter_ == u"gif") {
+    Fill(IsGif);
+  } else if (currentFilter_ == u"jpg") {
+    Fill(IsJpg);
+  } else {
+    Fill([](const CUpload&) { return false; });
+  }
+  apartment_.listingIsCurrent = true;
+  return true;
+}
+
+void ctrlListImage::ChangeFileFilter(TextView szFileFilter) {
+  ResultAsItStood(0, [&](int&) {
+    const Text previous = SelectedFileName();
+    const Text filter = LowerCase(szFileFilter);
+    if (filter == u"gif") {
+      currentFilter_ = filter;
+      Fill(IsGif);
+    } else if (filter == u"jpg") {
+      currentFilter_ = filter;
+      Fill(IsJpg);
+    } else {
+      currentFilter_ = u"*";
+      Fill([](const CUpload&) { return true; });
+    }
+    if (!reselect_ || items_.empty()) return;
+    std::size_t again = 0;
+    for (std::size_t i = 0; i < items_.size(); ++i) {
+      if (!EqualsIgnoringCase(items_[i].record->FileName, previous)) continue;
+      again = i;
+      break;
+    }
+    SelectAlone(again);
+  });
+}
+
+void ctrlListImage::Fill(const std::function<bool(const CUpload&)>& shows) {
+  const FileList& all = apartment_.allFiles;
+  std::vector<Item> items;
+  items.reserve(all.Count());
+  for (std::size_t i = 1; i <= all.Count(); ++i)
+    if (const auto& record = all.At(i); shows(*record)) items.push_back({record});
+  items_ = std::move(items);
+  ++filling_;
+  view_.SetItemCount(items_.size());
+}
+
+bool ctrlListImage::ShowsWhenUploaded(TextView name) const {
+  const Text filter = LowerCase(currentFilter_);
+  return (filter != u"gif" && filter != u"jpg") || EndsWithIgnoringCase(name, filter);
+}
+
+void ctrlListImage::GetFileDetails(TextView FileName,
+                                   const std::function<void(const std::shared_ptr<CUpload>&)>& colFiles) {
+  ResultAsItStood(0, [&](int&) {
+    for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i) {
+      const CUpload& record = *apartment_.allFiles.At(i);
+      if (record.FilePath != FileName && FileNameFromUrl(record.FilePath) != FileName) continue;
+      auto details = std::make_shared<CUpload>(record);
+      details->FilePath.clear();
+      colFiles(details);
+      return;
+    }
+  });
+}
+
+// --- Selection ---
+
+std::optional<std::size_t> ctrlListImage::NextSelected(std::size_t from) const {
+  const auto selected = view_.NextSelected(from);
+  return selected && *selected < items_.size() ? selected : std::nullopt;
+}
+
+Text ctrlListImage::SelectedFileName() const {
+  const auto selected = Selected();
+  return selected ? items_[*selected].record->FileName : Text();
+}
+
+Text ctrlListImage::SelectedKey() const {
+  const auto selected = Selected();
+  return selected ? items_[*selected].record->FilePath : Text();
+}
+
+std::optional<Text> ctrlListImage::GetSelectedFilesHttpPath() const {
+  return Selected() ? std::optional(SelectedKey()) : std::nullopt;
+}
+
+std::vector<Text> ctrlListImage::GetFileNames() const {
+  std::vector<Text> names;
+  for (auto at = Selected(); at; at = NextSelected(*at + 1)) names.push_back(items_[*at].record->FileName);
+  return names;
+}
+
+void ctrlListImage::SetMultiSelectProperty(bool bVal) {
+  view_.SetMultiSelect(bVal);
+}
+
+void ctrlListImage::ListViewSetFocus() {
+  view_.Focus();
+}
+
+void ctrlListImage::UploadedFileSetFocus(TextView szFileName) {
+  const Text name(szFileName);
+  view_.Focus();
+  for (std::size_t i = 0; i < items_.size(); ++i) {
+    if (items_[i].record->FileName != name) continue;
+    SelectAlone(i);
+    return;
+  }
+}
+
+void ctrlListImage::SelectAlone(std::size_t index) {
+  for (auto at = Selected(); at; at = NextSelected(*at + 1))
+    if (*at != index) view_.Select(*at, false);
+  view_.Select(index, true);
+  view_.SetFocusTo(index);
+}
+
+// --- What the view asks ---
+
+Text ctrlListImage::ItemText(std::size_t index, int column) const {
+  if (index >= items_.size()) return {};
+  const Item& item = items_[index];
+  if (column == 0) return item.record->FileName;
+  if (column == 1) return item.record->FilePath;
+  if (column != 2) return {};
+  const Text bytes = SizeText(item.record->FileSize);
+  const Text kilobytes = TextFromNumber(Kilobytes(item.record->FileSize));
+  return item.uploaded ? bytes + u"Bytes (" + kilobytes + u"KB)" : bytes + u" Bytes (" + kilobytes + u" KB)";
+}
+
+ItemPicture ctrlListImage::PictureOf(std::size_t index) const {
+  if (index >= items_.size()) return kJpegPicture;
+  const Text filter = LowerCase(currentFilter_);
+  const bool gif =
+      filter == u"gif" || (filter != u"jpg" && EndsWithIgnoringCase(items_[index].record->FileName, u".gif"));
+  return gif ? kGifPicture : kJpegPicture;
+}
+
+std::optional<std::size_t> ctrlListImage::FindItem(TextView prefix, std::size_t start) const {
+  for (std::size_t step = 0; step < items_.size(); ++step) {
+    const std::size_t at = (start + step) % items_.size();
+    if (StartsWithIgnoringCase(items_[at].record->FileName, prefix)) return at;
+  }
+  return std::nullopt;
+}
+
+// --- What the user does ---
+
+void ctrlListImage::OnKeyDown(std::int32_t keyCode) {
+  if ((keyCode == kUpKey || keyCode == kDownKey) && !items_.empty()) RaiseCurrentItem();
+}
+
+void ctrlListImage::OnEnter() {
+  Raise(event::kClickEnds);
+}
+
+void ctrlListImage::OnSelectionChanged() {
+  RaiseCurrentItem();
+}
+
+void ctrlListImage::OnClick() {
+  Raise(event::kClickBegins);
+  if (!SelectedFileName().empty()) RaiseCurrentItem();
+  Raise(event::kClickEnds);
+}
+
+void ctrlListImage::OnMouseButton() {
+  // Either button on an item is the host's own affair, which learns of it by the click.
+  if (mobjFileupload && SelectedFileName().empty()) Raise(event::kCurrentItem);
+}
+
+bool ctrlListImage::OnBeforeLabelEdit() const {
+  return bRenameEnabled && !renameInProgress_ && !closed_;
+}
+
+bool ctrlListImage::OnAfterLabelEdit(std::size_t index, TextView newText) {
+  return ResultAsItStood(false, [&](bool& renamed) {
+    if (!bRenameEnabled || index >= items_.size()) return;
+    const Text oldName = items_[index].record->FileName;
+    Text newName(newText);
+    // An emptied or untouched label means that the user changed his mind.
+    if (Trim(newName).empty() || newName == oldName) return;
+    if (!IsFileNameValid(newName)) return;
+    CheckFileExtension(newName, ExtensionOf(oldName));
+    if (Trim(newName) != oldName) renamed = RenameFile(oldName, newName);
+  });
+}
+
+void ctrlListImage::StartLabelExit() {
+  view_.EndLabelEdit();
+}
+
+bool ctrlListImage::EnableRename(bool bEnableRename) {
+  bRenameEnabled = bEnableRename;
+  return bEnableRename;
+}
+
+// --- Drag and drop ---
+
+void ctrlListImage::OLEDrag() {
+  view_.StartDrag();
+}
+
+ctrlListImage::DragContent ctrlListImage::ContentOfDrag() const {
+  return ResultAsItStood(DragContent(), [&](DragContent& content) {
+    content.address = SelectedKey();
+    const Text name = SelectedFileName();
+    if (apartment_.UserFolderPath.empty() || !IsSafeFileName(name)) return;
+    Text copy = apartment_.UserFolderPath + u"\\" + name;
+    if (FileExists(apartment_.platform.files, copy)) content.localFile = std::move(copy);
+  });
+}
+
+void ctrlListImage::OnStartDrag(DragData& data, std::int32_t& allowedEffects) {
+  dragFromList_ = true;
+  events_.OLEStartDrag(data, allowedEffects);
+}
+
+void ctrlListImage::OnSetData(DragData& data, std::int16_t format) {
+  events_.OLESetData(data, format);
+}
+
+void ctrlListImage::OnGiveFeedback(std::int32_t& effect, bool& defaultCursors) {
+  events_.OLEGiveFeedback(effect, defaultCursors);
+}
+
+void ctrlListImage::OnDragOver(DragData& data, std::int32_t& effect, const DragPoint& at,
+                               std::int16_t state) {
+  events_.OLEDragOver(data, effect, at, state);
+}
+
+void ctrlListImage::OnDrop(DragData& data, const std::vector<Text>& files, std::int32_t& effect,
+                           const DragPoint& at) {
+  // What the host does in the event may end the drag.
+  const bool fromList = dragFromList_;
+  events_.OLEDragDrop(data, effect, at);
+  if (fromList) {
+    Raise(event::kListDrop);
+    return;
+  }
+  if (files.empty()) return;
+  for (const Text& path : files) Raise(event::kFileDrop, path);
+  Raise(event::kFileDrop);
+}
+
+void ctrlListImage::OnCompleteDrag(std::int32_t effect) {
+  if (std::exchange(dragFromList_, false)) events_.OLECompleteDrag(effect);
+}
+
+}  // namespace tarnwick

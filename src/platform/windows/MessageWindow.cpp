@@ -1,0 +1,35 @@
+#include "platform/windows/MessageWindow.h"
+
+#include <utility>
+
+#include "support/RuntimeError.h"
+
+namespace tarnwick {
+
+MessageWindow::MessageWindow(Handler handler) : handler_(std::move(handler)) {
+  // A class of the system's, so that none of ours has to go with the library.
+  window_ = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
+  if (!window_) return;
+  SetWindowLongPtrW(window_, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(this));
+  SetWindowLongPtrW(window_, GWLP_WNDPROC, reinterpret_cast<LONG_PTR>(WindowProc));
+}
+
+MessageWindow::~MessageWindow() {
+  if (!window_) return;
+  SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
+  DestroyWindow(window_);
+}
+
+LRESULT CALLBACK MessageWindow::WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  auto* self = reinterpret_cast<MessageWindow*>(GetWindowLongPtrW(window, GWLP_USERDATA));
+  if (self) {
+    // A copy, because the object may end inside its handler.
+    const Handler handler = self->handler_;
+    const bool taken =
+        ResultAsItStood(true, [&](bool& result) { result = handler(message, wParam, lParam); });
+    if (taken) return 0;
+  }
+  return DefWindowProcW(window, message, wParam, lParam);
+}
+
+}  // namespace tarnwick

@@ -1,0 +1,403 @@
+#include "platform/windows/WindowsListView.h"
+
+#include <algorithm>
+#include <string>
+
+#include "platform/windows/AnsiText.h"
+#include "support/RuntimeError.h"
+
+namespace tarnwick {
+namespace {
+
+constexpr wchar_t kClassName[] = L"TarnwickListImage";
+constexpr int kColumnWidth = 96;
+constexpr UINT_PTR kSubclass = 1;
+// Names for screen readers.
+constexpr wchar_t kListName[] = L"Files of the account";
+
+// A hidden window that holds the windows of controls that are in no container.
+HWND ParkingWindow(HINSTANCE module) {
+  static HWND parking = nullptr;
+  if (!IsWindow(parking))
+    parking = CreateWindowExW(WS_EX_TOOLWINDOW, L"STATIC", L"", WS_POPUP, 0, 0, 0, 0, nullptr, nullptr,
+                              module, nullptr);
+  return parking;
+}
+
+void CopyTo(const NMLVDISPINFOW& info, const Text& text) {
+  if (info.item.cchTextMax <= 0) return;
+  const auto room = static_cast<std::size_t>(info.item.cchTextMax - 1);
+  const std::size_t length = std::min(room, text.size());
+  std::copy_n(text.begin(), length, info.item.pszText);
+  info.item.pszText[length] = L'\0';
+}
+
+}  // namespace
+
+WindowsListView::~WindowsListView() {
+  if (!window_) return;
+  if (depth_ == 0) {
+    DestroyWindow(window_);
+    return;
+  }
+  // The host ended the control inside one of its own messages. The list is not done with that message yet, so
+  // the window goes with the next one.
+  SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
+  RemoveWindowSubclass(list_, ListProc, kSubclass);
+  Park();
+  PostMessageW(window_, WM_CLOSE, 0, 0);
+}
+
+HWND WindowsListView::Window() {
+  if (!window_ && !MakeWindow() && window_) {
+    DestroyWindow(window_);
+    window_ = nullptr;
+  }
+  return window_;
+}
+
+HWND WindowsListView::List() {
+  Window();
+  return list_;
+}
+
+bool WindowsListView::MakeWindow() {
+  const INITCOMMONCONTROLSEX classes = {sizeof classes, ICC_LISTVIEW_CLASSES};
+  InitCommonControlsEx(&classes);
+  WNDCLASSEXW windowClass = {};
+  windowClass.cbSize = sizeof windowClass;
+  windowClass.lpfnWndProc = WindowProc;
+  windowClass.hInstance = module_;
+  windowClass.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_WINDOW + 1);
+  windowClass.hCursor = LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(IDC_ARROW));
+  windowClass.lpszClassName = kClassName;
+  RegisterClassExW(&windowClass);  // fails when it is registered already
+
+  const HWND parking = ParkingWindow(module_);
+  window_ = CreateWindowExW(WS_EX_CONTROLPARENT, kClassName, L"", WS_CHILD | WS_CLIPCHILDREN, 0, 0, 0, 0,
+                            parking, nullptr, module_, this);
+  if (!window_) return false;
+  list_ = CreateWindowExW(0, WC_LISTVIEWW, kListName,
+                          WS_CHILD | WS_VISIBLE | WS_TABSTOP | LVS_REPORT | LVS_OWNERDATA |
+                              LVS_SHOWSELALWAYS | LVS_EDITLABELS | LVS_SHAREIMAGELISTS | LVS_SINGLESEL,
+                          0, 0, 0, 0, window_, nullptr, module_, nullptr);
+  label_ = CreateWindowExW(0, L"STATIC", L"", WS_CHILD | SS_CENTER | SS_NOPREFIX, 0, 0, 0, 0, window_,
+                           nullptr, module_, nullptr);
+  if (!list_ || !label_) return false;
+  SetWindowSubclass(list_, ListProc, kSubclass, reinterpret_cast<DWORD_PTR>(this));
+  largeIcons_ = MakeLargeIcons(Dpi());
+  smallIcons_ = MakeSmallIcons(Dpi());
+  ListView_SetImageList(list_, largeIcons_.Get(), LVSIL_NORMAL);
+  ListView_SetImageList(list_, smallIcons_.Get(), LVSIL_SMALL);
+  SetLook(nullptr, std::nullopt, std::nullopt);
+  return true;
+}
+
+int WindowsListView::Dpi() const {
+  const HDC dc = GetDC(window_);
+  const int dpi = GetDeviceCaps(dc, LOGPIXELSX);
+  ReleaseDC(window_, dc);
+  return dpi;
+}
+
+void WindowsListView::Park() {
+  if (!window_) return;
+  ShowWindow(window_, SW_HIDE);
+  SetParent(window_, ParkingWindow(module_));
+}
+
+void WindowsListView::SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background) {
+  font_ = font ? font : static_cast<HFONT>(GetStockObject(DEFAULT_GUI_FONT));
+  textColor_ = text.value_or(GetSysColor(COLOR_WINDOWTEXT));
+  backColor_ = background.value_or(GetSysColor(COLOR_WINDOW));
+  if (!window_) return;
+  SendMessageW(list_, WM_SETFONT, reinterpret_cast<WPARAM>(font_), TRUE);
+  SendMessageW(label_, WM_SETFONT, reinterpret_cast<WPARAM>(font_), TRUE);
+  ListView_SetTextColor(list_, textColor_);
+  ListView_SetTextBkColor(list_, backColor_);
+  ListView_SetBkColor(list_, backColor_);
+  InvalidateRect(window_, nullptr, TRUE);
+}
+
+void WindowsListView::Layout() const {
+  RECT client = {};
+  GetClientRect(window_, &client);
+  MoveWindow(list_, 0, 0, client.right, client.bottom, TRUE);
+  // The label stands in the middle; it is as high as two of its lines.
+  const int height = std::min<int>(client.bottom, MulDiv(32, Dpi(), 96));
+  MoveWindow(label_, 0, (client.bottom - height) / 2, client.right, height, TRUE);
+}
+
+void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
+  const int dpi = GetDeviceCaps(dc, LOGPIXELSX);
+  const HGDIOBJ oldFont =
+      SelectObject(dc, font_ ? font_ : static_cast<HFONT>(GetStockObject(DEFAULT_GUI_FONT)));
+  SetDCBrushColor(dc, backColor_ == CLR_DEFAULT ? GetSysColor(COLOR_WINDOW) : backColor_);
+  FillRect(dc, &bounds, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
+  SetTextColor(dc, textColor_ == CLR_DEFAULT ? GetSysColor(COLOR_WINDOWTEXT) : textColor_);
+  SetBkMode(dc, TRANSPARENT);
+  TEXTMETRICW metrics = {};
+  GetTextMetricsW(dc, &metrics);
+  const int line = metrics.tmHeight + 4;
+  constexpr UINT kCell = DT_LEFT | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
+  if (!listShown_) {
+    RECT middle = {bounds.left, (bounds.top + bounds.bottom - line) / 2, bounds.right, bounds.bottom};
+    DrawTextW(dc, WideFromText(labelText_).c_str(), -1, &middle, DT_CENTER | DT_TOP | DT_NOPREFIX);
+    SelectObject(dc, oldFont);
+    return;
+  }
+  const int width = MulDiv(kColumnWidth, dpi, 96);
+  int top = bounds.top;
+  for (std::size_t row = 0; row <= count_ && top < bounds.bottom; ++row, top += line) {
+    int left = bounds.left;
+    for (std::size_t column = 0; column < titles_.size() && left < bounds.right; ++column, left += width) {
+      RECT cell = {left, top, left + width, top + line};
+      if (row == 0) {
+        FillRect(dc, &cell, GetSysColorBrush(COLOR_BTNFACE));
+        DrawEdge(dc, &cell, BDR_RAISEDINNER, BF_RECT);
+      }
+      cell.left += 4;
+      cell.right -= 2;
+      if (row > 0 && column == 0 && smallIcons_) {
+        ImageList_Draw(smallIcons_.Get(), (user_.IsGif(row - 1) ? icon::kSmallGif : icon::kSmallJpeg) - 1, dc,
+                       cell.left, cell.top, ILD_TRANSPARENT);
+        cell.left += MulDiv(18, dpi, 96);
+      }
+      const Text text = row == 0 ? titles_[column] : user_.ItemText(row - 1, column);
+      DrawTextW(dc, WideFromText(text).c_str(), -1, &cell, kCell);
+    }
+  }
+  SelectObject(dc, oldFont);
+}
+
+void WindowsListView::SetColumns(std::span<const ListColumn> columns) {
+  if (!Window()) return;
+  while (ListView_DeleteColumn(list_, 0)) {
+  }
+  titles_.clear();
+  const int width = MulDiv(kColumnWidth, Dpi(), 96);
+  for (const ListColumn& column : columns) {
+    titles_.emplace_back(column.title);
+    std::wstring title = WideFromText(column.title);
+    LVCOLUMNW added = {};
+    added.mask = LVCF_TEXT | LVCF_WIDTH | LVCF_FMT | LVCF_SUBITEM;
+    added.fmt = LVCFMT_LEFT;
+    added.cx = width;
+    added.pszText = title.data();
+    added.iSubItem = static_cast<int>(titles_.size()) - 1;
+    SendMessageW(list_, LVM_INSERTCOLUMNW, static_cast<WPARAM>(added.iSubItem),
+                 reinterpret_cast<LPARAM>(&added));
+  }
+}
+
+void WindowsListView::SetItemCount(std::size_t count) {
+  if (!Window()) return;
+  ListView_CancelEditLabel(list_);
+  // One message for all items: their number does not count.
+  ListView_SetItemState(list_, -1, 0, LVIS_SELECTED | LVIS_FOCUSED);
+  count_ = count;
+  ListView_SetItemCountEx(list_, static_cast<int>(count), 0);
+  if (count > 0) ListView_EnsureVisible(list_, 0, FALSE);
+}
+
+void WindowsListView::AppendItem() {
+  if (!Window()) return;
+  ++count_;
+  ListView_SetItemCountEx(list_, static_cast<int>(count_), LVSICF_NOSCROLL);
+}
+
+void WindowsListView::RefreshItem(std::size_t index) {
+  if (Window()) ListView_RedrawItems(list_, static_cast<int>(index), static_cast<int>(index));
+}
+
+void WindowsListView::ShowList(bool list) {
+  listShown_ = list;
+  if (!Window()) return;
+  ShowWindow(list ? label_ : list_, SW_HIDE);
+  ShowWindow(list ? list_ : label_, SW_SHOWNA);
+}
+
+void WindowsListView::SetLabelText(TextView text) {
+  labelText_ = text;
+  if (Window()) SetWindowTextW(label_, WideFromText(text).c_str());
+}
+
+bool WindowsListView::IsSelected(std::size_t index) const {
+  return list_ && (ListView_GetItemState(list_, static_cast<int>(index), LVIS_SELECTED) & LVIS_SELECTED) != 0;
+}
+
+std::optional<std::size_t> WindowsListView::NextSelected(std::size_t from) const {
+  const int found = list_ ? ListView_GetNextItem(list_, static_cast<int>(from) - 1, LVNI_SELECTED) : -1;
+  return found < 0 ? std::nullopt : std::optional<std::size_t>(static_cast<std::size_t>(found));
+}
+
+void WindowsListView::Select(std::size_t index, bool selected) {
+  if (!Window()) return;
+  // A list of single selection does not see to it when the selection comes from a program.
+  if (selected && (GetWindowLongW(list_, GWL_STYLE) & LVS_SINGLESEL))
+    ListView_SetItemState(list_, -1, 0, LVIS_SELECTED);
+  ListView_SetItemState(list_, static_cast<int>(index), selected ? LVIS_SELECTED : 0, LVIS_SELECTED);
+}
+
+void WindowsListView::SetFocusTo(std::size_t index) {
+  if (!Window()) return;
+  ListView_SetItemState(list_, static_cast<int>(index), LVIS_FOCUSED, LVIS_FOCUSED);
+  ListView_EnsureVisible(list_, static_cast<int>(index), FALSE);
+}
+
+void WindowsListView::SetMultiSelect(bool multiple) {
+  if (!Window()) return;
+  const std::optional<std::size_t> first = NextSelected(0);
+  const LONG style = GetWindowLongW(list_, GWL_STYLE);
+  SetWindowLongW(list_, GWL_STYLE, multiple ? style & ~LVS_SINGLESEL : style | LVS_SINGLESEL);
+  if (!multiple && first) Select(*first, true);
+}
+
+void WindowsListView::EndLabelEdit() {
+  if (list_) ListView_CancelEditLabel(list_);
+}
+
+void WindowsListView::Focus() {
+  if (Window()) SetFocus(listShown_ ? list_ : window_);
+}
+
+void WindowsListView::SetHourglass(bool hourglass) {
+  hourglass_ = hourglass;
+  POINT at = {};
+  if (window_ && GetCursorPos(&at) && ScreenToClient(window_, &at)) {
+    RECT client = {};
+    GetClientRect(window_, &client);
+    if (PtInRect(&client, at))
+      SetCursor(LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(hourglass ? IDC_WAIT : IDC_ARROW)));
+  }
+}
+
+// Runs a handler, whose exceptions end here. The object may be gone afterwards.
+LRESULT WindowsListView::Handle(HWND window, const std::function<LRESULT()>& handler) {
+  ++depth_;
+  const LRESULT result = ResultAsItStood(LRESULT{0}, [&](LRESULT& answer) { answer = handler(); });
+  if (GetWindowLongPtrW(window, GWLP_USERDATA) == reinterpret_cast<LONG_PTR>(this)) --depth_;
+  return result;
+}
+
+LRESULT CALLBACK WindowsListView::WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  if (message == WM_NCCREATE) {
+    const auto* create = reinterpret_cast<const CREATESTRUCTW*>(lParam);
+    SetWindowLongPtrW(window, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(create->lpCreateParams));
+  }
+  auto* self = reinterpret_cast<WindowsListView*>(GetWindowLongPtrW(window, GWLP_USERDATA));
+  if (!self || !self->list_ || !self->label_) return DefWindowProcW(window, message, wParam, lParam);
+  switch (message) {
+    case WM_SIZE:
+      self->Layout();
+      return 0;
+    case WM_SETFOCUS:
+      self->user_.GotFocus();
+      if (self->listShown_) SetFocus(self->list_);
+      return 0;
+    case WM_SETCURSOR:
+      if (!self->hourglass_) break;
+      SetCursor(LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(IDC_WAIT)));
+      return TRUE;
+    case WM_CTLCOLORSTATIC:
+      SetTextColor(reinterpret_cast<HDC>(wParam), self->textColor_);
+      SetBkColor(reinterpret_cast<HDC>(wParam), self->backColor_);
+      SetDCBrushColor(reinterpret_cast<HDC>(wParam), self->backColor_);
+      return reinterpret_cast<LRESULT>(GetStockObject(DC_BRUSH));
+    case WM_NOTIFY: {
+      const auto& header = *reinterpret_cast<const NMHDR*>(lParam);
+      if (header.hwndFrom != self->list_) break;
+      return self->Handle(window, [&] { return self->OnNotify(header); });
+    }
+    case WM_NCDESTROY:
+      SetWindowLongPtrW(window, GWLP_USERDATA, 0);
+      self->window_ = self->list_ = self->label_ = nullptr;
+      break;
+    default:
+      break;
+  }
+  return DefWindowProcW(window, message, wParam, lParam);
+}
+
+LRESULT WindowsListView::OnNotify(const NMHDR& header) {
+  switch (header.code) {
+    case LVN_GETDISPINFOW: {
+      auto& info = *reinterpret_cast<NMLVDISPINFOW*>(const_cast<NMHDR*>(&header));
+      const auto item = static_cast<std::size_t>(info.item.iItem);
+      if (info.item.iItem < 0 || item >= count_) return 0;
+      if (info.item.mask & LVIF_TEXT)
+        CopyTo(info, user_.ItemText(item, static_cast<std::size_t>(info.item.iSubItem)));
+      if (info.item.mask & LVIF_IMAGE)
+        info.item.iImage = (user_.IsGif(item) ? icon::kSmallGif : icon::kSmallJpeg) - 1;
+      return 0;
+    }
+    case LVN_ODFINDITEMW: {
+      const auto& find = *reinterpret_cast<const NMLVFINDITEMW*>(&header);
+      if (!(find.lvfi.flags & (LVFI_STRING | LVFI_PARTIAL)) || !find.lvfi.psz) return -1;
+      const auto found =
+          user_.FindItem(TextFromWide(find.lvfi.psz), static_cast<std::size_t>(std::max(0, find.iStart)));
+      return found ? static_cast<LRESULT>(*found) : -1;
+    }
+    case LVN_BEGINLABELEDITW: {
+      const auto& info = *reinterpret_cast<const NMLVDISPINFOW*>(&header);
+      // True keeps the list from editing.
+      return user_.LabelEditBegins(static_cast<std::size_t>(info.item.iItem)) ? FALSE : TRUE;
+    }
+    case LVN_ENDLABELEDITW: {
+      const auto& info = *reinterpret_cast<const NMLVDISPINFOW*>(&header);
+      if (!info.item.pszText) return FALSE;
+      return user_.LabelEditEnds(static_cast<std::size_t>(info.item.iItem), TextFromWide(info.item.pszText))
+                 ? TRUE
+                 : FALSE;
+    }
+    case LVN_BEGINDRAG:
+      user_.DragBegins();
+      return 0;
+    case NM_CLICK:
+      user_.Clicked();
+      return 0;
+    case NM_DBLCLK:
+      user_.DoubleClicked();
+      return 0;
+    case NM_SETFOCUS:
+      user_.GotFocus();
+      return 0;
+    default:
+      return 0;
+  }
+}
+
+LRESULT CALLBACK WindowsListView::ListProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam,
+                                           UINT_PTR id, DWORD_PTR data) {
+  auto* self = reinterpret_cast<WindowsListView*>(data);
+  switch (message) {
+    case WM_NCDESTROY:
+      RemoveWindowSubclass(window, ListProc, id);
+      break;
+    case WM_KEYDOWN:
+    case WM_LBUTTONDOWN:
+    case WM_RBUTTONDOWN:
+      return self->Handle(GetParent(window), [&] { return self->OnListMessage(message, wParam, lParam); });
+    default:
+      break;
+  }
+  return DefSubclassProc(window, message, wParam, lParam);
+}
+
+LRESULT WindowsListView::OnListMessage(UINT message, WPARAM wParam, LPARAM lParam) {
+  // The handlers may run code of the host's that ends the control: nothing of it is touched after them.
+  const HWND list = list_;
+  if (message != WM_KEYDOWN) {
+    user_.ButtonPressed();
+    return DefSubclassProc(list, message, wParam, lParam);
+  }
+  if (wParam == VK_RETURN) {
+    user_.EnterPressed();
+    return 0;
+  }
+  const LRESULT result = DefSubclassProc(list, message, wParam, lParam);
+  user_.KeyPressed(static_cast<int>(wParam));
+  return result;
+}
+
+}  // namespace tarnwick

@@ -1,0 +1,108 @@
+// The list window: a report list without items of its own (owner data) and a label, one shown in place of the
+// other, in a window that fills its control.
+#pragma once
+
+#include "platform/windows/WindowsHeaders.h"
+
+#include <cstddef>
+#include <functional>
+#include <optional>
+#include <vector>
+
+#include "controls/listimage/ListView.h"
+#include "platform/windows/FileIcons.h"
+
+namespace tarnwick {
+
+// What the window asks for, and what it tells of the user. Items count from 0, columns too. No member throws.
+class ListViewUser {
+ public:
+  virtual ~ListViewUser() = default;
+
+  virtual Text ItemText(std::size_t item, std::size_t column) const = 0;
+  virtual bool IsGif(std::size_t item) const = 0;
+  // The first item from `start` on, round the end, whose name begins with `prefix` in any letter case.
+  virtual std::optional<std::size_t> FindItem(TextView prefix, std::size_t start) const = 0;
+
+  // A key was pressed, and the list has done with it what lists do.
+  virtual void KeyPressed(int key) = 0;
+  virtual void EnterPressed() = 0;
+  virtual void ButtonPressed() = 0;
+  virtual void Clicked() = 0;
+  virtual void DoubleClicked() = 0;
+  // Whether the label may be edited, and whether the edited text stands.
+  virtual bool LabelEditBegins(std::size_t item) = 0;
+  virtual bool LabelEditEnds(std::size_t item, TextView text) = 0;
+  virtual void DragBegins() = 0;
+  virtual void GotFocus() = 0;
+};
+
+class WindowsListView : public ListView {
+ public:
+  // `module` is where the window's class belongs. `user` outlives the window.
+  WindowsListView(HINSTANCE module, ListViewUser& user) : module_(module), user_(user) {}
+  ~WindowsListView() override;
+  WindowsListView(const WindowsListView&) = delete;
+  WindowsListView& operator=(const WindowsListView&) = delete;
+
+  // The window that holds list and label, made hidden and without a container on the first call; null on
+  // failure.
+  HWND Window();
+  // The list itself, where drops land.
+  HWND List();
+  // Takes the window out of its container and hides it; what it shows stays.
+  void Park();
+  // Null for the system's own font, nullopt for the system's own colour.
+  void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background);
+  // Draws the list as the window would show it, into `bounds`.
+  void Draw(HDC dc, const RECT& bounds) const;
+  // The small pictures, for a picture made of two.
+  HIMAGELIST SmallIcons() const { return smallIcons_.Get(); }
+
+  void SetColumns(std::span<const ListColumn> columns) override;
+  void SetItemCount(std::size_t count) override;
+  void AppendItem() override;
+  void RefreshItem(std::size_t index) override;
+  void ShowList(bool list) override;
+  void SetLabelText(TextView text) override;
+  bool IsSelected(std::size_t index) const override;
+  std::optional<std::size_t> NextSelected(std::size_t from) const override;
+  void Select(std::size_t index, bool selected) override;
+  void SetFocusTo(std::size_t index) override;
+  void SetMultiSelect(bool multiple) override;
+  void EndLabelEdit() override;
+  void Focus() override;
+  void SetHourglass(bool hourglass) override;
+  void StartDrag() override { user_.DragBegins(); }
+
+ private:
+  static LRESULT CALLBACK WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  static LRESULT CALLBACK ListProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR id,
+                                   DWORD_PTR data);
+  LRESULT Handle(HWND window, const std::function<LRESULT()>& handler);
+  LRESULT OnNotify(const NMHDR& header);
+  LRESULT OnListMessage(UINT message, WPARAM wParam, LPARAM lParam);
+  bool MakeWindow();
+  void Layout() const;
+  int Dpi() const;
+
+  const HINSTANCE module_;
+  ListViewUser& user_;
+  HWND window_ = nullptr;
+  HWND list_ = nullptr;
+  HWND label_ = nullptr;
+  HFONT font_ = nullptr;
+  COLORREF textColor_ = CLR_DEFAULT;
+  COLORREF backColor_ = CLR_DEFAULT;
+  ImageListOwner largeIcons_;
+  ImageListOwner smallIcons_;
+  // Handlers of messages that run now, one inside the other.
+  int depth_ = 0;
+  std::vector<Text> titles_;
+  std::size_t count_ = 0;
+  bool listShown_ = true;
+  bool hourglass_ = false;
+  Text labelText_;
+};
+
+}  // namespace tarnwick

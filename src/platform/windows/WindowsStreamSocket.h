@@ -1,0 +1,46 @@
+#pragma once
+
+#include <winsock2.h>
+
+#include <memory>
+#include <string>
+
+#include "platform/StreamSocket.h"
+#include "platform/windows/MessageWindow.h"
+
+namespace tarnwick {
+
+// A non-blocking Winsock socket that tells its events as window messages, so that a wait for them uses no
+// processor time.
+class WindowsStreamSocket : public StreamSocket {
+ public:
+  WindowsStreamSocket();
+  ~WindowsStreamSocket() override;
+  WindowsStreamSocket(const WindowsStreamSocket&) = delete;
+  WindowsStreamSocket& operator=(const WindowsStreamSocket&) = delete;
+
+  void SetEvents(SocketEvents* events) override { events_ = events; }
+  void Connect(TextView host, std::uint16_t port) override;
+  void Send(std::string_view bytes) override;
+  std::size_t Read(std::span<char> room) override;
+  void Close() override;
+
+ private:
+  bool OnMessage(UINT message, WPARAM wParam, LPARAM lParam);
+  void OnNetworkEvent(int event, int error);
+  void ConnectTo(std::uint32_t address);
+  void SendPending();
+  void TellError(int error);
+
+  SocketEvents* events_ = nullptr;
+  SOCKET socket_ = INVALID_SOCKET;
+  // Of the look-up that runs; null when none does.
+  HANDLE lookup_ = nullptr;
+  std::string lookupAnswer_;
+  std::uint16_t port_ = 0;
+  std::string pending_;
+  bool started_ = false;
+  MessageWindow window_;
+};
+
+}  // namespace tarnwick

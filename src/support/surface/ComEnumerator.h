@@ -1,0 +1,110 @@
+// An enumerator over a copy of a list, for the enumerator interfaces of COM that all have the same four
+// methods.
+#pragma once
+
+#include <ocidl.h>
+
+#include <algorithm>
+#include <atomic>
+#include <utility>
+#include <vector>
+
+#include "support/surface/Automation.h"
+#include "support/surface/Guard.h"
+#include "support/surface/Module.h"
+
+namespace tarnwick {
+
+// How an enumerator keeps and hands out an element: Keep makes it the enumerator's, Free ends that.
+inline void Keep(VARIANT& value) {
+  Variant copy(value);
+  value = copy.Detach();
+}
+inline void Free(VARIANT& value) {
+  VariantClear(&value);
+}
+inline void Keep(CONNECTDATA& connection) {
+  connection.pUnk->AddRef();
+}
+inline void Free(CONNECTDATA& connection) {
+  connection.pUnk->Release();
+}
+inline void Keep(IConnectionPoint* point) {
+  point->AddRef();
+}
+inline void Free(IConnectionPoint* point) {
+  point->Release();
+}
+
+// Ours have no target device, which would have to be copied.
+inline void Keep(FORMATETC&) {}
+inline void Free(FORMATETC&) {}
+
+template <typename Interface, typename Element>
+class ComEnumerator final : public Interface {
+ public:
+  // Takes references of its own to the elements. Throws what copying throws.
+  explicit ComEnumerator(std::vector<Element> elements, std::size_t next = 0)
+      : elements_(std::move(elements)), next_(next) {
+    for (Element& element : elements_) Keep(element);
+    module::Hold();
+  }
+  ComEnumerator(const ComEnumerator&) = delete;
+  ComEnumerator& operator=(const ComEnumerator&) = delete;
+
+  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override {
+    if (!object) return E_POINTER;
+    *object = interfaceId == IID_IUnknown || interfaceId == __uuidof(Interface) ? this : nullptr;
+    if (!*object) return E_NOINTERFACE;
+    AddRef();
+    return S_OK;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
+  STDMETHODIMP_(ULONG) Release() override {
+    const ULONG left = --references_;
+    if (left == 0) delete this;
+    return left;
+  }
+  STDMETHODIMP Next(ULONG count, Element* elements, ULONG* fetched) override {
+    if (!elements || (!fetched && count != 1)) return E_POINTER;
+    ULONG done = 0;
+    const HRESULT result = Guarded([&] {
+      for (; done < count && next_ < elements_.size(); ++done, ++next_) {
+        elements[done] = elements_[next_];
+        Keep(elements[done]);
+      }
+      return done == count ? S_OK : S_FALSE;
+    });
+    if (fetched) *fetched = done;
+    return result;
+  }
+  STDMETHODIMP Skip(ULONG count) override {
+    const std::size_t step = std::min<std::size_t>(count, elements_.size() - next_);
+    next_ += step;
+    return step == count ? S_OK : S_FALSE;
+  }
+  STDMETHODIMP Reset() override {
+    next_ = 0;
+    return S_OK;
+  }
+  STDMETHODIMP Clone(Interface** clone) override {
+    if (!clone) return E_POINTER;
+    *clone = nullptr;
+    return Guarded([&] {
+      *clone = new ComEnumerator(elements_, next_);
+      return S_OK;
+    });
+  }
+
+ private:
+  ~ComEnumerator() {
+    for (Element& element : elements_) Free(element);
+    module::LetGo();
+  }
+
+  std::atomic<ULONG> references_{1};
+  std::vector<Element> elements_;
+  std::size_t next_;
+};
+
+}  // namespace tarnwick

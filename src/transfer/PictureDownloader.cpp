@@ -1,0 +1,121 @@
+#include "transfer/PictureDownloader.h"
+
+#include "platform/FileSystem.h"
+#include "platform/Platform.h"
+#include "support/PathHelpers.h"
+#include "support/RuntimeError.h"
+
+namespace tarnwick {
+namespace {
+
+// Of one arrival; a host hears of each.
+constexpr std::size_t kRoom = 256 * 1024;
+
+// FtpErrors.
+constexpr std::int32_t kHostNotFound = 9;
+constexpr std::int32_t kConnectionReset = 7;
+constexpr std::int32_t kConnectionRefused = 6;
+constexpr std::int32_t kConnectAborted = 5;
+constexpr std::int32_t kTimeout = 58;
+// Winsock's numbers of the same conditions.
+constexpr std::int32_t kWinsockReset = 10054;
+constexpr std::int32_t kWinsockRefused = 10061;
+constexpr std::int32_t kWinsockHostNotFound = 11001;
+
+std::int32_t FtpErrorOf(std::int32_t winsockError) {
+  switch (winsockError) {
+    case kWinsockReset:
+      return kConnectionReset;
+    case kWinsockRefused:
+      return kConnectionRefused;
+    case kWinsockHostNotFound:
+      return kHostNotFound;
+    default:
+      return kConnectAborted;
+  }
+}
+
+}  // namespace
+
+PictureDownloader::PictureDownloader(Apartment& apartment, StreamSocket& socket, Timer& watchdog)
+    : apartment_(apartment), socket_(socket), watchdog_(watchdog), machine_(*this) {
+  socket_.SetEvents(this);
+  watchdog_.SetHandler([this] {
+    ftpError_ = kTimeout;
+    if (machine_.IsRunning()) return machine_.OnWatchdog();
+    // Of an upload: it fails the transfer all the same.
+    watchdog_.Stop();
+    Failed(false);
+  });
+}
+
+PictureDownloader::~PictureDownloader() {
+  watchdog_.Stop();
+  socket_.SetEvents(nullptr);
+  socket_.Close();
+}
+
+void PictureDownloader::Start(TextView url, TextView explicitTarget) {
+  ftpError_ = kConnectAborted;
+  machine_.StartDownload(url, apartment_.UserFolderPath, explicitTarget, apartment_.proxy.ProxyHost,
+                         apartment_.proxy.ProxyPort);
+}
+
+void PictureDownloader::Wait() {
+  // A quit message ends the program: nothing is waited for any more.
+  if (apartment_.platform.pump.Wait()) return;
+  machine_.Cancel();
+  Failed(false);
+}
+
+void PictureDownloader::RemoveFile(TextView path) {
+  apartment_.platform.files.Remove(path);
+}
+
+void PictureDownloader::Connect(TextView host, std::uint16_t port) {
+  if (events_) events_->Resolving();
+  socket_.Connect(host, port);
+}
+
+void PictureDownloader::OnConnected() {
+  if (events_) events_->Connected();
+  machine_.OnConnected();
+  if (events_) events_->TransferStarting();
+}
+
+void PictureDownloader::OnReadable() {
+  room_.resize(kRoom);
+  const std::size_t count = socket_.Read(room_);
+  machine_.OnData({room_.data(), count});
+}
+
+void PictureDownloader::OnSocketError(std::int32_t number) {
+  ftpError_ = FtpErrorOf(number);
+  machine_.OnSocketError();
+}
+
+void PictureDownloader::WriteFile(TextView path, TextView explicitPath, std::string_view bytes) {
+  ResultAsItStood(0, [&](int&) {
+    FileSystem& files = apartment_.platform.files;
+    files.Write(explicitPath.empty() ? path : explicitPath, bytes);
+    if (!explicitPath.empty() && explicitPath != path) CopyLocalFile(files, explicitPath, path);
+  });
+}
+
+void PictureDownloader::Received(std::int32_t bytes) {
+  if (events_) events_->Received(bytes);
+}
+
+void PictureDownloader::ReplyLine(std::string_view line) {
+  if (events_) events_->ReplyLine(TextFromLatin1(line));
+}
+
+void PictureDownloader::Finished() {
+  if (events_) events_->Finished();
+}
+
+void PictureDownloader::Failed(bool told) {
+  if (events_) events_->Failed(ftpError_, ftpError_ == kTimeout ? u"Timed out" : u"Connection failed", told);
+}
+
+}  // namespace tarnwick

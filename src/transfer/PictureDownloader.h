@@ -1,0 +1,58 @@
+// A control's downloader: ties the machine to a socket, the watchdog and the local files.
+#pragma once
+
+#include <string>
+
+#include "platform/StreamSocket.h"
+#include "platform/Timer.h"
+#include "support/Apartment.h"
+#include "transfer/SocketDownloader.h"
+#include "transfer/Transfers.h"
+
+namespace tarnwick {
+
+class PictureDownloader : public Downloader, private DownloadActions, private SocketEvents {
+ public:
+  // All of them outlive the object. The owner keeps it alive while it tells its events.
+  PictureDownloader(Apartment& apartment, StreamSocket& socket, Timer& watchdog);
+  ~PictureDownloader() override;
+  PictureDownloader(const PictureDownloader&) = delete;
+  PictureDownloader& operator=(const PictureDownloader&) = delete;
+
+  void SetEvents(DownloadEvents* events) override { events_ = events; }
+  void Start(TextView url, TextView explicitTarget) override;
+  void Cancel() override { machine_.Cancel(); }
+  void RestartWatchdog() override { watchdog_.Start(kWatchdogMs); }
+  void StopWatchdog() override { watchdog_.Stop(); }
+  void Wait() override;
+  void RemoveFile(TextView path) override;
+
+ private:
+  // DownloadActions
+  void Connect(TextView host, std::uint16_t port) override;
+  void Send(std::string_view bytes) override { socket_.Send(bytes); }
+  void CloseSocket() override { socket_.Close(); }
+  void WriteFile(TextView path, TextView explicitPath, std::string_view bytes) override;
+  void Received(std::int32_t bytes) override;
+  void ReplyLine(std::string_view line) override;
+  void Finished() override;
+  void Failed(bool told) override;
+
+  // SocketEvents
+  void OnResolved() override {}
+  void OnConnected() override;
+  void OnReadable() override;
+  void OnClosedByPeer() override { machine_.OnClosedByPeer(); }
+  void OnSent() override { machine_.OnSent(); }
+  void OnSocketError(std::int32_t number) override;
+
+  Apartment& apartment_;
+  StreamSocket& socket_;
+  Timer& watchdog_;
+  SocketDownloader machine_;
+  DownloadEvents* events_ = nullptr;
+  std::int32_t ftpError_ = 0;
+  std::string room_;
+};
+
+}  // namespace tarnwick

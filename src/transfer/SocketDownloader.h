@@ -1,0 +1,96 @@
+// The picture downloader: an HTTP/1.1 client for one file at a time, made of what the server sends. It owns
+// no socket, clock or window: it is told what happens and says what is to be done, so that Winsock, a test
+// and a fuzzer drive it alike.
+//
+// Wire form of the request, each line with CR LF at its end, then an empty one:
+//   GET TARGET HTTP/1.1
+//   Host: HOST
+//   Connection: close
+//   Accept: */*
+//   User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)
+// The reply is everything up to an orderly close, whatever it says of itself: its bytes after the first empty
+// line are the file.
+#pragma once
+
+#include <cstdint>
+#include <span>
+#include <string>
+#include <string_view>
+
+#include "support/Text.h"
+
+namespace tarnwick {
+
+// More bytes than a picture has; a reply that is longer fails.
+inline constexpr std::size_t kMostReplyBytes = std::size_t{256} << 20;
+
+// Longest silence of a transfer.
+inline constexpr std::uint32_t kWatchdogMs = 40'000;
+
+// What the downloader wants to be done. Nothing may be told to it from inside these, except that events of a
+// control may start or end another download.
+class DownloadActions {
+ public:
+  virtual ~DownloadActions() = default;
+  virtual void Connect(TextView host, std::uint16_t port) = 0;
+  virtual void Send(std::string_view bytes) = 0;
+  virtual void CloseSocket() = 0;
+  virtual void RestartWatchdog() = 0;
+  virtual void StopWatchdog() = 0;
+  // Writes the bytes to `explicitPath`, unless that is empty, and to `path`, over what is there. Failures are
+  // ignored: who waits for the file sees that it is not there.
+  virtual void WriteFile(TextView path, TextView explicitPath, std::string_view bytes) = 0;
+
+  virtual void Received(std::int32_t bytes) = 0;
+  virtual void ReplyLine(std::string_view line) = 0;
+  virtual void Finished() = 0;
+  // The download is over without a file. `told`: hosts hear of it.
+  virtual void Failed(bool told) = 0;
+};
+
+class SocketDownloader {
+ public:
+  explicit SocketDownloader(DownloadActions& actions) : actions_(actions) {}
+
+  // Begins to fetch `url` ("http://host[:port]/path", or without the scheme), through the proxy unless its
+  // host is empty. The file goes to `folder` under the last part of the address, and first to
+  // `explicitTarget` unless that is empty. An address or name that could do harm, a folder that is empty, or
+  // a proxy without a usable port fails at once. An empty address does nothing.
+  void StartDownload(TextView url, TextView folder, TextView explicitTarget, TextView proxyHost,
+                     TextView proxyPort);
+
+  // Ends a download without an event.
+  void Cancel();
+
+  void OnConnected();
+  // Bytes in the order of their arrival.
+  void OnData(std::span<const char> bytes);
+  void OnClosedByPeer();
+  void OnSent();
+  void OnSocketError();
+  void OnWatchdog();
+
+  bool IsRunning() const { return running_; }
+  // The announced length of the file; 0 when there is none that is a 32-bit number.
+  std::int32_t ContentLength() const { return contentLength_; }
+
+ private:
+  void Fail(bool told);
+  void ReadHeader();
+
+  DownloadActions& actions_;
+  Text remoteHost_;
+  Text hostLine_;
+  Text remotePath_;
+  Text target_;
+  Text explicitTarget_;
+  // Everything that has arrived; the body alone once the header was found.
+  std::string buffer_;
+  std::size_t searched_ = 0;
+  std::size_t arrived_ = 0;
+  std::int32_t contentLength_ = 0;
+  bool headerFound_ = false;
+  bool running_ = false;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,63 @@
+// The components that move bytes, as the controls use them, and what they tell meanwhile.
+#pragma once
+
+#include <cstdint>
+
+#include "support/Text.h"
+
+namespace tarnwick {
+
+class UploadEvents {
+ public:
+  virtual ~UploadEvents() = default;
+  virtual void ActionComplete() = 0;
+  virtual void Connecting() = 0;
+  virtual void Initializing() = 0;
+  virtual void ServerProcess() = 0;
+  virtual void UploadStarted() = 0;
+  virtual void UploadProgress(std::int32_t percent, std::int32_t bytes) = 0;
+  virtual void UploadComplete() = 0;
+};
+
+// The three operations throw a RuntimeError with the component's number.
+class Uploader {
+ public:
+  virtual ~Uploader() = default;
+  virtual void UploadFile(TextView localPath, TextView usersBaseUrl, TextView acceptorPath, std::int32_t flag,
+                          TextView user, TextView password, TextView productGuid, UploadEvents& events) = 0;
+  virtual void DeleteFile(TextView usersBaseUrl, TextView name, TextView acceptorPath, TextView user,
+                          TextView password, TextView productGuid) = 0;
+  virtual void RenameFile(TextView usersBaseUrl, TextView oldName, TextView newName, TextView acceptorPath,
+                          TextView user, TextView password, TextView productGuid) = 0;
+};
+
+class DownloadEvents {
+ public:
+  virtual ~DownloadEvents() = default;
+  virtual void Resolving() = 0;
+  virtual void Connected() = 0;
+  virtual void TransferStarting() = 0;
+  virtual void ReplyLine(TextView line) = 0;
+  // Bytes so far.
+  virtual void Received(std::int32_t bytes) = 0;
+  // Closed by the peer, and the file writer has run.
+  virtual void Finished() = 0;
+  // 5555 is due when `told`; a watchdog that ran out says nothing.
+  virtual void Failed(std::int32_t ftpError, TextView description, bool told) = 0;
+};
+
+class Downloader {
+ public:
+  virtual ~Downloader() = default;
+  virtual void Start(TextView url, TextView explicitTarget) = 0;
+  virtual void SetEvents(DownloadEvents* events) = 0;
+  virtual void Cancel() = 0;
+  virtual void RestartWatchdog() = 0;
+  virtual void StopWatchdog() = 0;
+  // Sleeps until there is a message, and handles what waits then.
+  virtual void Wait() = 0;
+  // Throws 75.
+  virtual void RemoveFile(TextView path) = 0;
+};
+
+}  // namespace tarnwick

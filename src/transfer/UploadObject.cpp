@@ -1,0 +1,143 @@
+#include "transfer/UploadObject.h"
+
+#include <algorithm>
+#include <limits>
+#include <memory>
+#include <string>
+
+#include "platform/FileSystem.h"
+#include "platform/HttpTransport.h"
+#include "support/PathHelpers.h"
+#include "support/RuntimeError.h"
+#include "transfer/AcceptorPages.h"
+
+namespace tarnwick {
+namespace {
+
+// The file's bytes are not searched for it: a file that held this line would have been made to.
+constexpr std::string_view kBoundary = "--tarnwick-7d1f4c0be85a4296b3f2c6e0a9d85137";
+
+// The body of an upload: the fields, then the bytes of the file while they are read.
+class UploadBody : public BodySource {
+ public:
+  UploadBody(FileSystem& files, TextView path, UploadEvents& events)
+      : length_(files.Length(path)), file_(files.Open(path)), events_(events) {}
+
+  void AddField(std::string_view name, TextView value) {
+    AddPartHead(name, {});
+    head_.append(Utf8FromText(value)).append("\r\n");
+  }
+  // The last part. The name comes from a path of this machine; a quote in it cannot be.
+  void AddFile(std::string_view name, TextView fileName) {
+    AddPartHead(name,
+                "; filename=\"" + Utf8FromText(fileName) + "\"\r\nContent-Type: application/octet-stream");
+    tail_ = "\r\n--" + std::string(kBoundary) + "--\r\n";
+  }
+
+  std::uint64_t Length() const override { return head_.size() + length_ + tail_.size(); }
+
+  std::size_t Read(std::span<char> room) override {
+    std::size_t filled = 0;
+    while (filled < room.size()) {
+      const std::span<char> rest = room.subspan(filled);
+      const std::size_t count = ReadSome(rest);
+      if (count == 0) break;
+      filled += count;
+      position_ += count;
+    }
+    return filled;
+  }
+
+  void Sent(std::uint64_t sent) override {
+    // Of the file alone: the fields around it are no progress that a user would see.
+    const std::uint64_t ofFile = std::min(sent - std::min<std::uint64_t>(sent, head_.size()), length_);
+    const auto percent =
+        static_cast<std::int32_t>(length_ == 0 ? (sent == 0 ? 0 : 100) : ofFile * 100 / length_);
+    if (!started_) events_.UploadStarted();
+    started_ = true;
+    if (percent <= percent_) return;
+    percent_ = percent;
+    constexpr std::uint64_t kMost = std::numeric_limits<std::int32_t>::max();
+    events_.UploadProgress(percent, static_cast<std::int32_t>(std::min(ofFile, kMost)));
+  }
+
+ private:
+  void AddPartHead(std::string_view name, std::string_view more) {
+    head_.append("--").append(kBoundary).append("\r\nContent-Disposition: form-data; name=\"").append(name);
+    head_.append("\"").append(more).append("\r\n\r\n");
+  }
+
+  std::size_t ReadSome(std::span<char> room) {
+    const std::uint64_t afterFile = head_.size() + length_;
+    if (position_ < head_.size()) return Copy(head_, position_, room);
+    if (position_ >= afterFile) return Copy(tail_, position_ - afterFile, room);
+    const std::uint64_t left = afterFile - position_;
+    const std::size_t count =
+        file_->Read(room.first(static_cast<std::size_t>(std::min<std::uint64_t>(room.size(), left))));
+    // The file has become shorter: what was announced cannot be kept.
+    if (count == 0) throw RuntimeError(error::kPathAccess);
+    return count;
+  }
+
+  static std::size_t Copy(std::string_view text, std::uint64_t from, std::span<char> room) {
+    return text.copy(room.data(), room.size(), static_cast<std::size_t>(from));
+  }
+
+  std::string head_;
+  std::string tail_;
+  const std::uint64_t length_;
+  const std::unique_ptr<FileReader> file_;
+  UploadEvents& events_;
+  std::uint64_t position_ = 0;
+  std::int32_t percent_ = -1;
+  bool started_ = false;
+};
+
+}  // namespace
+
+void UploadObject::UploadFile(TextView localPath, TextView usersBaseUrl, TextView acceptorPath,
+                              std::int32_t flag, TextView user, TextView password, TextView productGuid,
+                              UploadEvents& events) {
+  UploadBody body(platform_.files, localPath, events);
+  body.AddField("UsersBaseUrl", usersBaseUrl);
+  body.AddField("Flag", TextFromNumber(flag));
+  body.AddField("User", user);
+  body.AddField("Password", password);
+  body.AddField("ProductID", productGuid);
+  body.AddFile("File", FileNameFromPath(localPath));
+
+  HttpPost post = AcceptorPost(usersBaseUrl, acceptorPath);
+  const std::string contentType = "multipart/form-data; boundary=" + std::string(kBoundary);
+  post.contentType = contentType;
+  events.Initializing();
+  events.Connecting();
+  const auto answer = platform_.http.PostStream(post, body, kMostAcceptorAnswerBytes);
+  events.ServerProcess();
+  const std::int32_t number = ErrorNumberOf(answer);
+  if (number == 0 || number == acceptor::kNothingChanged) events.UploadComplete();
+  events.ActionComplete();
+  if (number != 0) throw RuntimeError(number);
+}
+
+void UploadObject::DeleteFile(TextView usersBaseUrl, TextView name, TextView acceptorPath, TextView user,
+                              TextView password, TextView productGuid) {
+  PostAcceptorForm(platform_.http, usersBaseUrl, acceptorPath,
+                   {{u"UsersBaseUrl", usersBaseUrl},
+                    {u"FileName", name},
+                    {u"User", user},
+                    {u"Password", password},
+                    {u"ProductID", productGuid}});
+}
+
+void UploadObject::RenameFile(TextView usersBaseUrl, TextView oldName, TextView newName,
+                              TextView acceptorPath, TextView user, TextView password, TextView productGuid) {
+  PostAcceptorForm(platform_.http, usersBaseUrl, acceptorPath,
+                   {{u"UsersBaseUrl", usersBaseUrl},
+                    {u"OldFileName", oldName},
+                    {u"NewFileName", newName},
+                    {u"User", user},
+                    {u"Password", password},
+                    {u"ProductID", productGuid}});
+}
+
+}  // namespace tarnwick

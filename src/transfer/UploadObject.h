@@ -1,0 +1,30 @@
+// The upload component: puts files on the hosting server through its acceptor pages, deletes and renames them
+// there.
+#pragma once
+
+#include "platform/Platform.h"
+#include "transfer/Transfers.h"
+
+namespace tarnwick {
+
+class UploadObject : public Uploader {
+ public:
+  explicit UploadObject(const Platform& platform) : platform_(platform) {}
+
+  // Streams the file, whatever its size, and pumps messages meanwhile. Throws 53 when there is no such file,
+  // the page's error number, or acceptor::kUnspecified when there is no usable answer. A file that changes
+  // its length meanwhile is a failure.
+  void UploadFile(TextView localPath, TextView usersBaseUrl, TextView acceptorPath, std::int32_t flag,
+                  TextView user, TextView password, TextView productGuid, UploadEvents& events) override;
+
+  // Block without pumping. Throw the page's error number.
+  void DeleteFile(TextView usersBaseUrl, TextView name, TextView acceptorPath, TextView user,
+                  TextView password, TextView productGuid) override;
+  void RenameFile(TextView usersBaseUrl, TextView oldName, TextView newName, TextView acceptorPath,
+                  TextView user, TextView password, TextView productGuid) override;
+
+ private:
+  const Platform platform_;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,75 @@
+// Scripted doubles of the components that move bytes.
+#pragma once
+
+#include <deque>
+#include <functional>
+#include <string>
+
+#include "fakes/FakeListControl.h"
+#include "fakes/FakePlatform.h"
+#include "support/RuntimeError.h"
+#include "transfer/Transfers.h"
+
+namespace tarnwick {
+
+struct FakeUploader : Uploader {
+  explicit FakeUploader(Transcript& itsLog) : log(itsLog) {}
+  Transcript& log;
+  // What the component tells while it works.
+  std::function<void(UploadEvents&)> script;
+  // The error with which the next calls end; 0 for none.
+  std::int32_t error = 0;
+
+  void Called(std::string call, std::initializer_list<TextView> arguments) {
+    for (const TextView argument : arguments) call += "|" + Utf8FromText(argument);
+    log.push_back(call);
+  }
+  void End() const {
+    if (error != 0) throw RuntimeError(error);
+  }
+  void UploadFile(TextView path, TextView base, TextView page, std::int32_t flag, TextView user,
+                  TextView password, TextView product, UploadEvents& events) override {
+    Called("page upload", {path, base, page, TextFromNumber(flag), user, password, product});
+    if (script) script(events);
+    End();
+  }
+  void DeleteFile(TextView base, TextView name, TextView page, TextView user, TextView password,
+                  TextView product) override {
+    Called("page delete", {base, name, page, user, password, product});
+    End();
+  }
+  void RenameFile(TextView base, TextView oldName, TextView newName, TextView page, TextView user,
+                  TextView password, TextView product) override {
+    Called("page rename", {base, oldName, newName, page, user, password, product});
+    End();
+  }
+};
+
+struct FakeDownloader : Downloader {
+  FakeDownloader(Transcript& itsLog, FakeFiles& itsFiles) : log(itsLog), files(itsFiles) {}
+  Transcript& log;
+  FakeFiles& files;
+  DownloadEvents* events = nullptr;
+  Text target;
+  // What happens while a wait sleeps, one entry a wait. When they are used up the watchdog runs out.
+  std::deque<std::function<void(FakeDownloader&)>> waits;
+
+  void Wait() override {
+    if (!events) return;
+    if (waits.empty()) return events->Failed(58, u"timeout", false);
+    const auto next = std::move(waits.front());
+    waits.pop_front();
+    next(*this);
+  }
+  void SetEvents(DownloadEvents* sink) override { events = sink; }
+  void Start(TextView url, TextView explicitTarget) override {
+    target = explicitTarget;
+    log.push_back("download " + Utf8FromText(url) + " to " + Utf8FromText(explicitTarget));
+  }
+  void Cancel() override { log.emplace_back("cancel"); }
+  void RestartWatchdog() override { log.emplace_back("watchdog starts"); }
+  void RemoveFile(TextView path) override { files.Remove(path); }
+  void StopWatchdog() override { log.emplace_back("watchdog stops"); }
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,495 @@
+// Upload, delete, rename and download: everything that happens, in its order.
+#include "unit/ListImageFixture.h"
+
+namespace tarnwick {
+namespace {
+
+const std::string kUploadCall =
+    "page upload|C:\\new.jpg|http://h:81/users/|/httpupload/UploadAcceptor.asp|0|u@x|p|"
+    "4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E";
+const std::string kDeleteTail = "|/httpupload/DeleteAcceptor.asp|u@x|p|4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E";
+const std::string kRenameTail = "|/httpupload/RenameAcceptor.asp|u@x|p|4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E";
+const std::string kAskCan = "ask CanUploadFile UserName=u@x&ProductID=7";
+const std::string kAskList = "ask ListFilesRequest Username=u@x&ProductID=7";
+
+// --- Upload ---
+
+class ListImageUpload : public ListImageTest {
+ protected:
+  ListImageUpload() {
+    fake.files.files[u"C:\\new.jpg"] = {1536, 0};
+    uploader.script = Upload;
+  }
+};
+
+TEST_F(ListImageUpload, Transcript) {
+  List({});
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  ExpectLog({"view hourglass", kAskCan, "watchdog starts", kUploadCall,
+             // Initializing, connecting.
+             "yield", "yield", "state 0",
+             // Started, half, complete; the server works between the last two.
+             "yield", "state 2", "state 9", "9999 0", "uploaded 0", "watchdog starts", "yield", "9999 50",
+             "uploaded 768", "yield", "watchdog starts", "yield", "yield", "9999 100", "uploaded 768",
+             "watchdog stops", "state 10", "yield", "yield",
+             "ask FileUploadRequest FileName=new.jpg&FileSize=1536&Username=u@x&ProductID=7",
+             "watchdog stops", "view append", "view list", "view focus", "view at 0",
+             "1015 http://h/u/new.jpg", "view pointer"});
+  EXPECT_EQ(control.ItemText(0, 2), u"1536Bytes (2KB)");
+  EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
+  EXPECT_FALSE(control.m_bTransferInProgress);
+  ASSERT_EQ(Records(), "new.jpg,");
+  const CUpload& record = *fake.apartment.allFiles.At(1);
+  EXPECT_EQ(record.FilePath, u"http://h/u/new.jpg");
+  EXPECT_EQ(record.FileDate, u"1/2/2026 3:04:05 AM");
+  // The next filling spells the size as it spells the others.
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(control.ItemText(0, 2), u"1536 Bytes (2 KB)");
+}
+
+TEST_F(ListImageUpload, Outcomes) {
+  const auto nothing = [](UploadEvents&) {};
+  const auto completeOnly = [](UploadEvents& events) { events.UploadComplete(); };
+  const auto neverComplete = [](UploadEvents& events) {
+    events.UploadComplete();
+    events.UploadProgress(100, 1536);
+  };
+  const struct {
+    const char* name;
+    const char* answer;
+    std::function<void(UploadEvents&)> script;
+    std::int32_t error;
+    const char* url;
+    bool result;
+    bool registered;
+    const char* events;
+  } kCases[] = {
+      {"quota", "CanUploadFile=1002", Upload, 0, "FileURL=x", false, false, "1014 ,"},
+      {"expired", "CanUploadFile=1004", Upload, 0, "FileURL=x", false, false, "1005 ,"},
+      {"no service", "fails", Upload, 0, "FileURL=x", false, false, "1005 ,"},
+      {"other code", "CanUploadFile=7", completeOnly, 0, "FileURL=x", true, true, "9999 100,1015 x,"},
+      {"same bytes", "CanUploadFile=1001", completeOnly, -2147220891, "FileURL=x", true, true,
+       "9999 100,1015 x,"},
+      {"tolerated", "CanUploadFile=1001", completeOnly, 380, "FileURL=x", true, true, "9999 100,1015 x,"},
+      {"tolerated, incomplete", "CanUploadFile=1001", nothing, 380, "FileURL=x", false, false, ""},
+      {"refused", "CanUploadFile=1001", completeOnly, -2147220881, "FileURL=x", false, false, "9999 100,"},
+      {"silent", "CanUploadFile=1001", nothing, 0, "FileURL=x", false, false, ""},
+      {"goes on", "CanUploadFile=1001", neverComplete, 0, "FileURL=x", false, false, "9999 100,9999 100,"},
+      {"no address", "CanUploadFile=1001", completeOnly, 0, "FileURL=", false, true, "9999 100,"},
+      {"not registered", "CanUploadFile=1001", completeOnly, 0, "fails", false, true, "9999 100,"},
+  };
+  for (const auto& test : kCases) {
+    SCOPED_TRACE(test.name);
+    List({});
+    replies["CanUploadFile"] = test.answer;
+    replies["FileUploadRequest"] = test.url;
+    uploader.script = test.script;
+    uploader.error = test.error;
+    EXPECT_EQ(control.UploadImage(u"C:\\new.jpg"), test.result);
+    EXPECT_EQ(Events(), test.events);
+    const auto asks = [](const std::string& line) { return line.starts_with("ask FileUpload"); };
+    EXPECT_EQ(std::ranges::count_if(log, asks), test.registered ? 1 : 0);
+    EXPECT_EQ(Names(), test.result ? "new.jpg," : "");
+    EXPECT_EQ(Records(), test.result ? "new.jpg," : "");
+    EXPECT_EQ(log.back(), "view pointer");
+    EXPECT_FALSE(control.m_bTransferInProgress);
+  }
+}
+
+TEST_F(ListImageUpload, ReplacesAFile) {
+  List({{"old.jpg", "1"}, {"NEW.jpg", "1"}, {"z.jpg", "1"}});
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(Names() + Records(), "old.jpg,new.jpg,z.jpg,old.jpg,new.jpg,z.jpg,");
+  EXPECT_EQ(control.ItemText(1, 1) + control.ItemText(1, 2), u"http://h/u/new.jpg1536Bytes (2KB)");
+  EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/new.jpg"), 2U);
+  EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/NEW.jpg"), 0U);
+  EXPECT_TRUE(std::ranges::count(log, "view refresh 1") == 1 && std::ranges::count(log, "view append") == 0);
+  // Once more, under the address that it has by now; then a service that gives it another file's address.
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(control.ItemCount(), 3U);
+  EXPECT_EQ(Events().substr(Events().rfind("1015")), "1015 http://h/u/new.jpg,");
+  fake.files.files[u"C:\\two.jpg"] = {1, 0};
+  replies["FileUploadRequest"] = "FileURL=http://h/u/z.jpg";
+  EXPECT_TRUE(control.UploadImage(u"C:\\two.jpg"));
+  EXPECT_EQ(Names() + Records(), "old.jpg,new.jpg,two.jpg,old.jpg,new.jpg,two.jpg,");
+}
+
+TEST_F(ListImageUpload, FilterHidesWhatItWouldHide) {
+  const struct {
+    TextView filter;
+    bool shown;
+  } kCases[] = {{u"*", true}, {u"jpg", true}, {u"gif", false}};
+  for (const auto& test : kCases) {
+    List({});
+    control.ChangeFileFilter(test.filter);
+    EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+    EXPECT_EQ(Names(), test.shown ? "new.jpg," : "") << Utf8FromText(test.filter);
+    EXPECT_EQ(Records(), "new.jpg,");
+  }
+  EXPECT_TRUE(Events().ends_with(",1015 ,"));
+}
+
+TEST_F(ListImageUpload, HostActsWhileItRuns) {
+  // In any event the host may take the client away, list again, or end the control.
+  for (const char* event :
+       {"9999 0", "9999 50", "9999 100", "state 9", "uploaded 768", "1015 http://h/u/new.jpg"}) {
+    SCOPED_TRACE(event);
+    List({{"a.jpg", "1"}});
+    bool second = true;
+    OnEvent(event, [&] {
+      if (control.m_bTransferInProgress) second = control.UploadImage(u"C:\\new.jpg");
+      control.ChangeFileFilter(u"gif");
+      control.mobjFileupload.reset();
+    });
+    EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+    EXPECT_EQ(Records(), "a.jpg,new.jpg,");
+    if (std::string_view(event) != "1015 http://h/u/new.jpg") {
+      EXPECT_FALSE(second);
+      EXPECT_EQ(control.m_LastError, ftp_error::kTransferInProgress);
+    }
+    host.onEvent = nullptr;
+    control.mobjFileupload = std::make_shared<CFileUpload>(fake.apartment);
+  }
+  EXPECT_EQ(std::ranges::count(log, "view hourglass"), std::ranges::count(log, "view pointer"));
+  control.mobjFileupload.reset();
+  log.clear();
+  EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
+  ExpectLog({"view hourglass", "view pointer"});
+}
+
+TEST_F(ListImageUpload, NextOneStartsFromTheLastEvent) {
+  List({});
+  fake.files.files[u"C:\\two.jpg"] = {1, 0};
+  OnEvent("1015 http://h/u/new.jpg", [&] {
+    host.onEvent = nullptr;
+    replies["FileUploadRequest"] = "FileURL=http://h/u/two.jpg";
+    EXPECT_TRUE(control.UploadImage(u"C:\\two.jpg"));
+  });
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(Names(), "new.jpg,two.jpg,");
+  // One hourglass over both.
+  EXPECT_EQ(std::ranges::count(log, "view hourglass"), 1);
+  EXPECT_EQ(std::ranges::count(log, "view pointer"), 1);
+}
+
+// --- Delete ---
+
+TEST_F(ListImageTest, DeleteTranscript) {
+  List({{"a.jpg", "1"}, {"b.jpg", "1"}, {"c.gif", "1"}, {"d.jpg", "1"}}, u"jpg");
+  view.Select(1, true);
+  view.Select(2, true);
+  account = {{"a.jpg", "1"}, {"c.gif", "1"}};
+  control.DeleteFile();
+  ExpectLog({"view hourglass", "1002 ", "page delete|http://h:81/users/|b.jpg" + kDeleteTail,
+             "ask DeleteFileRequest Username=u@x&ProductID=7&FileToBeDeleted=b.jpg", "1001 ",
+             "1015 " + AddressOf("b.jpg"), "page delete|http://h:81/users/|d.jpg" + kDeleteTail,
+             "ask DeleteFileRequest Username=u@x&ProductID=7&FileToBeDeleted=d.jpg", "1001 ",
+             "1015 " + AddressOf("b.jpg"), "view items 0", kAskList, "view list", "view columns",
+             "view items 1", "view at 0", "1015 " + AddressOf("a.jpg"), "view pointer"});
+  EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"a.jpg"});
+  EXPECT_TRUE(fake.apartment.listingIsCurrent);
+}
+
+TEST_F(ListImageTest, DeletesOneOfTen) {
+  std::vector<File> files;
+  for (char name = 'a'; name <= 'j'; ++name) files.push_back({std::string(1, name), "1"});
+  List(files);
+  view.Select(4, true);
+  files.erase(files.begin() + 4);
+  account = files;
+  control.DeleteFile();
+  std::string expected;
+  for (int i = 0; i < 4; ++i) expected += "1002 ,";
+  expected += "1001 ,1015 http://h/u/e,";
+  for (int i = 0; i < 5; ++i) expected += "1002 ,";
+  EXPECT_EQ(Events(), expected + "1015 http://h/u/a,");
+}
+
+TEST_F(ListImageTest, DeleteOutcomes) {
+  // Nothing listed: nothing asked.
+  List({});
+  control.DeleteFile();
+  ExpectLog({"view hourglass", "view pointer"});
+
+  // The service decides, whatever the page says.
+  List({{"a.jpg", "1"}});
+  uploader.error = -2147220880;
+  view.Select(0, true);
+  account.clear();
+  control.DeleteFile();
+  EXPECT_EQ(Events(), "1001 ,1015 http://h/u/a.jpg,");
+  EXPECT_FALSE(view.listShown);
+  uploader.error = 0;
+  for (const char* answer : {"DeleteStatus=FALSE", "fails", ""}) {
+    List({{"a.jpg", "1"}});
+    replies["DeleteFileRequest"] = answer;
+    view.Select(0, true);
+    control.DeleteFile();
+    EXPECT_EQ(Events(), "1015 http://h/u/a.jpg,") << answer;
+    EXPECT_EQ(Names(), "a.jpg,");
+  }
+
+  // A listing that fails afterwards is told by the list alone.
+  replies["DeleteFileRequest"] = "DeleteStatus=TRUE";
+  List({{"a.jpg", "1"}, {"b.jpg", "1"}});
+  view.Select(0, true);
+  listingFails = true;
+  control.DeleteFile();
+  EXPECT_EQ(Events(), "1001 ,1015 http://h/u/a.jpg,1002 ,");
+  EXPECT_EQ(Names(), "");
+  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_EQ(log.back(), "view pointer");
+}
+
+TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
+  const struct {
+    const char* name;
+    std::function<void(ctrlListImage&)> action;
+    const char* deleted;
+  } kCases[] = {
+      {"fills and selects again",
+       [this](ctrlListImage& list) {
+         list.ChangeFileFilter(u"*");
+         view.selected.assign(3, true);
+       },
+       "a.jpg,"},
+      {"takes the client", [](ctrlListImage& list) { list.mobjFileupload.reset(); }, "a.jpg,"},
+      {"closes", [](ctrlListImage& list) { list.Close(); }, "a.jpg,"},
+      {"deletes again", [](ctrlListImage& list) { list.DeleteFile(); }, "a.jpg,b.jpg,c.jpg,"},
+  };
+  for (const auto& test : kCases) {
+    SCOPED_TRACE(test.name);
+    log.clear();
+    fake.apartment.listingIsCurrent = false;
+    account = {{"a.jpg", "1"}, {"b.jpg", "1"}, {"c.jpg", "1"}};
+    ctrlListImage deleting{{fake.apartment, view, host, uploader, downloader}};
+    ASSERT_TRUE(deleting.Init(u"*"));
+    for (std::size_t i = 0; i < 3; ++i) view.Select(i, true);
+    bool acted = false;
+    OnEvent("1001 ", [&] {
+      if (!std::exchange(acted, true)) test.action(deleting);
+    });
+    deleting.DeleteFile();
+    std::string deleted;
+    for (const std::string& line : log)
+      if (const std::size_t at = line.find("ToBeDeleted="); at != std::string::npos)
+        deleted += line.substr(at + 12) + ",";
+    EXPECT_EQ(deleted, test.deleted);
+    EXPECT_EQ(log.back(), "view pointer");
+    host.onEvent = nullptr;
+  }
+}
+
+// --- Rename ---
+
+TEST_F(ListImageTest, RenameTranscript) {
+  List({{"a.jpg", "1"}, {"b.jpg", "1"}});
+  view.Select(1, true);
+  EXPECT_TRUE(control.RenameFile(u"b.jpg", u"  c d.jpg "));
+  ExpectLog({"view hourglass", "page rename|http://h:81/users/|b.jpg|c d.jpg" + kRenameTail,
+             "ask RenameFileRequest Username=u@x&ProductID=7&OldFileName=b.jpg&NewFileName=c%20d.jpg",
+             "view refresh 1", "1031 c d.jpg", "view pointer"});
+  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_EQ(Names() + Records(), "a.jpg,c d.jpg,a.jpg,c d.jpg,");
+  EXPECT_EQ(control.GetSelectedFilesHttpPath(), u"http://h/u/c d.jpg");
+  EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/c d.jpg"), 2U);
+  EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/b.jpg"), 0U);
+}
+
+TEST_F(ListImageTest, RenameOutcomes) {
+  const auto rename = [&] {
+    log.clear();
+    EXPECT_FALSE(control.RenameFile(u"a.jpg", u"b.jpg"));
+    EXPECT_EQ(Events(), "1033 ,");
+    EXPECT_EQ(Names() + Records(), "a.jpg,a.jpg,");
+    EXPECT_EQ(log.back(), "view pointer");
+    return log.size();
+  };
+  List({{"a.jpg", "1"}});
+  for (const char* answer : {"lRenameFileStatus=1033", "lRenameFileStatus=1004", "fails", ""}) {
+    replies["RenameFileRequest"] = answer;
+    EXPECT_EQ(rename(), 5U) << answer;
+  }
+  EXPECT_TRUE(fake.apartment.listingIsCurrent);
+  // The service hears nothing of what the page refused, and without a client nobody does.
+  uploader.error = 380;
+  EXPECT_EQ(rename(), 4U);
+  control.mobjFileupload.reset();
+  EXPECT_EQ(rename(), 3U);
+}
+
+TEST_F(ListImageTest, RenamesWhatIsOnlyHalfKnown) {
+  List({{"a.jpg", "1"}, {"b.jpg", "1"}});
+  // Not listed at all; in the list alone; onto an address that another record has.
+  EXPECT_TRUE(control.RenameFile(u"none.jpg", u"x.jpg"));
+  EXPECT_EQ(Names() + Records(), "a.jpg,b.jpg,a.jpg,b.jpg,");
+  EXPECT_TRUE(control.RenameFile(u"a.jpg", u"b.jpg"));
+  EXPECT_EQ(Names() + Records(), "b.jpg,b.jpg,b.jpg,b.jpg,");
+  fake.apartment.allFiles.Clear();
+  EXPECT_TRUE(control.RenameFile(u"b.jpg", u"c.jpg"));
+  EXPECT_EQ(Names(), "c.jpg,b.jpg,");
+  EXPECT_EQ(control.ItemText(0, 1), u"http://h/u/c.jpg");
+}
+
+// --- Download ---
+
+class ListImageDownload : public ListImageTest {
+ protected:
+  // The transfer of a file of five bytes, a wait for each step.
+  void Succeed() {
+    downloader.waits = {
+        [](FakeDownloader& d) { d.events->Resolving(); },
+        [](FakeDownloader& d) {
+          d.events->Connected();
+          d.events->TransferStarting();
+        },
+        [](FakeDownloader& d) { d.events->Received(20); },
+        [](FakeDownloader& d) { d.events->ReplyLine(u"HTTP/1.1 200 OK"); },
+        [](FakeDownloader& d) { d.events->Received(5); },
+        [](FakeDownloader& d) {
+          d.files.files[d.target] = {5, 0};
+          d.events->Finished();
+        },
+    };
+  }
+};
+
+TEST_F(ListImageDownload, Transcript) {
+  List({{"a.jpg", "1"}, {"b.jpg", "5"}});
+  view.Select(1, true);
+  for (const TextView folder : {u"C:\\To", u"C:\\To\\"}) {
+    fake.files.files[u"C:\\To\\b.jpg"] = {1, 0};
+    Succeed();
+    downloader.waits.push_front([](FakeDownloader& d) { EXPECT_FALSE(d.files.files.contains(d.target)); });
+    EXPECT_EQ(control.DownLoadFileFromServer(folder), u"C:\\To\\b.jpg");
+    ExpectLog({"download http://h/u/b.jpg to C:\\To\\b.jpg", "state 0", "state 2", "state 9", "9999 20",
+               "downloaded 20", "reply HTTP/1.1 200 OK", "9999 5", "downloaded 5", "state 10",
+               "watchdog stops", "yield"});
+    EXPECT_EQ(control.m_lDownloadedBytes, 5);
+    EXPECT_FALSE(control.m_bTransferInProgress);
+  }
+}
+
+TEST_F(ListImageDownload, FindsTargetAndAddress) {
+  const struct {
+    const char* name;
+    TextView path;
+    TextView target;
+    bool fetched;
+  } kCases[] = {
+      {"2024", u"C:\\To\\picture", u"C:\\To\\picture", true},
+      {"2024", u"C:\\To\\", u"C:\\To", true},
+      {"2024.jpg", u"C:\\To\\\\", u"C:\\To\\\\2024.jpg", true},
+      {"a.jpg", u"", u"\\a.jpg", true},
+      {"..", u"C:\\To", u"C:\\To\\..", false},
+      {"a\\b.jpg", u"C:\\To", u"C:\\To\\a\\b.jpg", false},
+  };
+  for (const auto& test : kCases) {
+    SCOPED_TRACE(test.name);
+    List({{test.name, "1"}});
+    view.Select(0, true);
+    fake.files.files.clear();
+    Succeed();
+    EXPECT_EQ(control.DownLoadFileFromServer(test.path), test.target);
+    const std::string start = "download " + AddressOf(test.name) + " to " + Utf8FromText(test.target);
+    EXPECT_EQ(std::ranges::count(log, start), test.fetched ? 1 : 0);
+    EXPECT_EQ(Events().starts_with("5555"), !test.fetched);
+  }
+  // The first record whose address holds the item's; none: nothing starts.
+  List({{"a.jpg.gif", "1"}, {"a.jpg", "1"}}, u"jpg");
+  view.Select(0, true);
+  Succeed();
+  control.DownLoadFileFromServer(u"C:\\To");
+  EXPECT_EQ(log.front(), "download http://h/u/a.jpg.gif to C:\\To\\a.jpg");
+  log.clear();
+  fake.apartment.allFiles.Clear();
+  EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To\\"), u"C:\\To\\a.jpg");
+  // Nothing selected, no client: nothing to return.
+  view.Select(0, false);
+  EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"");
+  view.Select(0, true);
+  control.mobjFileupload.reset();
+  EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"");
+  ExpectLog({});
+}
+
+TEST_F(ListImageDownload, Failures) {
+  List({{"a.jpg", "1"}});
+  view.Select(0, true);
+  const auto download = [&] {
+    log.clear();
+    EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
+    EXPECT_FALSE(control.gbConnectionFailed || control.m_bTransferInProgress);
+    EXPECT_EQ(log.back(), "watchdog stops");
+    return Events();
+  };
+  downloader.waits = {[](FakeDownloader& d) { d.events->Failed(6, u"refused", true); }};
+  EXPECT_EQ(download(), "5555 ,");
+  EXPECT_EQ(control.m_LastError, 6);
+  EXPECT_EQ(control.m_strLastErrorDesc, u"refused");
+  // Silence.
+  EXPECT_EQ(download(), "");
+  EXPECT_EQ(control.m_LastError, ftp_error::kTimeout);
+  // The writer failed.
+  downloader.waits = {[](FakeDownloader& d) { d.events->Finished(); }};
+  EXPECT_EQ(download(), "");
+  EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+  // The host gives up, before or meanwhile.
+  control.gbConnectionFailed = true;
+  EXPECT_EQ(download(), "");
+  downloader.waits = {[&](FakeDownloader&) { control.gbConnectionFailed = true; }};
+  EXPECT_EQ(download(), "");
+  EXPECT_TRUE(downloader.waits.empty());
+  EXPECT_EQ(std::ranges::count(log, "cancel"), 1);
+}
+
+TEST_F(ListImageDownload, OneTransferAtATime) {
+  List({{"a.jpg", "1"}, {"b.jpg", "1"}});
+  view.Select(0, true);
+  fake.files.files[u"C:\\new.jpg"] = {1, 0};
+  for (const char* event : {"state 0", "9999 20", "downloaded 5", "reply HTTP/1.1 200 OK", "state 10"}) {
+    SCOPED_TRACE(event);
+    Succeed();
+    fake.files.files.erase(u"C:\\To\\a.jpg");
+    bool acted = false;
+    OnEvent(event, [&] {
+      acted = true;
+      EXPECT_TRUE(control.m_bTransferInProgress);
+      control.m_bTransferInProgress = false;
+      log.clear();
+      EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
+      EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"");
+      ExpectLog({});
+      EXPECT_EQ(control.m_LastError, ftp_error::kTransferInProgress);
+      EXPECT_NE(control.m_strLastErrorDesc, u"");
+      // What is no transfer is free to run.
+      EXPECT_TRUE(control.RenameFile(u"b.jpg", u"c.jpg"));
+      control.ChangeFileFilter(u"gif");
+      control.mobjFileupload.reset();
+    });
+    EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
+    EXPECT_TRUE(acted);
+    EXPECT_TRUE(fake.files.files.contains(u"C:\\To\\a.jpg"));
+    host.onEvent = nullptr;
+    control.mobjFileupload = std::make_shared<CFileUpload>(fake.apartment);
+    control.ChangeFileFilter(u"*");
+    view.Select(0, true);
+  }
+}
+
+TEST_F(ListImageDownload, CloseEndsTheWait) {
+  List({{"a.jpg", "1"}});
+  view.Select(0, true);
+  Succeed();
+  OnEvent("9999 20", [&] { control.Close(); });
+  EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
+  EXPECT_EQ(downloader.waits.size(), 3U);
+  EXPECT_GE(std::ranges::count(log, "cancel"), 1);
+  log.clear();
+  EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"");
+  EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
+  ExpectLog({});
+}
+
+}  // namespace
+}  // namespace tarnwick
