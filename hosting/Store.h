@@ -1,8 +1,9 @@
 // The accounts and their files. Accounts are in DATA/hosting.sqlite, the files are plain files
 // DATA/users/FOLDER/NAME (an FTP server is rooted at DATA), mails to users are text files in DATA/outbox.
 //
-// A change is on the disk when its function returns, and each is one step on the disk, so a kill leaves the
-// state before it or after it. Names and texts are UTF-8. Any thread may call. Failures of disk or database
+// A change is on the disk when its function returns. The change of a file or folder is one step, so a kill
+// leaves the state before it or after it; where a folder and its account change, a repeated call or start
+// ends what a kill interrupted. Names and texts are UTF-8. Any thread may call. Failures of disk or database
 // throw std::exception.
 #pragma once
 

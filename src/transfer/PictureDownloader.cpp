@@ -68,10 +68,6 @@ void PictureDownloader::Wait() {
   Failed(false);
 }
 
-void PictureDownloader::RemoveFile(TextView path) {
-  apartment_.platform.files.Remove(path);
-}
-
 void PictureDownloader::Connect(TextView host, std::uint16_t port) {
   if (events_) events_->Resolving();
   socket_.Connect(host, port);

@@ -25,7 +25,6 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   void RestartWatchdog() override { watchdog_.Start(kWatchdogMs); }
   void StopWatchdog() override { watchdog_.Stop(); }
   void Wait() override;
-  void RemoveFile(TextView path) override;
 
  private:
   // DownloadActions

@@ -56,8 +56,6 @@ class Downloader {
   virtual void StopWatchdog() = 0;
   // Sleeps until there is a message, and handles what waits then.
   virtual void Wait() = 0;
-  // Throws 75.
-  virtual void RemoveFile(TextView path) = 0;
 };
 
 }  // namespace tarnwick

@@ -68,7 +68,6 @@ struct FakeDownloader : Downloader {
   }
   void Cancel() override { log.emplace_back("cancel"); }
   void RestartWatchdog() override { log.emplace_back("watchdog starts"); }
-  void RemoveFile(TextView path) override { files.Remove(path); }
   void StopWatchdog() override { log.emplace_back("watchdog stops"); }
 };
 

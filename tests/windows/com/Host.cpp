@@ -2,6 +2,8 @@
 
 #include <gtest/gtest.h>
 
+#include <ole2.h>
+
 #include <cstdio>
 
 namespace tarnwick::test {
@@ -55,8 +57,9 @@ VARIANT Get(IDispatch* object, const wchar_t* member, const VARIANT* argument) {
 
 int main(int count, char** arguments) {
   testing::InitGoogleTest(&count, arguments);
-  CoInitialize(nullptr);
+  // With OLE, so that controls can take drops.
+  OleInitialize(nullptr);
   const int result = RUN_ALL_TESTS();
-  CoUninitialize();
+  OleUninitialize();
   return result;
 }
