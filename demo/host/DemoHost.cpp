@@ -379,6 +379,30 @@ class Host {
     for (int i = 0; i < 100 && GetFileAttributesW(shot.c_str()) == INVALID_FILE_ATTRIBUTES; ++i) Rest(100);
   }
 
+  // Makes an account for as long as its picture takes. Its key is its password.
+  bool ShowEmptyAccount() {
+    ComPtr<_CFileUpload> client;
+    if (FAILED(list_->get_mobjFileupload(client.Receive())) || !client) return false;
+    const Argument product(Given(3));
+    const Argument user(L"nobody.yet@demo.example");
+    const Argument nothing(L"");
+    VARIANT guid = {};
+    V_VT(&guid) = VT_BSTR;
+    V_BSTR(&guid) = nothing.Get();
+    BSTR text = nullptr;
+    client->AddUser(product.Get(), user.Get(), guid, &text);
+    SysFreeString(text);
+    const bool shown = Fill(L"*");
+    Step(L"9-empty");
+    VARIANT key = {};
+    V_VT(&key) = VT_BSTR;
+    client->GetKeyForUser(product.Get(), user.Get(), &V_BSTR(&key));
+    LONG deleted = 0;
+    client->DeleteUser(product.Get(), user.Get(), key, VARIANT_TRUE, &deleted);
+    VariantClear(&key);
+    return shown && deleted == 1001;
+  }
+
   bool Tour() {
     bool well = true;
     const auto expect = [&](bool happened, const wchar_t* what) {
@@ -423,6 +447,7 @@ class Host {
     list_->DeleteFile();
     expect(!Select(L"stars.png"), L"delete");
     Step(L"8-deleted");
+    expect(ShowEmptyAccount(), L"an account of no files");
     return well;
   }
 
