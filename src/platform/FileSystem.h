@@ -17,6 +17,9 @@ inline constexpr std::uint32_t kReadOnly = 0x01;
 inline constexpr std::uint32_t kHidden = 0x02;
 inline constexpr std::uint32_t kSystem = 0x04;
 inline constexpr std::uint32_t kArchive = 0x20;
+inline constexpr std::uint32_t kTemporary = 0x100;
+inline constexpr std::uint32_t kOffline = 0x1000;
+inline constexpr std::uint32_t kNotIndexed = 0x2000;
 }  // namespace attribute
 
 // A file that is read from its start to its end; closed by its destructor.

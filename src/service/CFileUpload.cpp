@@ -71,10 +71,8 @@ Text CFileUpload::AskForText(TextView requestName, TextView clientAction,
 std::int32_t CFileUpload::AskForNumber(TextView requestName, TextView clientAction,
                                        std::initializer_list<Parameter> parameters, std::int32_t sendFlag,
                                        TextView variable, std::int32_t onFailure) {
-  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& number) {
-    const Text failure = TextFromNumber(onFailure);
-    number = NumberFromText(AskForText(requestName, clientAction, parameters, sendFlag, variable, failure));
-  });
+  return NumberFromText(
+      AskForText(requestName, clientAction, parameters, sendFlag, variable, TextFromNumber(onFailure)));
 }
 
 void CFileUpload::SetHTTPServer(TextView serverName) {
@@ -103,6 +101,7 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
   const bool loggedOn = ResultAsItStood(false, [&](bool& result) {
     const Text user(Username);
     const Text password(Password);
+    const Text product(ProductID);
     session.mguid = Text(MGUID);
     session.userName = user;
     session.password = password;
@@ -115,7 +114,7 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
     const Text status = AskForText(u"ValidationRequest", u"UserValidate",
                                    {{u"UserName", Encipher(user)},
                                     {u"Password", Encipher(password)},
-                                    {u"ProductID", SessionProduct()},
+                                    {u"ProductID", product},
                                     {u"MGUID", session.mguid}},
                                    0, u"UserAuthenticationStatus", u"FALSE");
     if (LowerCase(status) != u"true") return;

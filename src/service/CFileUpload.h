@@ -26,7 +26,6 @@ inline constexpr std::int32_t kSuccess = 1001;
 inline constexpr std::int32_t kNegative = 1002;
 inline constexpr std::int32_t kUserExists = 1003;
 inline constexpr std::int32_t kFailure = 1004;
-inline constexpr std::int32_t kAccountLimit = 1011;
 inline constexpr std::int32_t kRenameRefused = 1033;
 }  // namespace status
 
@@ -190,7 +189,7 @@ class CFileUpload {
   Text AskForText(TextView requestName, TextView clientAction, std::initializer_list<Parameter> parameters,
                   std::int32_t sendFlag, TextView variable, TextView onFailure);
 
-  // The same as a number. Never throws: 0 when the variable is missing or no number.
+  // The same as a number; also throws what is no number.
   std::int32_t AskForNumber(TextView requestName, TextView clientAction,
                             std::initializer_list<Parameter> parameters, std::int32_t sendFlag,
                             TextView variable, std::int32_t onFailure);

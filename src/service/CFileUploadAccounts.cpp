@@ -133,22 +133,26 @@ Text CFileUpload::GetKeyForUser(TextView ProductID, TextView Username) {
 }
 
 std::int32_t CFileUpload::EmailKeyToUser(TextView ProductID, TextView Username, std::int32_t blnNewUser) {
-  return AskForNumber(u"EmailKeyRequest", u"SendMeMail",
-                      {{u"UserName", EnCodeString(Username)},
-                       {u"ProductID", Text(ProductID)},
-                       {u"NewUser", TextFromNumber(blnNewUser)}},
-                      1, u"SendMail", status::kFailure);
+  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& number) {
+    number = AskForNumber(u"EmailKeyRequest", u"SendMeMail",
+                          {{u"UserName", EnCodeString(Username)},
+                           {u"ProductID", Text(ProductID)},
+                           {u"NewUser", TextFromNumber(blnNewUser)}},
+                          1, u"SendMail", status::kFailure);
+  });
 }
 
 std::int32_t CFileUpload::ManagePassword(TextView szProductID, TextView szUserName, TextView szPassword,
                                          TextView szNewPassword) {
-  const std::int32_t answer = AskForNumber(u"UpdatePasswordObject", u"ManagePassword",
-                                           {{u"Username", EnCodeString(szUserName)},
-                                            {u"ProductID", Text(szProductID)},
-                                            {u"Password", Encipher(szPassword)},
-                                            {u"NewPassword", Encipher(szNewPassword)}},
-                                           1, u"UpdatePassword", status::kFailure);
-  return answer == status::kSuccess ? status::kSuccess : status::kFailure;
+  return ResultAsItStood(status::kFailure, [&](std::int32_t& result) {
+    const std::int32_t answer = AskForNumber(u"UpdatePasswordObject", u"ManagePassword",
+                                             {{u"Username", EnCodeString(szUserName)},
+                                              {u"ProductID", Text(szProductID)},
+                                              {u"Password", Encipher(szPassword)},
+                                              {u"NewPassword", Encipher(szNewPassword)}},
+                                             1, u"UpdatePassword", status::kFailure);
+    if (answer == status::kSuccess) result = answer;
+  });
 }
 
 Text CFileUpload::ActivateAccount(TextView szProductID, TextView szUserName, TextView szPassword) {
@@ -163,13 +167,17 @@ Text CFileUpload::ActivateAccount(TextView szProductID, TextView szUserName, Tex
 }
 
 std::int32_t CFileUpload::GetHardLimit(TextView szProductID) {
-  return AskForNumber(u"HardLimitRequest", u"HardLimit", {{u"ProductID", Text(szProductID)}}, 1, u"HardLimit",
-                      0);
+  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& number) {
+    number = AskForNumber(u"HardLimitRequest", u"HardLimit", {{u"ProductID", Text(szProductID)}}, 1,
+                          u"HardLimit", 0);
+  });
 }
 
 std::int32_t CFileUpload::GetSoftLimit(TextView szProductID) {
-  return AskForNumber(u"SoftLimitRequest", u"SoftLimit", {{u"ProductID", Text(szProductID)}}, 1, u"SoftLimit",
-                      0);
+  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& number) {
+    number = AskForNumber(u"SoftLimitRequest", u"SoftLimit", {{u"ProductID", Text(szProductID)}}, 1,
+                          u"SoftLimit", 0);
+  });
 }
 
 Text CFileUpload::GetMGUIDForUser(TextView szProductID, TextView szUserName) {
@@ -221,13 +229,17 @@ std::int32_t CFileUpload::GetAccountDetailsForMGUID(TextView MGUID, TextView Use
 }
 
 std::int32_t CFileUpload::HasUserAccountExpired(TextView Username) {
-  return AskForNumber(u"HasUserExpired", u"HasUserExpired", {{u"UserName", Text(Username)}}, 1,
-                      u"HasUserExpired", status::kFailure);
+  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& number) {
+    number = AskForNumber(u"HasUserExpired", u"HasUserExpired", {{u"UserName", Text(Username)}}, 1,
+                          u"HasUserExpired", status::kFailure);
+  });
 }
 
 std::int32_t CFileUpload::GetPremiumBaseAccountSize(TextView Username) {
-  return AskForNumber(u"PremiumAccountSize", u"PremiumAccountSize", {{u"UserName", Text(Username)}}, 1,
-                      u"PremiumAccountSize", status::kFailure);
+  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& number) {
+    number = AskForNumber(u"PremiumAccountSize", u"PremiumAccountSize", {{u"UserName", Text(Username)}}, 1,
+                          u"PremiumAccountSize", status::kFailure);
+  });
 }
 
 }  // namespace tarnwick

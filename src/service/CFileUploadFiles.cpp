@@ -95,13 +95,15 @@ void CFileUpload::SetCUploadObject(TextView FileName, TextView FilePath, double 
 
 std::int32_t CFileUpload::RenameFile(TextView ProductID, TextView Username, TextView FileToRename,
                                      TextView NewFileName) {
-  const std::int32_t answer = AskForNumber(u"RenameFileRequest", u"RenameFile",
-                                           {{u"Username", Text(Username)},
-                                            {u"ProductID", Text(ProductID)},
-                                            {u"OldFileName", EnCodeString(FileToRename)},
-                                            {u"NewFileName", EnCodeString(NewFileName)}},
-                                           1, u"lRenameFileStatus", status::kRenameRefused);
-  return answer == status::kSuccess ? status::kSuccess : status::kRenameRefused;
+  return ResultAsItStood(status::kRenameRefused, [&](std::int32_t& result) {
+    const std::int32_t answer = AskForNumber(u"RenameFileRequest", u"RenameFile",
+                                             {{u"Username", Text(Username)},
+                                              {u"ProductID", Text(ProductID)},
+                                              {u"OldFileName", EnCodeString(FileToRename)},
+                                              {u"NewFileName", EnCodeString(NewFileName)}},
+                                             1, u"lRenameFileStatus", status::kRenameRefused);
+    if (answer == status::kSuccess) result = answer;
+  });
 }
 
 std::int32_t CFileUpload::DeleteFileForUser(TextView FileToBeDeleted) {
@@ -136,9 +138,11 @@ std::optional<double> CFileUpload::GetTotalUsedQuota(TextView ProductID, TextVie
 }
 
 std::int32_t CFileUpload::CanUploadFile() {
-  return AskForNumber(u"CanUploadFile", u"CanUploadFile",
-                      {{u"UserName", SessionUser()}, {u"ProductID", SessionProduct()}}, 0, u"CanUploadFile",
-                      status::kFailure);
+  return ResultAsItStood(std::int32_t{0}, [&](std::int32_t& number) {
+    number = AskForNumber(u"CanUploadFile", u"CanUploadFile",
+                          {{u"UserName", SessionUser()}, {u"ProductID", SessionProduct()}}, 0,
+                          u"CanUploadFile", status::kFailure);
+  });
 }
 
 bool CFileUpload::FileExists(TextView szNewFileName) const {

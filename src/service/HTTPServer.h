@@ -2,8 +2,7 @@
 // pages for folders.
 //
 // Wire form of an exchange: an HTTP POST to PATH/PAGE?Request=NAME&Flag=FLAG whose body is name=value joined
-// by
-// "&", in the order of adding. Values come escaped or enciphered, so the only further escape is %XX
+// by "&", in the order of adding. Values come escaped or enciphered, so the only further escape is %XX
 // (upper-case hex) for each byte of the UTF-8 form outside 0x21 to 0x7E.
 #pragma once
 

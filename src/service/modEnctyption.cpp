@@ -35,21 +35,21 @@ Text StripToAlphabet(TextView value) {
   return kept;
 }
 
-Text ApplyCipher(Text& value) {
-  value = EncryptParameter(value);
-  return value;
-}
-
-Text EncryptParameter(TextView value) {
-  Text text = StripToAlphabet(value);
-  std::size_t keyIndex = text.size() % kKey.size();
-  for (char16_t& character : text) {
+void ApplyCipher(Text& value) {
+  value = StripToAlphabet(value);
+  std::size_t keyIndex = value.size() % kKey.size();
+  for (char16_t& character : value) {
     const std::size_t shifted =
         (PositionOf(kKey[keyIndex]) + std::size_t{PositionOf(character)}) % kAlphabet.size();
     character = kAlphabet[(kAlphabet.size() - shifted) % kAlphabet.size()];
     keyIndex = (keyIndex + 1) % kKey.size();
   }
-  return text;
+}
+
+Text EncryptParameter(TextView value) {
+  Text copy(value);
+  ApplyCipher(copy);
+  return copy;
 }
 
 }  // namespace tarnwick

@@ -13,7 +13,7 @@ Text EncryptParameter(TextView value);
 // `value` without the characters that the cipher's alphabet lacks.
 Text StripToAlphabet(TextView value);
 
-// Overwrites `value` with the cipher of StripToAlphabet(value) and returns it too.
-Text ApplyCipher(Text& value);
+// Overwrites `value` with the cipher of StripToAlphabet(value).
+void ApplyCipher(Text& value);
 
 }  // namespace tarnwick

@@ -51,16 +51,15 @@ RegistryValues::Value RegistryValues::Get(TextView name) const {
     case RegistryType::kString:
     case RegistryType::kExpandString:
       value.text = registry_.TextFromAnsi(bytes.substr(0, bytes.find('\0')));
-      return value;
+      break;
     case RegistryType::kBinary:
       value.text = TextFromLatin1(bytes);
-      return value;
+      break;
     case RegistryType::kNumber:
-      if (bytes.size() != sizeof value.number) break;
-      std::memcpy(&value.number, bytes.data(), sizeof value.number);
-      return value;
+      std::memcpy(&value.number, bytes.data(), std::min(bytes.size(), sizeof value.number));
+      break;
   }
-  throw RuntimeError(error::kInvalidCall);
+  return value;
 }
 
 }  // namespace tarnwick

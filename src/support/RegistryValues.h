@@ -23,7 +23,8 @@ class RegistryValues {
   // outlives the object.
   RegistryValues(Registry& registry, TextView path);
 
-  // Throws run-time error 5 when there is no such value, or one of another type than the four.
+  // Throws run-time error 5 when there is no such value. One of another type than the four has neither number
+  // nor text.
   Value Get(TextView name) const;
 
  private:

@@ -24,7 +24,7 @@ TEST(Cipher, KnownVectors) {
   for (const auto& [plain, cipher] : vectors) {
     EXPECT_EQ(EncryptParameter(plain), cipher);
     Text overwritten(plain);
-    EXPECT_EQ(ApplyCipher(overwritten), cipher);
+    ApplyCipher(overwritten);
     EXPECT_EQ(overwritten, cipher);
   }
 }

@@ -14,8 +14,9 @@ namespace tarnwick {
 namespace {
 
 // The bits that a program can set; the system numbers them as the core does.
-constexpr std::uint32_t kSettable =
-    attribute::kReadOnly | attribute::kHidden | attribute::kSystem | attribute::kArchive;
+constexpr std::uint32_t kSettable = attribute::kReadOnly | attribute::kHidden | attribute::kSystem |
+                                    attribute::kArchive | attribute::kTemporary | attribute::kOffline |
+                                    attribute::kNotIndexed;
 
 // 255 characters with their terminator, as hosts know the temporary folder.
 constexpr DWORD kTempPathRoom = 255;

@@ -9,10 +9,8 @@ namespace {
 
 Variant Converted(const VARIANT& value, VARTYPE type) {
   Variant converted;
-  // The locale is fixed, so that a number becomes the same text on every machine.
-  constexpr LCID kNeutralEnglish = 0x409;
   const HRESULT result =
-      VariantChangeTypeEx(&converted.Get(), const_cast<VARIANT*>(&value), kNeutralEnglish, 0, type);
+      VariantChangeTypeEx(&converted.Get(), const_cast<VARIANT*>(&value), kConversionLocale, 0, type);
   if (result == E_OUTOFMEMORY) throw std::bad_alloc();
   if (FAILED(result)) throw RuntimeError(error::kTypeMismatch);
   return converted;

@@ -14,6 +14,9 @@ namespace tarnwick {
 
 static_assert(sizeof(OLECHAR) == sizeof(char16_t));
 
+// The locale of all conversions is fixed, so that a number becomes the same text on every machine.
+inline constexpr LCID kConversionLocale = 0x409;
+
 // An owned VARIANT; empty at first.
 class Variant {
  public:

@@ -3,20 +3,11 @@
 #include "support/surface/CBVAccountObject.h"
 #include "support/surface/Guard.h"
 #include "support/surface/HostCollection.h"
-#include "support/surface/ThreadApartment.h"
 
 namespace tarnwick {
-CFileUploadObject::CFileUploadObject()
-    : CFileUploadObject(std::make_shared<CFileUpload>(ApartmentOfThread())) {}
+CFileUploadObject::CFileUploadObject() : client_(std::make_shared<CFileUpload>(apartment_.Get())) {}
 
-CFileUploadObject::CFileUploadObject(std::shared_ptr<CFileUpload> client) : client_(std::move(client)) {
-  HoldApartment();
-}
-
-CFileUploadObject::~CFileUploadObject() {
-  client_ = {};
-  LetGoOfApartment();
-}
+CFileUploadObject::CFileUploadObject(std::shared_ptr<CFileUpload> client) : client_(std::move(client)) {}
 
 ComPtr<CFileUploadObject> CFileUploadObject::From(IUnknown* object) {
   // As with records: the class's own identifier leads back to the object.

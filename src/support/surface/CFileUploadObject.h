@@ -7,6 +7,7 @@
 #include "service/CFileUpload.h"
 #include "support/surface/CUploadObject.h"
 #include "support/surface/DualObject.h"
+#include "support/surface/ThreadApartment.h"
 #include "support/surface/TypeLibrary.h"
 
 namespace tarnwick {
@@ -73,10 +74,10 @@ class CFileUploadObject final : public DualObject<_CFileUpload> {
   STDMETHODIMP GetPremiumBaseAccountSize(BSTR Username, LONG* result) override;
 
  private:
-  ~CFileUploadObject() override;
   void* FindInterface(REFIID interfaceId) override;
 
-  std::shared_ptr<CFileUpload> client_;
+  const ApartmentHold apartment_;
+  const std::shared_ptr<CFileUpload> client_;
   // What the host was last given for the client's record, so that it gets the same object again.
   ComPtr<CUploadObject> uploadObject_;
 };

@@ -60,6 +60,8 @@ CollectionObject::CollectionObject() {
   module::Hold();
 }
 CollectionObject::~CollectionObject() {
+  // First: the items' last release may run code of the host's, which the library must be there for.
+  items_.Clear();
   module::LetGo();
 }
 
@@ -166,8 +168,9 @@ HRESULT CollectionObject::Call(DISPID member, WORD flags, const DISPPARAMS& argu
       std::vector<VARIANT> items;
       items.reserve(items_.Count());
       for (std::size_t i = 1; i <= items_.Count(); ++i) items.push_back(items_.At(i).Get());
+      IUnknown* enumerator = new ComEnumerator<IEnumVARIANT, VARIANT>(std::move(items));
       V_VT(&value.Get()) = VT_UNKNOWN;
-      V_UNKNOWN(&value.Get()) = new ComEnumerator<IEnumVARIANT, VARIANT>(std::move(items));
+      V_UNKNOWN(&value.Get()) = enumerator;
       break;
     }
     default:

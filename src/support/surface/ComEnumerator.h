@@ -46,7 +46,13 @@ class ComEnumerator final : public Interface {
   // Takes references of its own to the elements. Throws what copying throws.
   explicit ComEnumerator(std::vector<Element> elements, std::size_t next = 0)
       : elements_(std::move(elements)), next_(next) {
-    for (Element& element : elements_) Keep(element);
+    std::size_t kept = 0;
+    try {
+      for (; kept < elements_.size(); ++kept) Keep(elements_[kept]);
+    } catch (...) {
+      while (kept > 0) Free(elements_[--kept]);
+      throw;
+    }
     module::Hold();
   }
   ComEnumerator(const ComEnumerator&) = delete;
@@ -70,8 +76,9 @@ class ComEnumerator final : public Interface {
     ULONG done = 0;
     const HRESULT result = Guarded([&] {
       for (; done < count && next_ < elements_.size(); ++done, ++next_) {
-        elements[done] = elements_[next_];
-        Keep(elements[done]);
+        Element copy = elements_[next_];
+        Keep(copy);
+        elements[done] = copy;
       }
       return done == count ? S_OK : S_FALSE;
     });

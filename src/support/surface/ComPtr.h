@@ -1,6 +1,8 @@
 // A counted reference to a COM object.
 #pragma once
 
+#include "platform/windows/WindowsHeaders.h"
+
 #include <unknwn.h>
 
 #include <utility>

@@ -98,7 +98,8 @@ HRESULT Convert(const VARIANT& argument, VARTYPE type, StandIn& standIn) {
   if (type == VT_DISPATCH && MeansNoObject(source)) {
     MakeNoObject(value);
   } else {
-    const HRESULT result = VariantChangeType(&value, const_cast<VARIANT*>(&source), 0, type);
+    const HRESULT result =
+        VariantChangeTypeEx(&value, const_cast<VARIANT*>(&source), kConversionLocale, 0, type);
     if (FAILED(result)) return result == E_OUTOFMEMORY ? result : DISP_E_TYPEMISMATCH;
   }
   standIn.before = value;
@@ -124,6 +125,9 @@ void HandBack(StandIn& standIn) {
 HRESULT InvokeMember(ITypeInfo& description, void* object, DISPID member, WORD flags, DISPPARAMS* arguments,
                      VARIANT* result, EXCEPINFO* exception, UINT* argumentError) {
   if (!arguments) return E_INVALIDARG;
+  // Most calls of a script read a property: there is nothing to prepare.
+  if (arguments->cArgs == 0)
+    return description.Invoke(object, member, flags, arguments, result, exception, argumentError);
   return Guarded([&] {
     const MemberDescription known(description, member, flags);
     std::vector<VARIANT> values(arguments->rgvarg, arguments->rgvarg + arguments->cArgs);

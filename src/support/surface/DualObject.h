@@ -54,6 +54,8 @@ class DualObject : public Interface {
                       VARIANT* result, EXCEPINFO* exception, UINT* argumentError) override {
     if (reserved != IID_NULL) return DISP_E_UNKNOWNINTERFACE;
     if (!Description()) return TYPE_E_CANTLOADLIBRARY;
+    // The host's code may run inside and release its last reference.
+    const ComPtr<Interface> alive(this);
     return InvokeMember(*Description(), static_cast<Interface*>(this), member, flags, arguments, result,
                         exception, argumentError);
   }

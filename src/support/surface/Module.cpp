@@ -58,7 +58,7 @@ bool IsHeld() {
   return g_holds > 0;
 }
 
-ComPtr<ITypeInfo> TypeInfo(REFIID interfaceId) {
+ComPtr<ITypeInfo> TypeInfo(REFIID interfaceId) noexcept try {
   const std::lock_guard guard(g_lock);
   if (!g_typeInfos) g_typeInfos = new TypeInfos;
   for (const auto& [known, info] : *g_typeInfos)
@@ -71,6 +71,9 @@ ComPtr<ITypeInfo> TypeInfo(REFIID interfaceId) {
     return {};
   g_typeInfos->emplace_back(interfaceId, info);
   return info;
+} catch (...) {
+  // No memory: it is as if the description could not be read.
+  return {};
 }
 
 }  // namespace tarnwick::module

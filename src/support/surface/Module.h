@@ -27,7 +27,7 @@ bool IsHeld();
 
 // Description of an interface of ours, from the type library inside the library's file; null when that cannot
 // be read. It is kept as long as anything holds the library.
-ComPtr<ITypeInfo> TypeInfo(REFIID interfaceId);
+ComPtr<ITypeInfo> TypeInfo(REFIID interfaceId) noexcept;
 
 }  // namespace module
 

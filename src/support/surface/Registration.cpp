@@ -23,8 +23,13 @@ constexpr WORD kMinor = 1;
 constexpr LCID kLocale = 0x409;
 #ifdef _WIN64
 constexpr SYSKIND kSystem = SYS_WIN64;
+constexpr wchar_t kTypeLibraryKey[] = L"\\1.1\\409\\win64";
+// Where programs of the other kind look, on a system that runs both.
+constexpr REGSAM kOtherView = KEY_WOW64_32KEY;
 #else
 constexpr SYSKIND kSystem = SYS_WIN32;
+constexpr wchar_t kTypeLibraryKey[] = L"\\1.1\\409\\win32";
+constexpr REGSAM kOtherView = KEY_WOW64_64KEY;
 #endif
 
 // A failure inside a registration, as its HRESULT.
@@ -49,6 +54,15 @@ void SetValue(const std::wstring& key, const wchar_t* name, const std::wstring& 
 bool RemoveTree(const std::wstring& key) {
   const LSTATUS status = RegDeleteTreeW(HKEY_CLASSES_ROOT, key.c_str());
   return status == ERROR_SUCCESS || status == ERROR_FILE_NOT_FOUND;
+}
+
+// Whether there is a key below HKEY_CLASSES_ROOT, in the view that `view` selects.
+bool KeyExists(const std::wstring& path, REGSAM view) {
+  HKEY key = nullptr;
+  if (RegOpenKeyExW(HKEY_CLASSES_ROOT, path.c_str(), 0, KEY_QUERY_VALUE | view, &key) != ERROR_SUCCESS)
+    return false;
+  const KeyOwner owner(key);
+  return true;
 }
 
 struct Names {
@@ -112,11 +126,13 @@ HRESULT Unregister() {
     bool gone = true;
     for (const CreatableClass& known : CreatableClasses()) {
       const Names names(known);
-      for (const std::wstring& key : {names.classKey, names.general, names.versioned})
-        gone &= RemoveTree(key);
+      gone &= RemoveTree(names.classKey);
+      // The two kinds of programs of a 64-bit system share the names, but not the classes.
+      if (KeyExists(names.classKey, kOtherView)) continue;
+      for (const std::wstring& key : {names.general, names.versioned}) gone &= RemoveTree(key);
     }
-    const HRESULT library = UnRegisterTypeLib(LIBID_Tarnwick, kMajor, kMinor, kLocale, kSystem);
-    if (FAILED(library) && library != TYPE_E_REGISTRYACCESS) gone = false;
+    UnRegisterTypeLib(LIBID_Tarnwick, kMajor, kMinor, kLocale, kSystem);
+    gone &= !KeyExists(L"TypeLib\\" + GuidText(LIBID_Tarnwick) + kTypeLibraryKey, 0);
     return gone ? S_OK : SELFREG_E_CLASS;
   });
 }

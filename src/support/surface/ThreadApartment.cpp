@@ -10,13 +10,14 @@
 #include "support/surface/Module.h"
 
 namespace tarnwick {
-namespace {
 
 struct ThreadState {
   WindowsPlatform platform{module::Instance()};
   Apartment apartment{platform.View()};
-  long objects = 0;
+  long holds = 0;
 };
+
+namespace {
 
 std::mutex g_lock;
 
@@ -25,26 +26,27 @@ std::mutex g_lock;
 using ThreadStates = std::map<DWORD, std::unique_ptr<ThreadState>>;
 ThreadStates* g_states = nullptr;
 
-ThreadState& StateOfThread() {
+// Counts one more hold.
+ThreadState* HoldStateOfThread() {
   const std::lock_guard guard(g_lock);
   if (!g_states) g_states = new ThreadStates;
   std::unique_ptr<ThreadState>& state = (*g_states)[GetCurrentThreadId()];
   if (!state) state = std::make_unique<ThreadState>();
-  return *state;
+  ++state->holds;
+  return state.get();
 }
 
 }  // namespace
 
-Apartment& ApartmentOfThread() {
-  return StateOfThread().apartment;
+ApartmentHold::ApartmentHold() : state_(HoldStateOfThread()) {}
+
+ApartmentHold::~ApartmentHold() {
+  const std::lock_guard guard(g_lock);
+  --state_->holds;
 }
 
-void HoldApartment() {
-  ++StateOfThread().objects;
-}
-
-void LetGoOfApartment() {
-  --StateOfThread().objects;
+Apartment& ApartmentHold::Get() const {
+  return state_->apartment;
 }
 
 void FreeApartmentOfThread() {
@@ -53,7 +55,7 @@ void FreeApartmentOfThread() {
   const auto state = g_states->find(GetCurrentThreadId());
   if (state == g_states->end()) return;
   // An object that outlived its thread still refers to the state; the identifier will come again, though.
-  if (state->second->objects > 0) static_cast<void>(state->second.release());
+  if (state->second->holds > 0) static_cast<void>(state->second.release());
   g_states->erase(state);
 }
 

@@ -4,13 +4,22 @@
 namespace tarnwick {
 
 struct Apartment;
+struct ThreadState;
 
-// The calling thread's state, made on the first call. It outlives all objects of the thread.
-Apartment& ApartmentOfThread();
+// Keeps the state of the thread that makes it, which is made with the first one. Objects that use the state
+// have one as a member, before whatever uses it.
+class ApartmentHold {
+ public:
+  ApartmentHold();
+  ~ApartmentHold();
+  ApartmentHold(const ApartmentHold&) = delete;
+  ApartmentHold& operator=(const ApartmentHold&) = delete;
 
-// Objects of ours that use the state count themselves, so that it is never freed below them.
-void HoldApartment();
-void LetGoOfApartment();
+  Apartment& Get() const;
+
+ private:
+  ThreadState* const state_;
+};
 
 // For the library's entry point: frees the state of the calling thread, which ends, unless an object was left
 // behind; frees the state of every thread, when the library is unloaded.

@@ -4,7 +4,6 @@
 
 #include "support/surface/Guard.h"
 #include "support/surface/HostCollection.h"
-#include "support/surface/ThreadApartment.h"
 
 namespace tarnwick {
 namespace {
@@ -53,18 +52,16 @@ void Assign(BSTR* target, TextView text) {
 ctrlListImageObject::ctrlListImageObject()
     : ole_(*this, DIID___ctrlListImage),
       view_(module::Instance(), *this),
-      uploader_(ApartmentOfThread().platform),
-      downloader_(ApartmentOfThread(), socket_, watchdog_) {
-  HoldApartment();
+      uploader_(apartment_.Get().platform),
+      downloader_(apartment_.Get(), socket_, watchdog_) {
   rules_ = std::make_unique<ctrlListImage>(
-      ctrlListImage::Parts{ApartmentOfThread(), view_, *this, uploader_, downloader_});
+      ctrlListImage::Parts{apartment_.Get(), view_, *this, uploader_, downloader_});
 }
 
 ctrlListImageObject::~ctrlListImageObject() {
   if (dropTarget_) dropTarget_->Revoke();
   rules_ = {};
   clientObject_ = {};
-  LetGoOfApartment();
 }
 
 STDMETHODIMP ctrlListImageObject::QueryInterface(REFIID interfaceId, void** object) {

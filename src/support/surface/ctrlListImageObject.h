@@ -147,6 +147,7 @@ class ctrlListImageObject final : public DualObject<_ctrlListImage>,
   // Raises an automation error with a description.
   static HRESULT Fail(const wchar_t* description, std::int32_t number);
 
+  const ApartmentHold apartment_;
   OleControl ole_;
   WindowsListView view_;
   UploadObject uploader_;
