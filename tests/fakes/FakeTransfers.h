@@ -7,6 +7,8 @@
 
 #include "fakes/FakeListControl.h"
 #include "fakes/FakePlatform.h"
+#include "platform/StreamSocket.h"
+#include "platform/Timer.h"
 #include "support/RuntimeError.h"
 #include "transfer/Transfers.h"
 
@@ -69,6 +71,41 @@ struct FakeDownloader : Downloader {
   void Cancel() override { log.emplace_back("cancel"); }
   void RestartWatchdog() override { log.emplace_back("watchdog starts"); }
   void StopWatchdog() override { log.emplace_back("watchdog stops"); }
+};
+
+// A socket whose events a test tells through `events`.
+struct FakeSocket : StreamSocket {
+  explicit FakeSocket(Transcript& itsLog) : log(itsLog) {}
+  Transcript& log;
+  SocketEvents* events = nullptr;
+  std::string waiting;
+
+  void Arrives(std::string_view bytes) {
+    waiting = bytes;
+    events->OnReadable();
+  }
+  void SetEvents(SocketEvents* sink) override { events = sink; }
+  void Connect(TextView host, std::uint16_t port) override {
+    log.push_back("connect " + Utf8FromText(host) + ":" + std::to_string(port));
+  }
+  void Send(std::string_view bytes) override {
+    log.push_back("send " + std::string(bytes.substr(0, bytes.find('\r'))));
+  }
+  std::size_t Read(std::span<char> room) override {
+    const std::size_t count = waiting.copy(room.data(), room.size());
+    waiting.erase(0, count);
+    return count;
+  }
+  void Close() override { log.emplace_back("close"); }
+};
+
+struct FakeTimer : Timer {
+  std::function<void()> handler;
+  // 0 when it does not run.
+  std::uint32_t runs = 0;
+  void SetHandler(std::function<void()> itsHandler) override { handler = std::move(itsHandler); }
+  void Start(std::uint32_t milliseconds) override { runs = milliseconds; }
+  void Stop() override { runs = 0; }
 };
 
 }  // namespace tarnwick

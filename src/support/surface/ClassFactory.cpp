@@ -1,10 +1,10 @@
 #include "support/surface/ClassFactory.h"
 
 #include <array>
-#include <atomic>
 
 #include "support/surface/CBVAccountObject.h"
 #include "support/surface/CFileUploadObject.h"
+#include "support/surface/ComObject.h"
 #include "support/surface/ComPtr.h"
 #include "support/surface/Guard.h"
 #include "support/surface/Module.h"
@@ -30,23 +30,9 @@ const std::array kClasses = {
                    kListImageBitmap, Make<ctrlListImageObject>},
 };
 
-class ClassFactory final : public IClassFactory {
+class ClassFactory final : public ComObject<IClassFactory> {
  public:
-  explicit ClassFactory(const CreatableClass& itsClass) : class_(itsClass) { module::Hold(); }
-
-  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override {
-    if (!object) return E_POINTER;
-    *object = interfaceId == IID_IUnknown || interfaceId == IID_IClassFactory ? this : nullptr;
-    if (!*object) return E_NOINTERFACE;
-    AddRef();
-    return S_OK;
-  }
-  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
-  STDMETHODIMP_(ULONG) Release() override {
-    const ULONG left = --references_;
-    if (left == 0) delete this;
-    return left;
-  }
+  explicit ClassFactory(const CreatableClass& itsClass) : class_(itsClass) {}
 
   STDMETHODIMP CreateInstance(IUnknown* outer, REFIID interfaceId, void** object) override {
     if (!object) return E_POINTER;
@@ -63,10 +49,7 @@ class ClassFactory final : public IClassFactory {
   }
 
  private:
-  ~ClassFactory() { module::LetGo(); }
-
   const CreatableClass& class_;
-  std::atomic<ULONG> references_{1};
 };
 
 }  // namespace

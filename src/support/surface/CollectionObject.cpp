@@ -7,7 +7,6 @@
 #include "support/RuntimeError.h"
 #include "support/surface/ComEnumerator.h"
 #include "support/surface/Guard.h"
-#include "support/surface/Module.h"
 
 namespace tarnwick {
 namespace {
@@ -55,33 +54,6 @@ const VARIANT* ArgumentAt(const DISPPARAMS& arguments, UINT index) {
 }
 
 }  // namespace
-
-CollectionObject::CollectionObject() {
-  module::Hold();
-}
-CollectionObject::~CollectionObject() {
-  // First: the items' last release may run code of the host's, which the library must be there for.
-  items_.Clear();
-  module::LetGo();
-}
-
-STDMETHODIMP CollectionObject::QueryInterface(REFIID interfaceId, void** object) {
-  if (!object) return E_POINTER;
-  *object = interfaceId == IID_IUnknown || interfaceId == IID_IDispatch ? this : nullptr;
-  if (!*object) return E_NOINTERFACE;
-  AddRef();
-  return S_OK;
-}
-
-STDMETHODIMP_(ULONG) CollectionObject::AddRef() {
-  return ++references_;
-}
-
-STDMETHODIMP_(ULONG) CollectionObject::Release() {
-  const ULONG left = --references_;
-  if (left == 0) delete this;
-  return left;
-}
 
 STDMETHODIMP CollectionObject::GetTypeInfoCount(UINT* count) {
   if (!count) return E_POINTER;

@@ -6,25 +6,17 @@
 // of the host's.
 #pragma once
 
-#include <atomic>
-
 #include "support/KeyedList.h"
 #include "support/surface/Automation.h"
+#include "support/surface/ComObject.h"
 
 namespace tarnwick {
 
-class CollectionObject final : public IDispatch {
+class CollectionObject final : public ComObject<IDispatch> {
  public:
-  CollectionObject();
-  CollectionObject(const CollectionObject&) = delete;
-  CollectionObject& operator=(const CollectionObject&) = delete;
-
   // Adds an item without a key.
   void Append(Variant item) { items_.Add(std::move(item)); }
 
-  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;
-  STDMETHODIMP_(ULONG) AddRef() override;
-  STDMETHODIMP_(ULONG) Release() override;
   STDMETHODIMP GetTypeInfoCount(UINT* count) override;
   STDMETHODIMP GetTypeInfo(UINT index, LCID locale, ITypeInfo** info) override;
   STDMETHODIMP GetIDsOfNames(REFIID reserved, LPOLESTR* names, UINT count, LCID locale, DISPID* ids) override;
@@ -32,15 +24,12 @@ class CollectionObject final : public IDispatch {
                       VARIANT* result, EXCEPINFO* exception, UINT* argumentError) override;
 
  private:
-  ~CollectionObject();
-
   // Members by identifier; they throw run-time errors, which Invoke hands to the host.
   HRESULT Call(DISPID member, WORD flags, const DISPPARAMS& arguments, VARIANT* result);
   void Add(const DISPPARAMS& arguments);
   // Position that an index argument means. Throws 5 for an unknown key, 9 for a position out of range.
   std::size_t PositionOf(const VARIANT& index) const;
 
-  std::atomic<ULONG> references_{1};
   KeyedList<Variant> items_;
 };
 

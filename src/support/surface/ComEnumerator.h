@@ -5,13 +5,12 @@
 #include <ocidl.h>
 
 #include <algorithm>
-#include <atomic>
 #include <utility>
 #include <vector>
 
 #include "support/surface/Automation.h"
+#include "support/surface/ComObject.h"
 #include "support/surface/Guard.h"
-#include "support/surface/Module.h"
 
 namespace tarnwick {
 
@@ -41,7 +40,7 @@ inline void Keep(FORMATETC&) {}
 inline void Free(FORMATETC&) {}
 
 template <typename Interface, typename Element>
-class ComEnumerator final : public Interface {
+class ComEnumerator final : public ComObject<Interface> {
  public:
   // Takes references of its own to the elements. Throws what copying throws.
   explicit ComEnumerator(std::vector<Element> elements, std::size_t next = 0)
@@ -53,24 +52,8 @@ class ComEnumerator final : public Interface {
       while (kept > 0) Free(elements_[--kept]);
       throw;
     }
-    module::Hold();
   }
-  ComEnumerator(const ComEnumerator&) = delete;
-  ComEnumerator& operator=(const ComEnumerator&) = delete;
 
-  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override {
-    if (!object) return E_POINTER;
-    *object = interfaceId == IID_IUnknown || interfaceId == __uuidof(Interface) ? this : nullptr;
-    if (!*object) return E_NOINTERFACE;
-    AddRef();
-    return S_OK;
-  }
-  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
-  STDMETHODIMP_(ULONG) Release() override {
-    const ULONG left = --references_;
-    if (left == 0) delete this;
-    return left;
-  }
   STDMETHODIMP Next(ULONG count, Element* elements, ULONG* fetched) override {
     if (!elements || (!fetched && count != 1)) return E_POINTER;
     ULONG done = 0;
@@ -104,12 +87,10 @@ class ComEnumerator final : public Interface {
   }
 
  private:
-  ~ComEnumerator() {
+  ~ComEnumerator() override {
     for (Element& element : elements_) Free(element);
-    module::LetGo();
   }
 
-  std::atomic<ULONG> references_{1};
   std::vector<Element> elements_;
   std::size_t next_;
 };

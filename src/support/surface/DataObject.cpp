@@ -13,7 +13,6 @@
 #include "support/surface/CollectionObject.h"
 #include "support/surface/ComEnumerator.h"
 #include "support/surface/Guard.h"
-#include "support/surface/Module.h"
 
 namespace tarnwick {
 namespace {
@@ -73,7 +72,6 @@ std::vector<Text> FilesOf(HDROP drop) {
 
 DataObject::DataObject(TextView text, TextView file) : text_(text), hasText_(!text.empty()) {
   if (!file.empty()) files_.emplace_back(file);
-  module::Hold();
 }
 
 DataObject::DataObject(IDataObject& foreign) {
@@ -96,34 +94,11 @@ DataObject::DataObject(IDataObject& foreign) {
     }
     ReleaseStgMedium(&medium);
   }
-  module::Hold();
-}
-
-DataObject::~DataObject() {
-  module::LetGo();
 }
 
 bool DataObject::Has(CLIPFORMAT format) const {
   return ((format == CF_UNICODETEXT || format == CF_TEXT) && hasText_) ||
          (format == CF_HDROP && !files_.empty());
-}
-
-STDMETHODIMP DataObject::QueryInterface(REFIID interfaceId, void** object) {
-  if (!object) return E_POINTER;
-  *object = nullptr;
-  if (interfaceId == IID_IUnknown || interfaceId == IID_IDataObject)
-    *object = static_cast<IDataObject*>(this);
-  else if (interfaceId == IID_IDispatch)
-    *object = static_cast<IDispatch*>(this);
-  if (!*object) return E_NOINTERFACE;
-  AddRef();
-  return S_OK;
-}
-
-STDMETHODIMP_(ULONG) DataObject::Release() {
-  const ULONG left = --references_;
-  if (left == 0) delete this;
-  return left;
 }
 
 // --- IDataObject ---

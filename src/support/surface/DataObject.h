@@ -6,12 +6,12 @@
 
 #include <ole2.h>
 
-#include <atomic>
 #include <vector>
 
 #include "controls/listimage/ControlEvents.h"
 #include "support/Text.h"
 #include "support/surface/Automation.h"
+#include "support/surface/ComObject.h"
 #include "support/surface/ComPtr.h"
 
 namespace tarnwick {
@@ -20,21 +20,15 @@ namespace tarnwick {
 inline constexpr std::int16_t kTextFormat = CF_TEXT;
 inline constexpr std::int16_t kFilesFormat = CF_HDROP;
 
-class DataObject final : public IDataObject, public IDispatch, public DragData {
+class DataObject final : public ComObject<IDataObject, IDispatch>, public DragData {
  public:
   // The data of a drag that begins in a control of ours: a text, and a file when its path is not empty.
   DataObject(TextView text, TextView file);
   // The data of a drag that comes from elsewhere, read when the object is made.
   explicit DataObject(IDataObject& foreign);
-  DataObject(const DataObject&) = delete;
-  DataObject& operator=(const DataObject&) = delete;
 
   const std::vector<Text>& Files() const { return files_; }
   IDispatch* Dispatch() { return this; }
-
-  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;
-  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
-  STDMETHODIMP_(ULONG) Release() override;
 
   // IDataObject
   STDMETHODIMP GetData(FORMATETC* format, STGMEDIUM* medium) override;
@@ -55,11 +49,9 @@ class DataObject final : public IDataObject, public IDispatch, public DragData {
                       VARIANT* result, EXCEPINFO* exception, UINT* argumentError) override;
 
  private:
-  ~DataObject();
   HRESULT Call(DISPID member, const DISPPARAMS& arguments, VARIANT* result);
   bool Has(CLIPFORMAT format) const;
 
-  std::atomic<ULONG> references_{1};
   Text text_;
   bool hasText_ = false;
   std::vector<Text> files_;

@@ -1,7 +1,6 @@
 #include "support/surface/DropTarget.h"
 
 #include "support/surface/Guard.h"
-#include "support/surface/Module.h"
 
 namespace tarnwick {
 namespace {
@@ -10,23 +9,10 @@ constexpr std::int16_t kEnters = 0;
 constexpr std::int16_t kLeaves = 1;
 constexpr std::int16_t kMoves = 2;
 
-class DropSource final : public IDropSource {
+class DropSource final : public ComObject<IDropSource> {
  public:
-  explicit DropSource(const std::function<bool(DWORD)>& feedback) : feedback_(feedback) { module::Hold(); }
+  explicit DropSource(const std::function<bool(DWORD)>& feedback) : feedback_(feedback) {}
 
-  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override {
-    if (!object) return E_POINTER;
-    *object = interfaceId == IID_IUnknown || interfaceId == IID_IDropSource ? this : nullptr;
-    if (!*object) return E_NOINTERFACE;
-    AddRef();
-    return S_OK;
-  }
-  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
-  STDMETHODIMP_(ULONG) Release() override {
-    const ULONG left = --references_;
-    if (left == 0) delete this;
-    return left;
-  }
   STDMETHODIMP QueryContinueDrag(BOOL escape, DWORD keys) override {
     if (escape) return DRAGDROP_S_CANCEL;
     return keys & (MK_LBUTTON | MK_RBUTTON) ? S_OK : DRAGDROP_S_DROP;
@@ -36,9 +22,6 @@ class DropSource final : public IDropSource {
   }
 
  private:
-  ~DropSource() { module::LetGo(); }
-
-  std::atomic<ULONG> references_{1};
   const std::function<bool(DWORD)> feedback_;
 };
 
@@ -46,31 +29,12 @@ class DropSource final : public IDropSource {
 
 DropTarget::DropTarget(HWND window, IUnknown& identity, DropUser& user)
     : window_(window), identity_(&identity), user_(&user) {
-  module::Hold();
   RegisterDragDrop(window_, this);
-}
-
-DropTarget::~DropTarget() {
-  module::LetGo();
 }
 
 void DropTarget::Revoke() {
   user_ = nullptr;
   RevokeDragDrop(window_);
-}
-
-STDMETHODIMP DropTarget::QueryInterface(REFIID interfaceId, void** object) {
-  if (!object) return E_POINTER;
-  *object = interfaceId == IID_IUnknown || interfaceId == IID_IDropTarget ? this : nullptr;
-  if (!*object) return E_NOINTERFACE;
-  AddRef();
-  return S_OK;
-}
-
-STDMETHODIMP_(ULONG) DropTarget::Release() {
-  const ULONG left = --references_;
-  if (left == 0) delete this;
-  return left;
 }
 
 DragPoint DropTarget::PointOf(DWORD keys, POINTL screen) const {

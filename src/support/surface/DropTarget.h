@@ -5,9 +5,9 @@
 
 #include <ole2.h>
 
-#include <atomic>
 #include <functional>
 
+#include "support/surface/ComObject.h"
 #include "support/surface/DataObject.h"
 
 namespace tarnwick {
@@ -22,31 +22,24 @@ class DropUser {
 };
 
 // The target that is registered for a window. It belongs to the system as well, so it may outlive its user.
-class DropTarget final : public IDropTarget {
+class DropTarget final : public ComObject<IDropTarget> {
  public:
   // Registers for `window`; `identity` is kept alive while `user` is called.
   DropTarget(HWND window, IUnknown& identity, DropUser& user);
-  DropTarget(const DropTarget&) = delete;
-  DropTarget& operator=(const DropTarget&) = delete;
 
   // From here on nothing is told any more.
   void Revoke();
 
-  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;
-  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
-  STDMETHODIMP_(ULONG) Release() override;
   STDMETHODIMP DragEnter(IDataObject* data, DWORD keys, POINTL at, DWORD* effect) override;
   STDMETHODIMP DragOver(DWORD keys, POINTL at, DWORD* effect) override;
   STDMETHODIMP DragLeave() override;
   STDMETHODIMP Drop(IDataObject* data, DWORD keys, POINTL at, DWORD* effect) override;
 
  private:
-  ~DropTarget();
   DragPoint PointOf(DWORD keys, POINTL screen) const;
   // Calls the user with the control kept alive; nothing when it was revoked.
   HRESULT Tell(const std::function<void(DropUser&)>& what);
 
-  std::atomic<ULONG> references_{1};
   HWND window_;
   IUnknown* identity_;
   DropUser* user_;

@@ -1,38 +1,18 @@
-// What all our objects with a dual interface share: counting, and late-bound calls through the type library.
+// What all our objects with a dual interface share: late-bound calls through the type library.
 #pragma once
 
-#include <atomic>
-
 #include "support/surface/Automation.h"
+#include "support/surface/ComObject.h"
 #include "support/surface/ComPtr.h"
 #include "support/surface/Dispatch.h"
 #include "support/surface/Module.h"
 
 namespace tarnwick {
 
-// `Interface` is a dual interface of our type library. An object begins with one reference, which its creator
-// owns, and keeps the library loaded.
+// `Interface` is a dual interface of our type library.
 template <typename Interface>
-class DualObject : public Interface {
+class DualObject : public ComObject<Interface> {
  public:
-  DualObject() { module::Hold(); }
-  DualObject(const DualObject&) = delete;
-  DualObject& operator=(const DualObject&) = delete;
-
-  STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override {
-    if (!object) return E_POINTER;
-    *object = FindInterface(interfaceId);
-    if (!*object) return E_NOINTERFACE;
-    AddRef();
-    return S_OK;
-  }
-  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
-  STDMETHODIMP_(ULONG) Release() override {
-    const ULONG left = --references_;
-    if (left == 0) delete this;
-    return left;
-  }
-
   STDMETHODIMP GetTypeInfoCount(UINT* count) override {
     if (!count) return E_POINTER;
     *count = 1;
@@ -61,16 +41,9 @@ class DualObject : public Interface {
   }
 
  protected:
-  virtual ~DualObject() {
-    description_ = {};
-    module::LetGo();
-  }
-
-  // The part of the object that is the interface, without a reference of its own; null when it has none.
-  virtual void* FindInterface(REFIID interfaceId) {
-    if (interfaceId == IID_IUnknown || interfaceId == IID_IDispatch || interfaceId == __uuidof(Interface))
-      return static_cast<Interface*>(this);
-    return nullptr;
+  void* FindInterface(REFIID interfaceId) override {
+    if (interfaceId == IID_IDispatch) return static_cast<Interface*>(this);
+    return ComObject<Interface>::FindInterface(interfaceId);
   }
 
  private:
@@ -80,7 +53,6 @@ class DualObject : public Interface {
     return description_.Get();
   }
 
-  std::atomic<ULONG> references_{1};
   ComPtr<ITypeInfo> description_;
 };
 
