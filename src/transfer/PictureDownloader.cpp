@@ -9,7 +9,7 @@ namespace tarnwick {
 namespace {
 
 // Of one arrival; a host hears of each.
-constexpr std::size_t kRoom = 256 * 1024;
+constexpr std::size_t kRoom = std::size_t{1} << 20;
 
 // FtpErrors.
 constexpr std::int32_t kHostNotFound = 9;
@@ -69,14 +69,17 @@ void PictureDownloader::Wait() {
 }
 
 void PictureDownloader::Connect(TextView host, std::uint16_t port) {
-  if (events_) events_->Resolving();
+  // It tells nothing yet, so the event still comes first; and what the host does there finds a download to
+  // end.
   socket_.Connect(host, port);
+  if (events_) events_->Resolving();
 }
 
 void PictureDownloader::OnConnected() {
+  if (!machine_.IsRunning()) return;
   if (events_) events_->Connected();
   machine_.OnConnected();
-  if (events_) events_->TransferStarting();
+  if (events_ && machine_.IsRunning()) events_->TransferStarting();
 }
 
 void PictureDownloader::OnReadable() {

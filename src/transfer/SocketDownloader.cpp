@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <charconv>
+#include <new>
 
 #include "support/PathHelpers.h"
 #include "support/RuntimeError.h"
@@ -83,20 +84,26 @@ void SocketDownloader::OnData(std::span<const char> bytes) {
   arrived_ += bytes.size();
   if (arrived_ > kMostReplyBytes) return Fail(true);
   const auto shown = static_cast<std::int32_t>(headerFound_ ? buffer_.size() + bytes.size() : arrived_);
-  buffer_.append(bytes.data(), bytes.size());
+  try {
+    buffer_.append(bytes.data(), bytes.size());
+  } catch (const std::bad_alloc&) {
+    // A file with a hole in it is worse than none.
+    return Fail(true);
+  }
   actions_.Received(shown);
   // The host may have ended or replaced the download in its event.
   if (!running_) return;
   actions_.RestartWatchdog();
-  if (!headerFound_) ReadHeader();
+  if (const auto statusLine = FindHeader()) actions_.ReplyLine(*statusLine);
 }
 
-void SocketDownloader::ReadHeader() {
+std::optional<std::string> SocketDownloader::FindHeader() {
+  if (headerFound_) return std::nullopt;
   // The last three bytes may be the beginning of the empty line; all before them has been seen.
   const std::size_t from = searched_ > 3 ? searched_ - 3 : 0;
   const std::size_t end = buffer_.find(kHeaderEnd, from);
   searched_ = buffer_.size();
-  if (end == std::string::npos) return;
+  if (end == std::string::npos) return std::nullopt;
   headerFound_ = true;
 
   const std::string header = buffer_.substr(0, end);
@@ -111,14 +118,19 @@ void SocketDownloader::ReadHeader() {
     }
     lines.remove_prefix(std::min(line.size() + 2, lines.size()));
   }
-  // Once, so that the body is not copied as it grows; what the server says is believed up to the bound.
-  if (contentLength_ > 0)
-    buffer_.reserve(std::min<std::size_t>(static_cast<std::size_t>(contentLength_), kMostReplyBytes));
-  actions_.ReplyLine(statusLine);
+  // Once, so that the body is not copied as it grows; what the server says is believed up to the bound. Where
+  // there is no room for all of it, there may be for what really comes.
+  ResultAsItStood(0, [&](int&) {
+    if (contentLength_ > 0)
+      buffer_.reserve(std::min<std::size_t>(static_cast<std::size_t>(contentLength_), kMostReplyBytes));
+  });
+  return std::string(statusLine);
 }
 
 void SocketDownloader::OnClosedByPeer() {
   if (!running_) return;
+  // A host that pumps messages in the event of an arrival gets the close before the arrival was searched.
+  const auto statusLine = FindHeader();
   if (!headerFound_) return Fail(arrived_ == 0);
   const std::string body = std::move(buffer_);
   buffer_ = {};
@@ -126,6 +138,7 @@ void SocketDownloader::OnClosedByPeer() {
   actions_.CloseSocket();
   actions_.StopWatchdog();
   actions_.WriteFile(target_, explicitTarget_, body);
+  if (statusLine) actions_.ReplyLine(*statusLine);
   actions_.Finished();
 }
 

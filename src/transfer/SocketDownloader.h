@@ -13,6 +13,7 @@
 #pragma once
 
 #include <cstdint>
+#include <optional>
 #include <span>
 #include <string>
 #include <string_view>
@@ -27,8 +28,8 @@ inline constexpr std::size_t kMostReplyBytes = std::size_t{256} << 20;
 // Longest silence of a transfer.
 inline constexpr std::uint32_t kWatchdogMs = 40'000;
 
-// What the downloader wants to be done. Nothing may be told to it from inside these, except that events of a
-// control may start or end another download.
+// What the downloader wants to be done. The last four are events: in them a host may start or end a download,
+// and more of what happens may be told. Nothing may be told to it from inside the others.
 class DownloadActions {
  public:
   virtual ~DownloadActions() = default;
@@ -76,7 +77,8 @@ class SocketDownloader {
 
  private:
   void Fail(bool told);
-  void ReadHeader();
+  // The status line when the header, which was not known before, is whole in the buffer; takes it from there.
+  std::optional<std::string> FindHeader();
 
   DownloadActions& actions_;
   Text remoteHost_;

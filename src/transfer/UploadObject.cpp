@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <limits>
 #include <memory>
+#include <random>
 #include <string>
 
 #include "platform/FileSystem.h"
@@ -14,8 +15,20 @@
 namespace tarnwick {
 namespace {
 
-// The file's bytes are not searched for it: a file that held this line would have been made to.
-constexpr std::string_view kBoundary = "--tarnwick-7d1f4c0be85a4296b3f2c6e0a9d85137";
+// New for each upload. The file's bytes are not searched for it, so no file may be made to hold it.
+std::string NewBoundary() {
+  std::random_device random;
+  std::string boundary = "--tarnwick";
+  for (int i = 0; i < 4; ++i) boundary.append("-").append(std::to_string(random()));
+  return boundary;
+}
+
+// Whether the name can stand between quotes in a head. What cannot is refused by the page as well; it is met
+// where a path names more than a file (a stream of it, for one).
+bool CanBeQuoted(TextView name) {
+  return std::none_of(name.begin(), name.end(),
+                      [](char16_t unit) { return unit < 0x20 || unit == 0x7F || unit == u'"'; });
+}
 
 // The body of an upload: the fields, then the bytes of the file while they are read.
 class UploadBody : public BodySource {
@@ -23,15 +36,17 @@ class UploadBody : public BodySource {
   UploadBody(FileSystem& files, TextView path, UploadEvents& events)
       : length_(files.Length(path)), file_(files.Open(path)), events_(events) {}
 
+  const std::string& Boundary() const { return boundary_; }
+
   void AddField(std::string_view name, TextView value) {
     AddPartHead(name, {});
     head_.append(Utf8FromText(value)).append("\r\n");
   }
-  // The last part. The name comes from a path of this machine; a quote in it cannot be.
+  // The last part. The name can be quoted.
   void AddFile(std::string_view name, TextView fileName) {
     AddPartHead(name,
                 "; filename=\"" + Utf8FromText(fileName) + "\"\r\nContent-Type: application/octet-stream");
-    tail_ = "\r\n--" + std::string(kBoundary) + "--\r\n";
+    tail_ = "\r\n--" + boundary_ + "--\r\n";
   }
 
   std::uint64_t Length() const override { return head_.size() + length_ + tail_.size(); }
@@ -63,14 +78,17 @@ class UploadBody : public BodySource {
 
  private:
   void AddPartHead(std::string_view name, std::string_view more) {
-    head_.append("--").append(kBoundary).append("\r\nContent-Disposition: form-data; name=\"").append(name);
+    head_.append("--").append(boundary_).append("\r\nContent-Disposition: form-data; name=\"").append(name);
     head_.append("\"").append(more).append("\r\n\r\n");
   }
 
   std::size_t ReadSome(std::span<char> room) {
     const std::uint64_t afterFile = head_.size() + length_;
     if (position_ < head_.size()) return Copy(head_, position_, room);
-    if (position_ >= afterFile) return Copy(tail_, position_ - afterFile, room);
+    if (position_ >= afterFile) {
+      if (position_ == afterFile) ExpectEnd();
+      return Copy(tail_, position_ - afterFile, room);
+    }
     const std::uint64_t left = afterFile - position_;
     const std::size_t count =
         file_->Read(room.first(static_cast<std::size_t>(std::min<std::uint64_t>(room.size(), left))));
@@ -79,10 +97,17 @@ class UploadBody : public BodySource {
     return count;
   }
 
+  // The file has become longer: what was sent of it is not all of it.
+  void ExpectEnd() {
+    char more = 0;
+    if (file_->Read({&more, 1}) != 0) throw RuntimeError(error::kPathAccess);
+  }
+
   static std::size_t Copy(std::string_view text, std::uint64_t from, std::span<char> room) {
     return text.copy(room.data(), room.size(), static_cast<std::size_t>(from));
   }
 
+  const std::string boundary_ = NewBoundary();
   std::string head_;
   std::string tail_;
   const std::uint64_t length_;
@@ -99,15 +124,17 @@ void UploadObject::UploadFile(TextView localPath, TextView usersBaseUrl, TextVie
                               std::int32_t flag, TextView user, TextView password, TextView productGuid,
                               UploadEvents& events) {
   UploadBody body(platform_.files, localPath, events);
+  const TextView fileName = FileNameFromPath(localPath);
+  if (!CanBeQuoted(fileName)) throw RuntimeError(acceptor::kNameRefused);
   body.AddField("UsersBaseUrl", usersBaseUrl);
   body.AddField("Flag", TextFromNumber(flag));
   body.AddField("User", user);
   body.AddField("Password", password);
   body.AddField("ProductID", productGuid);
-  body.AddFile("File", FileNameFromPath(localPath));
+  body.AddFile("File", fileName);
 
   HttpPost post = AcceptorPost(usersBaseUrl, acceptorPath);
-  const std::string contentType = "multipart/form-data; boundary=" + std::string(kBoundary);
+  const std::string contentType = "multipart/form-data; boundary=" + body.Boundary();
   post.contentType = contentType;
   events.Initializing();
   events.Connecting();

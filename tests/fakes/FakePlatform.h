@@ -144,7 +144,9 @@ struct FakeFiles : FileSystem {
     const std::string bytes;
     std::size_t at = 0;
   };
-  std::unique_ptr<FileReader> Open(TextView path) override { return std::make_unique<Reader>(At(path).bytes); }
+  std::unique_ptr<FileReader> Open(TextView path) override {
+    return std::make_unique<Reader>(At(path).bytes);
+  }
   void Write(TextView path, std::string_view bytes) override {
     files[Text(path)] = {bytes.size(), 0, std::string(bytes)};
   }

@@ -1,5 +1,8 @@
 #include <gtest/gtest.h>
 
+#include <chrono>
+#include <sstream>
+
 #include "fakes/FakePlatform.h"
 #include "transfer/AcceptorPages.h"
 #include "transfer/FileNameGuard.h"
@@ -71,6 +74,33 @@ TEST_F(DownloaderTest, FindsTheHeaderAcrossAnySplit) {
       ASSERT_EQ(actions.body, "body\r\n\r\nmore") << first << " " << second;
       ASSERT_EQ(machine.ContentLength(), 0);
     }
+}
+
+// Byte by byte, and with as many beginnings of the empty line as fit: whoever searched all again for each
+// arrival would still be at it.
+TEST_F(DownloaderTest, LooksAtEachByteOfTheHeaderOnce) {
+  std::string header;
+  while (header.size() < 300'000) header += "\r\n\rx";
+  Start(u"h/a.gif");
+  machine.OnConnected();
+  const auto begin = std::chrono::steady_clock::now();
+  for (const char byte : header) machine.OnData({&byte, 1});
+  EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
+  Data("\r\n\r\nbody");
+  machine.OnClosedByPeer();
+  EXPECT_EQ(actions.body, "body");
+}
+
+TEST_F(DownloaderTest, FailsBeyondItsBound) {
+  Start(u"h/a.gif");
+  machine.OnConnected();
+  const std::string piece(kMostReplyBytes / 16, 'x');
+  Data("HTTP/1.1 200\r\nContent-Length: 2147483647\r\n\r\n");
+  for (int i = 0; i < 15; ++i) Data(piece);
+  EXPECT_TRUE(machine.IsRunning());
+  actions.log.clear();
+  Data(piece);
+  EXPECT_EQ(actions.log, "close;w-;failed told;");
 }
 
 TEST_F(DownloaderTest, FailsAsALostConnectionDoes) {
@@ -186,11 +216,127 @@ TEST(UploadObject, SendsTheFileAndTellsItsProgress) {
                       "|\r\nContent-Disposition: form-data; name=\"File\"; filename=\"a b.jpg\"\r\n"
                       "Content-Type: application/octet-stream\r\n\r\n12345678901234567890\r\n|--\r\n");
 
-  // A file that is shorter than it was said to be must not be sent as if it were whole.
-  fake.files.files[u"C:\\a b.jpg"].length = 21;
-  EXPECT_EQ(upload("ErrorNumber=0").substr(0, 3), "75 ");
+  EXPECT_NE(fake.http.sent[0].contentType, fake.http.sent[1].contentType) << "a boundary can be foreseen";
+
+  // A file that is shorter or longer than it was said to be must not be sent as if it were whole.
+  for (const std::uint64_t length : {21U, 19U}) {
+    fake.files.files[u"C:\\a b.jpg"].length = length;
+    EXPECT_EQ(upload("ErrorNumber=0").substr(0, 3), "75 ");
+  }
   fake.files.files.clear();
   EXPECT_EQ(upload("ErrorNumber=0"), "53 ");
+}
+
+// A transport that takes the body in pieces of one size.
+struct PiecewiseHttp : FakeHttp {
+  std::size_t piece = 1;
+  std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source, std::size_t most) override {
+    std::string body;
+    std::string room(piece, '?');
+    source.Sent(0);
+    while (body.size() < source.Length()) {
+      body.append(room, 0, source.Read(room));
+      source.Sent(body.size());
+    }
+    EXPECT_EQ(source.Read(room), 0U);
+    HttpPost whole = post;
+    whole.body = body;
+    return Post(whole, most);
+  }
+};
+
+TEST(UploadObject, TellsRisingPercentsInPiecesOfAnySize) {
+  for (const std::size_t length : {0U, 1U, 7U, 100U, 12345U}) {
+    for (const std::size_t piece : {1U, 1000U, 1U << 20}) {
+      SCOPED_TRACE(std::to_string(length) + " in " + std::to_string(piece));
+      FakePlatform fake;
+      PiecewiseHttp http;
+      http.piece = piece;
+      http.answers.push_back(HttpAnswer{200, "ErrorNumber=0"});
+      std::string bytes(length, 'x');
+      fake.files.files[u"C:\\\u00e9.jpg"] = {length, 0, bytes};
+      Platform platform = fake.apartment.platform;
+      UploadObject uploader(
+          {platform.registry, http, platform.internet, platform.files, platform.strings, platform.pump});
+      Uploads events;
+      uploader.UploadFile(u"C:\\\u00e9.jpg", u"http://h/users/", u"/p", 0, u"u", u"p", u"g", events);
+
+      std::istringstream log(events.log);
+      std::vector<std::string> told;
+      for (std::string event; std::getline(log, event, ';');) told.push_back(event);
+      ASSERT_GE(told.size(), 8U) << events.log;
+      EXPECT_EQ(told[2], "started");
+      EXPECT_EQ(told[3], "0 0");
+      EXPECT_EQ(told[told.size() - 4], "100 " + std::to_string(length));
+      for (std::size_t i = 4; i + 3 < told.size(); ++i)
+        EXPECT_LT(std::stoi(told[i - 1]), std::stoi(told[i])) << events.log;
+      const std::string& body = http.sent[0].body;
+      EXPECT_NE(body.find("filename=\"\xC3\xA9.jpg\"\r\nContent-Type: application/octet-stream\r\n\r\n" +
+                          bytes + "\r\n--"),
+                std::string::npos);
+      EXPECT_TRUE(body.ends_with("--\r\n"));
+    }
+  }
+}
+
+TEST(UploadObject, FailsWithTheNumberOfTheFailure) {
+  const struct {
+    const char* name;
+    TextView path;
+    TextView base;
+    std::optional<HttpAnswer> answer;
+    std::int32_t error;
+    std::size_t posts;
+  } rows[] = {
+      {"no file", u"C:\\none", u"http://h/users/", {}, 53, 0},
+      {"no server", u"C:\\a", u"http:///users/", {}, acceptor::kUnspecified, 0},
+      {"a head in the address", u"C:\\a", u"http://h\r\nX: y/users/", {}, acceptor::kUnspecified, 0},
+      {"a head in the name", u"C:\\a:\"\r\nX: y", u"http://h/users/", {}, acceptor::kNameRefused, 0},
+      {"no answer", u"C:\\a", u"http://h/users/", {}, acceptor::kUnspecified, 1},
+      {"another status", u"C:\\a", u"h/users/", HttpAnswer{500, "ErrorNumber=0"}, acceptor::kUnspecified, 1},
+      {"no number", u"C:\\a", u"h/users/", HttpAnswer{200, "ErrorNumber=none"}, acceptor::kUnspecified, 1},
+      {"nothing said", u"C:\\a", u"h/users/", HttpAnswer{200, "OK"}, acceptor::kUnspecified, 1},
+      {"the page's own", u"C:\\a", u"h/users/", HttpAnswer{200, "ErrorNumber=380"}, 380, 1},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    FakePlatform fake;
+    fake.files.files[u"C:\\a"] = fake.files.files[u"C:\\a:\"\r\nX: y"] = {3, 0, "abc"};
+    if (row.answer) fake.http.answers.push_back(row.answer);
+    UploadObject uploader(fake.apartment.platform);
+    Uploads events;
+    std::int32_t error = 0;
+    try {
+      uploader.UploadFile(row.path, row.base, u"/p", 0, u"u", u"p", u"g", events);
+    } catch (const RuntimeError& failure) {
+      error = failure.Number();
+    }
+    EXPECT_EQ(error, row.error);
+    EXPECT_EQ(fake.http.sent.size(), row.posts);
+    EXPECT_EQ(events.log.find("upload complete"), std::string::npos);
+  }
+}
+
+// The forms of the two other operations, and that each failure is the page's number.
+TEST(UploadObject, DeletesAndRenames) {
+  FakePlatform fake;
+  UploadObject uploader(fake.apartment.platform);
+  fake.http.answers = {HttpAnswer{200, "ErrorNumber=0"}, HttpAnswer{200, "ErrorNumber=0"},
+                       HttpAnswer{200, "ErrorNumber=-2147220880"}};
+  uploader.DeleteFile(u"http://h:81/users/", u"a b&\u00e9.jpg", u"/httpupload/DeleteAcceptor.asp", u"u", u"p",
+                      u"g");
+  uploader.RenameFile(u"http://h:81/users/", u"old", u"new", u"/httpupload/RenameAcceptor.asp", u"u", u"p",
+                      u"g");
+  EXPECT_THROW(uploader.DeleteFile(u"h/users/", u"a", u"/p", u"u", u"p", u"g"), RuntimeError);
+  EXPECT_THROW(uploader.RenameFile(u"h/users/", u"a", u"b", u"/p", u"u", u"p", u"g"), RuntimeError);
+  ASSERT_EQ(fake.http.sent.size(), 4U);
+  EXPECT_EQ(fake.http.sent[0].target, "/httpupload/DeleteAcceptor.asp");
+  EXPECT_EQ(fake.http.sent[0].body,
+            "UsersBaseUrl=http%3A%2F%2Fh%3A81%2Fusers%2F&FileName=a%20b%26%C3%A9.jpg&User=u&Password=p&"
+            "ProductID=g");
+  EXPECT_EQ(fake.http.sent[1].body,
+            "UsersBaseUrl=http%3A%2F%2Fh%3A81%2Fusers%2F&OldFileName=old&NewFileName=new&User=u&Password=p&"
+            "ProductID=g");
 }
 
 }  // namespace

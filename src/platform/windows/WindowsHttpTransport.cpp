@@ -243,6 +243,8 @@ std::optional<HttpAnswer> WindowsHttpTransport::PostStream(const HttpPost& post,
       worker.Give(std::move(block));
     } else if (woken == WAIT_OBJECT_0 + 1) {
       return worker.TakeAnswer();
+    } else if (woken == WAIT_FAILED) {
+      return std::nullopt;
     } else {
       MSG message = {};
       if (PeekMessageW(&message, nullptr, WM_QUIT, WM_QUIT, PM_NOREMOVE)) return std::nullopt;

@@ -9,11 +9,21 @@
 namespace tarnwick {
 namespace {
 
-constexpr UINT kLookedUp = WM_APP + 1;
-constexpr UINT kNetworkEvent = WM_APP + 2;
-constexpr UINT kFailedAtOnce = WM_APP + 3;
+// Much at a time: each arrival costs several messages, whatever its size.
+constexpr int kReceiveRoom = 4 << 20;
+constexpr UINT kFirstMessage = WM_APP;
+// After so many connections the message numbers come again; those of the first are gone by then.
+constexpr UINT kConnections = 1000;
 
 }  // namespace
+
+// What a message tells. Each connection has message numbers of its own: messages of one that was closed may
+// still wait, and the next one may get its socket handle.
+enum class WindowsStreamSocket::Tells : UINT { kLookedUp, kNetworkEvent, kSent, kError, kCount };
+
+UINT WindowsStreamSocket::MessageOf(Tells tells) const {
+  return kFirstMessage + connection_ * static_cast<UINT>(Tells::kCount) + static_cast<UINT>(tells);
+}
 
 WindowsStreamSocket::WindowsStreamSocket()
     : window_(
@@ -34,11 +44,12 @@ void WindowsStreamSocket::Close() {
   pending_.clear();
   if (socket_ != INVALID_SOCKET) closesocket(socket_);
   socket_ = INVALID_SOCKET;
+  connection_ = (connection_ + 1) % kConnections;
 }
 
 // Told as a message: nothing is told inside a call.
 void WindowsStreamSocket::TellError(int error) {
-  PostMessageW(window_.Get(), kFailedAtOnce, static_cast<WPARAM>(error), 0);
+  PostMessageW(window_.Get(), MessageOf(Tells::kError), static_cast<WPARAM>(error), 0);
 }
 
 void WindowsStreamSocket::Connect(TextView host, std::uint16_t port) {
@@ -50,16 +61,18 @@ void WindowsStreamSocket::Connect(TextView host, std::uint16_t port) {
   const unsigned long number = inet_addr(name->c_str());
   if (number != INADDR_NONE) return ConnectTo(number);
   lookupAnswer_.assign(MAXGETHOSTSTRUCT, '\0');
-  lookup_ = WSAAsyncGetHostByName(window_.Get(), kLookedUp, name->c_str(), lookupAnswer_.data(),
-                                  static_cast<int>(lookupAnswer_.size()));
+  lookup_ = WSAAsyncGetHostByName(window_.Get(), MessageOf(Tells::kLookedUp), name->c_str(),
+                                  lookupAnswer_.data(), static_cast<int>(lookupAnswer_.size()));
   if (!lookup_) TellError(WSAGetLastError());
 }
 
 void WindowsStreamSocket::ConnectTo(std::uint32_t address) {
   socket_ = socket(AF_INET, SOCK_STREAM, IPPROTO_TCP);
-  if (socket_ == INVALID_SOCKET ||
-      WSAAsyncSelect(socket_, window_.Get(), kNetworkEvent, FD_CONNECT | FD_READ | FD_WRITE | FD_CLOSE) != 0)
+  if (socket_ == INVALID_SOCKET || WSAAsyncSelect(socket_, window_.Get(), MessageOf(Tells::kNetworkEvent),
+                                                  FD_CONNECT | FD_READ | FD_WRITE | FD_CLOSE) != 0)
     return TellError(WSAGetLastError());
+  const int room = kReceiveRoom;
+  setsockopt(socket_, SOL_SOCKET, SO_RCVBUF, reinterpret_cast<const char*>(&room), sizeof room);
   sockaddr_in peer = {};
   peer.sin_family = AF_INET;
   peer.sin_port = htons(port_);
@@ -71,16 +84,13 @@ void WindowsStreamSocket::ConnectTo(std::uint32_t address) {
 
 void WindowsStreamSocket::Send(std::string_view bytes) {
   pending_.append(bytes);
-  SendPending();
-}
-
-void WindowsStreamSocket::SendPending() {
   while (!pending_.empty()) {
     const int count =
         send(socket_, pending_.data(), static_cast<int>(std::min<std::size_t>(pending_.size(), 1U << 30)), 0);
     // What cannot go now goes when the socket tells that it may.
     if (count <= 0) return;
     pending_.erase(0, static_cast<std::size_t>(count));
+    PostMessageW(window_.Get(), MessageOf(Tells::kSent), 0, 0);
   }
 }
 
@@ -91,62 +101,64 @@ std::size_t WindowsStreamSocket::Read(std::span<char> room) {
 }
 
 bool WindowsStreamSocket::OnMessage(UINT message, WPARAM wParam, LPARAM lParam) {
-  switch (message) {
-    case kLookedUp: {
-      if (!lookup_ || reinterpret_cast<HANDLE>(wParam) != lookup_) return true;
-      lookup_ = nullptr;
-      const int error = WSAGETASYNCERROR(lParam);
-      const auto* found = reinterpret_cast<const hostent*>(lookupAnswer_.data());
-      if (error != 0 || found->h_length != sizeof(std::uint32_t)) {
-        if (events_) events_->OnSocketError(WSAHOST_NOT_FOUND);
-        return true;
-      }
-      std::uint32_t address = 0;
-      std::memcpy(&address, found->h_addr_list[0], sizeof address);
-      if (events_) events_->OnResolved();
-      ConnectTo(address);
-      return true;
-    }
-    case kNetworkEvent:
-      // Messages of a socket that has been closed may still be there.
-      if (static_cast<SOCKET>(wParam) == socket_ && socket_ != INVALID_SOCKET)
-        OnNetworkEvent(WSAGETSELECTEVENT(lParam), WSAGETSELECTERROR(lParam));
-      return true;
-    case kFailedAtOnce:
-      if (events_) events_->OnSocketError(static_cast<std::int32_t>(wParam));
-      return true;
-    default:
-      return false;
+  constexpr UINT kCount = static_cast<UINT>(Tells::kCount);
+  if (message < kFirstMessage || message >= kFirstMessage + kConnections * kCount) return false;
+  if (!events_ || (message - kFirstMessage) / kCount != connection_) return true;
+  switch (static_cast<Tells>((message - kFirstMessage) % kCount)) {
+    case Tells::kLookedUp:
+      OnLookedUp(WSAGETASYNCERROR(lParam));
+      break;
+    case Tells::kNetworkEvent:
+      OnNetworkEvent(WSAGETSELECTEVENT(lParam), WSAGETSELECTERROR(lParam));
+      break;
+    case Tells::kSent:
+      events_->OnSent();
+      break;
+    case Tells::kError:
+    case Tells::kCount:
+      events_->OnSocketError(static_cast<std::int32_t>(wParam));
+      break;
   }
+  return true;
+}
+
+void WindowsStreamSocket::OnLookedUp(int error) {
+  lookup_ = nullptr;
+  const auto* found = reinterpret_cast<const hostent*>(lookupAnswer_.data());
+  if (error != 0 || found->h_length != sizeof(std::uint32_t))
+    return events_->OnSocketError(WSAHOST_NOT_FOUND);
+  std::uint32_t address = 0;
+  std::memcpy(&address, found->h_addr_list[0], sizeof address);
+  const UINT connection = connection_;
+  events_->OnResolved();
+  if (connection == connection_) ConnectTo(address);
 }
 
 void WindowsStreamSocket::OnNetworkEvent(int event, int error) {
-  if (!events_) return;
   if (error != 0) return events_->OnSocketError(error);
   switch (event) {
     case FD_CONNECT:
-      events_->OnConnected();
-      return;
-    case FD_WRITE: {
-      const bool any = !pending_.empty();
-      SendPending();
-      if (any) events_->OnSent();
-      return;
-    }
+      return events_->OnConnected();
+    case FD_WRITE:
+      return Send({});
     case FD_READ:
-      events_->OnReadable();
-      return;
-    case FD_CLOSE: {
-      // What arrived before the close is still to be read.
-      const SOCKET closed = socket_;
-      unsigned long left = 0;
-      while (socket_ == closed && ioctlsocket(closed, FIONREAD, &left) == 0 && left > 0)
-        events_->OnReadable();
-      if (socket_ == closed && events_) events_->OnClosedByPeer();
-      return;
-    }
+      return events_->OnReadable();
+    case FD_CLOSE:
+      return OnClose();
     default:
       return;
+  }
+}
+
+void WindowsStreamSocket::OnClose() {
+  const UINT connection = connection_;
+  while (connection == connection_) {
+    // What arrived before the close is still to be read; a reset may follow even now.
+    char next = 0;
+    const int left = recv(socket_, &next, 1, MSG_PEEK);
+    if (left < 0 && WSAGetLastError() != WSAEWOULDBLOCK) return events_->OnSocketError(WSAGetLastError());
+    if (left <= 0) return events_->OnClosedByPeer();
+    events_->OnReadable();
   }
 }
 

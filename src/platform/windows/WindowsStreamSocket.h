@@ -26,14 +26,20 @@ class WindowsStreamSocket : public StreamSocket {
   void Close() override;
 
  private:
+  enum class Tells : UINT;
+
+  UINT MessageOf(Tells tells) const;
   bool OnMessage(UINT message, WPARAM wParam, LPARAM lParam);
+  void OnLookedUp(int error);
   void OnNetworkEvent(int event, int error);
+  void OnClose();
   void ConnectTo(std::uint32_t address);
-  void SendPending();
   void TellError(int error);
 
   SocketEvents* events_ = nullptr;
   SOCKET socket_ = INVALID_SOCKET;
+  // Counts the connections, so that messages of one that was closed can be told.
+  UINT connection_ = 0;
   // Of the look-up that runs; null when none does.
   HANDLE lookup_ = nullptr;
   std::string lookupAnswer_;

@@ -6,8 +6,10 @@
 // Before any <windows.h>, whose own sockets are older.
 #include <chrono>
 #include <cstdint>
+#include <limits>
 #include <stdexcept>
 #include <string>
+#include <string_view>
 #include <thread>
 #include <vector>
 
@@ -19,6 +21,9 @@ class LoopbackServer {
   struct Answer {
     std::string bytes;
     End end = End::kClose;
+    // Reads no more than about this many bytes of the request, and pauses after each piece.
+    std::size_t reads = std::numeric_limits<std::size_t>::max();
+    unsigned pauseMs = 0;
   };
 
   explicit LoopbackServer(std::vector<Answer> answers) : answers_(std::move(answers)) {
@@ -66,7 +71,7 @@ class LoopbackServer {
     const std::size_t head = request.find("\r\n\r\n");
     if (head == std::string::npos) return false;
     const std::size_t length = request.find("Content-Length: ");
-    return length < head && request.size() - head - 4 >= std::stoul(request.substr(length + 16));
+    return length > head || request.size() - head - 4 >= std::stoul(request.substr(length + 16, 20));
   }
 
   void Serve() {
@@ -74,27 +79,36 @@ class LoopbackServer {
     for (std::size_t i = 0; i <= answers_.size(); ++i) {
       if (!Ready(listener_, i < answers_.size() ? 5000 : 150)) return;
       const SOCKET peer = accept(listener_, nullptr, nullptr);
+      const Answer answer = i < answers_.size() ? answers_[i] : Answer{};
       std::string request;
-      char buffer[4096];
-      while (!Whole(request) && Ready(peer, 2000)) {
+      char buffer[32 * 1024];
+      while (request.size() < answer.reads && !Whole(request) && Ready(peer, 2000)) {
         const int received = recv(peer, buffer, sizeof buffer, 0);
         if (received <= 0) break;
         request.append(buffer, static_cast<std::size_t>(received));
+        if (answer.pauseMs != 0) Sleep(answer.pauseMs);
       }
       requests_.push_back(request);
-      if (i < answers_.size()) Play(peer, answers_[i]);
+      if (i < answers_.size()) Play(peer, answer);
       closesocket(peer);
     }
   }
 
   static void Play(SOCKET peer, const Answer& answer) {
-    send(peer, answer.bytes.data(), static_cast<int>(answer.bytes.size()), 0);
+    for (std::string_view rest = answer.bytes; !rest.empty();) {
+      const int sent = send(peer, rest.data(), static_cast<int>(rest.size()), 0);
+      if (sent <= 0) break;
+      rest.remove_prefix(static_cast<std::size_t>(sent));
+    }
     if (answer.end == End::kReset) {
       const linger now{1, 0};
       setsockopt(peer, SOL_SOCKET, SO_LINGER, reinterpret_cast<const char*>(&now), sizeof now);
     } else if (answer.end == End::kSilence) {
-      // Until the client gives up.
-      Ready(peer, 5000);
+      // Until the client gives up. What of its request was not read would look like it already.
+      if (answer.reads == std::numeric_limits<std::size_t>::max())
+        Ready(peer, 5000);
+      else
+        Sleep(1500);
     }
   }
 

@@ -1,0 +1,312 @@
+// Streamed posts, sockets and timers that tell their events as messages, against real connections.
+#include "LoopbackServer.h"
+// LoopbackServer.h comes first: see there.
+#include <gtest/gtest.h>
+
+#include <algorithm>
+#include <functional>
+
+#include "platform/windows/Owner.h"
+#include "platform/windows/WindowsHttpTransport.h"
+#include "platform/windows/WindowsMessagePump.h"
+#include "platform/windows/WindowsStreamSocket.h"
+#include "platform/windows/WindowsTimer.h"
+#include "support/RuntimeError.h"
+
+namespace tarnwick {
+namespace {
+
+using End = LoopbackServer::End;
+
+constexpr char kOk[] = "HTTP/1.1 200 OK\r\nContent-Length: 2\r\n\r\nok";
+constexpr std::size_t kLarge = 24U << 20;
+
+// Milliseconds of processor time that this process has used.
+std::uint64_t ProcessorMs() {
+  FILETIME created{};
+  FILETIME ended{};
+  FILETIME kernel{};
+  FILETIME user{};
+  GetProcessTimes(GetCurrentProcess(), &created, &ended, &kernel, &user);
+  const auto ticks = [](const FILETIME& time) {
+    return (std::uint64_t{time.dwHighDateTime} << 32) | time.dwLowDateTime;
+  };
+  return (ticks(kernel) + ticks(user)) / 10'000;
+}
+
+// Pumps until `done`, for as long as a test may take.
+bool PumpUntil(const std::function<bool()>& done, std::uint32_t mostMs = 5000) {
+  WindowsMessagePump pump;
+  WindowsTimer limit;
+  bool late = false;
+  limit.SetHandler([&] { late = true; });
+  limit.Start(mostMs);
+  while (!done() && !late) pump.Wait();
+  return done();
+}
+
+// --- Timer ---
+
+TEST(WindowsTimer, RunsOutOnceAndCountsAnew) {
+  WindowsTimer timer;
+  int expired = 0;
+  timer.SetHandler([&] { ++expired; });
+  const DWORD begin = GetTickCount();
+  const std::uint64_t processor = ProcessorMs();
+  timer.Start(200);
+  PumpUntil([] { return false; }, 120);
+  timer.Start(200);
+  EXPECT_TRUE(PumpUntil([&] { return expired > 0; }));
+  EXPECT_GE(GetTickCount() - begin, 300U);
+  PumpUntil([] { return false; }, 500);
+  EXPECT_EQ(expired, 1);
+  timer.Start(50);
+  timer.Stop();
+  PumpUntil([] { return false; }, 150);
+  EXPECT_EQ(expired, 1);
+  EXPECT_LE(ProcessorMs() - processor, 50U) << "a wait uses the processor";
+}
+
+// --- Socket ---
+
+// Writes down what a socket tells, and reads what it has.
+struct Sink : SocketEvents {
+  WindowsStreamSocket socket;
+  std::string log;
+  std::string bytes;
+  std::size_t room = 64 * 1024;
+  // Before an event is written down.
+  std::function<void()> onReadable;
+
+  Sink() { socket.SetEvents(this); }
+  void OnResolved() override { log += "resolved;"; }
+  void OnConnected() override {
+    log += "connected;";
+    socket.Send("GET / HTTP/1.1\r\n\r\n");
+  }
+  void OnReadable() override {
+    if (onReadable) onReadable();
+    std::string piece(room, '\0');
+    piece.resize(socket.Read(piece));
+    bytes += piece;
+  }
+  void OnClosedByPeer() override { log += "closed;"; }
+  void OnSent() override { log += "sent;"; }
+  void OnSocketError(std::int32_t number) override { log += "error " + std::to_string(number) + ";"; }
+  bool Over() const {
+    return log.find("closed") != std::string::npos || log.find("error") != std::string::npos;
+  }
+};
+
+std::string Pattern(std::size_t length) {
+  std::string bytes(length, '\0');
+  for (std::size_t i = 0; i < length; ++i) bytes[i] = static_cast<char>(i * 7 + i / 251);
+  return bytes;
+}
+
+TEST(WindowsStreamSocket, BringsWhatThePeerSendsAndTellsItsClose) {
+  const std::string bytes = Pattern(3'000'000);
+  for (const TextView host : {u"127.0.0.1", u"localhost"}) {
+    LoopbackServer server({{bytes}});
+    Sink sink;
+    sink.room = 10'007;
+    sink.socket.Connect(host, server.Port());
+    EXPECT_TRUE(sink.log.empty()) << "told inside a call";
+    EXPECT_TRUE(PumpUntil([&] { return sink.Over(); }));
+    EXPECT_EQ(sink.log, std::string(host == u"localhost" ? "resolved;" : "") + "connected;sent;closed;");
+    EXPECT_TRUE(sink.bytes == bytes) << sink.bytes.size();
+    EXPECT_EQ(server.Requests()[0], "GET / HTTP/1.1\r\n\r\n");
+  }
+}
+
+TEST(WindowsStreamSocket, TellsWhyThereIsNoConnection) {
+  std::uint16_t port = 0;
+  {
+    LoopbackServer gone({});
+    port = gone.Port();
+  }
+  Sink refused;
+  refused.socket.Connect(u"127.0.0.1", port);
+  EXPECT_TRUE(PumpUntil([&] { return refused.Over(); }));
+  EXPECT_EQ(refused.log, "error 10061;");
+  Sink unknown;
+  unknown.socket.Connect(u"\u65E5", 80);
+  EXPECT_TRUE(unknown.log.empty());
+  EXPECT_TRUE(PumpUntil([&] { return unknown.Over(); }));
+  EXPECT_EQ(unknown.log, "error 11001;");
+}
+
+// The numbers of closed sockets come again, and messages of theirs may still wait.
+TEST(WindowsStreamSocket, TellsNothingOfAnEarlierConnection) {
+  const std::vector<LoopbackServer::Answer> answers(40, {"A\r\n\r\nabc"});
+  LoopbackServer server(answers);
+  Sink sink;
+  for (std::size_t i = 0; i < answers.size() / 2; ++i) {
+    // Closed before, or when, what it has to tell is told. The first ones fail at once.
+    sink.socket.Connect(u"\u65E5", 80);
+    sink.socket.Connect(u"127.0.0.1", server.Port());
+    Sleep(i % 2 == 0 ? 0 : 20);
+    sink.log.clear();
+    sink.bytes.clear();
+    sink.socket.Connect(u"127.0.0.1", server.Port());
+    EXPECT_TRUE(PumpUntil([&] { return sink.Over(); }));
+    EXPECT_EQ(sink.log, "connected;sent;closed;") << i;
+    EXPECT_EQ(sink.bytes, "A\r\n\r\nabc") << i;
+  }
+}
+
+TEST(WindowsStreamSocket, TellsNothingAfterItWasClosedInAnEvent) {
+  LoopbackServer server({{Pattern(1'000'000)}});
+  Sink sink;
+  sink.onReadable = [&] { sink.socket.Close(); };
+  sink.socket.Connect(u"127.0.0.1", server.Port());
+  PumpUntil([&] { return sink.Over(); }, 300);
+  EXPECT_EQ(sink.log, "connected;sent;");
+  EXPECT_TRUE(sink.bytes.empty());
+}
+
+TEST(WindowsStreamSocket, WaitsForASilentPeerAtNoCost) {
+  LoopbackServer server({{"", End::kSilence}});
+  Sink sink;
+  sink.socket.Connect(u"127.0.0.1", server.Port());
+  EXPECT_TRUE(PumpUntil([&] { return !sink.log.empty(); }));
+  const std::uint64_t processor = ProcessorMs();
+  PumpUntil([&] { return sink.Over(); }, 700);
+  EXPECT_LE(ProcessorMs() - processor, 20U);
+  EXPECT_EQ(sink.log, "connected;sent;");
+}
+
+// --- Streamed posts ---
+
+struct Source : BodySource {
+  explicit Source(std::uint64_t itsLength) : length(itsLength) {}
+  std::uint64_t length;
+  std::uint64_t position = 0;
+  // At which it fails.
+  std::uint64_t failsAt = std::numeric_limits<std::uint64_t>::max();
+  std::size_t largestRoom = 0;
+  std::vector<std::uint64_t> told;
+  DWORD thread = GetCurrentThreadId();
+
+  std::uint64_t Length() const override { return length; }
+  std::size_t Read(std::span<char> room) override {
+    EXPECT_EQ(GetCurrentThreadId(), thread);
+    if (position >= failsAt) throw RuntimeError(75);
+    largestRoom = std::max(largestRoom, room.size());
+    const auto count = static_cast<std::size_t>(std::min<std::uint64_t>(room.size(), length - position));
+    for (std::size_t i = 0; i < count; ++i)
+      room[i] = static_cast<char>((position + i) * 7 + (position + i) / 251);
+    position += count;
+    return count;
+  }
+  void Sent(std::uint64_t sent) override {
+    EXPECT_EQ(GetCurrentThreadId(), thread);
+    told.push_back(sent);
+  }
+};
+
+std::optional<HttpAnswer> Stream(std::uint16_t port, Source& source, std::uint32_t silenceMs = 400) {
+  WindowsHttpTransport http(1500, silenceMs);
+  HttpPost post;
+  post.host = u"127.0.0.1";
+  post.port = port;
+  post.target = "/p";
+  post.contentType = "multipart/form-data; boundary=x";
+  return http.PostStream(post, source, 1000);
+}
+
+TEST(PostStream, SendsALargeBodyPieceByPiece) {
+  LoopbackServer server({{kOk}});
+  Source source(kLarge);
+  const auto answer = Stream(server.Port(), source);
+  ASSERT_TRUE(answer);
+  EXPECT_EQ(answer->status, 200);
+  EXPECT_EQ(answer->body, "ok");
+  EXPECT_LE(source.largestRoom, std::size_t{1} << 20);
+  ASSERT_FALSE(source.told.empty());
+  EXPECT_EQ(source.told.front(), 0U);
+  EXPECT_EQ(source.told.back(), kLarge);
+  EXPECT_TRUE(std::is_sorted(source.told.begin(), source.told.end()));
+
+  const std::string& request = server.Requests()[0];
+  const std::size_t headEnd = request.find("\r\n\r\n");
+  const std::string head = request.substr(0, headEnd + 2);
+  for (const std::string& line :
+       {std::string("POST /p HTTP/1.1"), "Content-Length: " + std::to_string(kLarge),
+        std::string("Content-Type: multipart/form-data; boundary=x")})
+    EXPECT_NE(("\r\n" + head).find("\r\n" + line + "\r\n"), std::string::npos) << line << " in\n" << head;
+  EXPECT_TRUE(request.substr(headEnd + 4) == Pattern(kLarge)) << request.size();
+  EXPECT_EQ(ownedObjects, 0);
+}
+
+TEST(PostStream, HandlesMessagesWhileThePeerIsSlow) {
+  LoopbackServer server({{kOk, End::kClose, std::numeric_limits<std::size_t>::max(), 10}});
+  Source source(4U << 20);
+  WindowsTimer timer;
+  int ticks = 0;
+  timer.SetHandler([&] {
+    ++ticks;
+    timer.Start(20);
+  });
+  timer.Start(20);
+  const DWORD begin = GetTickCount();
+  // What has left is still on its way to a slow reader, so that the answer takes its time.
+  EXPECT_TRUE(Stream(server.Port(), source, 3000));
+  const DWORD took = GetTickCount() - begin;
+  EXPECT_GE(took, 300U);
+  EXPECT_GE(ticks, static_cast<int>(took / 60));
+}
+
+TEST(PostStream, FailsWithinItsTimeOut) {
+  const struct {
+    const char* name;
+    LoopbackServer::Answer answer;
+  } rows[] = {
+      {"reset in the body", {"", End::kReset, 100'000}},
+      {"closed in the body", {"", End::kClose, 100'000}},
+      {"nothing is read", {"", End::kSilence, 0}},
+      {"no more is read", {"", End::kSilence, 100'000}},
+      {"no answer", {"", End::kSilence}},
+      {"reset instead of an answer", {"", End::kReset}},
+      {"half an answer", {"HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\nErr", End::kSilence}},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    LoopbackServer server({row.answer});
+    Source source(kLarge);
+    const DWORD begin = GetTickCount();
+    const std::uint64_t processor = ProcessorMs();
+    EXPECT_FALSE(Stream(server.Port(), source));
+    EXPECT_LT(GetTickCount() - begin, 1300U);
+    EXPECT_LT(ProcessorMs() - processor, 400U);
+    EXPECT_EQ(ownedObjects, 0);
+  }
+}
+
+TEST(PostStream, EndsWithItsSourceAndWithAQuitMessage) {
+  {
+    LoopbackServer server({{kOk}});
+    Source source(kLarge);
+    source.failsAt = kLarge / 2;
+    EXPECT_THROW(Stream(server.Port(), source), RuntimeError);
+    EXPECT_EQ(ownedObjects, 0);
+  }
+  for (const std::size_t reads : {std::size_t{0}, std::numeric_limits<std::size_t>::max()}) {
+    LoopbackServer server({{"", End::kSilence, reads}});
+    Source source(kLarge);
+    WindowsTimer timer;
+    timer.SetHandler([] { PostQuitMessage(7); });
+    timer.Start(150);
+    const DWORD begin = GetTickCount();
+    EXPECT_FALSE(Stream(server.Port(), source));
+    // Some versions of the system do not end the call that runs; then its time-out does.
+    EXPECT_LT(GetTickCount() - begin, 150U + 400U + 250U);
+    MSG message{};
+    ASSERT_TRUE(PeekMessageW(&message, nullptr, WM_QUIT, WM_QUIT, PM_REMOVE));
+    EXPECT_EQ(message.wParam, WPARAM{7});
+    EXPECT_EQ(ownedObjects, 0);
+  }
+}
+
+}  // namespace
+}  // namespace tarnwick
