@@ -92,7 +92,7 @@ TEST(WindowsHttpTransport, CollectsWholeAnswersOnly) {
     LoopbackServer server({{*item.answer ? std::string("HTTP/1.1") + item.answer : "", item.end}});
     const DWORD begin = GetTickCount();
     const auto answer = PostTo(server.Port());
-    EXPECT_LT(GetTickCount() - begin, 1500U);
+    EXPECT_LT(GetTickCount() - begin, 20'000U);
     EXPECT_EQ(answer ? answer->status : -1, item.status);
     EXPECT_EQ(answer ? answer->body : "", item.body);
     // Neither a redirect followed nor a post sent again.
@@ -121,7 +121,7 @@ TEST(WindowsHttpTransport, FailsWhenNobodyListens) {
   }
   const DWORD begin = GetTickCount();
   EXPECT_FALSE(PostTo(port));
-  EXPECT_LT(GetTickCount() - begin, 3000U);
+  EXPECT_LT(GetTickCount() - begin, 20'000U);
 }
 
 }  // namespace

@@ -108,7 +108,7 @@ class LoopbackServer {
       if (answer.reads == std::numeric_limits<std::size_t>::max())
         Ready(peer, 5000);
       else
-        Sleep(1500);
+        Sleep(2500);
     }
   }
 
