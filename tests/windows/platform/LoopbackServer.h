@@ -4,6 +4,7 @@
 
 #include <winsock2.h>
 // Before any <windows.h>, whose own sockets are older.
+#include <atomic>
 #include <chrono>
 #include <cstdint>
 #include <limits>
@@ -49,6 +50,7 @@ class LoopbackServer {
   // Ends the server; what each connection had sent.
   const std::vector<std::string>& Requests() {
     if (thread_.joinable()) {
+      done_ = true;
       thread_.join();
       closesocket(listener_);
       WSACleanup();
@@ -94,7 +96,7 @@ class LoopbackServer {
     }
   }
 
-  static void Play(SOCKET peer, const Answer& answer) {
+  void Play(SOCKET peer, const Answer& answer) {
     for (std::string_view rest = answer.bytes; !rest.empty();) {
       const int sent = send(peer, rest.data(), static_cast<int>(rest.size()), 0);
       if (sent <= 0) break;
@@ -104,11 +106,10 @@ class LoopbackServer {
       const linger now{1, 0};
       setsockopt(peer, SOL_SOCKET, SO_LINGER, reinterpret_cast<const char*>(&now), sizeof now);
     } else if (answer.end == End::kSilence) {
-      // Until the client gives up. What of its request was not read would look like it already.
-      if (answer.reads == std::numeric_limits<std::size_t>::max())
-        Ready(peer, 5000);
-      else
-        Sleep(2500);
+      // Until the client gives up: it ends the connection, or its test is done. Reading what of its request
+      // was not read would be no silence.
+      const bool reads = answer.reads == std::numeric_limits<std::size_t>::max();
+      for (int i = 0; i < 500 && !done_ && !(reads && Ready(peer, 0)); ++i) Sleep(10);
     }
   }
 
@@ -116,6 +117,8 @@ class LoopbackServer {
   std::vector<std::string> requests_;
   SOCKET listener_ = INVALID_SOCKET;
   std::uint16_t port_ = 0;
+  // Nothing more is asked of the server.
+  std::atomic<bool> done_ = false;
   std::thread thread_;
 };
 

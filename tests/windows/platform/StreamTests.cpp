@@ -112,13 +112,15 @@ TEST(WindowsStreamSocket, BringsWhatThePeerSendsAndTellsItsClose) {
   for (const TextView host : {u"127.0.0.1", u"localhost"}) {
     LoopbackServer server({{bytes}});
     Sink sink;
+    // Not every machine knows its own name.
+    if (host == u"localhost" && !gethostbyname("localhost")) break;
     sink.room = 10'007;
     sink.socket.Connect(host, server.Port());
     EXPECT_TRUE(sink.log.empty()) << "told inside a call";
     EXPECT_TRUE(PumpUntil([&] { return sink.Over(); }));
     EXPECT_EQ(sink.log, std::string(host == u"localhost" ? "resolved;" : "") + "connected;sent;closed;");
     EXPECT_TRUE(sink.bytes == bytes) << sink.bytes.size();
-    EXPECT_EQ(server.Requests()[0], "GET / HTTP/1.1\r\n\r\n");
+    EXPECT_EQ(server.Requests(), std::vector<std::string>{"GET / HTTP/1.1\r\n\r\n"});
   }
 }
 
@@ -231,6 +233,7 @@ TEST(PostStream, SendsALargeBodyPieceByPiece) {
   EXPECT_EQ(source.told.back(), kLarge);
   EXPECT_TRUE(std::is_sorted(source.told.begin(), source.told.end()));
 
+  ASSERT_EQ(server.Requests().size(), 1U);
   const std::string& request = server.Requests()[0];
   const std::size_t headEnd = request.find("\r\n\r\n");
   const std::string head = request.substr(0, headEnd + 2);
@@ -291,21 +294,18 @@ TEST(PostStream, EndsWithItsSourceAndWithAQuitMessage) {
     EXPECT_THROW(Stream(server.Port(), source), RuntimeError);
     EXPECT_EQ(ownedObjects, 0);
   }
-  for (const std::size_t reads : {std::size_t{0}, std::numeric_limits<std::size_t>::max()}) {
-    LoopbackServer server({{"", End::kSilence, reads}});
-    Source source(kLarge);
-    WindowsTimer timer;
-    timer.SetHandler([] { PostQuitMessage(7); });
-    timer.Start(150);
-    const DWORD begin = GetTickCount();
-    EXPECT_FALSE(Stream(server.Port(), source));
-    // Some versions of the system do not end the call that runs; then its time-out does.
-    EXPECT_LT(GetTickCount() - begin, kHangs);
-    MSG message{};
-    ASSERT_TRUE(PeekMessageW(&message, nullptr, WM_QUIT, WM_QUIT, PM_REMOVE));
-    EXPECT_EQ(message.wParam, WPARAM{7});
-    EXPECT_EQ(ownedObjects, 0);
-  }
+  // To a peer that reads so slowly that all of it would take seconds.
+  LoopbackServer server({{kOk, End::kClose, std::numeric_limits<std::size_t>::max(), 10}});
+  Source source(kLarge);
+  WindowsTimer timer;
+  timer.SetHandler([] { PostQuitMessage(7); });
+  timer.Start(150);
+  EXPECT_FALSE(Stream(server.Port(), source, 5000));
+  EXPECT_LT(source.position, kLarge);
+  MSG message{};
+  ASSERT_TRUE(PeekMessageW(&message, nullptr, WM_QUIT, WM_QUIT, PM_REMOVE));
+  EXPECT_EQ(message.wParam, WPARAM{7});
+  EXPECT_EQ(ownedObjects, 0);
 }
 
 }  // namespace
