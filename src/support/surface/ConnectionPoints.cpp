@@ -92,14 +92,4 @@ void NotifyChanged(const ConnectionPoint& listeners, DISPID property) {
   }
 }
 
-bool MayChange(const ConnectionPoint& listeners, DISPID property) {
-  for (const ComPtr<IUnknown>& sink : listeners.Sinks()) {
-    ComPtr<IPropertyNotifySink> listener;
-    if (SUCCEEDED(sink->QueryInterface(IID_IPropertyNotifySink, listener.ReceiveVoid())) &&
-        listener->OnRequestEdit(property) == S_FALSE)
-      return false;
-  }
-  return true;
-}
-
 }  // namespace tarnwick

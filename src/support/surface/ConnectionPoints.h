@@ -52,8 +52,7 @@ class ConnectionPoint final : public IConnectionPoint {
 // being called.
 void RaiseEvent(const ConnectionPoint& events, DISPID id, std::span<VARIANT> arguments);
 
-// Tells the listeners of property changes that `property` has changed, or asks them whether it may.
+// Tells the listeners of property changes that `property` has changed.
 void NotifyChanged(const ConnectionPoint& listeners, DISPID property);
-bool MayChange(const ConnectionPoint& listeners, DISPID property);
 
 }  // namespace tarnwick

@@ -64,12 +64,13 @@ void* OleControl::FindInterface(REFIID id) {
 }
 
 void OleControl::Raise(DISPID event, std::span<VARIANT> arguments) {
-  if (eventsFrozen_ == 0) RaiseEvent(events_, event, arguments);
+  if (eventsFrozen_ > 0) return;
+  ResultAsItStood(0, [&](int&) { RaiseEvent(events_, event, arguments); });
 }
 
 void OleControl::PropertyChanged(DISPID property) {
   dirty_ = true;
-  NotifyChanged(propertyListeners_, property);
+  ResultAsItStood(0, [&](int&) { NotifyChanged(propertyListeners_, property); });
 }
 
 void OleControl::ViewChanged() {
@@ -527,27 +528,31 @@ STDMETHODIMP OleControl::Load(IStream* stream) {
     const HRESULT result = stream->Read(&value, sizeof value, &count);
     return FAILED(result) ? result : count == sizeof value ? S_OK : STG_E_READFAULT;
   };
-  std::uint32_t version = 0;
-  HRESULT result = read(version);
-  if (SUCCEEDED(result) && version != kStreamVersion) result = STG_E_OLDFORMAT;
-  std::vector<std::int32_t> values(hooks_.Properties().size());
-  for (std::int32_t& value : values)
-    if (SUCCEEDED(result)) result = read(value);
-  if (FAILED(result)) return result;
-  for (std::size_t i = 0; i < values.size(); ++i) hooks_.SetProperty(hooks_.Properties()[i].id, values[i]);
-  dirty_ = false;
-  return S_OK;
+  return Guarded([&]() -> HRESULT {
+    std::uint32_t version = 0;
+    HRESULT result = read(version);
+    if (SUCCEEDED(result) && version != kStreamVersion) result = STG_E_OLDFORMAT;
+    std::vector<std::int32_t> values(hooks_.Properties().size());
+    for (std::int32_t& value : values)
+      if (SUCCEEDED(result)) result = read(value);
+    if (FAILED(result)) return result;
+    for (std::size_t i = 0; i < values.size(); ++i) hooks_.SetProperty(hooks_.Properties()[i].id, values[i]);
+    dirty_ = false;
+    return S_OK;
+  });
 }
 
 STDMETHODIMP OleControl::Save(IStream* stream, BOOL clearDirty) {
   if (!stream) return E_POINTER;
-  std::vector<std::uint32_t> values = {kStreamVersion};
-  for (const PersistedProperty& property : hooks_.Properties())
-    values.push_back(static_cast<std::uint32_t>(hooks_.GetProperty(property.id)));
-  const HRESULT result =
-      stream->Write(values.data(), static_cast<ULONG>(values.size() * sizeof(std::uint32_t)), nullptr);
-  if (SUCCEEDED(result) && clearDirty) dirty_ = false;
-  return result;
+  return Guarded([&]() -> HRESULT {
+    std::vector<std::uint32_t> values = {kStreamVersion};
+    for (const PersistedProperty& property : hooks_.Properties())
+      values.push_back(static_cast<std::uint32_t>(hooks_.GetProperty(property.id)));
+    const HRESULT result =
+        stream->Write(values.data(), static_cast<ULONG>(values.size() * sizeof(std::uint32_t)), nullptr);
+    if (SUCCEEDED(result) && clearDirty) dirty_ = false;
+    return result;
+  });
 }
 
 STDMETHODIMP OleControl::GetSizeMax(ULARGE_INTEGER* size) {

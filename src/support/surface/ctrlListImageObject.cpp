@@ -425,10 +425,11 @@ STDMETHODIMP ctrlListImageObject::Overlay(VARIANT* Key1, VARIANT* Key2, IPicture
 HWND ctrlListImageObject::Window() {
   const HWND window = view_.Window();
   // A host that did not initialise OLE has a control without drops.
-  if (window && !dropTarget_) {
-    dropTarget_ = ComPtr<DropTarget>::Adopt(new DropTarget(view_.List(), Identity(), *this));
-    ApplyLook();
-  }
+  if (window && !dropTarget_)
+    Done([&] {
+      dropTarget_ = ComPtr<DropTarget>::Adopt(new DropTarget(view_.List(), Identity(), *this));
+      ApplyLook();
+    });
   return window;
 }
 
