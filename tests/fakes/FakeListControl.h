@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "controls/listimage/ControlEvents.h"
+#include "controls/ControlEvents.h"
 #include "controls/listimage/ListView.h"
 #include "support/RuntimeError.h"
 

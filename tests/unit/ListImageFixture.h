@@ -114,7 +114,7 @@ class ListImageTest : public testing::Test {
   FakeUploader uploader{log};
   FakeDownloader downloader{log, fake.files};
   const bool prepared = Prepare();
-  ctrlListImage control{{fake.apartment, view, host, uploader, downloader}};
+  ctrlListImage control{{fake.apartment, host, uploader, downloader}, view};
 };
 
 }  // namespace tarnwick

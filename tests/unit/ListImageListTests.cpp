@@ -2,7 +2,7 @@
 #include "unit/ListImageFixture.h"
 
 #include "controls/listimage/DirectoryDate.h"
-#include "controls/listimage/FileNames.h"
+#include "controls/FileNames.h"
 
 namespace tarnwick {
 namespace {
@@ -41,10 +41,10 @@ TEST_F(ListImageTest, FailingInitLeavesTheList) {
   };
   fake.apartment.listingIsCurrent = false;
   listingFails = true;
-  EXPECT_EQ(failure(), list_error::kListingFailed);
+  EXPECT_EQ(failure(), init_error::kListingFailed);
   EXPECT_FALSE(fake.apartment.listingIsCurrent);
   control.mobjFileupload.reset();
-  EXPECT_EQ(failure(), list_error::kNoClient);
+  EXPECT_EQ(failure(), init_error::kNoClient);
   EXPECT_EQ(Names(), "a.jpg,");
 }
 
@@ -327,7 +327,7 @@ TEST_F(ListImageTest, ManyFilesCostTheViewNothing) {
 TEST_F(ListImageTest, EndMakesTheNextControlList) {
   List({{"a.jpg", "1"}});
   {
-    ctrlListImage second{{fake.apartment, view, host, uploader, downloader}};
+    ctrlListImage second{{fake.apartment, host, uploader, downloader}, view};
     EXPECT_TRUE(second.Init(u"*"));
     log.clear();
   }

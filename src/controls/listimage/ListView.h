@@ -6,6 +6,7 @@
 #include <optional>
 #include <span>
 
+#include "controls/ControlView.h"
 #include "support/Text.h"
 
 namespace tarnwick {
@@ -18,10 +19,8 @@ struct ListColumn {
 // Items count from 0. What the rules change through this interface is not reported back to them: the handlers
 // of ctrlListImage are for what the user does. No member throws. All work without a window too; a window that
 // comes later shows the same state.
-class ListView {
+class ListView : public ControlView {
  public:
-  virtual ~ListView() = default;
-
   // Replaces all columns. Each is 96 pixels wide at 96 DPI, its text stands left.
   virtual void SetColumns(std::span<const ListColumn> columns) = 0;
 
@@ -51,15 +50,6 @@ class ListView {
 
   // Ends a running label edit without a result.
   virtual void EndLabelEdit() = 0;
-
-  // The keyboard focus.
-  virtual void Focus() = 0;
-
-  // The hourglass over the control, or the default pointer.
-  virtual void SetHourglass(bool hourglass) = 0;
-
-  // Starts a drag of the selected items, as if the user did.
-  virtual void StartDrag() = 0;
 };
 
 }  // namespace tarnwick

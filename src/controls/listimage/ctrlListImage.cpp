@@ -5,12 +5,10 @@
 #include <array>
 #include <utility>
 
-#include "controls/listimage/FileNames.h"
-#include "support/PathHelpers.h"
+#include "controls/FileNames.h"
 #include "support/ResourceStrings.h"
 #include "support/RuntimeError.h"
 #include "support/UserFolder.h"
-#include "transfer/FileNameGuard.h"
 
 namespace tarnwick {
 namespace {
@@ -34,35 +32,14 @@ bool IsJpg(const CUpload& record) {
 
 }  // namespace
 
-ctrlListImage::ctrlListImage(const Parts& parts)
-    : mobjFileupload(std::make_shared<CFileUpload>(parts.apartment)),
-      apartment_(parts.apartment),
-      view_(parts.view),
-      events_(parts.events),
-      uploader_(parts.uploader),
-      downloader_(parts.downloader) {
-  downloader_.SetEvents(this);
+ctrlListImage::ctrlListImage(const ControlParts& parts, ListView& view)
+    : FileControl(parts, view, TransferEvents::kTold), view_(view) {
   view_.SetLabelText(
       ResultAsItStood(Text(), [&](Text& label) { label = GetResourceString(apartment_, kNoImagesString); }));
 }
 
 ctrlListImage::~ctrlListImage() {
-  Close();
   apartment_.listingIsCurrent = false;
-}
-
-void ctrlListImage::Close() {
-  closed_ = true;
-  downloader_.SetEvents(nullptr);
-  downloader_.Cancel();
-}
-
-void ctrlListImage::Raise(std::int16_t code, TextView description) {
-  events_.FileManagerEvent(code, description);
-}
-
-void ctrlListImage::RaiseCurrentItem() {
-  Raise(event::kCurrentItem, SelectedKey());
 }
 
 // --- Listing ---
@@ -70,11 +47,11 @@ void ctrlListImage::RaiseCurrentItem() {
 bool ctrlListImage::Init(TextView szFileFilter) {
   Text filter(szFileFilter);
   if (!apartment_.listingIsCurrent) apartment_.allFiles.Clear();
-  if (!mobjFileupload) throw RuntimeError(list_error::kNoClient);
+  if (!mobjFileupload) throw RuntimeError(init_error::kNoClient);
   PrepareUserFolder(apartment_);
   const bool listed = mobjFileupload->ListFilesForUser(
       [&](const std::shared_ptr<CUpload>& record, TextView key) { apartment_.allFiles.Add(record, key); });
-  if (!listed) throw RuntimeError(list_error::kListingFailed);
+  if (!listed) throw RuntimeError(init_error::kListingFailed);
   ShowListOrLabel();
   view_.SetColumns(kColumns);
   currentFilter_ = std::move(filter);
@@ -133,20 +110,6 @@ bool ctrlListImage::ShowsWhenUploaded(TextView name) const {
   return (filter != u"gif" && filter != u"jpg") || EndsWithIgnoringCase(name, filter);
 }
 
-void ctrlListImage::GetFileDetails(TextView FileName,
-                                   const std::function<void(const std::shared_ptr<CUpload>&)>& colFiles) {
-  ResultAsItStood(0, [&](int&) {
-    for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i) {
-      const CUpload& record = *apartment_.allFiles.At(i);
-      if (record.FilePath != FileName && FileNameFromUrl(record.FilePath) != FileName) continue;
-      auto details = std::make_shared<CUpload>(record);
-      details->FilePath.clear();
-      colFiles(details);
-      return;
-    }
-  });
-}
-
 // --- Selection ---
 
 std::optional<std::size_t> ctrlListImage::NextSelected(std::size_t from) const {
@@ -154,32 +117,15 @@ std::optional<std::size_t> ctrlListImage::NextSelected(std::size_t from) const {
   return selected && *selected < items_.size() ? selected : std::nullopt;
 }
 
-Text ctrlListImage::SelectedFileName() const {
+std::shared_ptr<CUpload> ctrlListImage::SelectedRecord() const {
   const auto selected = Selected();
-  return selected ? items_[*selected].record->FileName : Text();
-}
-
-Text ctrlListImage::SelectedKey() const {
-  const auto selected = Selected();
-  return selected ? items_[*selected].record->FilePath : Text();
-}
-
-std::optional<Text> ctrlListImage::GetSelectedFilesHttpPath() const {
-  return Selected() ? std::optional(SelectedKey()) : std::nullopt;
+  return selected ? items_[*selected].record : nullptr;
 }
 
 std::vector<Text> ctrlListImage::GetFileNames() const {
   std::vector<Text> names;
   for (auto at = Selected(); at; at = NextSelected(*at + 1)) names.push_back(items_[*at].record->FileName);
   return names;
-}
-
-void ctrlListImage::SetMultiSelectProperty(bool bVal) {
-  view_.SetMultiSelect(bVal);
-}
-
-void ctrlListImage::ListViewSetFocus() {
-  view_.Focus();
 }
 
 void ctrlListImage::UploadedFileSetFocus(TextView szFileName) {
@@ -254,7 +200,7 @@ void ctrlListImage::OnMouseButton() {
 }
 
 bool ctrlListImage::OnBeforeLabelEdit() const {
-  return bRenameEnabled && !renameInProgress_ && !closed_;
+  return bRenameEnabled && !RenameRuns() && !IsClosed();
 }
 
 bool ctrlListImage::OnAfterLabelEdit(std::size_t index, TextView newText) {
@@ -270,65 +216,8 @@ bool ctrlListImage::OnAfterLabelEdit(std::size_t index, TextView newText) {
   });
 }
 
-void ctrlListImage::StartLabelExit() {
-  view_.EndLabelEdit();
-}
-
-bool ctrlListImage::EnableRename(bool bEnableRename) {
-  bRenameEnabled = bEnableRename;
-  return bEnableRename;
-}
-
-// --- Drag and drop ---
-
-void ctrlListImage::OLEDrag() {
-  view_.StartDrag();
-}
-
-ctrlListImage::DragContent ctrlListImage::ContentOfDrag() const {
-  return ResultAsItStood(DragContent(), [&](DragContent& content) {
-    content.address = SelectedKey();
-    const Text name = SelectedFileName();
-    if (apartment_.UserFolderPath.empty() || !IsSafeFileName(name)) return;
-    Text copy = apartment_.UserFolderPath + u"\\" + name;
-    if (FileExists(apartment_.platform.files, copy)) content.localFile = std::move(copy);
-  });
-}
-
-void ctrlListImage::OnStartDrag(DragData& data, std::int32_t& allowedEffects) {
-  dragFromList_ = true;
-  events_.OLEStartDrag(data, allowedEffects);
-}
-
-void ctrlListImage::OnSetData(DragData& data, std::int16_t format) {
-  events_.OLESetData(data, format);
-}
-
-void ctrlListImage::OnGiveFeedback(std::int32_t& effect, bool& defaultCursors) {
-  events_.OLEGiveFeedback(effect, defaultCursors);
-}
-
-void ctrlListImage::OnDragOver(DragData& data, std::int32_t& effect, const DragPoint& at,
-                               std::int16_t state) {
-  events_.OLEDragOver(data, effect, at, state);
-}
-
-void ctrlListImage::OnDrop(DragData& data, const std::vector<Text>& files, std::int32_t& effect,
-                           const DragPoint& at) {
-  // What the host does in the event may end the drag.
-  const bool fromList = dragFromList_;
-  events_.OLEDragDrop(data, effect, at);
-  if (fromList) {
-    Raise(event::kListDrop);
-    return;
-  }
-  if (files.empty()) return;
-  for (const Text& path : files) Raise(event::kFileDrop, path);
-  Raise(event::kFileDrop);
-}
-
-void ctrlListImage::OnCompleteDrag(std::int32_t effect) {
-  if (std::exchange(dragFromList_, false)) events_.OLECompleteDrag(effect);
+void ctrlListImage::DroppedNoFiles(bool own) {
+  if (own) Raise(event::kOwnDrop);
 }
 
 }  // namespace tarnwick

@@ -8,7 +8,7 @@
 
 #include <vector>
 
-#include "controls/listimage/ControlEvents.h"
+#include "controls/ControlEvents.h"
 #include "support/Text.h"
 #include "support/surface/Automation.h"
 #include "support/surface/ComObject.h"

@@ -15,15 +15,25 @@ inline constexpr std::int16_t kNotSelected = 1002;    // a delete passed over th
 inline constexpr std::int16_t kNotAllowed = 1005;     // by the account
 inline constexpr std::int16_t kUploadRefused = 1014;  // the quota is used up
 inline constexpr std::int16_t kCurrentItem = 1015;    // description: its address, empty when there is none
-inline constexpr std::int16_t kListDrop = 1021;       // a drop that comes from the list itself
+inline constexpr std::int16_t kContextMenu = 1016;    // the right button; description as for kCurrentItem
+inline constexpr std::int16_t kDragOver = 1020;       // files are dragged over the thumbnails
+inline constexpr std::int16_t kOwnDrop = 1021;        // a drop that comes from the control itself
 inline constexpr std::int16_t kClickBegins = 1022;
 inline constexpr std::int16_t kFileDrop = 1023;  // description: a file's path; empty after the last one
 inline constexpr std::int16_t kClickEnds = 1024;
 inline constexpr std::int16_t kRenamed = 1031;  // description: the new name
+inline constexpr std::int16_t kNameTaken = 1032;
 inline constexpr std::int16_t kRenameFailed = 1033;
 inline constexpr std::int16_t kNameRefused = 1034;
+inline constexpr std::int16_t kNameUnfit = 1035;   // empty, or it begins as no name may begin
+inline constexpr std::int16_t kQuickStart = 1111;  // the link of an empty account
+inline constexpr std::int16_t kBusy = 1234;        // description: "1" when it begins, "-1" at the end
+inline constexpr std::int16_t kDeleteKey = 2222;   // the host may delete the selected picture
+inline constexpr std::int16_t kSwitchView = 5554;
 inline constexpr std::int16_t kDownloadFailed = 5555;
-inline constexpr std::int16_t kProgress = 9999;  // description: percent of an upload, bytes of a download
+inline constexpr std::int16_t kRefreshKey = 7777;  // the host may list the account again
+inline constexpr std::int16_t kRenameKey = 8888;   // a rename begins
+inline constexpr std::int16_t kProgress = 9999;    // description: percent of an upload, bytes of a download
 }  // namespace event
 
 // FTP_CONNECTION_STATES that a transfer passes through.

@@ -1,4 +1,4 @@
-#include "controls/listimage/FileNames.h"
+#include "controls/FileNames.h"
 
 #include <algorithm>
 #include <charconv>

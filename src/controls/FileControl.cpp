@@ -1,0 +1,455 @@
+#include "controls/FileControl.h"
+
+#include <utility>
+
+#include "controls/FileNames.h"
+#include "platform/FileSystem.h"
+#include "support/PathHelpers.h"
+#include "support/RuntimeError.h"
+#include "transfer/AcceptorPages.h"
+#include "transfer/FileNameGuard.h"
+
+namespace tarnwick {
+namespace {
+
+// An error of the upload component after which the file is on the server all the same, like
+// acceptor::kNothingChanged.
+constexpr std::int32_t kInvalidProperty = 380;
+
+constexpr TextView kRefusedCharacters = u"\\/:*?\"<>|#%";
+
+}  // namespace
+
+FileControl::RunningTransfer::RunningTransfer(FileControl& control) : control_(control) {
+  control_.transferRuns_ = control_.m_bTransferInProgress = true;
+  control_.Fail(ftp_error::kSuccess, u"");
+}
+
+FileControl::RunningTransfer::~RunningTransfer() {
+  control_.transferRuns_ = control_.m_bTransferInProgress = false;
+}
+
+FileControl::Hourglass::Hourglass(FileControl& control) : control_(control) {
+  if (++control_.hourglasses_ == 1) control_.controlView_.SetHourglass(true);
+}
+
+FileControl::Hourglass::~Hourglass() {
+  if (--control_.hourglasses_ == 0) control_.controlView_.SetHourglass(false);
+}
+
+FileControl::FileControl(const ControlParts& parts, ControlView& view, TransferEvents transferEvents)
+    : mobjFileupload(std::make_shared<CFileUpload>(parts.apartment)),
+      apartment_(parts.apartment),
+      events_(parts.events),
+      controlView_(view),
+      uploader_(parts.uploader),
+      downloader_(parts.downloader),
+      tellsTransfers_(transferEvents == TransferEvents::kTold) {
+  downloader_.SetEvents(this);
+}
+
+FileControl::~FileControl() {
+  Close();
+}
+
+void FileControl::Close() {
+  closed_ = true;
+  // A wait must end even when the control is opened again before it looks.
+  if (transferRuns_) gbConnectionFailed = true;
+  downloader_.SetEvents(nullptr);
+  downloader_.Cancel();
+}
+
+void FileControl::Open() {
+  closed_ = false;
+  downloader_.SetEvents(this);
+}
+
+void FileControl::Fail(std::int32_t ftpError, TextView description) {
+  m_LastError = ftpError;
+  m_strLastErrorDesc = description;
+}
+
+bool FileControl::RefusesTransfer() {
+  if (transferRuns_) Fail(ftp_error::kTransferInProgress, u"A transfer is in progress.");
+  return transferRuns_ || closed_;
+}
+
+// --- Selection ---
+
+Text FileControl::SelectedFileName() const {
+  const auto record = SelectedRecord();
+  return record ? record->FileName : Text();
+}
+
+Text FileControl::SelectedKey() const {
+  const auto record = SelectedRecord();
+  return record ? record->FilePath : Text();
+}
+
+std::optional<Text> FileControl::GetSelectedFilesHttpPath() const {
+  const auto record = SelectedRecord();
+  return record ? std::optional(record->FilePath) : std::nullopt;
+}
+
+void FileControl::GetFileDetails(TextView FileName,
+                                 const std::function<void(const std::shared_ptr<CUpload>&)>& colFiles) {
+  ResultAsItStood(0, [&](int&) {
+    for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i) {
+      const CUpload& record = *apartment_.allFiles.At(i);
+      if (record.FilePath != FileName && FileNameFromUrl(record.FilePath) != FileName) continue;
+      auto details = std::make_shared<CUpload>(record);
+      details->FilePath.clear();
+      colFiles(details);
+      return;
+    }
+  });
+}
+
+// --- Upload ---
+
+bool FileControl::UploadImage(TextView szLocalPath) {
+  return ResultAsItStood(false, [&](bool& uploaded) {
+    if (RefusesTransfer()) return;
+    const Text path(szLocalPath);
+    const Hourglass pointer(*this);
+    const std::shared_ptr<CFileUpload> client = mobjFileupload;
+    if (!client) return;
+    const std::int32_t answer = client->CanUploadFile();
+    if (answer == status::kNegative) return Raise(event::kUploadRefused);
+    if (answer == status::kFailure) return Raise(event::kNotAllowed);
+    Text url;
+    {
+      const RunningTransfer running(*this);
+      // What is on the server is registered, whatever the host made of the control meanwhile.
+      if (SendFile(path)) url = client->SaveUploadFile(path);
+      downloader_.StopWatchdog();
+    }
+    if (url.empty()) return;
+    ShowUploaded(RecordUploaded(path, url));
+    uploaded = true;
+    RaiseCurrentItem();
+  });
+}
+
+bool FileControl::SendFile(const Text& path) {
+  const SessionValues& session = apartment_.session;
+  uploadFinished_ = false;
+  m_lUploadedBytes = 0;
+  downloader_.RestartWatchdog();
+  try {
+    uploader_.UploadFile(path, UsersBaseUrl(session.serverName), AcceptorPath(u"UploadAcceptor.asp"), 0,
+                         Text(session.userName), Text(session.password), kProductGuid, *this);
+  } catch (const RuntimeError& failure) {
+    const std::int32_t number = failure.Number();
+    if (number != acceptor::kNothingChanged && number != kInvalidProperty) {
+      Fail(number == acceptor::kUnspecified ? ftp_error::kConnectionLost : ftp_error::kNotTaken,
+           u"The file was not uploaded (" + TextFromNumber(number) + u").");
+      return false;
+    }
+  }
+  Yield();
+  return uploadFinished_;
+}
+
+void FileControl::Connecting() {
+  Yield();
+  TellState(ConnectionState::kResolvingHost);
+}
+
+void FileControl::UploadStarted() {
+  Yield();
+  TellState(ConnectionState::kConnected);
+  TellState(ConnectionState::kTransferStarting);
+  RaiseUploadProgress(0);
+  uploadFinished_ = false;
+  downloader_.RestartWatchdog();
+}
+
+void FileControl::UploadProgress(std::int32_t percent, std::int32_t bytes) {
+  Yield();
+  m_lUploadedBytes = bytes;
+  RaiseUploadProgress(percent);
+  uploadFinished_ = false;
+  Yield();
+  downloader_.RestartWatchdog();
+}
+
+void FileControl::UploadComplete() {
+  Yield();
+  RaiseUploadProgress(100);
+  uploadFinished_ = true;
+  downloader_.StopWatchdog();
+  TellState(ConnectionState::kTransferCompleted);
+}
+
+void FileControl::RaiseUploadProgress(std::int32_t percent) {
+  Raise(event::kProgress, TextFromNumber(percent));
+  if (tellsTransfers_) events_.UploadProgress(m_lUploadedBytes);
+}
+
+void FileControl::TellState(ConnectionState state) {
+  if (tellsTransfers_) events_.StateChanged(state);
+}
+
+std::shared_ptr<CUpload> FileControl::RecordUploaded(const Text& path, const Text& url) {
+  FileSystem& files = apartment_.platform.files;
+  FileList& all = apartment_.allFiles;
+  auto record = std::make_shared<CUpload>();
+  record->FileName = FileNameFromPath(path);
+  record->FilePath = url;
+  record->FileSize = GetLocalFileSize(files, path);
+  record->FileDate = GetLocalFileDate(files, path);
+  if (const Text copy = LocalCopyOf(url); !copy.empty() && copy != path) {
+    // The copy of the picture that was there before must not be shown for the new one.
+    RemoveLocalCopy(copy);
+    CopyLocalFile(files, path, copy);
+  }
+  // An upload that replaced a file takes over its record.
+  std::size_t position = PositionOf(record->FileName);
+  if (position == 0) position = all.PositionOf(url);
+  if (position == 0) {
+    all.Add(record, url);
+    return record;
+  }
+  const std::shared_ptr<CUpload> known = all.At(position);
+  *known = *record;
+  SetAddress(all, position, url);
+  return known;
+}
+
+// --- Delete ---
+
+bool FileControl::DeleteOnServer(CFileUpload& client, const CUpload& file) {
+  const SessionValues& session = apartment_.session;
+  const Text name = file.FileName;
+  const Text copy = LocalCopyOf(file.FilePath);
+  // What the page says does not matter; the service decides.
+  ResultAsItStood(0, [&](int&) {
+    uploader_.DeleteFile(UsersBaseUrl(session.serverName), name, AcceptorPath(u"DeleteAcceptor.asp"),
+                         session.userName, session.password, kProductGuid);
+  });
+  if (client.DeleteFileForUser(name) != status::kSuccess) return false;
+  RemoveLocalCopy(copy);
+  return true;
+}
+
+// --- Rename ---
+
+bool FileControl::RenameFile(TextView strOldFileName, TextView strNewFileName) {
+  return ResultAsItStood(false, [&](bool& renamed) {
+    const Text oldName(strOldFileName);
+    const Text newName(Trim(strNewFileName));
+    const Hourglass pointer(*this);
+    const bool nested = std::exchange(renameInProgress_, true);
+    renamed = Rename(oldName, newName);
+    if (renamed) {
+      Raise(event::kRenamed, newName);
+    } else {
+      Raise(event::kRenameFailed);
+    }
+    renameInProgress_ = nested;
+  });
+}
+
+bool FileControl::Rename(const Text& oldName, const Text& newName) {
+  if (!RenameOnServer(oldName, newName)) return false;
+  apartment_.listingIsCurrent = false;
+  ResultAsItStood(0, [&](int&) { ShowRenamed(RecordRenamed(oldName, newName), oldName, newName); });
+  return true;
+}
+
+bool FileControl::RenameOnServer(const Text& oldName, const Text& newName) {
+  return ResultAsItStood(false, [&](bool& renamed) {
+    // Bytes that are renamed without the service's knowledge would be lost to the user.
+    const std::shared_ptr<CFileUpload> client = mobjFileupload;
+    if (!client) return;
+    const SessionValues& session = apartment_.session;
+    uploader_.RenameFile(UsersBaseUrl(session.serverName), oldName, newName,
+                         AcceptorPath(u"RenameAcceptor.asp"), session.userName, session.password,
+                         kProductGuid);
+    renamed = client->RenameFile(TextFromNumber(session.productNumber), session.userName, oldName, newName) ==
+              status::kSuccess;
+  });
+}
+
+std::shared_ptr<CUpload> FileControl::RecordRenamed(const Text& oldName, const Text& newName) {
+  FileList& all = apartment_.allFiles;
+  for (std::size_t i = 1; i <= all.Count(); ++i) {
+    const std::shared_ptr<CUpload> record = all.At(i);
+    if (record->FileName != oldName) continue;
+    const Text oldCopy = LocalCopyOf(record->FilePath);
+    GiveName(*record, newName);
+    SetAddress(all, i, record->FilePath);
+    MoveLocalCopy(oldCopy, LocalCopyOf(record->FilePath));
+    return record;
+  }
+  return nullptr;
+}
+
+void FileControl::GiveName(CUpload& record, const Text& newName) {
+  const std::size_t folder = record.FilePath.size() - FileNameFromUrl(record.FilePath).size();
+  record.FilePath = record.FilePath.substr(0, folder) + newName;
+  record.FileName = newName;
+}
+
+void FileControl::SetAddress(FileList& list, std::size_t position, const Text& url) {
+  std::shared_ptr<CUpload> record = list.Take(position);
+  record->FilePath = url;
+  const bool taken = list.PositionOf(url) != 0;
+  list.Insert(position, std::move(record), taken ? TextView() : TextView(url));
+}
+
+bool FileControl::IsFileNameValid(TextView szFileName) {
+  return ResultAsItStood(false, [&](bool& valid) {
+    valid = szFileName.find_first_of(kRefusedCharacters) == TextView::npos;
+    if (!valid) Raise(event::kNameRefused);
+  });
+}
+
+bool FileControl::CheckFileExtension(Text& szNewString, TextView szOriExt) {
+  return ResultAsItStood(false, [&](bool& agrees) {
+    if (ExtensionOf(szNewString) != szOriExt) szNewString = WithExtension(szNewString, szOriExt);
+    agrees = true;
+  });
+}
+
+bool FileControl::CheckIfFileDoesNotExist(TextView szFileName) const {
+  return !ShowsFile(szFileName) && PositionOf(szFileName) == 0;
+}
+
+std::size_t FileControl::PositionOf(TextView name) const {
+  for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i)
+    if (EqualsIgnoringCase(Trim(apartment_.allFiles.At(i)->FileName), Trim(name))) return i;
+  return 0;
+}
+
+bool FileControl::EnableRename(bool bEnableRename) {
+  bRenameEnabled = bEnableRename;
+  return bEnableRename;
+}
+
+// --- Local copies ---
+
+Text FileControl::LocalCopyOf(TextView url) const {
+  // The name comes from the server; it must not lead out of the folder.
+  const TextView name = FileNameFromUrl(url);
+  if (apartment_.UserFolderPath.empty() || !IsSafeFileName(name)) return {};
+  return apartment_.UserFolderPath + u"\\" + Text(name);
+}
+
+void FileControl::MoveLocalCopy(const Text& from, const Text& to) {
+  FileSystem& files = apartment_.platform.files;
+  if (from.empty() || !FileExists(files, from)) return;
+  if (!to.empty() && to != from) CopyLocalFile(files, from, to);
+  if (to != from) RemoveLocalCopy(from);
+}
+
+void FileControl::RemoveLocalCopy(const Text& copy) {
+  if (!copy.empty()) ResultAsItStood(0, [&](int&) { apartment_.platform.files.Remove(copy); });
+}
+
+// --- Download ---
+
+Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
+  return ResultAsItStood(Text(), [&](Text& local) {
+    if (RefusesTransfer() || !mobjFileupload || !CFileUpload::CanDownLoadFile()) return;
+    const std::shared_ptr<CUpload> selected = SelectedRecord();
+    if (!selected) return;
+    const Text name = selected->FileName;
+    Text target(szLocalFilePath);
+    if (target.ends_with(u'\\')) target.pop_back();
+    // For a file whose name is a number the path is the file itself, not its folder; hosts rely on it.
+    const bool inFolder = !IsNumeric(name);
+    if (inFolder) target += u"\\" + name;
+    local = target;
+
+    Text url;
+    const FileList& all = apartment_.allFiles;
+    for (std::size_t i = 1; i <= all.Count() && url.empty(); ++i)
+      if (all.At(i)->FilePath.find(selected->FilePath) != Text::npos) url = all.At(i)->FilePath;
+    if (url.empty()) return;
+    // The name comes from the server; it must not lead out of the folder.
+    if (inFolder && !IsSafeFileName(name)) {
+      Fail(ftp_error::kAborted, u"The file's name is not safe.");
+      return Raise(event::kDownloadFailed);
+    }
+    FileSystem& files = apartment_.platform.files;
+    if (FileExists(files, target)) files.Remove(target);
+    if (Download(url, target, target, [] { return false; })) Yield();
+  });
+}
+
+bool FileControl::Download(const Text& url, const Text& explicitTarget, const Text& expected,
+                           const std::function<bool()>& stop) {
+  const RunningTransfer running(*this);
+  m_lDownloadedBytes = 0;
+  downloadFinished_ = false;
+  downloader_.Start(url, explicitTarget);
+  while (!gbConnectionFailed && !downloadFinished_ && !closed_ && !stop()) downloader_.Wait();
+  gbConnectionFailed = false;
+  // The host may have set the flag; then the transfer would go on behind the back of the next one.
+  if (!downloadFinished_) downloader_.Cancel();
+  // Or it would run out later, on whatever comes next.
+  downloader_.StopWatchdog();
+  if (!downloadFinished_) return false;
+  // The writer tells of no failure; whether it wrote is seen here, and nothing else will come.
+  if (FileExists(apartment_.platform.files, expected)) return true;
+  Fail(ftp_error::kAborted, u"The file could not be written.");
+  return false;
+}
+
+void FileControl::ReplyLine(TextView line) {
+  if (tellsTransfers_) events_.ReplyMessage(line);
+}
+
+void FileControl::Received(std::int32_t bytes) {
+  m_lDownloadedBytes = bytes;
+  Raise(event::kProgress, TextFromNumber(bytes));
+  if (tellsTransfers_) events_.DownloadProgress(bytes);
+}
+
+void FileControl::Finished() {
+  downloadFinished_ = true;
+  TellState(ConnectionState::kTransferCompleted);
+}
+
+void FileControl::Failed(std::int32_t ftpError, TextView description, bool told) {
+  gbConnectionFailed = true;
+  Fail(ftpError, description);
+  if (told) Raise(event::kDownloadFailed);
+}
+
+// --- Drag and drop ---
+
+FileControl::DragContent FileControl::ContentOfDrag() const {
+  return ResultAsItStood(DragContent(), [&](DragContent& content) {
+    content.address = SelectedKey();
+    Text copy = LocalCopyOf(content.address);
+    if (!copy.empty() && FileExists(apartment_.platform.files, copy)) content.localFile = std::move(copy);
+  });
+}
+
+void FileControl::OnStartDrag(DragData& data, std::int32_t& allowedEffects) {
+  dragIsOurs_ = true;
+  events_.OLEStartDrag(data, allowedEffects);
+}
+
+void FileControl::OnDrop(DragData& data, const std::vector<Text>& files, std::int32_t& effect,
+                         const DragPoint& at) {
+  // What the host does in the event may end the drag.
+  const bool own = dragIsOurs_;
+  events_.OLEDragDrop(data, effect, at);
+  if (own || files.empty()) return DroppedNoFiles(own);
+  for (const Text& path : files) {
+    if (StopsDrop()) break;
+    Raise(event::kFileDrop, path);
+  }
+  Raise(event::kFileDrop);
+}
+
+void FileControl::OnCompleteDrag(std::int32_t effect) {
+  if (std::exchange(dragIsOurs_, false)) events_.OLECompleteDrag(effect);
+}
+
+}  // namespace tarnwick

@@ -1,0 +1,286 @@
+// What both controls are: a view of the account's files that uploads, renames and downloads them, tells its
+// host by events and takes part in drag and drop. Each control adds what it shows and how it is used.
+//
+// No public operation throws; a failure is told by the result and by the events. Events and passes of the
+// message pump run code of the host, which may call the control again. The surface keeps the object alive as
+// long as one of its members runs.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <memory>
+#include <optional>
+#include <vector>
+
+#include "controls/ControlEvents.h"
+#include "controls/ControlView.h"
+#include "service/CFileUpload.h"
+#include "support/Apartment.h"
+#include "support/Text.h"
+#include "transfer/Transfers.h"
+
+namespace tarnwick {
+
+// FtpErrors that the controls set.
+namespace ftp_error {
+inline constexpr std::int32_t kSuccess = 32;
+inline constexpr std::int32_t kConnectionLost = 43;
+inline constexpr std::int32_t kNotTaken = 44;
+inline constexpr std::int32_t kAborted = 45;
+inline constexpr std::int32_t kTimeout = 58;
+inline constexpr std::int32_t kTransferInProgress = 59;
+}  // namespace ftp_error
+
+// Numbers with which Init fails to the host.
+namespace init_error {
+inline constexpr std::int32_t kNoClient = 91;         // mobjFileupload is not set
+inline constexpr std::int32_t kListingFailed = 1004;  // the service did not list the files
+}  // namespace init_error
+
+// What a control works with beside its view; all of it outlives the control.
+struct ControlParts {
+  Apartment& apartment;
+  ControlEvents& events;
+  Uploader& uploader;
+  Downloader& downloader;
+};
+
+class FileControl : private UploadEvents, private DownloadEvents {
+ public:
+  ~FileControl() override;
+  FileControl(const FileControl&) = delete;
+  FileControl& operator=(const FileControl&) = delete;
+
+  // --- Fields that the host reads and writes ---
+
+  // The service client; may be null.
+  std::shared_ptr<CFileUpload> mobjFileupload;
+  // An FtpErrors value and its text, of the transfer that ran last or was refused.
+  std::int32_t m_LastError = 0;
+  Text m_strLastErrorDesc;
+  // A transfer runs. What a host writes here does not stop it.
+  bool m_bTransferInProgress = false;
+  // Bytes of the transfer that runs or ran last.
+  std::int32_t m_lDownloadedBytes = 0;
+  std::int32_t m_lUploadedBytes = 0;
+  // Ends the wait of a download; the end of the wait clears it.
+  bool gbConnectionFailed = false;
+  bool bRenameEnabled = false;
+  // The control stores these for the host and does nothing with them.
+  Text m_strWinsockBuffer;
+  Text m_strDataBuffer;
+  Text m_strLocalFilePath;
+  std::int16_t m_intLocalFileID = 0;
+  bool m_bUploadFile = false;
+  Text m_strLastServerResponse;
+  bool m_bFileIsOpened = false;
+  bool gbUploadImage = false;
+  Text gszDownloadPath;
+  bool gbDownload = false;
+  bool bConnectedToFtp = false;
+  std::int16_t OLEDropMode = 0;
+  std::int32_t OLEDragMode = 0;
+
+  // --- Selection ---
+
+  // Name of the (first) selected file, empty when there is none.
+  Text SelectedFileName() const;
+  // Its address; nullopt when there is none.
+  std::optional<Text> GetSelectedFilesHttpPath() const;
+  // Hands name, size and date of the first cached record whose address is `FileName`, or ends in that name,
+  // to `colFiles` in a new record.
+  void GetFileDetails(TextView FileName,
+                      const std::function<void(const std::shared_ptr<CUpload>&)>& colFiles);
+  // Gives the control the focus and selects the file of that name (letter case counts), and no other one.
+  virtual void UploadedFileSetFocus(TextView szFileName) = 0;
+
+  // --- Operations ---
+
+  // Fills the control from the service. May throw an init_error.
+  virtual bool Init(TextView szFileFilter) = 0;
+  virtual void ChangeFileFilter(TextView szFileFilter) = 0;
+
+  // Sends the file to the account, registers it and shows it. Pumps messages meanwhile.
+  bool UploadImage(TextView szLocalPath);
+
+  virtual void DeleteFile() = 0;
+
+  bool RenameFile(TextView strOldFileName, TextView strNewFileName);
+
+  // Fetches the selected file. `szLocalFilePath` is the folder to put it in, or, when the file's name is a
+  // number, the file to write. Returns the path of the file, whether or not it could be fetched; empty when
+  // nothing could be attempted. Pumps messages until the end of the transfer.
+  Text DownLoadFileFromServer(TextView szLocalFilePath);
+
+  // Whether the name holds none of \ / : * ? " < > | # %.
+  bool IsFileNameValid(TextView szFileName);
+
+  // Gives the new name the extension `szOriExt` (with its dot; letter case counts) in place of its own. True.
+  bool CheckFileExtension(Text& szNewString, TextView szOriExt);
+
+  // Whether neither a file that is shown nor a cached record has the name, in any letter case.
+  bool CheckIfFileDoesNotExist(TextView szFileName) const;
+
+  // Allows or forbids renaming in place and returns the argument.
+  bool EnableRename(bool bEnableRename);
+  void OLEDrag() { controlView_.StartDrag(); }
+
+  // Ends a running wait at its next pass, as if the connection had failed, and lets nothing start until
+  // Open. For a control that its container closes while an operation runs.
+  void Close();
+  // The control is in a container (again).
+  void Open();
+
+  // --- Drag and drop ---
+
+  // What a drag of the control offers: the address of the selected file, and its local copy when there is
+  // one.
+  struct DragContent {
+    Text address;
+    Text localFile;
+  };
+  DragContent ContentOfDrag() const;
+  // The host may change the data and the effects.
+  void OnStartDrag(DragData& data, std::int32_t& allowedEffects);
+  void OnSetData(DragData& data, std::int16_t format) { events_.OLESetData(data, format); }
+  void OnGiveFeedback(std::int32_t& effect, bool& defaultCursors) {
+    events_.OLEGiveFeedback(effect, defaultCursors);
+  }
+  void OnDragOver(DragData& data, std::int32_t& effect, const DragPoint& at, std::int16_t state) {
+    events_.OLEDragOver(data, effect, at, state);
+  }
+  // Files are dragged over the control's edge.
+  virtual void OnFilesEnter() {}
+  // `files` are the paths of the dropped files, empty when the data holds none; they last as long as the
+  // call.
+  void OnDrop(DragData& data, const std::vector<Text>& files, std::int32_t& effect, const DragPoint& at);
+  void OnCompleteDrag(std::int32_t effect);
+
+ protected:
+  // Whether a control tells its host by StateChanged, the two progress events and ReplyMessage.
+  enum class TransferEvents { kTold, kSilent };
+
+  // Has a service client of its own from the start.
+  FileControl(const ControlParts& parts, ControlView& view, TransferEvents transferEvents);
+
+  // Marks a transfer as running, and shows the hourglass, as long as they live.
+  class RunningTransfer;
+  class Hourglass;
+
+  // --- What each control does in its own way ---
+
+  // Record of the (first) selected file; null when there is none.
+  virtual std::shared_ptr<CUpload> SelectedRecord() const = 0;
+  virtual bool ShowsFile(TextView name) const = 0;
+  // The record is new in the list of all files, or, when an upload replaced a file, has new values.
+  virtual void ShowUploaded(const std::shared_ptr<CUpload>& record) = 0;
+  // The file has another name now, also in the list of all files, where `record` is it (null when it is not
+  // there).
+  virtual void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldName,
+                           const Text& newName) = 0;
+  // A drop without files, or of the control's own drag (`own`).
+  virtual void DroppedNoFiles(bool own) = 0;
+  // Whether the walk through dropped files ends here.
+  virtual bool StopsDrop() { return false; }
+
+  // --- For the controls ---
+
+  // `description` is none of the texts that the host can change in the event.
+  void Raise(std::int16_t code, TextView description = {}) { events_.FileManagerEvent(code, description); }
+  // Address of the (first) selected file, empty when there is none.
+  Text SelectedKey() const;
+  void RaiseCurrentItem() { Raise(event::kCurrentItem, SelectedKey()); }
+  void Yield() { apartment_.platform.pump.Yield(); }
+  bool IsClosed() const { return closed_; }
+
+  // Whether a transfer must not start now; tells the host why.
+  bool RefusesTransfer();
+  void Fail(std::int32_t ftpError, TextView description);
+  // Fetches `url` into the user's folder, and to `explicitTarget` first unless that is empty. Waits, pumping,
+  // for its end or until `stop` says so; whether `expected` is there then.
+  bool Download(const Text& url, const Text& explicitTarget, const Text& expected,
+                const std::function<bool()>& stop);
+  // Deletes a file by its page and the service, and its local copy. Whether the service took it out.
+  bool DeleteOnServer(CFileUpload& client, const CUpload& file);
+  // Renames a file on the server and wherever it is known here, without an event.
+  bool Rename(const Text& oldName, const Text& newName);
+  bool RenameRuns() const { return renameInProgress_; }
+  // Where the file's copy in the user's folder is or would be; empty when there cannot be one.
+  Text LocalCopyOf(TextView url) const;
+
+  // Position of the record of that name in the list of all files, in any letter case; 0 when there is none.
+  std::size_t PositionOf(TextView name) const;
+  // Gives a record another name, and its address that name at the end.
+  static void GiveName(CUpload& record, const Text& newName);
+  // Gives the record at `position` of a list another address, which is its key as well. Another record that
+  // has the key already keeps it.
+  static void SetAddress(FileList& list, std::size_t position, const Text& url);
+
+  Apartment& apartment_;
+  ControlEvents& events_;
+
+ private:
+  // What the transfer components tell while they work.
+  void ActionComplete() override { Yield(); }
+  void Connecting() override;
+  void Initializing() override { Yield(); }
+  void ServerProcess() override { Yield(); }
+  void UploadStarted() override;
+  void UploadProgress(std::int32_t percent, std::int32_t bytes) override;
+  void UploadComplete() override;
+  void RaiseUploadProgress(std::int32_t percent);
+  void Resolving() override { TellState(ConnectionState::kResolvingHost); }
+  void Connected() override { TellState(ConnectionState::kConnected); }
+  void TransferStarting() override { TellState(ConnectionState::kTransferStarting); }
+  void ReplyLine(TextView line) override;
+  void Received(std::int32_t bytes) override;
+  void Finished() override;
+  void Failed(std::int32_t ftpError, TextView description, bool told) override;
+  void TellState(ConnectionState state);
+
+  bool SendFile(const Text& path);
+  std::shared_ptr<CUpload> RecordUploaded(const Text& path, const Text& url);
+  bool RenameOnServer(const Text& oldName, const Text& newName);
+  std::shared_ptr<CUpload> RecordRenamed(const Text& oldName, const Text& newName);
+  void MoveLocalCopy(const Text& from, const Text& to);
+  void RemoveLocalCopy(const Text& copy);
+
+  ControlView& controlView_;
+  Uploader& uploader_;
+  Downloader& downloader_;
+  const bool tellsTransfers_;
+
+  bool transferRuns_ = false;
+  bool uploadFinished_ = false;
+  bool downloadFinished_ = false;
+  bool renameInProgress_ = false;
+  bool dragIsOurs_ = false;
+  bool closed_ = false;
+  int hourglasses_ = 0;
+};
+
+class FileControl::RunningTransfer {
+ public:
+  explicit RunningTransfer(FileControl& control);
+  ~RunningTransfer();
+  RunningTransfer(const RunningTransfer&) = delete;
+  RunningTransfer& operator=(const RunningTransfer&) = delete;
+
+ private:
+  FileControl& control_;
+};
+
+class FileControl::Hourglass {
+ public:
+  explicit Hourglass(FileControl& control);
+  // Operations nest when the host starts one in an event; the last one restores the pointer.
+  ~Hourglass();
+  Hourglass(const Hourglass&) = delete;
+  Hourglass& operator=(const Hourglass&) = delete;
+
+ private:
+  FileControl& control_;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,55 @@
+// The seam to the window of the thumbnail control: four slots, a scroll bar, the texts of an empty account,
+// the editor over a caption and the button that switches to the list.
+#pragma once
+
+#include <cstdint>
+
+#include "controls/ControlView.h"
+#include "support/Text.h"
+
+namespace tarnwick {
+
+inline constexpr int kSlotCount = 4;
+
+// Where a picture stands in its slot's frame, in twips (1440 to an inch).
+struct PicturePlace {
+  double left = 0;
+  double top = 0;
+  std::int32_t width = 0;
+  std::int32_t height = 0;
+};
+
+// Slots count from 1: top left, top right, bottom left, bottom right. What the rules change through this
+// interface is not reported back to them: the handlers of ctrlThumbNailView are for what the user does.
+class ThumbnailPage : public ControlView {
+ public:
+  // The grid with its scroll bar, or in its place message and link. Showing the grid shows all four slots.
+  virtual void ShowGrid(bool grid) = 0;
+  // The texts of an empty account.
+  virtual void SetEmptyTexts(TextView message, TextView link) = 0;
+
+  // Frame and caption of a slot.
+  virtual void ShowSlot(int slot, bool shown) = 0;
+  // Takes the picture out and empties the caption.
+  virtual void ClearSlot(int slot) = 0;
+  // "&&" stands for one "&", as in the caption of any label.
+  virtual void SetCaption(int slot, TextView caption) = 0;
+  // Reads the file and shows it at `place`; an unreadable or absurdly large picture leaves the square empty.
+  virtual void SetPicture(int slot, TextView path, const PicturePlace& place) = 0;
+  // The look of the selected picture.
+  virtual void SetSelected(int slot, bool selected) = 0;
+
+  // A move of the scroll bar by an arrow or beside the thumb is two pictures. `max` may be negative while
+  // disabled.
+  virtual void SetScrollRange(int max) = 0;
+  virtual void EnableScroll(bool enabled) = 0;
+  virtual void SetScrollValue(int value) = 0;
+  virtual int ScrollValue() const = 0;
+
+  // The editor over the slot's caption, with all of `name` selected.
+  virtual void ShowEditor(int slot, TextView name) = 0;
+  virtual void HideEditor() = 0;
+  virtual Text EditorText() const = 0;
+};
+
+}  // namespace tarnwick
