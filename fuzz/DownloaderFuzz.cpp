@@ -1,7 +1,5 @@
 // Whatever a server sends, in whatever pieces, and however the connection ends: the downloader writes what
-// came after the first empty line, or nothing. Not part of the build; made with
-//   clang++ -std=c++20 -g -O1 -fsanitize=fuzzer,address,undefined -Isrc fuzz/DownloaderFuzz.cpp
-//     src/transfer/*.cpp src/support/*.cpp src/service/*.cpp
+// came after the first empty line, or nothing.
 #include <cstdint>
 #include <cstdlib>
 #include <string>

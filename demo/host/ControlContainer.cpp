@@ -109,9 +109,32 @@ void ControlContainer::Disconnect(REFIID interfaceId, DWORD cookie) const {
 HRESULT ControlContainer::Create(REFCLSID classId, WayIn wayIn, IPropertyBag* bag) {
   HRESULT result =
       CoCreateInstance(classId, nullptr, CLSCTX_INPROC_SERVER, IID_IUnknown, control_.ReceiveVoid());
+  if (SUCCEEDED(result)) result = Site(wayIn);
   if (FAILED(result)) return result;
+
+  if (bag) {
+    ComPtr<IPersistPropertyBag> persist;
+    result = control_->QueryInterface(IID_IPersistPropertyBag, persist.ReceiveVoid());
+    if (SUCCEEDED(result)) result = persist->Load(bag, nullptr);
+  } else {
+    ComPtr<IPersistStreamInit> persist;
+    result = control_->QueryInterface(IID_IPersistStreamInit, persist.ReceiveVoid());
+    if (SUCCEEDED(result)) result = persist->InitNew();
+  }
+  if (SUCCEEDED(result)) SetBounds(bounds_);
+  return result;
+}
+
+HRESULT ControlContainer::TakeUp(IUnknown& control, WayIn wayIn) {
+  control_ = ComPtr<IUnknown>(&control);
+  const HRESULT result = Site(wayIn);
+  if (SUCCEEDED(result)) SetBounds(bounds_);
+  return result;
+}
+
+HRESULT ControlContainer::Site(WayIn wayIn) {
   ComPtr<IProvideClassInfo2> classInfo;
-  result = control_->QueryInterface(IID_IOleObject, object_.ReceiveVoid());
+  HRESULT result = control_->QueryInterface(IID_IOleObject, object_.ReceiveVoid());
   if (SUCCEEDED(result)) result = control_->QueryInterface(IID_IProvideClassInfo2, classInfo.ReceiveVoid());
   if (SUCCEEDED(result)) result = classInfo->GetGUID(GUIDKIND_DEFAULT_SOURCE_DISP_IID, &events_);
   if (FAILED(result)) return result;
@@ -137,18 +160,6 @@ HRESULT ControlContainer::Create(REFCLSID classId, WayIn wayIn, IPropertyBag* ba
     if (SUCCEEDED(result))
       result = Connect(static_cast<IPropertyNotifySink*>(this), IID_IPropertyNotifySink, notifyCookie_);
   }
-  if (FAILED(result)) return result;
-
-  if (bag) {
-    ComPtr<IPersistPropertyBag> persist;
-    result = control_->QueryInterface(IID_IPersistPropertyBag, persist.ReceiveVoid());
-    if (SUCCEEDED(result)) result = persist->Load(bag, nullptr);
-  } else {
-    ComPtr<IPersistStreamInit> persist;
-    result = control_->QueryInterface(IID_IPersistStreamInit, persist.ReceiveVoid());
-    if (SUCCEEDED(result)) result = persist->InitNew();
-  }
-  if (SUCCEEDED(result)) SetBounds(bounds_);
   return result;
 }
 
@@ -347,7 +358,8 @@ STDMETHODIMP ControlContainer::TransformCoords(POINTL*, POINTF*, DWORD) {
   return E_NOTIMPL;
 }
 
-STDMETHODIMP ControlContainer::TranslateAccelerator(MSG* message, DWORD) {
+STDMETHODIMP ControlContainer::TranslateAccelerator(MSG* message, DWORD modifiers) {
+  if (onKey && onKey(*message, modifiers)) return S_OK;
   // The dialog keys of the form that the control stands on.
   const HWND form = GetAncestor(window_, GA_ROOT);
   return IsDialogMessageW(form, message) ? S_OK : S_FALSE;

@@ -58,6 +58,9 @@ class ControlContainer final : public IOleClientSite,
   Ambient ambient;
   // Events of the control, by number, with their arguments in the order of the declaration.
   std::function<void(DISPID event, std::vector<VARIANT>& arguments)> onEvent;
+  // A key that the control passed on, with 1 for Shift, 2 for Control and 4 for Alt; true when the form took
+  // it, else it is looked at as a dialog key.
+  std::function<bool(const MSG& message, DWORD modifiers)> onKey;
   // Persisted properties that the control said to have changed.
   std::vector<DISPID> changed;
   // Calls that no container must get, in words.
@@ -65,6 +68,8 @@ class ControlContainer final : public IOleClientSite,
 
   // Creates the control and connects its events. With `bag` it is loaded from it, else made new.
   HRESULT Create(REFCLSID classId, WayIn wayIn, IPropertyBag* bag);
+  // Takes up a control that was in another container, as it is, and connects its events.
+  HRESULT TakeUp(IUnknown& control, WayIn wayIn);
   // Where the control is, in pixels of the window.
   void SetBounds(const RECT& bounds);
   HRESULT Do(LONG verb);
@@ -142,6 +147,7 @@ class ControlContainer final : public IOleClientSite,
   class EventSink;
 
   ~ControlContainer() = default;
+  HRESULT Site(WayIn wayIn);
   HRESULT Connect(IUnknown* sink, REFIID interfaceId, DWORD& cookie) const;
   void Disconnect(REFIID interfaceId, DWORD cookie) const;
   void Violation(const char* what) { violations.emplace_back(what); }

@@ -20,13 +20,14 @@ constexpr TextView kRefusedCharacters = u"\\/:*?\"<>|#%";
 
 }  // namespace
 
-FileControl::RunningTransfer::RunningTransfer(FileControl& control) : control_(control) {
+FileControl::RunningTransfer::RunningTransfer(FileControl& control)
+    : control_(control), nested_(control.transferRuns_) {
   control_.transferRuns_ = control_.m_bTransferInProgress = true;
   control_.Fail(ftp_error::kSuccess, u"");
 }
 
 FileControl::RunningTransfer::~RunningTransfer() {
-  control_.transferRuns_ = control_.m_bTransferInProgress = false;
+  control_.transferRuns_ = control_.m_bTransferInProgress = nested_;
 }
 
 FileControl::Hourglass::Hourglass(FileControl& control) : control_(control) {
@@ -125,6 +126,7 @@ bool FileControl::UploadImage(TextView szLocalPath) {
       if (SendFile(path)) url = client->SaveUploadFile(path);
       downloader_.StopWatchdog();
     }
+    TransferEnded();
     if (url.empty()) return;
     ShowUploaded(RecordUploaded(path, url));
     uploaded = true;
@@ -377,6 +379,7 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
     FileSystem& files = apartment_.platform.files;
     if (FileExists(files, target)) files.Remove(target);
     if (Download(url, target, target, [] { return false; })) Yield();
+    TransferEnded();
   });
 }
 

@@ -181,6 +181,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
                            const Text& newName) = 0;
   // A drop without files, or of the control's own drag (`own`).
   virtual void DroppedNoFiles(bool own) = 0;
+  // A transfer that the host started is over.
+  virtual void TransferEnded() {}
   // Whether the walk through dropped files ends here.
   virtual bool StopsDrop() { return false; }
 
@@ -194,6 +196,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   void Yield() { apartment_.platform.pump.Yield(); }
   bool IsClosed() const { return closed_; }
 
+  bool TransferRuns() const { return transferRuns_; }
   // Whether a transfer must not start now; tells the host why.
   bool RefusesTransfer();
   void Fail(std::int32_t ftpError, TextView description);
@@ -269,6 +272,8 @@ class FileControl::RunningTransfer {
 
  private:
   FileControl& control_;
+  // One runs around this one, such as the filling of a page around its downloads.
+  const bool nested_;
 };
 
 class FileControl::Hourglass {

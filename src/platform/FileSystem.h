@@ -53,6 +53,10 @@ class FileSystem {
   // Throws 53 when there is no such file, 75 when it cannot be read.
   virtual std::unique_ptr<FileReader> Open(TextView path) = 0;
 
+  // Fills `room` with the first bytes of the file, as many as there are; how many. A file that is not there
+  // is created empty. Throws 76 when its folder is missing, 75 on other failures, a locked file among them.
+  virtual std::size_t ReadBeginning(TextView path, std::span<char> room) = 0;
+
   // Writes a file of these bytes over an existing one, whole or not at all. Throws 75.
   virtual void Write(TextView path, std::string_view bytes) = 0;
 

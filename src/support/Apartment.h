@@ -68,9 +68,10 @@ struct Apartment {
   // Working folder of the user without a trailing separator; empty until it is prepared.
   Text UserFolderPath;
 
-  // The server's listing, and the part of it that a filter shows.
+  // The server's listing, and the part of it that the thumbnails' filter shows.
   FileList allFiles;
   FileList shownFiles;
+  Text shownFilter = u"*";
   bool listingIsCurrent = false;
   bool listLoaded = false;
 

@@ -115,6 +115,8 @@ struct FakeFiles : FileSystem {
   std::vector<Text> made;
   // The error that creating this folder raises.
   std::map<Text, std::int32_t> makeErrors;
+  // The error that reading the beginning of this file raises.
+  std::map<Text, std::int32_t> readErrors;
   std::vector<std::uint32_t> attributesSet;
   Text temp = u"C:\\Temp\\";
 
@@ -146,6 +148,11 @@ struct FakeFiles : FileSystem {
   };
   std::unique_ptr<FileReader> Open(TextView path) override {
     return std::make_unique<Reader>(At(path).bytes);
+  }
+  std::size_t ReadBeginning(TextView path, std::span<char> room) override {
+    if (const auto failure = readErrors.find(Text(path)); failure != readErrors.end())
+      throw RuntimeError(failure->second);
+    return files[Text(path)].bytes.copy(room.data(), room.size());
   }
   void Write(TextView path, std::string_view bytes) override {
     files[Text(path)] = {bytes.size(), 0, std::string(bytes)};

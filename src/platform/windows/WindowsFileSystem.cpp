@@ -107,6 +107,16 @@ std::unique_ptr<FileReader> WindowsFileSystem::Open(TextView path) {
   return std::make_unique<WindowsFileReader>(std::move(file));
 }
 
+std::size_t WindowsFileSystem::ReadBeginning(TextView path, std::span<char> room) {
+  // Others may write meanwhile: a file that a program holds open without locking it can be looked at.
+  FileOwner file(CreateFileW(WidePath(path, error::kPathAccess).c_str(), GENERIC_READ,
+                             FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr, OPEN_ALWAYS,
+                             FILE_ATTRIBUTE_NORMAL, nullptr));
+  if (!file)
+    throw RuntimeError(GetLastError() == ERROR_PATH_NOT_FOUND ? error::kPathNotFound : error::kPathAccess);
+  return WindowsFileReader(std::move(file)).Read(room);
+}
+
 void WindowsFileSystem::Write(TextView path, std::string_view bytes) {
   StagedFile staged(WidePath(path, error::kPathAccess));
   if (staged.Path().empty()) throw RuntimeError(error::kPathAccess);

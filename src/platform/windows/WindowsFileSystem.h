@@ -12,6 +12,7 @@ class WindowsFileSystem : public FileSystem {
   void SetAttributes(TextView path, std::uint32_t attributes) override;
   void Copy(TextView source, TextView destination) override;
   std::unique_ptr<FileReader> Open(TextView path) override;
+  std::size_t ReadBeginning(TextView path, std::span<char> room) override;
   void Write(TextView path, std::string_view bytes) override;
   void Remove(TextView path) override;
   Text FirstName(TextView pattern, bool folders) override;

@@ -4,25 +4,14 @@
 #include <string>
 
 #include "platform/windows/AnsiText.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {
 
 constexpr wchar_t kClassName[] = L"TarnwickListImage";
 constexpr int kColumnWidth = 96;
-constexpr UINT_PTR kSubclass = 1;
 // Names for screen readers.
 constexpr wchar_t kListName[] = L"Files of the account";
-
-// A hidden window that holds the windows of controls that are in no container.
-HWND ParkingWindow(HINSTANCE module) {
-  static HWND parking = nullptr;
-  if (!IsWindow(parking))
-    parking = CreateWindowExW(WS_EX_TOOLWINDOW, L"STATIC", L"", WS_POPUP, 0, 0, 0, 0, nullptr, nullptr,
-                              module, nullptr);
-  return parking;
-}
 
 void CopyTo(const NMLVDISPINFOW& info, const Text& text) {
   if (info.item.cchTextMax <= 0) return;
@@ -34,94 +23,44 @@ void CopyTo(const NMLVDISPINFOW& info, const Text& text) {
 
 }  // namespace
 
-WindowsListView::~WindowsListView() {
-  if (!window_) return;
-  if (depth_ == 0) {
-    DestroyWindow(window_);
-    return;
-  }
-  // The host ended the control inside one of its own messages. The list is not done with that message yet, so
-  // the window goes with the next one.
-  SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
-  RemoveWindowSubclass(list_, ListProc, kSubclass);
-  Park();
-  PostMessageW(window_, WM_CLOSE, 0, 0);
-}
-
-HWND WindowsListView::Window() {
-  if (!window_ && !MakeWindow() && window_) {
-    DestroyWindow(window_);
-    window_ = nullptr;
-  }
-  return window_;
-}
+WindowsListView::WindowsListView(HINSTANCE module, ListViewUser& user)
+    : ControlWindow(module, kClassName), user_(user) {}
 
 HWND WindowsListView::List() {
   Window();
   return list_;
 }
 
-bool WindowsListView::MakeWindow() {
+bool WindowsListView::MakeChildren() {
   const INITCOMMONCONTROLSEX classes = {sizeof classes, ICC_LISTVIEW_CLASSES};
   InitCommonControlsEx(&classes);
-  WNDCLASSEXW windowClass = {};
-  windowClass.cbSize = sizeof windowClass;
-  windowClass.lpfnWndProc = WindowProc;
-  windowClass.hInstance = module_;
-  windowClass.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_WINDOW + 1);
-  windowClass.hCursor = LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(IDC_ARROW));
-  windowClass.lpszClassName = kClassName;
-  RegisterClassExW(&windowClass);  // fails when it is registered already
-
-  const HWND parking = ParkingWindow(module_);
-  window_ = CreateWindowExW(WS_EX_CONTROLPARENT, kClassName, L"", WS_CHILD | WS_CLIPCHILDREN, 0, 0, 0, 0,
-                            parking, nullptr, module_, this);
-  if (!window_) return false;
-  list_ = CreateWindowExW(0, WC_LISTVIEWW, kListName,
-                          WS_CHILD | WS_VISIBLE | WS_TABSTOP | LVS_REPORT | LVS_OWNERDATA |
-                              LVS_SHOWSELALWAYS | LVS_EDITLABELS | LVS_SHAREIMAGELISTS | LVS_SINGLESEL,
-                          0, 0, 0, 0, window_, nullptr, module_, nullptr);
-  label_ = CreateWindowExW(0, L"STATIC", L"", WS_CHILD | SS_CENTER | SS_NOPREFIX, 0, 0, 0, 0, window_,
-                           nullptr, module_, nullptr);
+  list_ = MakeChild(Outer(), WC_LISTVIEWW, kListName,
+                    WS_VISIBLE | WS_TABSTOP | LVS_REPORT | LVS_OWNERDATA | LVS_SHOWSELALWAYS |
+                        LVS_EDITLABELS | LVS_SHAREIMAGELISTS | LVS_SINGLESEL);
+  label_ = MakeChild(Outer(), L"STATIC", L"", SS_CENTER | SS_NOPREFIX);
   if (!list_ || !label_) return false;
-  SetWindowSubclass(list_, ListProc, kSubclass, reinterpret_cast<DWORD_PTR>(this));
   largeIcons_ = MakeLargeIcons(Dpi());
   smallIcons_ = MakeSmallIcons(Dpi());
   ListView_SetImageList(list_, largeIcons_.Get(), LVSIL_NORMAL);
   ListView_SetImageList(list_, smallIcons_.Get(), LVSIL_SMALL);
-  SetLook(nullptr, std::nullopt, std::nullopt);
   return true;
 }
 
-int WindowsListView::Dpi() const {
-  const HDC dc = GetDC(window_);
-  const int dpi = GetDeviceCaps(dc, LOGPIXELSX);
-  ReleaseDC(window_, dc);
-  return dpi;
+void WindowsListView::WindowGone() {
+  list_ = label_ = nullptr;
 }
 
-void WindowsListView::Park() {
-  if (!window_) return;
-  ShowWindow(window_, SW_HIDE);
-  SetParent(window_, ParkingWindow(module_));
-}
-
-void WindowsListView::SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background) {
-  font_ = font ? font : static_cast<HFONT>(GetStockObject(DEFAULT_GUI_FONT));
-  textColor_ = text.value_or(GetSysColor(COLOR_WINDOWTEXT));
-  backColor_ = background.value_or(GetSysColor(COLOR_WINDOW));
-  if (!window_) return;
-  SendMessageW(list_, WM_SETFONT, reinterpret_cast<WPARAM>(font_), TRUE);
-  SendMessageW(label_, WM_SETFONT, reinterpret_cast<WPARAM>(font_), TRUE);
-  ListView_SetTextColor(list_, textColor_);
-  ListView_SetTextBkColor(list_, backColor_);
-  ListView_SetBkColor(list_, backColor_);
-  InvalidateRect(window_, nullptr, TRUE);
+void WindowsListView::ApplyLook() {
+  SendMessageW(list_, WM_SETFONT, reinterpret_cast<WPARAM>(Font()), TRUE);
+  SendMessageW(label_, WM_SETFONT, reinterpret_cast<WPARAM>(Font()), TRUE);
+  ListView_SetTextColor(list_, TextColor());
+  ListView_SetTextBkColor(list_, BackColor());
+  ListView_SetBkColor(list_, BackColor());
 }
 
 void WindowsListView::Layout() const {
   RECT client = {};
-  GetClientRect(window_, &client);
+  GetClientRect(Outer(), &client);
   MoveWindow(list_, 0, 0, client.right, client.bottom, TRUE);
   // The label stands in the middle; it is as high as two of its lines.
   const int height = std::min<int>(client.bottom, MulDiv(32, Dpi(), 96));
@@ -130,11 +69,10 @@ void WindowsListView::Layout() const {
 
 void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
   const int dpi = GetDeviceCaps(dc, LOGPIXELSX);
-  const HGDIOBJ oldFont =
-      SelectObject(dc, font_ ? font_ : static_cast<HFONT>(GetStockObject(DEFAULT_GUI_FONT)));
-  SetDCBrushColor(dc, backColor_ == CLR_DEFAULT ? GetSysColor(COLOR_WINDOW) : backColor_);
+  const HGDIOBJ oldFont = SelectObject(dc, Font());
+  SetDCBrushColor(dc, BackColor());
   FillRect(dc, &bounds, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
-  SetTextColor(dc, textColor_ == CLR_DEFAULT ? GetSysColor(COLOR_WINDOWTEXT) : textColor_);
+  SetTextColor(dc, TextColor());
   SetBkMode(dc, TRANSPARENT);
   TEXTMETRICW metrics = {};
   GetTextMetricsW(dc, &metrics);
@@ -258,65 +196,35 @@ void WindowsListView::EndLabelEdit() {
 }
 
 void WindowsListView::Focus() {
-  if (Window()) SetFocus(listShown_ ? list_ : window_);
+  if (Window()) SetFocus(listShown_ ? list_ : Outer());
 }
 
-void WindowsListView::SetHourglass(bool hourglass) {
-  hourglass_ = hourglass;
-  POINT at = {};
-  if (window_ && GetCursorPos(&at) && ScreenToClient(window_, &at)) {
-    RECT client = {};
-    GetClientRect(window_, &client);
-    if (PtInRect(&client, at))
-      SetCursor(LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(hourglass ? IDC_WAIT : IDC_ARROW)));
-  }
-}
-
-// Runs a handler, whose exceptions end here. The object may be gone afterwards.
-LRESULT WindowsListView::Handle(HWND window, const std::function<LRESULT()>& handler) {
-  ++depth_;
-  const LRESULT result = ResultAsItStood(LRESULT{0}, [&](LRESULT& answer) { answer = handler(); });
-  if (GetWindowLongPtrW(window, GWLP_USERDATA) == reinterpret_cast<LONG_PTR>(this)) --depth_;
-  return result;
-}
-
-LRESULT CALLBACK WindowsListView::WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
-  if (message == WM_NCCREATE) {
-    const auto* create = reinterpret_cast<const CREATESTRUCTW*>(lParam);
-    SetWindowLongPtrW(window, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(create->lpCreateParams));
-  }
-  auto* self = reinterpret_cast<WindowsListView*>(GetWindowLongPtrW(window, GWLP_USERDATA));
-  if (!self || !self->list_ || !self->label_) return DefWindowProcW(window, message, wParam, lParam);
+std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  if (window == list_) return OnListMessage(message, wParam, lParam);
+  if (window == label_) return std::nullopt;
   switch (message) {
     case WM_SIZE:
-      self->Layout();
+      Layout();
       return 0;
     case WM_SETFOCUS:
-      self->user_.GotFocus();
-      if (self->listShown_) SetFocus(self->list_);
+      user_.GotFocus();
+      if (IsAlive(this, window) && listShown_) SetFocus(list_);
       return 0;
-    case WM_SETCURSOR:
-      if (!self->hourglass_) break;
-      SetCursor(LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(IDC_WAIT)));
-      return TRUE;
-    case WM_CTLCOLORSTATIC:
-      SetTextColor(reinterpret_cast<HDC>(wParam), self->textColor_);
-      SetBkColor(reinterpret_cast<HDC>(wParam), self->backColor_);
-      SetDCBrushColor(reinterpret_cast<HDC>(wParam), self->backColor_);
+    case WM_CTLCOLORSTATIC: {
+      const auto dc = reinterpret_cast<HDC>(wParam);
+      SetTextColor(dc, TextColor());
+      SetBkColor(dc, BackColor());
+      SetDCBrushColor(dc, BackColor());
       return reinterpret_cast<LRESULT>(GetStockObject(DC_BRUSH));
+    }
     case WM_NOTIFY: {
       const auto& header = *reinterpret_cast<const NMHDR*>(lParam);
-      if (header.hwndFrom != self->list_) break;
-      return self->Handle(window, [&] { return self->OnNotify(header); });
+      if (header.hwndFrom != list_) return std::nullopt;
+      return OnNotify(header);
     }
-    case WM_NCDESTROY:
-      SetWindowLongPtrW(window, GWLP_USERDATA, 0);
-      self->window_ = self->list_ = self->label_ = nullptr;
-      break;
     default:
-      break;
+      return std::nullopt;
   }
-  return DefWindowProcW(window, message, wParam, lParam);
 }
 
 LRESULT WindowsListView::OnNotify(const NMHDR& header) {
@@ -367,37 +275,26 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
   }
 }
 
-LRESULT CALLBACK WindowsListView::ListProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam,
-                                           UINT_PTR id, DWORD_PTR data) {
-  auto* self = reinterpret_cast<WindowsListView*>(data);
+std::optional<LRESULT> WindowsListView::OnListMessage(UINT message, WPARAM wParam, LPARAM lParam) {
+  // The user's handlers come last, or nothing of this object is touched after them.
   switch (message) {
-    case WM_NCDESTROY:
-      RemoveWindowSubclass(window, ListProc, id);
-      break;
-    case WM_KEYDOWN:
     case WM_LBUTTONDOWN:
     case WM_RBUTTONDOWN:
-      return self->Handle(GetParent(window), [&] { return self->OnListMessage(message, wParam, lParam); });
+      user_.ButtonPressed();
+      return std::nullopt;
+    case WM_KEYDOWN: {
+      if (wParam == VK_RETURN) {
+        user_.EnterPressed();
+        return 0;
+      }
+      const HWND outer = Outer();
+      const LRESULT result = DefSubclassProc(list_, message, wParam, lParam);
+      if (IsAlive(this, outer)) user_.KeyPressed(static_cast<int>(wParam));
+      return result;
+    }
     default:
-      break;
+      return std::nullopt;
   }
-  return DefSubclassProc(window, message, wParam, lParam);
-}
-
-LRESULT WindowsListView::OnListMessage(UINT message, WPARAM wParam, LPARAM lParam) {
-  // The handlers may run code of the host's that ends the control: nothing of it is touched after them.
-  const HWND list = list_;
-  if (message != WM_KEYDOWN) {
-    user_.ButtonPressed();
-    return DefSubclassProc(list, message, wParam, lParam);
-  }
-  if (wParam == VK_RETURN) {
-    user_.EnterPressed();
-    return 0;
-  }
-  const LRESULT result = DefSubclassProc(list, message, wParam, lParam);
-  user_.KeyPressed(static_cast<int>(wParam));
-  return result;
 }
 
 }  // namespace tarnwick

@@ -5,11 +5,11 @@
 #include "platform/windows/WindowsHeaders.h"
 
 #include <cstddef>
-#include <functional>
 #include <optional>
 #include <vector>
 
 #include "controls/listimage/ListView.h"
+#include "platform/windows/ControlWindow.h"
 #include "platform/windows/FileIcons.h"
 
 namespace tarnwick {
@@ -37,23 +37,13 @@ class ListViewUser {
   virtual void GotFocus() = 0;
 };
 
-class WindowsListView : public ListView {
+class WindowsListView : public ListView, public ControlWindow {
  public:
   // `module` is where the window's class belongs. `user` outlives the window.
-  WindowsListView(HINSTANCE module, ListViewUser& user) : module_(module), user_(user) {}
-  ~WindowsListView() override;
-  WindowsListView(const WindowsListView&) = delete;
-  WindowsListView& operator=(const WindowsListView&) = delete;
+  WindowsListView(HINSTANCE module, ListViewUser& user);
 
-  // The window that holds list and label, made hidden and without a container on the first call; null on
-  // failure.
-  HWND Window();
   // The list itself, where drops land.
   HWND List();
-  // Takes the window out of its container and hides it; what it shows stays.
-  void Park();
-  // Null for the system's own font, nullopt for the system's own colour.
-  void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background);
   // Draws the list as the window would show it, into `bounds`.
   void Draw(HDC dc, const RECT& bounds) const;
   // The small pictures, for a picture made of two.
@@ -72,36 +62,26 @@ class WindowsListView : public ListView {
   void SetMultiSelect(bool multiple) override;
   void EndLabelEdit() override;
   void Focus() override;
-  void SetHourglass(bool hourglass) override;
+  void SetHourglass(bool hourglass) override { ShowHourglass(hourglass); }
   void StartDrag() override { user_.DragBegins(); }
 
  private:
-  static LRESULT CALLBACK WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
-  static LRESULT CALLBACK ListProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR id,
-                                   DWORD_PTR data);
-  LRESULT Handle(HWND window, const std::function<LRESULT()>& handler);
+  bool MakeChildren() override;
+  void WindowGone() override;
+  void ApplyLook() override;
+  std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;
+  std::optional<LRESULT> OnListMessage(UINT message, WPARAM wParam, LPARAM lParam);
   LRESULT OnNotify(const NMHDR& header);
-  LRESULT OnListMessage(UINT message, WPARAM wParam, LPARAM lParam);
-  bool MakeWindow();
   void Layout() const;
-  int Dpi() const;
 
-  const HINSTANCE module_;
   ListViewUser& user_;
-  HWND window_ = nullptr;
   HWND list_ = nullptr;
   HWND label_ = nullptr;
-  HFONT font_ = nullptr;
-  COLORREF textColor_ = CLR_DEFAULT;
-  COLORREF backColor_ = CLR_DEFAULT;
   ImageListOwner largeIcons_;
   ImageListOwner smallIcons_;
-  // Handlers of messages that run now, one inside the other.
-  int depth_ = 0;
   std::vector<Text> titles_;
   std::size_t count_ = 0;
   bool listShown_ = true;
-  bool hourglass_ = false;
   Text labelText_;
 };
 

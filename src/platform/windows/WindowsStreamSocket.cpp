@@ -157,7 +157,12 @@ void WindowsStreamSocket::OnClose() {
     char next = 0;
     const int left = recv(socket_, &next, 1, MSG_PEEK);
     if (left < 0 && WSAGetLastError() != WSAEWOULDBLOCK) return events_->OnSocketError(WSAGetLastError());
-    if (left <= 0) return events_->OnClosedByPeer();
+    if (left <= 0) {
+      // Whoever was reset cannot send any more, not even nothing, but whose peer has closed in an orderly way
+      // can. A reset does not always arrive as an error.
+      if (send(socket_, &next, 0, 0) != 0) return events_->OnSocketError(WSAECONNRESET);
+      return events_->OnClosedByPeer();
+    }
     events_->OnReadable();
   }
 }

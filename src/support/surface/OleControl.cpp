@@ -37,6 +37,31 @@ bool IsContent(DWORD aspect) {
   return aspect == DVASPECT_CONTENT;
 }
 
+// Whether a key that was pressed in a window of the control is the control's, although containers have uses
+// for it as a dialog key or an accelerator.
+bool Wants(const MSG& key) {
+  switch (key.wParam) {
+    case VK_TAB:
+      return false;
+    case VK_UP:
+    case VK_DOWN:
+    case VK_LEFT:
+    case VK_RIGHT:
+    case VK_PRIOR:
+    case VK_NEXT:
+    case VK_HOME:
+    case VK_END:
+    case VK_RETURN:
+      return true;
+    default: {
+      // While a label is edited, Escape ends that and Delete deletes a letter.
+      const LRESULT wanted =
+          SendMessageW(key.hwnd, WM_GETDLGCODE, key.wParam, reinterpret_cast<LPARAM>(&key));
+      return (wanted & DLGC_WANTALLKEYS) != 0;
+    }
+  }
+}
+
 }  // namespace
 
 OleControl::OleControl(OleControlHooks& hooks, REFIID events)
@@ -409,25 +434,10 @@ HRESULT OleControl::OfferToSite(MSG& message) const {
 STDMETHODIMP OleControl::TranslateAccelerator(LPMSG message) {
   if (!message) return E_POINTER;
   const HWND window = inPlace_ ? hooks_.Window() : nullptr;
-  if (window && message->message == WM_KEYDOWN && IsChild(window, message->hwnd)) {
-    switch (message->wParam) {
-      case VK_UP:
-      case VK_DOWN:
-      case VK_LEFT:
-      case VK_RIGHT:
-      case VK_PRIOR:
-      case VK_NEXT:
-      case VK_HOME:
-      case VK_END:
-      case VK_RETURN:
-      case VK_ESCAPE:
-        // Keys of the control that a container would take for its own dialog keys.
-        TranslateMessage(message);
-        DispatchMessageW(message);
-        return S_OK;
-      default:
-        break;
-    }
+  if (window && message->message == WM_KEYDOWN && IsChild(window, message->hwnd) && Wants(*message)) {
+    TranslateMessage(message);
+    DispatchMessageW(message);
+    return S_OK;
   }
   return OfferToSite(*message);
 }

@@ -1,97 +1,10 @@
 // The list control in a full container of our own, in the system's, and in none.
-#include <gtest/gtest.h>
-
-#include <fstream>
-#include <iterator>
-
-#include "ControlContainer.h"
-#include "Host.h"
-#include "platform/windows/CommonControls.h"
+#include "Form.h"
 
 namespace tarnwick::test {
 namespace {
 
-using demo::ControlContainer;
-using demo::PropertyBag;
-
 constexpr DISPID kDropModeId = 34;
-
-std::string Contents(const std::wstring& path) {
-  std::ifstream file(std::string(path.begin(), path.end()), std::ios::binary);
-  return {std::istreambuf_iterator<char>(file), {}};
-}
-
-// A form with the control on it, and what the control told.
-struct Form {
-  HWND frame = CreateWindowExW(WS_EX_CONTROLPARENT, L"STATIC", L"form", WS_OVERLAPPEDWINDOW, 0, 0, 400, 300,
-                               nullptr, nullptr, nullptr, nullptr);
-  ComPtr<ControlContainer> container = ComPtr<ControlContainer>::Adopt(new ControlContainer(frame));
-  ComPtr<_ctrlListImage> list;
-  std::vector<std::wstring> events;
-  // Runs inside each FileManagerEvent.
-  std::function<void(int code)> onEvent;
-
-  explicit Form(ControlContainer::WayIn wayIn = ControlContainer::WayIn::kSteps,
-                IPropertyBag* bag = nullptr) {
-    container->onEvent = [this](DISPID event, std::vector<VARIANT>& arguments) {
-      if (event != 1) return;
-      const int code = V_I2(V_VARIANTREF(&arguments[0]));
-      const BSTR text = *V_BSTRREF(&arguments[1]);
-      if (code != 9999) events.push_back(std::to_wstring(code) + L" " + (text ? text : L""));
-      if (onEvent) onEvent(code);
-    };
-    EXPECT_EQ(container->Create(CLSID_ctrlListImage, wayIn, bag), S_OK);
-    EXPECT_EQ(container->Control()->QueryInterface(__uuidof(_ctrlListImage), list.ReceiveVoid()), S_OK);
-  }
-  ~Form() {
-    list = {};
-    // The container's was the last reference, and it was never called in a way that it must not be.
-    EXPECT_EQ(container->Close(), 0U);
-    for (const std::string& violation : container->violations) ADD_FAILURE() << violation;
-    container = {};
-    DestroyWindow(frame);
-  }
-
-  void LogOn(const std::wstring& serverName) {
-    const Server& server = TheServer();
-    ComPtr<_CFileUpload> client;
-    ASSERT_EQ(list->get_mobjFileupload(client.Receive()), S_OK);
-    VARIANT_BOOL done = VARIANT_FALSE;
-    client->ConnectToServer(Bstr(serverName), &done);
-    client->LogonAs(Bstr(server.product), Bstr(server.user), Bstr(server.password), Bstr(L""), &done);
-    ASSERT_TRUE(done);
-  }
-  bool Init(const wchar_t* filter) {
-    Bstr text(filter);
-    BSTR given = text;
-    VARIANT_BOOL done = VARIANT_FALSE;
-    return SUCCEEDED(list->Init(&given, &done)) && done;
-  }
-  void Show() {
-    ShowWindow(frame, SW_SHOW);
-    EXPECT_EQ(container->Do(OLEIVERB_UIACTIVATE), S_OK);
-  }
-  HWND Window() const {
-    ComPtr<IOleWindow> window;
-    HWND control = nullptr;
-    if (SUCCEEDED(list->QueryInterface(IID_IOleWindow, window.ReceiveVoid()))) window->GetWindow(&control);
-    return control;
-  }
-  HWND ListWindow() const { return FindWindowExW(Window(), nullptr, WC_LISTVIEWW, nullptr); }
-  void Press(WPARAM key) {
-    MSG message = {ListWindow(), WM_KEYDOWN, key, 0, 0, {0, 0}};
-    if (!container->TranslateKey(message)) DispatchMessageW(&message);
-  }
-  std::wstring Select(const wchar_t* name) {
-    Bstr text(name);
-    BSTR given = text;
-    VARIANT ignored = {};
-    list->UploadedFileSetFocus(&given, &ignored);
-    Bstr selected;
-    list->SelectedFileName(selected.Receive());
-    return selected.Text();
-  }
-};
 
 TEST(ListControl, KeepsItsPropertiesWithTheForm) {
   const auto bag = ComPtr<PropertyBag>::Adopt(new PropertyBag);
@@ -216,6 +129,64 @@ TEST(ListControl, ShowsTheAccountInItsContainer) {
   EXPECT_TRUE(form.container->IsUiActive());
 }
 
+TEST(ListControl, FollowsItsContainer) {
+  Form form;
+  form.LogOn(TheServer().name);
+  form.container->ambient.foreColor = RGB(1, 2, 3);
+  form.container->AmbientChanged(DISPID_AMBIENT_FORECOLOR);
+  form.Show();
+  const struct {
+    const wchar_t* face;
+    SHORT weight;
+    OLE_COLOR color;
+    COLORREF shown;
+  } rows[] = {{L"Tahoma", FW_NORMAL, RGB(200, 10, 20), RGB(200, 10, 20)},
+              {L"Arial", FW_BOLD, 0x80000000 | COLOR_HIGHLIGHT, GetSysColor(COLOR_HIGHLIGHT)}};
+  EXPECT_EQ(SendMessageW(form.ListWindow(), LVM_GETTEXTCOLOR, 0, 0), RGB(1, 2, 3));
+  for (const auto& row : rows) {
+    std::wstring face = row.face;
+    FONTDESC description = {sizeof description, face.data(), {},    row.weight,
+                            DEFAULT_CHARSET,    FALSE,       FALSE, FALSE};
+    description.cySize.int64 = 140'000;  // ten-thousandths of a point
+    ASSERT_EQ(OleCreateFontIndirect(&description, IID_IFontDisp, form.container->ambient.font.ReceiveVoid()),
+              S_OK);
+    form.container->ambient.foreColor = row.color;
+    form.container->AmbientChanged(DISPID_UNKNOWN);
+    LOGFONTW font = {};
+    GetObjectW(reinterpret_cast<HFONT>(SendMessageW(form.ListWindow(), WM_GETFONT, 0, 0)), sizeof font,
+               &font);
+    EXPECT_STREQ(font.lfFaceName, row.face);
+    EXPECT_EQ(font.lfWeight, row.weight);
+    EXPECT_EQ(SendMessageW(form.ListWindow(), LVM_GETTEXTCOLOR, 0, 0), static_cast<LRESULT>(row.shown));
+  }
+
+  // 1 inch is 2540 HIMETRIC and, on this screen, 96 pixels.
+  form.container->SetBounds({10, 20, 10 + 96, 20 + 192});
+  ComPtr<IOleObject> object;
+  ComPtr<IViewObject2> view;
+  ASSERT_EQ(form.list->QueryInterface(IID_IOleObject, object.ReceiveVoid()), S_OK);
+  ASSERT_EQ(form.list->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
+  SIZEL extent = {};
+  EXPECT_EQ(object->GetExtent(DVASPECT_CONTENT, &extent), S_OK);
+  EXPECT_TRUE(extent.cx == 2540 && extent.cy == 5080) << extent.cx << " " << extent.cy;
+  extent = {};
+  EXPECT_EQ(view->GetExtent(DVASPECT_CONTENT, -1, nullptr, &extent), S_OK);
+  EXPECT_TRUE(extent.cx == 2540 && extent.cy == 5080) << extent.cx << " " << extent.cy;
+  EXPECT_EQ(object->GetExtent(DVASPECT_ICON, &extent), DV_E_DVASPECT);
+
+  // A frozen control tells nothing until it is thawed as often.
+  ComPtr<IOleControl> control;
+  ASSERT_EQ(form.list->QueryInterface(IID_IOleControl, control.ReceiveVoid()), S_OK);
+  control->FreezeEvents(TRUE);
+  control->FreezeEvents(TRUE);
+  control->FreezeEvents(FALSE);
+  form.Press(VK_RETURN);
+  EXPECT_TRUE(form.events.empty());
+  control->FreezeEvents(FALSE);
+  form.Press(VK_RETURN);
+  EXPECT_EQ(form.events, std::vector<std::wstring>{L"1024 "});
+}
+
 TEST(ListControl, UploadsDownloadsRenamesAndDeletes) {
   Form form;
   form.LogOn(TheServer().name);
@@ -249,37 +220,6 @@ TEST(ListControl, UploadsDownloadsRenamesAndDeletes) {
   EXPECT_NE(form.Select(L"renamed test.jpg"), L"renamed test.jpg");
 }
 
-TEST(ListControl, EndsADownloadThatFails) {
-  // On that server each of these pictures has a fault of its own; the listing is whole.
-  Form form;
-  form.LogOn(TheServer().faulty);
-  ASSERT_TRUE(form.Init(L"*"));
-  const struct {
-    const wchar_t* name;
-    bool told;
-    const char* left;                               // in the local file; null when it is gone
-  } rows[] = {{L"rose.jpg", true, nullptr},         // closed without a word
-              {L"coffee.jpg", true, nullptr},       // reset before the answer
-              {L"horse.png", false, "\x89P"},       // 404, which nobody looks at
-              {L"rocket.jpg", false, "\xFF\xD8"}};  // cut in the middle, in an orderly way
-  for (const auto& row : rows) {
-    ASSERT_EQ(form.Select(row.name), row.name);
-    std::ofstream(std::string(row.name, row.name + wcslen(row.name)), std::ios::binary)
-        << "of an earlier download";
-    form.events.clear();
-    Bstr local;
-    form.list->DownLoadFileFromServer(Bstr(L"."), local.Receive());
-    EXPECT_EQ(local.Text(), std::wstring(L".\\") + row.name);
-    EXPECT_EQ(form.events.size(), row.told ? 1U : 0U) << row.name;
-    EXPECT_TRUE(form.events.empty() || form.events[0] == L"5555 ") << row.name;
-    EXPECT_EQ(GetFileAttributesW(row.name) == INVALID_FILE_ATTRIBUTES, row.left == nullptr) << row.name;
-    if (row.left) {
-      EXPECT_EQ(Contents(row.name).substr(0, 2), row.left) << row.name;
-    }
-    DeleteFileW(row.name);
-  }
-}
-
 TEST(ListControl, MayBeReleasedInAnEventOfItsWait) {
   auto form = std::make_unique<Form>();
   form->LogOn(TheServer().name);
@@ -305,9 +245,10 @@ TEST(ListControl, LivesInTheSystemsContainer) {
   const auto get = reinterpret_cast<HRESULT(WINAPI*)(HWND, IUnknown**)>(
       reinterpret_cast<void*>(GetProcAddress(atl, "AtlAxGetControl")));
   ASSERT_TRUE(init && get && init());
-  const HWND window = CreateWindowExW(0, L"AtlAxWin", L"Tarnwick.ctrlListImage", WS_POPUP | WS_VISIBLE, 0, 0,
-                                      300, 200, nullptr, nullptr, nullptr, nullptr);
+  const HWND window = CreateWindowExW(0, L"AtlAxWin", L"Tarnwick.ctrlListImage", WS_POPUP, 0, 0, 300, 200,
+                                      nullptr, nullptr, nullptr, nullptr);
   ASSERT_NE(window, nullptr);
+  ShowWindow(window, SW_SHOWNOACTIVATE);
   ComPtr<IUnknown> control;
   ASSERT_EQ(get(window, control.Receive()), S_OK);
   ComPtr<_ctrlListImage> list;

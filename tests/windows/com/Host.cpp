@@ -39,16 +39,17 @@ ComPtr<_CFileUpload> LoggedOnClient() {
   return client;
 }
 
-VARIANT Get(IDispatch* object, const wchar_t* member, const VARIANT* argument) {
+VARIANT Call(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments) {
   VARIANT result;
   V_VT(&result) = VT_ERROR;
   std::wstring name = member;
   LPOLESTR names = name.data();
   DISPID id = 0;
-  DISPPARAMS arguments = {const_cast<VARIANT*>(argument), nullptr, argument ? 1U : 0U, 0};
+  DISPPARAMS parameters = {const_cast<VARIANT*>(arguments.begin()), nullptr,
+                           static_cast<UINT>(arguments.size()), 0};
   if (FAILED(object->GetIDsOfNames(IID_NULL, &names, 1, LOCALE_USER_DEFAULT, &id)) ||
       FAILED(object->Invoke(id, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD | DISPATCH_PROPERTYGET,
-                            &arguments, &result, nullptr, nullptr)))
+                            &parameters, &result, nullptr, nullptr)))
     V_VT(&result) = VT_ERROR;
   return result;
 }

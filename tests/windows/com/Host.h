@@ -6,6 +6,7 @@
 
 #include <oleauto.h>
 
+#include <initializer_list>
 #include <string>
 #include <utility>
 
@@ -49,6 +50,13 @@ inline VARIANT VariantOf(BSTR text) {
   return value;
 }
 
+inline VARIANT VariantOf(LONG number) {
+  VARIANT value;
+  V_VT(&value) = VT_I4;
+  V_I4(&value) = number;
+  return value;
+}
+
 // A new client; null when the library is not registered.
 inline ComPtr<_CFileUpload> NewClient() {
   ComPtr<_CFileUpload> client;
@@ -60,7 +68,10 @@ inline ComPtr<_CFileUpload> NewClient() {
 // A client that is logged on to the account.
 ComPtr<_CFileUpload> LoggedOnClient();
 
-// Late-bound call of a member without arguments, or with one; VT_ERROR when it fails.
-VARIANT Get(IDispatch* object, const wchar_t* member, const VARIANT* argument = nullptr);
+// Late-bound call of a member, with the last argument first; VT_ERROR when it fails.
+VARIANT Call(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments);
+inline VARIANT Get(IDispatch* object, const wchar_t* member, const VARIANT* argument = nullptr) {
+  return argument ? Call(object, member, {*argument}) : Call(object, member, {});
+}
 
 }  // namespace tarnwick::test

@@ -1,0 +1,159 @@
+#include "platform/windows/ControlWindow.h"
+
+#include "platform/windows/CommonControls.h"
+
+namespace tarnwick {
+namespace {
+
+constexpr UINT_PTR kSubclass = 1;
+
+HCURSOR PointerOf(bool hourglass) {
+  return LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(hourglass ? IDC_WAIT : IDC_ARROW));
+}
+
+// A hidden window that holds the windows of controls that are in no container. Each thread has its own:
+// windows go with the thread that made them, and take along what they hold.
+HWND ParkingWindow(HINSTANCE module) {
+  static thread_local HWND parking = nullptr;
+  if (!IsWindow(parking))
+    parking = CreateWindowExW(WS_EX_TOOLWINDOW, L"STATIC", L"", WS_POPUP, 0, 0, 0, 0, nullptr, nullptr,
+                              module, nullptr);
+  return parking;
+}
+
+}  // namespace
+
+ControlWindow::~ControlWindow() {
+  if (!window_) return;
+  // No message reaches the object from here on.
+  SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
+  if (depth_ == 0) {
+    DestroyWindow(window_);
+    return;
+  }
+  // The host ended the control inside one of its own messages. The windows are not done with that message
+  // yet, so they go with the next one.
+  Park();
+  PostMessageW(window_, WM_CLOSE, 0, 0);
+}
+
+HWND ControlWindow::Window() {
+  if (!window_ && !MakeWindow() && window_) DestroyWindow(window_);
+  return window_;
+}
+
+bool ControlWindow::MakeWindow() {
+  WNDCLASSEXW windowClass = {};
+  windowClass.cbSize = sizeof windowClass;
+  windowClass.lpfnWndProc = WindowProc;
+  windowClass.hInstance = module_;
+  windowClass.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_WINDOW + 1);
+  windowClass.hCursor = PointerOf(false);
+  windowClass.lpszClassName = className_;
+  RegisterClassExW(&windowClass);  // fails when it is registered already
+  window_ = CreateWindowExW(WS_EX_CONTROLPARENT, className_, L"", WS_CHILD | WS_CLIPCHILDREN, 0, 0, 0, 0,
+                            ParkingWindow(module_), nullptr, module_, this);
+  if (!window_ || !MakeChildren()) return false;
+  made_ = true;
+  ApplyLook();
+  return true;
+}
+
+HWND ControlWindow::MakeChild(HWND parent, const wchar_t* className, const wchar_t* name, DWORD style,
+                              const RECT& place) {
+  const HWND child =
+      CreateWindowExW(0, className, name, WS_CHILD | style, place.left, place.top, place.right - place.left,
+                      place.bottom - place.top, parent, nullptr, module_, nullptr);
+  if (child) SetWindowSubclass(child, ChildProc, kSubclass, reinterpret_cast<DWORD_PTR>(window_));
+  return child;
+}
+
+int ControlWindow::Dpi() {
+  const HDC screen = GetDC(nullptr);
+  const int dpi = GetDeviceCaps(screen, LOGPIXELSX);
+  ReleaseDC(nullptr, screen);
+  return dpi;
+}
+
+void ControlWindow::Park() {
+  if (!window_) return;
+  ShowWindow(window_, SW_HIDE);
+  SetParent(window_, ParkingWindow(module_));
+}
+
+void ControlWindow::SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background) {
+  font_ = font;
+  textColor_ = text;
+  backColor_ = background;
+  if (!made_) return;
+  ApplyLook();
+  InvalidateRect(window_, nullptr, TRUE);
+}
+
+void ControlWindow::ShowHourglass(bool hourglass) {
+  hourglass_ = hourglass;
+  POINT at = {};
+  if (window_ && GetCursorPos(&at) && ScreenToClient(window_, &at)) {
+    RECT client = {};
+    GetClientRect(window_, &client);
+    if (PtInRect(&client, at)) SetCursor(PointerOf(hourglass));
+  }
+}
+
+ControlWindow* ControlWindow::Of(HWND outer) {
+  return reinterpret_cast<ControlWindow*>(GetWindowLongPtrW(outer, GWLP_USERDATA));
+}
+
+// Runs a handler, whose exceptions end here. The object may be gone afterwards.
+template <typename Body>
+LRESULT ControlWindow::Handle(HWND outer, Body&& body) {
+  ++depth_;
+  const LRESULT result = ResultAsItStood(LRESULT{0}, [&](LRESULT& answer) { answer = body(); });
+  if (IsAlive(this, outer)) --depth_;
+  return result;
+}
+
+LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
+  if (message == WM_NCCREATE) {
+    const auto* create = reinterpret_cast<const CREATESTRUCTW*>(lParam);
+    SetWindowLongPtrW(window, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(create->lpCreateParams));
+  }
+  ControlWindow* self = Of(window);
+  if (self && message == WM_NCDESTROY) {
+    SetWindowLongPtrW(window, GWLP_USERDATA, 0);
+    self->window_ = nullptr;
+    self->made_ = false;
+    // Handlers that still run belong to the window that is gone.
+    self->depth_ = 0;
+    self->WindowGone();
+  } else if (self && self->made_) {
+    return self->Handle(window, [&] {
+      if (message == WM_SETCURSOR && self->hourglass_) {
+        SetCursor(PointerOf(true));
+        return LRESULT{TRUE};
+      }
+      const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
+      return answer ? *answer : DefWindowProcW(window, message, wParam, lParam);
+    });
+  }
+  return DefWindowProcW(window, message, wParam, lParam);
+}
+
+LRESULT CALLBACK ControlWindow::ChildProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam,
+                                          UINT_PTR id, DWORD_PTR data) {
+  const auto outer = reinterpret_cast<HWND>(data);
+  ControlWindow* self = Of(outer);
+  if (message == WM_NCDESTROY) {
+    RemoveWindowSubclass(window, ChildProc, id);
+  } else if (self && self->made_) {
+    // The child's own procedure runs inside too: it may wait for more messages, and must not lose its window
+    // meanwhile.
+    return self->Handle(outer, [&] {
+      const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
+      return answer ? *answer : DefSubclassProc(window, message, wParam, lParam);
+    });
+  }
+  return DefSubclassProc(window, message, wParam, lParam);
+}
+
+}  // namespace tarnwick

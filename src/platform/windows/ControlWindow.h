@@ -1,0 +1,83 @@
+// What the windows of the controls have in common: the window is made on first use and parked below a hidden
+// one while the control is in no container, it has the look that the container gives, and the host's code may
+// end the control inside any of its messages.
+#pragma once
+
+#include "platform/windows/WindowsHeaders.h"
+
+#include <optional>
+#include <utility>
+
+#include "support/RuntimeError.h"
+
+namespace tarnwick {
+
+class ControlWindow {
+ public:
+  ControlWindow(const ControlWindow&) = delete;
+  ControlWindow& operator=(const ControlWindow&) = delete;
+
+  // The window of the whole control, made hidden and without a container on the first call; null on failure.
+  HWND Window();
+  // Takes the window out of its container and hides it; what it shows stays.
+  void Park();
+  // Null for the system's own font, nullopt for the system's own colour. The font stays the caller's.
+  void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background);
+
+ protected:
+  // `module` is where the window's class belongs.
+  ControlWindow(HINSTANCE module, const wchar_t* className) : module_(module), className_(className) {}
+  ~ControlWindow();
+
+  // Makes what is inside the window; false on failure.
+  virtual bool MakeChildren() = 0;
+  // The window and all inside it are gone, although the control is not.
+  virtual void WindowGone() = 0;
+  // Font or colours are others now. Called only while there is a window.
+  virtual void ApplyLook() = 0;
+  // A message for the window of the control or for a child of it; nullopt leaves it to that window's own
+  // procedure. The control may have ended when a call that runs code of the host returns: see IsAlive.
+  virtual std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) = 0;
+
+  // A child, or a child's child, whose messages come to OnMessage too; null on failure. `name` is its text.
+  HWND MakeChild(HWND parent, const wchar_t* className, const wchar_t* name, DWORD style,
+                 const RECT& place = {});
+
+  // The window; null when there is none yet.
+  HWND Outer() const { return window_; }
+  // Whether this object is still there and has the window `outer`, after code of the host ran. The one
+  // question that may be asked of an object that is gone.
+  static bool IsAlive(const ControlWindow* object, HWND outer) { return Of(outer) == object; }
+
+  HFONT Font() const { return font_ ? font_ : static_cast<HFONT>(GetStockObject(DEFAULT_GUI_FONT)); }
+  COLORREF TextColor() const { return textColor_.value_or(GetSysColor(COLOR_WINDOWTEXT)); }
+  COLORREF BackColor() const { return backColor_.value_or(GetSysColor(COLOR_WINDOW)); }
+  // Dots per inch of the screen.
+  static int Dpi();
+
+  void ShowHourglass(bool hourglass);
+  bool HasHourglass() const { return hourglass_; }
+
+ private:
+  static LRESULT CALLBACK WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  static LRESULT CALLBACK ChildProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR id,
+                                    DWORD_PTR outer);
+  static ControlWindow* Of(HWND outer);
+  template <typename Body>
+  LRESULT Handle(HWND outer, Body&& body);
+  bool MakeWindow();
+
+  const HINSTANCE module_;
+  const wchar_t* const className_;
+  HWND window_ = nullptr;
+  // All children are there.
+  bool made_ = false;
+  // Handlers of messages that run now, one inside the other.
+  int depth_ = 0;
+  bool hourglass_ = false;
+  HFONT font_ = nullptr;
+  std::optional<COLORREF> textColor_;
+  std::optional<COLORREF> backColor_;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,365 @@
+// What the user does with the list control: drags, drops and keys.
+#include <ole2.h>
+#include <shlobj.h>
+
+#include <cstring>
+
+#include "Form.h"
+
+namespace tarnwick::test {
+namespace {
+
+using Arguments = std::vector<VARIANT>;
+
+constexpr LONG kText = CF_TEXT;
+constexpr LONG kFiles = CF_HDROP;
+
+// Calls of the data object that a drag event hands to the host.
+class Dragged {
+ public:
+  explicit Dragged(const VARIANT& argument) : object_(*V_DISPATCHREF(&argument)) {}
+
+  bool Has(LONG format) const {
+    const VARIANT answer = Call(object_, L"GetFormat", {VariantOf(format)});
+    EXPECT_EQ(V_VT(&answer), VT_BOOL);
+    return V_BOOL(&answer) == VARIANT_TRUE;
+  }
+  // "none" when the data refuses to give it.
+  std::wstring Text() const { return TextOf(Call(object_, L"GetData", {VariantOf(kText)})); }
+  void SetText(const wchar_t* text) const {
+    const Bstr owned(text);
+    const VARIANT done = Call(object_, L"SetData", {VariantOf(kText), VariantOf(owned)});
+    EXPECT_EQ(V_VT(&done), VT_EMPTY);
+  }
+  void Clear() const {
+    const VARIANT done = Call(object_, L"Clear", {});
+    EXPECT_EQ(V_VT(&done), VT_EMPTY);
+  }
+  std::vector<std::wstring> Files() const {
+    std::vector<std::wstring> files;
+    VARIANT collection = Call(object_, L"Files", {});
+    if (V_VT(&collection) != VT_DISPATCH) return {L"none"};
+    const VARIANT count = Call(V_DISPATCH(&collection), L"Count", {});
+    for (LONG i = 1; i <= V_I4(&count); ++i)
+      files.push_back(TextOf(Call(V_DISPATCH(&collection), L"Item", {VariantOf(i)})));
+    VariantClear(&collection);
+    return files;
+  }
+
+ private:
+  static std::wstring TextOf(VARIANT value) {
+    std::wstring text = V_VT(&value) == VT_BSTR ? V_BSTR(&value) : L"none";
+    VariantClear(&value);
+    return text;
+  }
+
+  IDispatch* object_;
+};
+
+// A drag of files as another program would offer it: the clipboard's data object.
+ComPtr<IDataObject> FilesFromOutside(HWND window, const std::vector<std::wstring>& files) {
+  std::wstring paths;
+  for (const std::wstring& file : files) paths += file + L'\0';
+  paths += L'\0';
+  const std::size_t size = paths.size() * sizeof(wchar_t);
+  const HGLOBAL block = GlobalAlloc(GMEM_MOVEABLE, sizeof(DROPFILES) + size);
+  auto* head = static_cast<DROPFILES*>(GlobalLock(block));
+  *head = {sizeof(DROPFILES), {0, 0}, FALSE, TRUE};
+  std::memcpy(head + 1, paths.data(), size);
+  GlobalUnlock(block);
+  EXPECT_TRUE(OpenClipboard(window) && EmptyClipboard() && SetClipboardData(CF_HDROP, block) &&
+              CloseClipboard());
+  ComPtr<IDataObject> data;
+  EXPECT_EQ(OleGetClipboard(data.Receive()), S_OK);
+  return data;
+}
+
+TEST(ListControl, TakesFilesThatAreDroppedOnIt) {
+  Form form;
+  form.container->SetBounds({15, 25, 315, 225});
+  form.Show();
+  const std::vector<std::wstring> files = {L"C:\\one.jpg", L"C:\\Bl\u00FCmchen.gif"};
+  const ComPtr<IDataObject> data = FilesFromOutside(form.frame, files);
+  auto* target = static_cast<IDropTarget*>(GetPropW(form.ListWindow(), L"OleDropTargetInterface"));
+  ASSERT_TRUE(data && target);
+  POINT corner = {0, 0};
+  ClientToScreen(form.ListWindow(), &corner);
+  const POINTL at = {corner.x + 30, corner.y + 40};
+  constexpr DWORD kKeys = MK_LBUTTON | MK_CONTROL;
+
+  std::wstring told;
+  bool empties = false;
+  form.onOther = [&](DISPID event, Arguments& arguments) {
+    const Dragged dragged(arguments[0]);
+    told += std::to_wstring(event) +
+            (event == kOLEDragOver ? std::to_wstring(*V_I2REF(&arguments[6])) : L"") + L" ";
+    LONG& effect = *V_I4REF(&arguments[1]);
+    if (event == kOLEDragOver && *V_I2REF(&arguments[6]) == 1) return;
+    EXPECT_EQ(effect, DROPEFFECT_COPY);
+    EXPECT_EQ(*V_I2REF(&arguments[2]), 1);
+    EXPECT_EQ(*V_I2REF(&arguments[3]), 2);
+    EXPECT_EQ(*V_R4REF(&arguments[4]), 30.0F);
+    EXPECT_EQ(*V_R4REF(&arguments[5]), 40.0F);
+    if (event == kOLEDragDrop && empties) {
+      dragged.Clear();
+      EXPECT_FALSE(dragged.Has(kFiles));
+      EXPECT_TRUE(dragged.Files().empty());
+      return;
+    }
+    EXPECT_EQ(dragged.Files(), files);
+    EXPECT_TRUE(dragged.Has(kFiles));
+    if (event == kOLEDragDrop) {
+      // What was set while the drag was over the list.
+      EXPECT_EQ(dragged.Text(), L"a note");
+      return;
+    }
+    EXPECT_EQ(dragged.Has(kText), *V_I2REF(&arguments[6]) == 2);
+    EXPECT_EQ(dragged.Text(), dragged.Has(kText) ? L"a note" : L"none");
+    dragged.SetText(L"a note");
+    // The host decides what a drop here would do.
+    if (*V_I2REF(&arguments[6]) == 2) effect = DROPEFFECT_NONE;
+  };
+  for (const bool leaves : {true, false, false}) {
+    DWORD effect = DROPEFFECT_COPY | DROPEFFECT_MOVE | DROPEFFECT_LINK;
+    EXPECT_EQ(target->DragEnter(data.Get(), kKeys, at, &effect), S_OK);
+    EXPECT_EQ(effect, static_cast<DWORD>(DROPEFFECT_COPY));
+    EXPECT_EQ(target->DragOver(kKeys, at, &effect), S_OK);
+    EXPECT_EQ(effect, static_cast<DWORD>(DROPEFFECT_NONE));
+    effect = DROPEFFECT_COPY;
+    if (leaves)
+      EXPECT_EQ(target->DragLeave(), S_OK);
+    else
+      EXPECT_EQ(target->Drop(data.Get(), kKeys, at, &effect), S_OK);
+    EXPECT_EQ(told, leaves ? L"50 52 51 " : L"50 52 6 ");
+    EXPECT_EQ(form.events, leaves || empties ? std::vector<std::wstring>()
+                                             : (std::vector<std::wstring>{L"1023 " + files[0],
+                                                                          L"1023 " + files[1], L"1023 "}));
+    told.clear();
+    form.events.clear();
+    empties = !leaves;
+  }
+}
+
+// The next events of the mouse, as if a person made them.
+void Mouse(DWORD what) {
+  mouse_event(what, 0, 0, 0, 0);
+}
+
+TEST(ListControl, DragsItsOwnFile) {
+  Form form;
+  form.LogOn(TheServer().name);
+  ASSERT_TRUE(form.Init(L"gif"));
+  form.Show();
+  RECT row = {LVIR_BOUNDS, 0, 0, 0};
+  SendMessageW(form.ListWindow(), LVM_GETITEMRECT, 1, reinterpret_cast<LPARAM>(&row));
+  POINT item = {row.left + 40, (row.top + row.bottom) / 2};
+  ClientToScreen(form.ListWindow(), &item);
+  const std::wstring name = L"wizard.gif";
+  const std::wstring address = L"http://" + TheServer().name + L"/users/anna.berg@example-org/" + name;
+  std::wstring copy;
+
+  const struct {
+    bool hasCopy;
+    bool byCall;  // of OLEDrag, in place of the mouse
+    BYTE key;     // that ends the drag, 0 for the mouse button
+    LONG allowed;
+    const wchar_t* told;
+    std::vector<std::wstring> events;
+  } rows[] = {
+      {false, false, 0, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1015 ", L"1021 "}},
+      {true, false, 0, DROPEFFECT_NONE, L"start over complete:0 ", {}},
+      {true, false, VK_ESCAPE, DROPEFFECT_COPY, L"start over complete:0 ", {}},
+      {true, true, 0, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1021 "}},
+  };
+  for (const auto& line : rows) {
+    SCOPED_TRACE(line.told);
+    if (line.hasCopy) {
+      form.Download(name.c_str());
+      DeleteFileW(name.c_str());
+    }
+    form.events.clear();
+    std::wstring told;
+    bool isOver = false;
+    form.onOther = [&](DISPID event, Arguments& arguments) {
+      switch (event) {
+        case kOLEStartDrag: {
+          told += L"start ";
+          const Dragged dragged(arguments[0]);
+          EXPECT_EQ(dragged.Text(), address);
+          const std::vector<std::wstring> files = dragged.Files();
+          EXPECT_EQ(files.size(), line.hasCopy ? 1U : 0U);
+          EXPECT_EQ(dragged.Has(kFiles), line.hasCopy);
+          if (!files.empty()) copy = files[0];
+          EXPECT_EQ(*V_I4REF(&arguments[1]), DROPEFFECT_COPY);
+          *V_I4REF(&arguments[1]) = line.allowed;
+          break;
+        }
+        case kOLEGiveFeedback:
+          EXPECT_EQ(*V_I4REF(&arguments[0]), line.allowed);
+          EXPECT_EQ(*V_BOOLREF(&arguments[1]), VARIANT_TRUE);
+          break;
+        case kOLEDragOver:
+          EXPECT_EQ(Dragged(arguments[0]).Text(), address);
+          if (std::exchange(isOver, true)) break;
+          told += L"over ";
+          if (line.key)
+            keybd_event(line.key, 0, 0, 0);
+          else
+            Mouse(MOUSEEVENTF_LEFTUP);
+          break;
+        case kOLEDragDrop:
+          told += L"drop ";
+          break;
+        case kOLECompleteDrag:
+          told += L"complete:" + std::to_wstring(*V_I4REF(&arguments[0])) + L" ";
+          break;
+        default:
+          break;
+      }
+    };
+    SetCursorPos(item.x, item.y);
+    Mouse(MOUSEEVENTF_LEFTDOWN);
+    if (line.byCall) form.list->OLEDrag();
+    for (int i = 0; i < 100 && told.empty(); ++i) {
+      SetCursorPos(item.x + i % 30, item.y);
+      Sleep(10);
+      form.Pump();
+    }
+    EXPECT_EQ(told, line.told);
+    EXPECT_EQ(form.events, line.events);
+    Mouse(MOUSEEVENTF_LEFTUP);
+    keybd_event(VK_ESCAPE, 0, KEYEVENTF_KEYUP, 0);
+    form.Pump();
+
+    // The list is as before: a click is a click, so far away that it is no double click.
+    SetCursorPos(item.x + 25, item.y);
+    Mouse(MOUSEEVENTF_LEFTDOWN);
+    form.Pump();
+    form.events.clear();
+    Mouse(MOUSEEVENTF_LEFTUP);
+    form.Pump();
+    EXPECT_EQ(form.events, (std::vector<std::wstring>{L"1022 ", L"1015 " + address, L"1024 "}));
+  }
+  EXPECT_EQ(Contents(copy), Contents(L"demo\\pictures\\wizard.gif"));
+  DeleteFileW(copy.c_str());
+}
+
+void Hold(BYTE key, bool down) {
+  BYTE keys[256] = {};
+  GetKeyboardState(keys);
+  keys[key] = down ? 0x80 : 0;
+  SetKeyboardState(keys);
+}
+
+TEST(ListControl, SharesTheKeyboardWithItsForm) {
+  Form form;
+  form.LogOn(TheServer().name);
+  ASSERT_TRUE(form.Init(L"*"));
+  const HWND button = CreateWindowExW(0, L"BUTTON", L"other", WS_CHILD | WS_VISIBLE | WS_TABSTOP, 0, 250, 50,
+                                      20, form.frame, nullptr, nullptr, nullptr);
+  ShowWindow(form.frame, SW_SHOWNOACTIVATE);
+  ASSERT_EQ(form.container->Do(OLEIVERB_INPLACEACTIVATE), S_OK);
+  EXPECT_FALSE(form.container->IsUiActive());
+  // Round the form with Tab: the list is one stop.
+  SetFocus(button);
+  form.Press(VK_TAB, button);
+  EXPECT_EQ(GetFocus(), form.ListWindow());
+  EXPECT_TRUE(form.container->IsUiActive());
+  form.Press(VK_TAB);
+  EXPECT_EQ(GetFocus(), button);
+  form.Press(VK_TAB, button);
+  EXPECT_EQ(GetFocus(), form.ListWindow());
+
+  struct Row {
+    WPARAM key;
+    BYTE held;
+    bool offered;  // to the form
+    DWORD modifiers;
+  };
+  const Row rows[] = {{VK_DOWN, 0, false, 0},  {VK_RIGHT, 0, false, 0},       {VK_NEXT, 0, false, 0},
+                      {VK_END, 0, false, 0},   {VK_RETURN, 0, false, 0},      {VK_ESCAPE, 0, true, 0},
+                      {VK_DELETE, 0, true, 0}, {VK_F5, 0, true, 0},           {'U', VK_CONTROL, true, 2},
+                      {'U', 0, true, 0},       {VK_INSERT, VK_SHIFT, true, 1}};
+  for (const Row& row : rows) {
+    SCOPED_TRACE(row.key);
+    int offers = 0;
+    form.container->onKey = [&](const MSG& message, DWORD modifiers) {
+      EXPECT_EQ(message.wParam, row.key);
+      EXPECT_EQ(modifiers, row.modifiers);
+      ++offers;
+      return true;
+    };
+    if (row.held) Hold(row.held, true);
+    EXPECT_TRUE(form.Press(row.key));
+    if (row.held) Hold(row.held, false);
+    EXPECT_EQ(offers, row.offered ? 1 : 0);
+  }
+  // What the form does not take either is a key of the list.
+  form.container->onKey = [](const MSG&, DWORD) { return false; };
+  ComPtr<IOleInPlaceActiveObject> active;
+  ASSERT_EQ(form.list->QueryInterface(IID_IOleInPlaceActiveObject, active.ReceiveVoid()), S_OK);
+  MSG outside = {GetDesktopWindow(), WM_KEYDOWN, VK_F5, 0, 0, {0, 0}};
+  EXPECT_EQ(active->TranslateAccelerator(&outside), S_FALSE);
+}
+
+TEST(ListControl, RenamesByEditingALabel) {
+  Form form;
+  form.LogOn(TheServer().name);
+  ASSERT_TRUE(form.Init(L"*"));
+  form.Show();
+  CopyFileW(L"demo\\pictures\\rose.jpg", L"label test.jpg", FALSE);
+  VARIANT_BOOL done = VARIANT_FALSE;
+  form.list->UploadImage(Bstr(L".\\label test.jpg"), &done);
+  DeleteFileW(L"label test.jpg");
+  ASSERT_TRUE(done);
+
+  const struct {
+    bool enabled;
+    const wchar_t* typed;
+    WPARAM key;  // that ends it
+    std::vector<std::wstring> events;
+    const wchar_t* name;  // afterwards
+  } rows[] = {
+      {false, L"", 0, {}, L"label test.jpg"},
+      {true, L"other.jpg", VK_ESCAPE, {}, L"label test.jpg"},
+      {true, L"a#b.jpg", VK_RETURN, {L"1034 "}, L"label test.jpg"},
+      {true, L"", VK_RETURN, {}, L"label test.jpg"},
+      {true, L"l\u00E4bel.two.gif", VK_RETURN, {L"1031 l\u00E4bel.two.jpg"}, L"l\u00E4bel.two.jpg"},
+  };
+  int offers = 0;
+  form.container->onKey = [&](const MSG& message, DWORD) {
+    return message.message == WM_KEYDOWN && ++offers > 0;
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(testing::Message() << row.typed << " " << row.key);
+    const auto item = static_cast<WPARAM>(
+        SendMessageW(form.ListWindow(), LVM_GETNEXTITEM, static_cast<WPARAM>(-1), LVNI_SELECTED));
+    form.list->put_bRenameEnabled(row.enabled ? VARIANT_TRUE : VARIANT_FALSE);
+    form.events.clear();
+    const auto edit = reinterpret_cast<HWND>(SendMessageW(form.ListWindow(), LVM_EDITLABELW, item, 0));
+    ASSERT_EQ(edit != nullptr, row.enabled);
+    if (edit) {
+      EXPECT_EQ(GetFocus(), edit);
+      SetWindowTextW(edit, L"");
+      for (const wchar_t* letter = row.typed; *letter; ++letter)
+        SendMessageW(edit, WM_CHAR, static_cast<WPARAM>(*letter), 0);
+      form.Press(VK_DELETE, edit);
+      form.Press(row.key, edit);
+      form.Pump();
+      EXPECT_FALSE(IsWindow(edit));
+    }
+    EXPECT_EQ(form.events, row.events);
+    Bstr selected;
+    form.list->SelectedFileName(selected.Receive());
+    EXPECT_EQ(selected.Text(), row.name);
+  }
+  // While a label is edited all of these keys are the label's.
+  EXPECT_EQ(offers, 0);
+  // The server has it under the new name.
+  ASSERT_TRUE(form.Init(L"*"));
+  EXPECT_EQ(form.Select(L"l\u00E4bel.two.jpg"), L"l\u00E4bel.two.jpg");
+  form.list->DeleteFile();
+}
+
+}  // namespace
+}  // namespace tarnwick::test

@@ -1,0 +1,125 @@
+// Downloads of the list control from a server on which each of some pictures has a fault of its own; the
+// listing is whole.
+#include "Form.h"
+
+namespace tarnwick::test {
+namespace {
+
+// What all faulty pictures are, but the one that is sent byte by byte: that has only the first ones.
+constexpr wchar_t kPicture[] = L"demo\\pictures\\rocket.jpg";
+constexpr std::size_t kDripBytes = 300;
+
+constexpr LONG kSuccess = 32;
+constexpr LONG kTimeout = 58;
+
+LONG LastError(const Form& form) {
+  FtpErrors error = {};
+  form.list->get_m_LastError(&error);
+  return static_cast<LONG>(error);
+}
+
+TEST(ListControl, LeavesWholeFilesOrNoneWhateverTheServerDoes) {
+  Form form;
+  form.LogOn(TheServer().faulty);
+  ASSERT_TRUE(form.Init(L"*"));
+  const std::optional<std::string> picture = Contents(kPicture);
+  ASSERT_TRUE(picture);
+  const std::optional<std::string> absent;
+  const struct {
+    const wchar_t* name;
+    std::optional<std::string> left;  // in the local file
+    bool told = false;                // with 5555
+    bool arrives = true;              // anything at all
+  } rows[] = {
+      {L"refuse.jpg", absent, true, false},
+      {L"reset-request.jpg", absent, true, false},
+      {L"reset-head.jpg", absent, true},
+      {L"reset-body.jpg", absent, true},
+      // An orderly close ends the picture, whatever was said about it before.
+      {L"cut.jpg", picture->substr(0, picture->size() / 2)},
+      {L"empty.jpg", ""},
+      {L"length-5.jpg", picture},
+      {L"length-999999.jpg", picture},
+      {L"status-404.jpg", picture},
+      {L"drip-2.jpg", picture->substr(0, kDripBytes)},
+      // Names that need care on the way.
+      {L"Chelsea the cat.jpg", Contents(L"demo\\pictures\\Chelsea the cat.jpg")},
+      {L"Bl\u00FCmchen.gif", Contents(L"demo\\pictures\\Bl\u00FCmchen.gif")},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(testing::Message() << row.name);
+    CopyFileW(kPicture, row.name, FALSE);  // of an earlier download
+    EXPECT_EQ(form.Download(row.name), std::wstring(L".\\") + row.name);
+    EXPECT_TRUE(Contents(row.name) == row.left);
+    EXPECT_EQ(form.events, row.told ? std::vector<std::wstring>{L"5555 "} : std::vector<std::wstring>());
+    EXPECT_EQ(form.progress.empty(), !row.arrives);
+    EXPECT_EQ(LastError(form) == kSuccess, !row.told);
+    if (row.name == std::wstring(L"drip-2.jpg")) {
+      // The head is no part of what is counted, and the host hears of the bytes as they come.
+      EXPECT_GT(form.progress.size(), 20U);
+      EXPECT_EQ(form.progress.back(), static_cast<int>(kDripBytes));
+    }
+    DeleteFileW(row.name);
+  }
+}
+
+int ticks = 0;
+void CALLBACK CountTick(HWND, UINT, UINT_PTR, DWORD) {
+  ++ticks;
+}
+
+TEST(ListControl, GivesUpADownloadThatStalls) {
+  wchar_t slow[8] = L"";
+  if (GetEnvironmentVariableW(L"TARNWICK_SLOW", slow, 8) == 0) GTEST_SKIP() << "takes 40 s, see scripts/test";
+  Form form;
+  form.LogOn(TheServer().faulty);
+  ASSERT_TRUE(form.Init(L"*"));
+  form.Show();
+  CopyFileW(kPicture, L"stall.jpg", FALSE);
+  // The host's own window lives meanwhile.
+  SetTimer(form.frame, 1, 1000, CountTick);
+  const ULONGLONG begin = GetTickCount64();
+  EXPECT_EQ(form.Download(L"stall.jpg"), L".\\stall.jpg");
+  const ULONGLONG time = GetTickCount64() - begin;
+  KillTimer(form.frame, 1);
+  EXPECT_GE(time, 39'500U);
+  EXPECT_LE(time, 44'000U);
+  EXPECT_GE(ticks, 30);
+  EXPECT_FALSE(Contents(L"stall.jpg"));
+  EXPECT_TRUE(form.events.empty());
+  EXPECT_TRUE(form.progress.empty());
+  EXPECT_EQ(LastError(form), kTimeout);
+
+  form.Download(L"rocket.jpg");
+  EXPECT_TRUE(Contents(L"rocket.jpg") == Contents(kPicture));
+  EXPECT_TRUE(form.events.empty());
+  EXPECT_EQ(LastError(form), kSuccess);
+  DeleteFileW(L"rocket.jpg");
+}
+
+TEST(ListControl, WorksInAnotherContainerAfterItsOwnClosed) {
+  Form form;
+  form.LogOn(TheServer().name);
+  for (const auto wayIn : {ControlContainer::WayIn::kSteps, ControlContainer::WayIn::kQuickActivate}) {
+    ASSERT_TRUE(form.Init(L"*"));
+    form.Show();
+    form.container->Close();
+    EXPECT_EQ(form.Window(), nullptr);
+    ASSERT_EQ(form.container->TakeUp(*form.list, wayIn), S_OK);
+    ASSERT_TRUE(form.Init(L"jpg"));
+    form.Show();
+    EXPECT_EQ(GetParent(form.Window()), form.frame);
+    EXPECT_EQ(SendMessageW(form.ListWindow(), LVM_GETITEMCOUNT, 0, 0), 4);
+
+    form.Download(L"rocket.jpg");
+    EXPECT_TRUE(Contents(L"rocket.jpg") == Contents(kPicture));
+    EXPECT_FALSE(form.progress.empty());
+    DeleteFileW(L"rocket.jpg");
+    VARIANT_BOOL done = VARIANT_FALSE;
+    form.list->UploadImage(Bstr(kPicture), &done);
+    EXPECT_TRUE(done);
+  }
+}
+
+}  // namespace
+}  // namespace tarnwick::test
