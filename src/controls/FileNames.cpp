@@ -79,13 +79,16 @@ Text SizeText(double bytes) {
   return TextFromLatin1({digits, end});
 }
 
-std::int32_t Kilobytes(double bytes) {
-  constexpr double kLimit = std::numeric_limits<std::int32_t>::max();
-  const double exact = std::clamp(bytes / 1024, -kLimit, kLimit);
+std::int32_t RoundHalfToEven(double exact) {
   double whole = std::floor(exact);
   const double rest = exact - whole;
   if (rest > 0.5 || (rest == 0.5 && std::fmod(whole, 2) != 0)) ++whole;
   return static_cast<std::int32_t>(whole);
+}
+
+std::int32_t Kilobytes(double bytes) {
+  constexpr double kLimit = std::numeric_limits<std::int32_t>::max();
+  return RoundHalfToEven(std::clamp(bytes / 1024, -kLimit, kLimit));
 }
 
 }  // namespace tarnwick

@@ -1,4 +1,4 @@
-// How the list shows and compares files.
+// How the controls show and compare files.
 #pragma once
 
 #include <cstdint>
@@ -24,6 +24,9 @@ bool IsNumeric(TextView text);
 
 // `bytes` as a decimal number.
 Text SizeText(double bytes);
+
+// The nearest whole number; of the two that are as near, the even one. `exact` is of 32 bits.
+std::int32_t RoundHalfToEven(double exact);
 
 // Kilobytes, rounded half to even, of at most 2^31 - 1.
 std::int32_t Kilobytes(double bytes);

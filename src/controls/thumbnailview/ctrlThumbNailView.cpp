@@ -1,0 +1,268 @@
+// Construction, listing, pages and their pictures. Selection, renaming and the operations on files are in
+// ctrlThumbNailViewFiles.cpp.
+#include "controls/thumbnailview/ctrlThumbNailView.h"
+
+#include <algorithm>
+#include <limits>
+#include <utility>
+
+#include "controls/FileNames.h"
+#include "platform/FileSystem.h"
+#include "support/PathHelpers.h"
+#include "support/ResourceStrings.h"
+#include "support/RuntimeError.h"
+#include "support/UserFolder.h"
+
+namespace tarnwick {
+namespace {
+
+// Twips.
+constexpr std::int32_t kBoxSide = 1965;
+constexpr double kBoxLeft = 150;
+constexpr double kBoxTop = 180;
+
+constexpr std::uint16_t kNoImagesString = 3582;
+constexpr std::uint16_t kLinkStrings[] = {487, 488, 489};
+
+constexpr std::size_t kCaptionLength = 20;
+
+// side * kBoxSide / longer, rounded half to even.
+std::int32_t Scaled(std::int32_t side, std::int32_t longer) {
+  const std::int64_t product = std::int64_t{side} * kBoxSide;
+  if (product > std::numeric_limits<std::int32_t>::max()) throw RuntimeError(error::kOverflow);
+  if (longer == 0) throw RuntimeError(error::kDivisionByZero);
+  return RoundHalfToEven(static_cast<double>(product) / longer);
+}
+
+}  // namespace
+
+PicturePlace FitImage(std::int32_t height, std::int32_t width) {
+  PicturePlace place{kBoxLeft, kBoxTop, kBoxSide, kBoxSide};
+  if (height <= width) {
+    place.height = Scaled(height, width);
+    place.top += (kBoxSide - place.height) / 2.0;
+  } else {
+    place.width = Scaled(width, height);
+    place.left += (kBoxSide - place.width) / 2.0;
+  }
+  return place;
+}
+
+Text FormatLabelText(TextView name) {
+  Text caption(name);
+  if (caption.size() > kCaptionLength)
+    caption = Text(name.substr(0, 13)) + u"..." + Text(name.substr(name.size() - 4));
+  return ReplaceAll(caption, u"&", u"&&");
+}
+
+ctrlThumbNailView::ctrlThumbNailView(const ControlParts& parts, ThumbnailPage& page)
+    : FileControl(parts, page, TransferEvents::kSilent), page_(page), header_(apartment_.platform.files) {
+  apartment_.shownFiles.Clear();
+}
+
+ctrlThumbNailView::~ctrlThumbNailView() {
+  apartment_.allFiles.Clear();
+  apartment_.shownFiles.Clear();
+  apartment_.listLoaded = false;
+}
+
+// --- Listing ---
+
+bool ctrlThumbNailView::Init(TextView szFileFilter) {
+  return ResultAsItStood(false, [&](bool& done) {
+    const Text filter(szFileFilter);
+    const bool listed = apartment_.listLoaded || List();
+    ResultAsItStood(0, [&](int&) {
+      Text link;
+      for (const std::uint16_t id : kLinkStrings)
+        link += (link.empty() ? u"" : u" ") + GetResourceString(apartment_, id);
+      page_.SetEmptyTexts(GetResourceString(apartment_, kNoImagesString), link);
+    });
+    Show(filter);
+    apartment_.listLoaded = done = listed;
+  });
+}
+
+bool ctrlThumbNailView::List() {
+  apartment_.allFiles.Clear();
+  PrepareUserFolder(apartment_);
+  const std::shared_ptr<CFileUpload> client = mobjFileupload;
+  return client && client->ListFilesForUser([&](const std::shared_ptr<CUpload>& record, TextView key) {
+    apartment_.allFiles.Add(record, key);
+  });
+}
+
+void ctrlThumbNailView::ChangeFileFilter(TextView szFileFilter) {
+  ResultAsItStood(0, [&](int&) {
+    const Text filter(szFileFilter);
+    selectedPath_.clear();
+    keepSelection_ = false;
+    Show(filter);
+  });
+}
+
+bool ctrlThumbNailView::Passes(TextView name) const {
+  const TextView end = name.substr(name.size() - std::min<std::size_t>(name.size(), 3));
+  return apartment_.shownFilter == u"*" || LowerCase(end) == apartment_.shownFilter;
+}
+
+void ctrlThumbNailView::Show(const Text& filter) {
+  const FileList& all = apartment_.allFiles;
+  FileList& shown = apartment_.shownFiles;
+  shown.Clear();
+  apartment_.shownFilter = filter;
+  for (std::size_t i = 1; i <= all.Count(); ++i) {
+    const std::shared_ptr<CUpload>& record = all.At(i);
+    if (!Passes(record->FileName)) continue;
+    // A second file of the same address is not shown.
+    ResultAsItStood(0, [&](int&) { shown.Add(record, record->FilePath); });
+  }
+  SetScrollRange();
+  scrolledBack_ = false;
+  ShowPage(0);
+  UpdateSelection();
+  SetScrollValue(0);
+}
+
+int ctrlThumbNailView::SetScrollRange() {
+  const int count = static_cast<int>(apartment_.shownFiles.Count());
+  // The last page begins with the last row but one; with four pictures or fewer there is one page.
+  const int max = count % 2 != 0 ? count - 3 : count - 4;
+  page_.EnableScroll(count > kSlotCount);
+  page_.SetScrollRange(max);
+  SetScrollValue(0);
+  return max;
+}
+
+void ctrlThumbNailView::SetScrollValue(int value) {
+  page_.SetScrollValue(value);
+  previousScroll_ = value;
+}
+
+// --- Pages ---
+
+void ctrlThumbNailView::ShowPage(int first) {
+  nextPage_ = first;
+  if (fillRuns_) return;
+  fillRuns_ = true;
+  while (nextPage_ && !IsClosed())
+    ResultAsItStood(0, [&](int&) { FillPage(*std::exchange(nextPage_, std::nullopt)); });
+  fillRuns_ = false;
+  // The host may do anything in the event, so the transfers are over before.
+  if (!busy_) return;
+  busy_.reset();
+  Raise(event::kBusy, u"-1");
+}
+
+void ctrlThumbNailView::FillPage(int first) {
+  firstIndex_ = first;
+  for (int slot = 1; slot <= kSlotCount; ++slot) {
+    page_.ClearSlot(slot);
+    PathOf(slot).clear();
+  }
+  const bool empty = apartment_.allFiles.IsEmpty();
+  page_.ShowGrid(!empty);
+  if (empty) {
+    page_.EnableScroll(false);
+    iImgNo = 0;
+    return;
+  }
+  if (scrolledBack_) {
+    // The page that was there must not shine through while this one is fetched.
+    for (int slot = 1; slot <= kSlotCount; ++slot) page_.ShowSlot(slot, false);
+    UpdateSelection();
+  }
+  for (int slot = 1; slot <= kSlotCount; ++slot) {
+    // The list may change in any event of the fill.
+    const std::size_t position = static_cast<std::size_t>(first + slot);
+    if (position > apartment_.shownFiles.Count()) {
+      page_.ShowSlot(slot, false);
+    } else if (!FillSlot(slot, apartment_.shownFiles.At(position))) {
+      return;
+    }
+  }
+  UpdateSelection();
+}
+
+bool ctrlThumbNailView::FillSlot(int slot, const std::shared_ptr<CUpload>& itsRecord) {
+  const std::shared_ptr<CUpload> record = itsRecord;
+  const Text copy = LocalCopyOf(record->FilePath);
+  FileSystem& files = apartment_.platform.files;
+  if (!copy.empty() && !FileExists(files, copy) && !Fetch(slot, *record, copy)) return false;
+  page_.SetCaption(slot, FormatLabelText(record->FileName));
+  PathOf(slot) = record->FilePath;
+  // A picture that cannot be read leaves the caption and an empty square.
+  if (!copy.empty() && FileExists(files, copy)) ResultAsItStood(0, [&](int&) { ShowPicture(slot, copy); });
+  page_.ShowSlot(slot, true);
+  return true;
+}
+
+bool ctrlThumbNailView::Fetch(int slot, const CUpload& record, const Text& copy) {
+  if (!busy_ && TransferRuns()) {
+    // The transfer of the host's has the socket; the page is filled again after it.
+    fillIsOwed_ = true;
+    return true;
+  }
+  if (!busy_) {
+    busy_.emplace(*this);
+    Raise(event::kBusy, u"1");
+    if (IsReplaced()) return false;
+  }
+  page_.SetCaption(slot, u"Downloading " + ReplaceAll(record.FileName, u"&", u"&&"));
+  Download(Text(record.FilePath), {}, copy, [this] { return IsReplaced(); });
+  return !IsReplaced();
+}
+
+void ctrlThumbNailView::ShowPicture(int slot, const Text& copy) {
+  header_.ReadImageInfo(copy);
+  if (header_.ImageType() == kImageUnknown) {
+    // What a server sent in place of the picture; the next page with it asks again.
+    apartment_.platform.files.Remove(copy);
+    return;
+  }
+  page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width()));
+}
+
+void ctrlThumbNailView::TransferEnded() {
+  if (std::exchange(fillIsOwed_, false) && !IsClosed()) ShowPage(firstIndex_);
+}
+
+void ctrlThumbNailView::OnScrollChanged(int value) {
+  ResultAsItStood(0, [&](int&) {
+    page_.EnableScroll(false);
+    scrolledBack_ = value < previousScroll_;
+    previousScroll_ = value;
+    if (value < static_cast<int>(apartment_.shownFiles.Count())) {
+      ShowPage(value);
+      UpdateSelection();
+    }
+    page_.EnableScroll(apartment_.shownFiles.Count() > kSlotCount);
+  });
+}
+
+void ctrlThumbNailView::OnScrollDragged(int value) {
+  ResultAsItStood(0, [&](int&) {
+    if (value == 0) {
+      firstIndex_ = 0;
+      // Other than in OnScrollChanged it is the number of all files that counts.
+    } else if (value < static_cast<int>(apartment_.allFiles.Count())) {
+      ShowPage(value);
+      UpdateSelection();
+    }
+  });
+}
+
+void ctrlThumbNailView::ShowItem(std::size_t position) {
+  const int max = SetScrollRange();
+  const int row = static_cast<int>(position - 1) / 2 * 2;
+  const int first = std::clamp(row, 0, std::max(0, max));
+  selectedPath_ = apartment_.shownFiles.At(position)->FilePath;
+  // The page does not choose a selection of its own.
+  selectionFirstIndex_ = first;
+  SetScrollValue(first);
+  scrolledBack_ = false;
+  ShowPage(first);
+  UpdateSelection();
+}
+
+}  // namespace tarnwick

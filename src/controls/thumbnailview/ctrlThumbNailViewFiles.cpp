@@ -1,0 +1,261 @@
+// Selection, renaming, deleting and what the user does.
+#include <algorithm>
+#include <utility>
+
+#include "controls/FileNames.h"
+#include "controls/thumbnailview/ctrlThumbNailView.h"
+#include "support/PathHelpers.h"
+#include "support/RuntimeError.h"
+#include "support/TransferLists.h"
+
+namespace tarnwick {
+namespace {
+
+constexpr int kEnterKey = 13;
+constexpr int kDeleteKey = 46;
+constexpr int kF2Key = 113;
+constexpr int kF5Key = 116;
+
+// Equal to the address of no picture.
+constexpr TextView kNoPath = u"   ";
+
+// Whether no file may have a name that begins like this: a dot or a blank, or the name of a device.
+bool BeginsUnfit(TextView name) {
+  if (name.empty() || name.front() == u'.' || name.front() == u' ') return true;
+  if (name.size() > 3 && name[3] != u'.') return false;
+  const Text device = LowerCase(name.substr(0, 3));
+  return device == u"con" || device == u"prn" || device == u"aux" || device == u"nul";
+}
+
+// Position of the file of that name in the list, 0 when there is none.
+template <typename Matches>
+std::size_t Find(const FileList& list, const Matches& matches) {
+  for (std::size_t i = 1; i <= list.Count(); ++i)
+    if (matches(*list.At(i))) return i;
+  return 0;
+}
+
+}  // namespace
+
+// --- Selection ---
+
+void ctrlThumbNailView::UpdateSelection() {
+  ResultAsItStood(0, [&](int&) {
+    const FileList& shown = apartment_.shownFiles;
+    if (selectedPath_.empty() && !shown.IsEmpty()) selectedPath_ = shown.At(1)->FilePath;
+    if (firstIndex_ != selectionFirstIndex_ && !keepSelection_ && !shown.IsEmpty()) {
+      const auto position = static_cast<std::size_t>(page_.ScrollValue() + 1);
+      if (position <= shown.Count()) selectedPath_ = shown.At(position)->FilePath;
+      selectionFirstIndex_ = firstIndex_;
+    }
+    if (selectedPath_.empty()) selectedPath_ = kNoPath;
+    int selected = SlotOf(selectedPath_);
+    // Keys act on something: without a selected picture on the page the first slot looks like it.
+    if (selected == 0 && !shown.IsEmpty()) selected = 1;
+    for (int slot = 1; slot <= kSlotCount; ++slot) page_.SetSelected(slot, slot == selected);
+    iImgNo = static_cast<std::int16_t>(selected);
+    page_.Focus();
+  });
+}
+
+int ctrlThumbNailView::SlotOf(TextView path) const {
+  if (Trim(path).empty()) return 0;
+  const auto slot = std::ranges::find(paths_, path);
+  return slot == paths_.end() ? 0 : static_cast<int>(slot - paths_.begin()) + 1;
+}
+
+std::shared_ptr<CUpload> ctrlThumbNailView::SelectedRecord() const {
+  const std::size_t position = apartment_.shownFiles.PositionOf(selectedPath_);
+  return position == 0 ? nullptr : apartment_.shownFiles.At(position);
+}
+
+bool ctrlThumbNailView::ShowsFile(TextView name) const {
+  return Find(apartment_.shownFiles,
+              [&](const CUpload& file) { return EqualsIgnoringCase(file.FileName, name); }) != 0;
+}
+
+void ctrlThumbNailView::UploadedFileSetFocus(TextView szFileName) {
+  ResultAsItStood(0, [&](int&) {
+    const std::size_t position =
+        Find(apartment_.shownFiles, [&](const CUpload& file) { return file.FileName == szFileName; });
+    if (position != 0) ShowItem(position);
+    page_.Focus();
+  });
+}
+
+void ctrlThumbNailView::RaiseSelection() {
+  Raise(event::kClickBegins);
+  Raise(event::kCurrentItem, Text(selectedPath_));
+}
+
+// --- Operations ---
+
+void ctrlThumbNailView::ShowUploaded(const std::shared_ptr<CUpload>& record) {
+  FileList& shown = apartment_.shownFiles;
+  keepSelection_ = true;
+  std::size_t position = Find(shown, [&](const CUpload& file) { return &file == record.get(); });
+  if (position != 0) {
+    SetAddress(shown, position, record->FilePath);
+  } else if (Passes(record->FileName)) {
+    shown.Add(record, record->FilePath);
+    position = shown.Count();
+  }
+  if (position != 0) ShowItem(position);
+}
+
+void ctrlThumbNailView::DeleteFile() {
+  ResultAsItStood(0, [&](int&) {
+    if (deleteRuns_) return;
+    const Hourglass pointer(*this);
+    const std::shared_ptr<CFileUpload> client = mobjFileupload;
+    if (!client) return;
+    if (!CFileUpload::CanDeleteFile()) return Raise(event::kNotAllowed);
+    const std::shared_ptr<CUpload> record = SelectedRecord();
+    if (!record) return Raise(event::kNotSelected);
+    deleteRuns_ = true;
+    const bool deleted = ResultAsItStood(false, [&](bool& gone) {
+      gone = DeleteOnServer(*client, *record);
+      if (gone) RemoveFromTransferLists(apartment_, record->FileName);
+    });
+    deleteRuns_ = false;
+    if (!deleted) return;
+    Raise(event::kDeleted);
+    if (IsClosed()) return;
+    keepSelection_ = false;
+    const std::size_t count = apartment_.shownFiles.Count();
+    if (count == 0) {
+      selectedPath_.clear();
+      SetScrollRange();
+      ShowPage(0);
+      return UpdateSelection();
+    }
+    // The page that was shown, or the one before when that was its last picture; its first picture is
+    // selected.
+    ShowItem(std::min(static_cast<std::size_t>(firstIndex_ / 2 * 2) + 1, count));
+    RaiseSelection();
+  });
+}
+
+void ctrlThumbNailView::ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldName,
+                                    const Text& newName) {
+  FileList& shown = apartment_.shownFiles;
+  const std::size_t position =
+      Find(shown, [&](const CUpload& file) { return &file == record.get() || file.FileName == oldName; });
+  if (position == 0) return;
+  const std::shared_ptr<CUpload> renamed = shown.At(position);
+  if (renamed != record) GiveName(*renamed, newName);
+  SetAddress(shown, position, renamed->FilePath);
+  if (FileNameFromUrl(selectedPath_) == oldName) selectedPath_ = renamed->FilePath;
+  for (int slot = 1; slot <= kSlotCount; ++slot) {
+    if (FileNameFromUrl(PathOf(slot)) != oldName) continue;
+    PathOf(slot) = renamed->FilePath;
+    page_.SetCaption(slot, FormatLabelText(newName));
+  }
+}
+
+void ctrlThumbNailView::SetLabelText(TextView szString) {
+  if (const int slot = SlotOf(selectedPath_)) page_.SetCaption(slot, FormatLabelText(szString));
+}
+
+void ctrlThumbNailView::ValidateFileName(Text& NewString) {
+  ResultAsItStood(0, [&](int&) {
+    const Text edited = std::exchange(editedName_, Text());
+    const Text oldName = edited.empty() ? SelectedFileName() : edited;
+    const auto refuse = [&](std::int16_t code) {
+      SetLabelText(oldName);
+      Raise(code);
+    };
+    NewString = Text(Trim(NewString));
+    if (BeginsUnfit(NewString)) return refuse(event::kNameUnfit);
+    CheckFileExtension(NewString, ExtensionOf(oldName));
+    if (NewString == oldName) return Raise(event::kRenamed);
+    if (Find(apartment_.shownFiles,
+             [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), NewString); }) != 0)
+      return refuse(event::kNameTaken);
+    const Hourglass pointer(*this);
+    if (!Rename(oldName, NewString)) return refuse(event::kRenameFailed);
+    Raise(event::kRenamed);
+  });
+}
+
+// --- What the user does ---
+
+void ctrlThumbNailView::OnSlotPressed(int slot, bool rightButton) {
+  keepSelection_ = false;
+  selectionFirstIndex_ = firstIndex_;
+  selectedPath_ = PathOf(slot);
+  UpdateSelection();
+  RaiseSelection();
+  if (rightButton) Raise(event::kContextMenu, Text(selectedPath_));
+}
+
+void ctrlThumbNailView::OnBackgroundPressed(bool rightButton) {
+  if (rightButton) Raise(event::kContextMenu, Text(selectedPath_));
+}
+
+void ctrlThumbNailView::OnKeyDown(int keyCode) {
+  switch (keyCode) {
+    case kDeleteKey:
+      RaiseSelection();
+      return Raise(event::kDeleteKey, Text(selectedPath_));
+    case kF5Key:
+      return Raise(event::kRefreshKey);
+    case kF2Key:
+      if (!bRenameEnabled) return;
+      Raise(event::kRenameKey);
+      if (const std::shared_ptr<CUpload> record = SelectedRecord();
+          record && SlotOf(selectedPath_) != 0 && !IsClosed()) {
+        editedName_ = record->FileName;
+        page_.ShowEditor(SlotOf(selectedPath_), editedName_);
+      }
+      return;
+    case kEnterKey:
+      RaiseSelection();
+      return Raise(event::kClickEnds, Text(selectedPath_));
+    default:
+      return;
+  }
+}
+
+void ctrlThumbNailView::OnLinkClicked() {
+  Raise(event::kQuickStart, u"Show QST");
+}
+
+void ctrlThumbNailView::OnSwitchView() {
+  Raise(event::kSwitchView, u"5554");
+}
+
+void ctrlThumbNailView::OnEditorEntered() {
+  if (editedName_.empty()) return;
+  Text name = page_.EditorText();
+  // Hiding the editor takes the focus from it, which would end the editing.
+  const Text oldName = std::exchange(editedName_, Text());
+  const bool valid = IsFileNameValid(name);
+  SetLabelText(valid ? name : oldName);
+  page_.HideEditor();
+  page_.Focus();
+  if (!valid) return;
+  editedName_ = oldName;
+  ValidateFileName(name);
+}
+
+void ctrlThumbNailView::OnEditorLeft() {
+  if (std::exchange(editedName_, Text()).empty()) return;
+  page_.HideEditor();
+}
+
+// --- Drag and drop ---
+
+void ctrlThumbNailView::OnFilesEnter() {
+  Raise(event::kDragOver, Text(selectedPath_));
+}
+
+void ctrlThumbNailView::DroppedNoFiles(bool) {
+  Raise(event::kOwnDrop);
+}
+
+bool ctrlThumbNailView::StopsDrop() {
+  return std::exchange(apartment_.abortTransfer, false);
+}
+
+}  // namespace tarnwick
