@@ -5,7 +5,7 @@
 #include <functional>
 #include <string>
 
-#include "fakes/FakeListControl.h"
+#include "fakes/FakeHost.h"
 #include "fakes/FakePlatform.h"
 #include "platform/StreamSocket.h"
 #include "platform/Timer.h"
@@ -52,6 +52,7 @@ struct FakeDownloader : Downloader {
   Transcript& log;
   FakeFiles& files;
   DownloadEvents* events = nullptr;
+  Text url;
   Text target;
   // What happens while a wait sleeps, one entry a wait. When they are used up the watchdog runs out.
   std::deque<std::function<void(FakeDownloader&)>> waits;
@@ -64,9 +65,10 @@ struct FakeDownloader : Downloader {
     next(*this);
   }
   void SetEvents(DownloadEvents* sink) override { events = sink; }
-  void Start(TextView url, TextView explicitTarget) override {
+  void Start(TextView itsUrl, TextView explicitTarget) override {
+    url = itsUrl;
     target = explicitTarget;
-    log.push_back("download " + Utf8FromText(url) + " to " + Utf8FromText(explicitTarget));
+    log.push_back("download " + Utf8FromText(url) + " to " + Utf8FromText(target));
   }
   void Cancel() override { log.emplace_back("cancel"); }
   void RestartWatchdog() override { log.emplace_back("watchdog starts"); }

@@ -262,7 +262,7 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
     log.clear();
     fake.apartment.listingIsCurrent = false;
     account = {{"a.jpg", "1"}, {"b.jpg", "1"}, {"c.jpg", "1"}};
-    ctrlListImage deleting{{fake.apartment, host, uploader, downloader}, view};
+    ctrlListImage deleting{parts, view};
     ASSERT_TRUE(deleting.Init(u"*"));
     for (std::size_t i = 0; i < 3; ++i) view.Select(i, true);
     bool acted = false;

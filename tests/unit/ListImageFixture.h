@@ -1,62 +1,14 @@
-// A list control on an account whose service, pages, host and window are doubles. Everything that happens
-// stands in one transcript.
+// A list control on such an account.
 #pragma once
 
-#include <gtest/gtest.h>
-
-#include <map>
-
 #include "controls/listimage/ctrlListImage.h"
-#include "fakes/FakeListControl.h"
-#include "fakes/FakePlatform.h"
-#include "fakes/FakeTransfers.h"
-#include "transfer/HttpAddress.h"
+#include "fakes/FakeListView.h"
+#include "unit/ControlFixture.h"
 
 namespace tarnwick {
 
-class ListImageTest : public testing::Test {
+class ListImageTest : public ControlTest {
  protected:
-  struct File {
-    std::string name;
-    std::string size;
-  };
-
-  // What the control finds when it is made.
-  bool Prepare() {
-    SessionValues& session = fake.apartment.session;
-    session.serverName = u"h:81";
-    session.userName = u"u@x";
-    session.password = u"p";
-    session.productNumber = 7;
-    fake.registry.InternetSettings()[u"ProxyEnable"] = FakeRegistry::Number(0);
-    fake.strings.own[3582] = u"No pictures.";
-    fake.http.onPost = [this](const FakeHttp::Sent& sent) { Answer(sent); };
-    fake.pump.onYield = [this] { log.emplace_back("yield"); };
-    return true;
-  }
-
-  void Answer(const FakeHttp::Sent& sent) {
-    // "/bv/bin/BVServicePage.asp?Request=NAME&Flag=0"; the first parameter is the enciphered name again.
-    const std::size_t at = sent.target.find('=') + 1;
-    const std::string name = sent.target.substr(at, sent.target.find('&') - at);
-    const std::size_t parameters = sent.body.find('&');
-    log.push_back("ask " + name + " " +
-                  (parameters == std::string::npos ? "" : sent.body.substr(parameters + 1)));
-    const auto answer = name == "ListFilesRequest" ? Listing() : replies[name];
-    fake.http.answers.clear();
-    if (answer != "fails") fake.http.answers.push_back(HttpAnswer{200, answer});
-  }
-  std::string Listing() const {
-    if (listingFails) return "fails";
-    std::string reply = "FileName&FileURL&FileSize&FileDate";
-    for (const File& file : account)
-      reply += "&FileName=" + EscapeFormValue(*TextFromUtf8(file.name)) +
-               "&FileURL=" + EscapeFormValue(u"http://h/u/" + *TextFromUtf8(file.name)) +
-               "&FileSize=" + file.size + "&FileDate=today";
-    return reply;
-  }
-  static std::string AddressOf(const std::string& name) { return "http://h/u/" + name; }
-
   void List(std::vector<File> files, TextView filter = u"*") {
     account = std::move(files);
     fake.apartment.listingIsCurrent = false;
@@ -68,53 +20,9 @@ class ListImageTest : public testing::Test {
     for (std::size_t i = 0; i < control.ItemCount(); ++i) names += Utf8FromText(control.ItemText(i, 0)) + ",";
     return names;
   }
-  std::string Records() const {
-    std::string names;
-    const FileList& all = fake.apartment.allFiles;
-    for (std::size_t i = 1; i <= all.Count(); ++i) names += Utf8FromText(all.At(i)->FileName) + ",";
-    return names;
-  }
-  // Only the lines that the host hears.
-  std::string Events() const {
-    std::string events;
-    for (const std::string& line : log)
-      if (std::isdigit(static_cast<unsigned char>(line[0])) != 0) events += line + ",";
-    return events;
-  }
-  void OnEvent(const std::string& event, const std::function<void()>& action) {
-    host.onEvent = [event, action](const std::string& raised) {
-      if (raised == event) action();
-    };
-  }
-  void ExpectLog(const Transcript& expected) {
-    EXPECT_EQ(log, expected);
-    log.clear();
-  }
-  static void Upload(UploadEvents& events) {
-    events.Initializing();
-    events.Connecting();
-    events.UploadStarted();
-    events.UploadProgress(50, 768);
-    events.ServerProcess();
-    events.UploadComplete();
-    events.ActionComplete();
-  }
 
-  FakePlatform fake;
-  // Answers of the service by request; an empty one lacks every variable, "fails" is a lost connection.
-  std::map<std::string, std::string> replies{{"CanUploadFile", "CanUploadFile=1001"},
-                                             {"FileUploadRequest", "FileURL=http%3A%2F%2Fh%2Fu%2Fnew.jpg"},
-                                             {"DeleteFileRequest", "DeleteStatus=TRUE"},
-                                             {"RenameFileRequest", "lRenameFileStatus=1001"}};
-  std::vector<File> account;
-  bool listingFails = false;
-  Transcript log;
   FakeListView view{log};
-  FakeHost host{log};
-  FakeUploader uploader{log};
-  FakeDownloader downloader{log, fake.files};
-  const bool prepared = Prepare();
-  ctrlListImage control{{fake.apartment, host, uploader, downloader}, view};
+  ctrlListImage control{parts, view};
 };
 
 }  // namespace tarnwick

@@ -327,7 +327,7 @@ TEST_F(ListImageTest, ManyFilesCostTheViewNothing) {
 TEST_F(ListImageTest, EndMakesTheNextControlList) {
   List({{"a.jpg", "1"}});
   {
-    ctrlListImage second{{fake.apartment, host, uploader, downloader}, view};
+    ctrlListImage second{parts, view};
     EXPECT_TRUE(second.Init(u"*"));
     log.clear();
   }

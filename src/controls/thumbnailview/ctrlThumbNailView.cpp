@@ -253,10 +253,12 @@ void ctrlThumbNailView::OnScrollDragged(int value) {
 }
 
 void ctrlThumbNailView::ShowItem(std::size_t position) {
-  const int max = SetScrollRange();
-  const int row = static_cast<int>(position - 1) / 2 * 2;
-  const int first = std::clamp(row, 0, std::max(0, max));
-  selectedPath_ = apartment_.shownFiles.At(position)->FilePath;
+  ShowFrom(static_cast<int>(position - 1) / 2 * 2, position);
+}
+
+void ctrlThumbNailView::ShowFrom(int first, std::optional<std::size_t> position) {
+  first = std::clamp(first, 0, std::max(0, SetScrollRange()));
+  selectedPath_ = apartment_.shownFiles.At(position.value_or(static_cast<std::size_t>(first) + 1))->FilePath;
   // The page does not choose a selection of its own.
   selectionFirstIndex_ = first;
   SetScrollValue(first);

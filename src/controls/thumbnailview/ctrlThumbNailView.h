@@ -90,6 +90,8 @@ class ctrlThumbNailView final : public FileControl {
   void UpdateSelection();
   // Shows the page with the item at that position, counted from 1, and selects it.
   void ShowItem(std::size_t position);
+  // Shows the page that begins at `first`, or the last one, and selects an item, its first one without one.
+  void ShowFrom(int first, std::optional<std::size_t> position);
 
   Text& PathOf(int slot) { return paths_[static_cast<std::size_t>(slot - 1)]; }
   // 0 when the picture is not on the page.

@@ -122,16 +122,13 @@ void ctrlThumbNailView::DeleteFile() {
     Raise(event::kDeleted);
     if (IsClosed()) return;
     keepSelection_ = false;
-    const std::size_t count = apartment_.shownFiles.Count();
-    if (count == 0) {
+    if (apartment_.shownFiles.IsEmpty()) {
       selectedPath_.clear();
       SetScrollRange();
       ShowPage(0);
       return UpdateSelection();
     }
-    // The page that was shown, or the one before when that was its last picture; its first picture is
-    // selected.
-    ShowItem(std::min(static_cast<std::size_t>(firstIndex_ / 2 * 2) + 1, count));
+    ShowFrom(firstIndex_, std::nullopt);
     RaiseSelection();
   });
 }

@@ -1,0 +1,487 @@
+// The thumbnail control: pages, the fetching of their pictures, selection, renaming and the other operations.
+#include "controls/thumbnailview/ctrlThumbNailView.h"
+
+#include <cmath>
+
+#include "fakes/FakeThumbnailPage.h"
+#include "support/RuntimeError.h"
+#include "unit/ControlFixture.h"
+
+namespace tarnwick {
+namespace {
+
+const std::string kGif("GIF89a\x90\x01\xC8\x00\xF7", 11);  // 400 by 200
+
+class ThumbNailTest : public ControlTest {
+ protected:
+  ThumbNailTest() {
+    fake.strings.own[487] = u"Click";
+    fake.strings.own[488] = u"here";
+    fake.strings.own[489] = u"for it";
+    fake.pump.onYield = nullptr;
+  }
+  static Text CopyOf(const std::string& name) { return u"C:\\Temp\\bv\\u@x\\" + *TextFromUtf8(name); }
+  bool HasCopy(const std::string& name) const { return fake.files.files.contains(CopyOf(name)); }
+
+  // The account has files of these names, of which each has its local copy.
+  void List(const std::string& names, TextView filter = u"*") {
+    account.clear();
+    fake.files.files.clear();
+    const Text all = *TextFromUtf8(names);
+    for (const TextView name : Split(all, u' ')) {
+      if (name.empty()) continue;
+      account.push_back({Utf8FromText(name), "1"});
+      fake.files.files[CopyOf(account.back().name)] = {kGif.size(), 0, kGif};
+    }
+    fake.apartment.listLoaded = false;
+    EXPECT_TRUE(control.Init(filter));
+    log.clear();
+  }
+  void ListNumbers(int count) {
+    std::string names;
+    for (int i = 1; i <= count; ++i) names += std::to_string(i) + ".gif ";
+    List(names);
+  }
+  void Scroll(int value) {
+    page.value = value;
+    control.OnScrollChanged(value);
+  }
+  std::string Selected() const {
+    return control.GetSelectedFilesHttpPath() ? Utf8FromText(*control.GetSelectedFilesHttpPath()) : "none";
+  }
+  std::string Shown() const {
+    std::string names;
+    const FileList& shown = fake.apartment.shownFiles;
+    for (std::size_t i = 1; i <= shown.Count(); ++i) names += Utf8FromText(shown.At(i)->FileName) + ",";
+    return names;
+  }
+  // A download that arrives whole.
+  void Arrives(FakeDownloader& from) {
+    from.events->Received(11);
+    fake.files.files[u"C:\\Temp\\bv\\u@x\\" + from.url.substr(from.url.rfind(u'/') + 1)] = {kGif.size(), 0,
+                                                                                            kGif};
+    from.events->Finished();
+  }
+  std::function<void(FakeDownloader&)> Arrival() {
+    return [this](FakeDownloader& from) { Arrives(from); };
+  }
+  std::string Validate(const std::string& name) {
+    log.clear();
+    Text text = *TextFromUtf8(name);
+    control.ValidateFileName(text);
+    return Events();
+  }
+
+  FakeThumbnailPage page{log};
+  ctrlThumbNailView control{parts, page};
+};
+
+// --- Pages ---
+
+TEST_F(ThumbNailTest, Pages) {
+  const struct {
+    int count;
+    bool scrolls;
+    int max;
+    const char* first;
+    const char* last;
+  } kCases[] = {
+      {0, false, -4, "No pictures./Click here for it", "No pictures./Click here for it"},
+      {1, false, -2, "1.gif* ", "1.gif* "},
+      {4, false, 0, "1.gif* 2.gif 3.gif 4.gif ", "1.gif* 2.gif 3.gif 4.gif "},
+      {5, true, 2, "1.gif* 2.gif 3.gif 4.gif ", "3.gif* 4.gif 5.gif "},
+      {6, true, 2, "1.gif* 2.gif 3.gif 4.gif ", "3.gif* 4.gif 5.gif 6.gif "},
+      {8, true, 4, "1.gif* 2.gif 3.gif 4.gif ", "5.gif* 6.gif 7.gif 8.gif "},
+      {9, true, 6, "1.gif* 2.gif 3.gif 4.gif ", "7.gif* 8.gif 9.gif "},
+  };
+  for (const auto& test : kCases) {
+    SCOPED_TRACE(test.count);
+    ListNumbers(test.count);
+    EXPECT_EQ(page.scrolls, test.scrolls);
+    EXPECT_EQ(page.max, test.max);
+    EXPECT_EQ(page.Look(), test.first);
+    if (test.scrolls) Scroll(test.max);
+    EXPECT_EQ(page.Look(), test.last);
+    EXPECT_EQ(page.scrolls, test.scrolls);
+    EXPECT_EQ(Events(), "");
+  }
+}
+
+TEST_F(ThumbNailTest, PagingMovesTheSelection) {
+  ListNumbers(9);
+  control.OnSlotPressed(3, false);
+  EXPECT_EQ(page.Look(), "1.gif 2.gif 3.gif* 4.gif ");
+  EXPECT_EQ(control.iImgNo, 3);
+  Scroll(2);
+  EXPECT_EQ(page.Look(), "3.gif* 4.gif 5.gif 6.gif ");
+  EXPECT_EQ(Selected(), AddressOf("3.gif"));
+  Scroll(0);
+  EXPECT_EQ(Selected(), AddressOf("1.gif"));
+  // The thumb may stand between rows; at the top it shows nothing until it is let go.
+  page.value = 5;
+  control.OnScrollDragged(5);
+  EXPECT_EQ(page.Look(), "6.gif* 7.gif 8.gif 9.gif ");
+  control.OnScrollDragged(0);
+  EXPECT_EQ(page.Look(), "6.gif* 7.gif 8.gif 9.gif ");
+  // The handler of the thumb asks how many files there are in all.
+  control.ChangeFileFilter(u"jpg");
+  fake.apartment.shownFiles.Clear();
+  control.OnScrollDragged(8);
+  EXPECT_EQ(page.Look(), "");
+  EXPECT_EQ(control.iImgNo, 0);
+}
+
+TEST_F(ThumbNailTest, FiltersByTheEndOfTheName) {
+  List("a.GIF b.jpg c.jpeg d.png e.Jpg f", u"gif");
+  EXPECT_EQ(Shown(), "a.GIF,");
+  const struct {
+    TextView filter;
+    const char* shown;
+  } kCases[] = {{u"jpg", "b.jpg,e.Jpg,"},
+                {u"*", "a.GIF,b.jpg,c.jpeg,d.png,e.Jpg,f,"},
+                {u"GIF", ""},
+                {u"png", "d.png,"}};
+  const std::size_t asked = fake.http.sent.size();
+  for (const auto& test : kCases) {
+    control.ChangeFileFilter(test.filter);
+    EXPECT_EQ(Shown(), test.shown);
+  }
+  EXPECT_TRUE(control.Init(u"jpg"));
+  EXPECT_EQ(page.Look(), "b.jpg* e.Jpg ");
+  EXPECT_EQ(fake.http.sent.size(), asked) << "the listing is fetched once";
+}
+
+TEST_F(ThumbNailTest, ListsAgainAfterAFailure) {
+  listingFails = true;
+  EXPECT_FALSE(control.Init(u"*"));
+  EXPECT_EQ(page.Look(), "No pictures./Click here for it");
+  listingFails = false;
+  List("a.gif");
+  EXPECT_EQ(Shown(), "a.gif,");
+  control.mobjFileupload = nullptr;
+  fake.apartment.listLoaded = false;
+  EXPECT_FALSE(control.Init(u"*"));
+}
+
+TEST_F(ThumbNailTest, EndEmptiesTheListsOfAll) {
+  ListNumbers(2);
+  {
+    FakeThumbnailPage other(log);
+    ctrlThumbNailView second(parts, other);
+  }
+  EXPECT_EQ(Records() + Shown(), "");
+  EXPECT_FALSE(fake.apartment.listLoaded);
+}
+
+// --- Places and captions ---
+
+TEST(ThumbNail, FitsPicturesIntoTheSquare) {
+  const struct {
+    std::int32_t height, width;
+    PicturePlace place;
+  } kCases[] = {
+      {200, 400, {150, 671.5, 1965, 982}},  // 982.5, rounded half to even
+      {400, 200, {641.5, 180, 982, 1965}},
+      {1, 1, {150, 180, 1965, 1965}},
+      {1, 65535, {150, 1162.5, 1965, 0}},
+  };
+  for (const auto& test : kCases) {
+    const PicturePlace place = FitImage(test.height, test.width);
+    EXPECT_EQ(place.left, test.place.left);
+    EXPECT_EQ(place.top, test.place.top);
+    EXPECT_EQ(place.width, test.place.width);
+    EXPECT_EQ(place.height, test.place.height);
+  }
+  const auto numberOf = [](std::int32_t height, std::int32_t width) {
+    try {
+      FitImage(height, width);
+      return 0;
+    } catch (const RuntimeError& failure) {
+      return static_cast<int>(failure.Number());
+    }
+  };
+  EXPECT_EQ(numberOf(0, 0), 11);
+  EXPECT_EQ(numberOf(1100000, 1100000), 6);
+}
+
+TEST(ThumbNail, ShortensCaptions) {
+  EXPECT_EQ(FormatLabelText(u"averyveryverylongname.jpeg"), u"averyveryvery...jpeg");
+  EXPECT_EQ(FormatLabelText(u"exactly-twenty-c.jpg"), u"exactly-twenty-c.jpg");
+  EXPECT_EQ(FormatLabelText(u"Tom & Jerry.jpg"), u"Tom && Jerry.jpg");
+  EXPECT_EQ(FormatLabelText(u"0123456789&&&&&&&&&&&.gif"), u"0123456789&&&&&&....gif");
+}
+
+// --- Fetching ---
+
+TEST_F(ThumbNailTest, FetchesWhatIsMissing) {
+  List("a.gif b&b.gif c.gif d.gif");
+  fake.files.files.erase(CopyOf("b&b.gif"));
+  fake.files.files.erase(CopyOf("d.gif"));
+  downloader.waits = {Arrival(), [](FakeDownloader& from) { from.events->Failed(7, u"refused", true); }};
+  control.ChangeFileFilter(u"*");
+  ExpectLog({"caption 1 a.gif", "picture 1", "1234 1", "caption 2 Downloading b&&b.gif",
+             "download http://h/u/b&b.gif to ", "9999 11", "watchdog stops", "caption 2 b&&b.gif",
+             "picture 2", "caption 3 c.gif", "picture 3", "caption 4 Downloading d.gif",
+             "download http://h/u/d.gif to ", "5555 ", "cancel", "watchdog stops", "caption 4 d.gif",
+             "1234 -1"});
+  EXPECT_EQ(page.Look(), "a.gif* b&&b.gif c.gif d.gif! ");
+  EXPECT_FALSE(HasCopy("d.gif")) << "the next page asks again";
+  EXPECT_FALSE(control.m_bTransferInProgress);
+  EXPECT_FALSE(control.gbConnectionFailed);
+  const PicturePlace& place = page.At(2).place;
+  EXPECT_EQ(place.height, 982);
+  EXPECT_EQ(place.top, 671.5);
+}
+
+TEST_F(ThumbNailTest, LeavesAnEmptySquareForWhatIsNoPicture) {
+  List("a.gif b.gif nul.gif");
+  fake.files.files[CopyOf("a.gif")].bytes = "<html>404</html>";
+  fake.files.files[CopyOf("b.gif")].bytes.replace(6, 4, 4, '\0');
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(page.Look(), "a.gif*! b.gif! nul.gif! ") << "the last name is not safe as a local one";
+  EXPECT_EQ(Events(), "");
+  EXPECT_FALSE(HasCopy("a.gif")) << "an error page is not kept for a picture";
+}
+
+TEST_F(ThumbNailTest, PagingReplacesTheFill) {
+  ListNumbers(9);
+  for (int i = 1; i <= 9; ++i) fake.files.files.erase(CopyOf(std::to_string(i) + ".gif"));
+  // The second picture is on its way when the user pages on; the third is never asked for.
+  downloader.waits = {Arrival(), [this](FakeDownloader&) { Scroll(6); }, Arrival(), Arrival(), Arrival()};
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(page.Look(), "7.gif* 8.gif 9.gif ");
+  EXPECT_EQ(Events(), "1234 1,9999 11,9999 11,9999 11,9999 11,1234 -1,");
+  EXPECT_FALSE(HasCopy("2.gif"));
+  EXPECT_FALSE(HasCopy("3.gif"));
+  EXPECT_EQ(Selected(), AddressOf("7.gif"));
+  // Filtering does the same, and so does paging in the event that tells that it begins.
+  downloader.waits = {[this](FakeDownloader&) { control.ChangeFileFilter(u"none"); }};
+  log.clear();
+  Scroll(2);
+  EXPECT_EQ(page.Look(), "");
+  EXPECT_EQ(Events(), "1234 1,1234 -1,");
+  log.clear();
+  OnEvent("1234 1", [this] { control.ChangeFileFilter(u"none"); });
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(Events(), "1234 1,1234 -1,");
+}
+
+TEST_F(ThumbNailTest, RefusesTransfersOfTheHostWhileItFetches) {
+  ListNumbers(1);
+  fake.files.files.erase(CopyOf("1.gif"));
+  const auto refused = [this] {
+    EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
+    EXPECT_EQ(control.m_LastError, ftp_error::kTransferInProgress);
+    EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\x"), u"");
+  };
+  int begun = 0;
+  host.onEvent = [&](const std::string& event) {
+    if (event == "1234 1" || event == "9999 11") {
+      ++begun;
+      refused();
+    }
+  };
+  downloader.waits = {Arrival()};
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(begun, 2);
+  EXPECT_EQ(page.Look(), "1.gif* ");
+}
+
+TEST_F(ThumbNailTest, FillsThePageAfterATransferOfTheHosts) {
+  ListNumbers(6);
+  fake.files.files.erase(CopyOf("6.gif"));
+  downloader.waits = {[this](FakeDownloader& from) {
+                        Scroll(2);
+                        EXPECT_EQ(page.Look(), "3.gif* 4.gif 5.gif 6.gif! ");
+                        Arrives(from);
+                      },
+                      Arrival()};
+  control.DownLoadFileFromServer(u"C:\\x");
+  EXPECT_EQ(page.Look(), "3.gif* 4.gif 5.gif 6.gif ");
+}
+
+TEST_F(ThumbNailTest, ClosingEndsTheWaitAndOpeningAllowsAnother) {
+  ListNumbers(2);
+  fake.files.files.erase(CopyOf("1.gif"));
+  // Closed and opened again before the wait looks: it must end all the same.
+  downloader.waits = {[this](FakeDownloader&) {
+    control.Close();
+    control.Open();
+  }};
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(page.Look(), "1.gif*! 2.gif ");
+  downloader.waits = {[this](FakeDownloader&) { control.Close(); }};
+  control.ChangeFileFilter(u"*");
+  control.Open();
+  downloader.waits = {Arrival()};
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(page.Look(), "1.gif* 2.gif ");
+}
+
+// --- What the user does ---
+
+TEST_F(ThumbNailTest, KeysAndButtons) {
+  ListNumbers(4);
+  const std::string at = AddressOf("1.gif");
+  const struct {
+    const char* name;
+    std::function<void()> action;
+    std::string events;
+  } kCases[] = {
+      {"left", [&] { control.OnSlotPressed(1, false); }, "1022 ,1015 " + at + ","},
+      {"right", [&] { control.OnSlotPressed(1, true); }, "1022 ,1015 " + at + ",1016 " + at + ","},
+      {"left beside", [&] { control.OnBackgroundPressed(false); }, ""},
+      {"right beside", [&] { control.OnBackgroundPressed(true); }, "1016 " + at + ","},
+      {"delete", [&] { control.OnKeyDown(46); }, "1022 ,1015 " + at + ",2222 " + at + ","},
+      {"F5", [&] { control.OnKeyDown(116); }, "7777 ,"},
+      {"F2 while forbidden", [&] { control.OnKeyDown(113); }, ""},
+      {"enter", [&] { control.OnKeyDown(13); }, "1022 ,1015 " + at + ",1024 " + at + ","},
+      {"another key", [&] { control.OnKeyDown(40); }, ""},
+      {"link", [&] { control.OnLinkClicked(); }, "1111 Show QST,"},
+      {"button", [&] { control.OnSwitchView(); }, "5554 5554,"},
+      {"files over it", [&] { control.OnFilesEnter(); }, "1020 " + at + ","},
+  };
+  for (const auto& test : kCases) {
+    SCOPED_TRACE(test.name);
+    log.clear();
+    test.action();
+    EXPECT_EQ(Events(), test.events);
+  }
+}
+
+TEST_F(ThumbNailTest, EditsTheNameInPlace) {
+  ListNumbers(4);
+  control.EnableRename(true);
+  control.OnSlotPressed(2, false);
+  log.clear();
+  control.OnKeyDown(113);
+  ExpectLog({"8888 ", "editor 2 2.gif"});
+  page.edited = u"new & old.jpg";
+  control.OnEditorEntered();
+  const std::string sent = log.size() > 2 ? log[2] : "";
+  EXPECT_NE(sent.find("page rename|http://h:81/users/|2.gif|new & old.gif|"), std::string::npos) << sent;
+  EXPECT_EQ(log.front(), "caption 2 new && old.jpg") << "as it was edited, until it is renamed";
+  EXPECT_EQ(Events(), "1031 ,");
+  EXPECT_EQ(page.Look(), "1.gif new && old.gif* 3.gif 4.gif ");
+  EXPECT_EQ(Shown() + Records(), "1.gif,new & old.gif,3.gif,4.gif,1.gif,new & old.gif,3.gif,4.gif,");
+  EXPECT_EQ(Selected(), AddressOf("new & old.gif"));
+  EXPECT_TRUE(HasCopy("new & old.gif"));
+  EXPECT_FALSE(HasCopy("2.gif"));
+
+  // A refused character restores the caption; leaving the editor changes nothing.
+  log.clear();
+  control.OnKeyDown(113);
+  page.edited = u"a#b.gif";
+  control.OnEditorEntered();
+  ExpectLog({"8888 ", "editor 2 new & old.gif", "1034 ", "caption 2 new && old.gif", "editor hides"});
+  control.OnKeyDown(113);
+  control.OnEditorLeft();
+  control.OnEditorLeft();
+  control.OnEditorEntered();
+  ExpectLog({"8888 ", "editor 2 new & old.gif", "editor hides"});
+}
+
+TEST_F(ThumbNailTest, NamesThatAreRefusedOrTaken) {
+  ListNumbers(3);
+  const struct {
+    const char* name;
+    const char* events;
+  } kCases[] = {{"", "1035 ,"},        {"   ", "1035 ,"},   {".gif", "1035 ,"},    {"CON", "1035 ,"},
+                {"nul.gif", "1035 ,"}, {"1.gif", "1031 ,"}, {" 1.gif ", "1031 ,"}, {"1.jpg", "1031 ,"},
+                {"2.GIF", "1032 ,"},   {"3", "1032 ,"},     {"1.GIF", "1031 ,"}};
+  for (const auto& test : kCases) {
+    SCOPED_TRACE(test.name);
+    EXPECT_EQ(Validate(test.name), test.events);
+    EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif ");
+    for (const std::string& line : log) EXPECT_EQ(line.find("page rename"), std::string::npos);
+  }
+  EXPECT_EQ(Validate("console.gif"), "1031 ,") << "begins like a device, but is none";
+  uploader.error = -2147220881;
+  EXPECT_EQ(Validate("x.gif"), "1033 ,");
+  EXPECT_EQ(page.Look(), "console.gif* 2.gif 3.gif ");
+  uploader.error = 0;
+  replies["RenameFileRequest"] = "lRenameFileStatus=1033";
+  EXPECT_EQ(Validate("x.gif"), "1033 ,");
+  replies["RenameFileRequest"] = "lRenameFileStatus=1001";
+  log.clear();
+  EXPECT_TRUE(control.RenameFile(u"2.gif", u" y.gif "));
+  EXPECT_EQ(Events(), "1031 y.gif,");
+  EXPECT_EQ(page.Look(), "console.gif* y.gif 3.gif ");
+}
+
+// --- Operations ---
+
+TEST_F(ThumbNailTest, DeletesTheSelectedPicture) {
+  ListNumbers(5);
+  Scroll(2);
+  control.OnSlotPressed(3, false);
+  log.clear();
+  control.DeleteFile();
+  EXPECT_EQ(Events(), "1001 ,1022 ,1015 " + AddressOf("1.gif") + ",") << "the page went with its last row";
+  EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
+  EXPECT_EQ(Shown() + Records(), "1.gif,2.gif,3.gif,4.gif,1.gif,2.gif,3.gif,4.gif,");
+  EXPECT_FALSE(HasCopy("5.gif"));
+  EXPECT_FALSE(page.scrolls);
+
+  log.clear();
+  replies["DeleteFileRequest"] = "DeleteStatus=FALSE";
+  control.DeleteFile();
+  EXPECT_EQ(Events(), "");
+  EXPECT_TRUE(HasCopy("1.gif"));
+  replies["DeleteFileRequest"] = "DeleteStatus=TRUE";
+  for (int i = 0; i < 4; ++i) control.DeleteFile();
+  EXPECT_EQ(page.Look(), "No pictures./Click here for it");
+  log.clear();
+  control.DeleteFile();
+  EXPECT_EQ(Events(), "1002 ,");
+}
+
+TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
+  ListNumbers(6);
+  uploader.script = Upload;
+  fake.files.files[u"C:\\new.jpg"] = {kGif.size(), 0, kGif};
+  log.clear();
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(Events(), "9999 0,9999 50,9999 100,1015 " + AddressOf("new.jpg") + ",");
+  EXPECT_EQ(page.Look(), "5.gif 6.gif new.jpg* ");
+  EXPECT_TRUE(HasCopy("new.jpg"));
+  // It stays selected while pages change; where it is not on the page the first slot looks selected.
+  Scroll(0);
+  EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
+  EXPECT_EQ(Selected(), AddressOf("new.jpg"));
+  control.UploadedFileSetFocus(u"2.gif");
+  EXPECT_EQ(page.Look(), "1.gif 2.gif* 3.gif 4.gif ");
+
+  // A picture that replaces one is shown instead of its old copy; what the filter hides is not shown.
+  fake.files.files[u"C:\\new.jpg"].bytes = "GIF89a....";
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(fake.files.files[CopyOf("new.jpg")].bytes, "GIF89a....");
+  EXPECT_EQ(fake.apartment.shownFiles.Count(), 7U);
+  control.ChangeFileFilter(u"gif");
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(fake.apartment.shownFiles.Count(), 6U);
+}
+
+TEST_F(ThumbNailTest, Drops) {
+  struct Data : DragData {
+  } data;
+  std::int32_t effect = 1;
+  const std::vector<Text> files{u"C:\\1.jpg", u"C:\\2.jpg"};
+  const auto drop = [&](const std::vector<Text>& dropped) {
+    log.clear();
+    control.OnDrop(data, dropped, effect, {});
+    return Events();
+  };
+  EXPECT_EQ(drop(files), "1023 C:\\1.jpg,1023 C:\\2.jpg,1023 ,");
+  EXPECT_EQ(drop({}), "1021 ,");
+  OnEvent("1023 C:\\1.jpg", [this] { control.mobjFileupload->AbortFileTransfer(true); });
+  EXPECT_EQ(drop(files), "1023 C:\\1.jpg,1023 ,");
+  EXPECT_FALSE(fake.apartment.abortTransfer);
+  std::int32_t allowed = 1;
+  control.OnStartDrag(data, allowed);
+  EXPECT_EQ(drop(files), "1021 ,") << "a picture dropped on its own page is none to upload";
+  control.OnCompleteDrag(0);
+}
+
+}  // namespace
+}  // namespace tarnwick
