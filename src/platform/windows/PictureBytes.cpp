@@ -1,0 +1,368 @@
+#include "platform/windows/PictureBytes.h"
+
+#include <algorithm>
+#include <array>
+#include <cstring>
+#include <string_view>
+
+namespace tarnwick {
+namespace {
+
+using Bytes = std::span<const std::uint8_t>;
+
+bool StartsWith(Bytes bytes, std::string_view text) {
+  return bytes.size() >= text.size() && std::memcmp(bytes.data(), text.data(), text.size()) == 0;
+}
+
+std::uint32_t BigEndian(Bytes bytes) {
+  std::uint32_t value = 0;
+  for (const std::uint8_t byte : bytes) value = (value << 8) | byte;
+  return value;
+}
+
+std::uint32_t LittleEndian(Bytes bytes) {
+  std::uint32_t value = 0;
+  for (std::size_t i = bytes.size(); i-- > 0;) value = (value << 8) | bytes[i];
+  return value;
+}
+
+bool Shown(std::uint64_t width, std::uint64_t height) {
+  return width > 0 && height > 0 && width <= kMostPixels && height <= kMostPixels &&
+         width * height <= kMostPixels;
+}
+
+PictureFacts Whole(PictureFormat format, std::uint32_t width, std::uint32_t height) {
+  PictureFacts facts;
+  facts.format = format;
+  facts.width = facts.frameWidth = width;
+  facts.height = facts.frameHeight = height;
+  return facts;
+}
+
+// Parts of a file, moved to its front one after the other.
+class Kept {
+ public:
+  explicit Kept(std::span<std::uint8_t> file) : file_(file) {}
+
+  // Parts are kept in their order, and do not overlap.
+  void Keep(std::size_t begin, std::size_t end) {
+    if (begin != length_) std::memmove(file_.data() + length_, file_.data() + begin, end - begin);
+    length_ += end - begin;
+  }
+  // There is room: something was left out, or the file was longer.
+  void Append(std::uint8_t byte) { file_[length_++] = byte; }
+  std::size_t Length() const { return length_; }
+
+ private:
+  std::span<std::uint8_t> file_;
+  std::size_t length_ = 0;
+};
+
+// ---- PNG -----------------------------------------------------------------------------------------------------
+
+// The smallest pieces that programs write are of about 8 KiB, or of a line; this is more than either needs.
+constexpr int kMostPngChunks = 200'000;
+
+std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
+  constexpr std::size_t kSignature = 8;
+  constexpr std::size_t kAround = 12;  // length and name before the data, the check sum behind it
+  constexpr std::size_t kHeaderEnd = kSignature + kAround + 13;
+  if (file.size() < kHeaderEnd || !StartsWith(file.subspan(kSignature + 4), "IHDR")) return {};
+  const std::uint32_t width = BigEndian(file.subspan(16, 4));
+  const std::uint32_t height = BigEndian(file.subspan(20, 4));
+  if (!Shown(width, height)) return {};
+  const unsigned depth = file[24];
+  const unsigned colorType = file[25];
+  const unsigned channels = (colorType & 1) != 0 ? 1 : ((colorType & 2) != 0 ? 3 : 1) + (colorType >> 2 & 1);
+  // A line begins with its filter. What unpacks to four bytes a pixel is within the decoder's bound.
+  const std::uint64_t unpacked = (std::uint64_t{width} * channels * depth / 8 + 2) * height;
+  if (std::uint64_t{width} * height * channels * depth / 8 > 4 * kMostPixels) return {};
+
+  Kept kept(file);
+  kept.Keep(0, kSignature);
+  std::uint64_t packed = 0;
+  int chunks = 0;
+  for (std::size_t at = kSignature; file.size() - at >= kAround;) {
+    const std::uint32_t length = BigEndian(file.subspan(at, 4));
+    const Bytes name = file.subspan(at + 4, 4);
+    const bool data = StartsWith(name, "IDAT");
+    const bool last = StartsWith(name, "IEND");
+    if (length > file.size() - at - kAround) return {};
+    const std::size_t end = at + kAround + length;
+    if ((data && length > 0) || last || StartsWith(name, "IHDR") || StartsWith(name, "PLTE") ||
+        StartsWith(name, "tRNS")) {
+      kept.Keep(at, end);
+      ++chunks;
+    }
+    if (data) packed += length;
+    at = end;
+    if (last) break;
+  }
+  // Packing adds next to nothing to what cannot be made smaller. More is blocks that unpack to nothing.
+  if (chunks > kMostPngChunks || packed > unpacked + unpacked / 16 + 4096) return {};
+  PictureFacts facts = Whole(PictureFormat::kPng, width, height);
+  facts.length = kept.Length();
+  return facts;
+}
+
+// ---- GIF -----------------------------------------------------------------------------------------------------
+
+// A decoder empties its table of 4,096 entries with each clear code.
+constexpr std::uint64_t kMostClearCodes = 500'000;
+
+// Reads the codes of a picture as a decoder does, without what they stand for.
+class GifCodes {
+ public:
+  explicit GifCodes(unsigned codeSize) : codeSize_(codeSize) { Clear(); }
+
+  // False when there are too many clear codes.
+  bool Read(Bytes block) {
+    for (const std::uint8_t byte : block) {
+      bits_ |= std::uint32_t{byte} << count_;
+      count_ += 8;
+      while (count_ >= width_ && !ended_) {
+        const std::uint32_t code = bits_ & ((1U << width_) - 1);
+        bits_ >>= width_;
+        count_ -= width_;
+        if (code == 1U << codeSize_) {
+          Clear();
+          if (++clears_ > kMostClearCodes) return false;
+        } else if (code == (1U << codeSize_) + 1) {
+          ended_ = true;
+        } else if (next_ <= 4096 && ++next_ > 1U << width_ && width_ < 12) {
+          ++width_;
+        }
+      }
+      if (ended_) return true;
+    }
+    return true;
+  }
+
+ private:
+  void Clear() {
+    width_ = codeSize_ + 1;
+    next_ = (1U << codeSize_) + 2;
+  }
+
+  unsigned codeSize_;
+  unsigned width_ = 0;
+  std::uint32_t next_ = 0;
+  std::uint32_t bits_ = 0;
+  unsigned count_ = 0;
+  std::uint64_t clears_ = 0;
+  bool ended_ = false;
+};
+
+std::optional<PictureFacts> ReduceGif(std::span<std::uint8_t> file) {
+  constexpr std::size_t kHeader = 13;
+  if (file.size() < kHeader) return {};
+  const auto tableBytes = [](unsigned flags) {
+    return (flags & 0x80) != 0 ? std::size_t{3} << ((flags & 7) + 1) : std::size_t{0};
+  };
+  Kept kept(file);
+  std::size_t at = kHeader + tableBytes(file[10]);
+  if (at > file.size()) return {};
+  kept.Keep(0, at);
+
+  // Blocks of up to 255 bytes, each with its length before it; the end of the empty one that ends them.
+  const auto blocksEnd = [&](std::size_t begin, GifCodes* codes) -> std::size_t {
+    while (begin < file.size()) {
+      const std::size_t length = file[begin];
+      const std::size_t end = begin + 1 + length;
+      if (end > file.size()) return 0;
+      if (length == 0) return end;
+      if (codes && !codes->Read(file.subspan(begin + 1, length))) return 0;
+      begin = end;
+    }
+    return 0;
+  };
+
+  // The last control block before the picture says which colour is transparent.
+  std::size_t control = 0;
+  std::size_t controlEnd = 0;
+  while (at + 2 <= file.size() && file[at] == 0x21) {
+    const std::size_t end = blocksEnd(at + 2, nullptr);
+    if (end == 0) return {};
+    if (file[at + 1] == 0xF9) {
+      control = at;
+      controlEnd = end;
+    }
+    at = end;
+  }
+  constexpr std::size_t kDescriptor = 10;
+  if (file.size() - at < kDescriptor || file[at] != 0x2C) return {};
+  PictureFacts facts;
+  facts.format = PictureFormat::kGif;
+  facts.left = LittleEndian(file.subspan(at + 1, 2));
+  facts.top = LittleEndian(file.subspan(at + 3, 2));
+  facts.frameWidth = LittleEndian(file.subspan(at + 5, 2));
+  facts.frameHeight = LittleEndian(file.subspan(at + 7, 2));
+  // A first picture that is larger than the whole makes the whole larger.
+  facts.width = std::max(LittleEndian(file.subspan(6, 2)), facts.left + facts.frameWidth);
+  facts.height = std::max(LittleEndian(file.subspan(8, 2)), facts.top + facts.frameHeight);
+  if (!Shown(facts.width, facts.height) || !Shown(facts.frameWidth, facts.frameHeight)) return {};
+
+  const std::size_t codeSizeAt = at + kDescriptor + tableBytes(file[at + 9]);
+  if (codeSizeAt >= file.size() || file[codeSizeAt] < 1 || file[codeSizeAt] > 8) return {};
+  GifCodes codes(file[codeSizeAt]);
+  const std::size_t end = blocksEnd(codeSizeAt + 1, &codes);
+  if (end == 0 || end == file.size()) return {};
+  kept.Keep(control, controlEnd);
+  kept.Keep(at, end);
+  kept.Append(0x3B);
+  facts.length = kept.Length();
+  return facts;
+}
+
+// ---- JPEG ----------------------------------------------------------------------------------------------------
+
+// Tables of all scans together. A scan of a camera's or an image program's picture has about 1 KiB.
+constexpr std::size_t kMostJpegTables = 1'000'000;
+
+// A decoder goes over the whole picture with each scan. Programs write 10 for colour, some up to 20.
+constexpr int kMostJpegScans = 40;
+
+std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
+  Kept kept(file);
+  kept.Keep(0, 2);
+  std::optional<PictureFacts> facts;
+  std::size_t tables = 0;
+  int scans = 0;
+  bool progressive = false;
+  unsigned components = 0;
+  for (std::size_t at = 2;;) {
+    // Up to the next marker: 0xFF, repeated at will, and its number.
+    const auto* mark = static_cast<const std::uint8_t*>(std::memchr(file.data() + at, 0xFF, file.size() - at));
+    if (!mark) return {};
+    at = static_cast<std::size_t>(mark - file.data());
+    while (at < file.size() && file[at] == 0xFF) ++at;
+    if (at == file.size()) return {};
+    const std::uint8_t marker = file[at++];
+    if (marker == 0xD9) {
+      at -= 2;
+      kept.Keep(at, at + 2);
+      break;
+    }
+    if (marker <= 0x01 || (marker >= 0xD0 && marker <= 0xD8)) continue;
+    if (file.size() - at < 2) return {};
+    const std::size_t length = BigEndian(file.subspan(at, 2));
+    if (length < 2 || length > file.size() - at) return {};
+    const std::size_t begin = at - 2;
+    const Bytes data = file.subspan(at + 2, length - 2);
+    at += length;
+    // All but the application's data and comments. Of those two tell how colours are meant.
+    const bool jfif = marker == 0xE0;
+    const bool adobe = marker == 0xEE;
+    if (((marker & 0xF0) == 0xE0 && !jfif && !adobe) || marker == 0xFE) continue;
+    tables += length;
+    if (tables > kMostJpegTables) return {};
+    if (marker >= 0xC0 && marker <= 0xCF && marker != 0xC4 && marker != 0xC8 && marker != 0xCC) {
+      if (facts || data.size() < 6) return {};
+      facts = Whole(PictureFormat::kJpeg, BigEndian(data.subspan(3, 2)), BigEndian(data.subspan(1, 2)));
+      if (!Shown(facts->width, facts->height)) return {};
+      components = data[5];
+      progressive = marker == 0xC2;
+    }
+    kept.Keep(begin, at);
+    if (marker != 0xDA) continue;
+
+    if (!facts || data.empty() || ++scans > kMostJpegScans) return {};
+    if (!progressive && data[0] == components) {
+      // One scan has it all; the decoder stops at its end.
+      kept.Keep(at, file.size());
+      break;
+    }
+    // The coded data: up to a marker that is neither a stuffed 0xFF nor a restart.
+    const std::size_t codes = at;
+    for (;;) {
+      mark = static_cast<const std::uint8_t*>(std::memchr(file.data() + at, 0xFF, file.size() - at));
+      if (!mark || mark + 1 == file.data() + file.size()) return {};
+      at = static_cast<std::size_t>(mark - file.data());
+      const std::uint8_t next = file[at + 1];
+      if (next != 0xFF && next != 0 && (next < 0xD0 || next > 0xD7)) break;
+      at += next == 0xFF ? 1 : 2;
+    }
+    kept.Keep(codes, at);
+  }
+  if (!facts || scans == 0) return {};
+  facts->length = kept.Length();
+  return facts;
+}
+
+// ---- BMP -----------------------------------------------------------------------------------------------------
+
+// True when the run-length code fills every line of the picture. A decoder may leave what is skipped as it found
+// the memory.
+bool FillsAll(Bytes code, std::uint32_t width, std::uint32_t height, unsigned bits) {
+  std::uint32_t x = 0;
+  std::uint32_t y = 0;
+  for (std::size_t at = 0; code.size() - at >= 2;) {
+    const std::uint32_t count = code[at];
+    const std::uint32_t value = code[at + 1];
+    at += 2;
+    if (count > 0) {
+      x += count;
+    } else if (value == 0 && x == width) {
+      x = 0;
+      ++y;
+    } else if (value == 1) {
+      return y == height || (y + 1 == height && x == width);
+    } else if (value >= 3) {
+      x += value;
+      // Pixels as they are, filled up to 16 bits.
+      const std::size_t length = (std::size_t{value} * bits + 15) / 16 * 2;
+      if (length > code.size() - at) return false;
+      at += length;
+    } else {
+      return false;
+    }
+    if (x > width || y > height || (y == height && x > 0)) return false;
+  }
+  return y == height || (y + 1 == height && x == width);
+}
+
+std::optional<PictureFacts> ReduceBmp(std::span<std::uint8_t> file) {
+  constexpr std::size_t kFileHeader = 14;
+  if (file.size() < kFileHeader + 12) return {};
+  const std::uint32_t offset = LittleEndian(file.subspan(10, 4));
+  const std::uint32_t headerSize = LittleEndian(file.subspan(14, 4));
+  std::uint32_t width = 0;
+  std::uint32_t height = 0;
+  std::uint32_t bits = 0;
+  std::uint32_t compression = 0;
+  if (headerSize == 12) {
+    width = LittleEndian(file.subspan(18, 2));
+    height = LittleEndian(file.subspan(20, 2));
+    bits = LittleEndian(file.subspan(24, 2));
+  } else {
+    if (headerSize < 40 || file.size() < kFileHeader + 40) return {};
+    width = LittleEndian(file.subspan(18, 4));
+    height = LittleEndian(file.subspan(22, 4));
+    // Negative when the lines come from the top.
+    if ((height & 0x80000000U) != 0) height = 0U - height;
+    bits = LittleEndian(file.subspan(28, 2));
+    compression = LittleEndian(file.subspan(30, 4));
+  }
+  if (!Shown(width, height) || bits > 32 || offset > file.size()) return {};
+  if (compression == 1 || compression == 2) {
+    if (!FillsAll(file.subspan(offset), width, height, compression == 1 ? 8 : 4)) return {};
+  } else {
+    const std::uint64_t stride = (std::uint64_t{width} * bits + 31) / 32 * 4;
+    if (stride * height > file.size() - offset) return {};
+  }
+  PictureFacts facts = Whole(PictureFormat::kBmp, width, height);
+  facts.length = file.size();
+  return facts;
+}
+
+}  // namespace
+
+std::optional<PictureFacts> ReducePicture(std::span<std::uint8_t> file) {
+  if (StartsWith(file, "\x89PNG\r\n\x1A\n")) return ReducePng(file);
+  if (StartsWith(file, "GIF87a") || StartsWith(file, "GIF89a")) return ReduceGif(file);
+  if (StartsWith(file, "\xFF\xD8\xFF")) return ReduceJpeg(file);
+  if (StartsWith(file, "BM")) return ReduceBmp(file);
+  return {};
+}
+
+}  // namespace tarnwick

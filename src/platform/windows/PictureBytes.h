@@ -1,0 +1,41 @@
+// What stands in the bytes of a picture file, looked at before a decoder gets them. A decoder believes what a
+// file says: it reserves the memory and takes the time that a few bytes ask for. So files that claim too much
+// are refused here, and what does not make the pixels (thumbnails in thumbnails, profiles, comments, the further
+// pictures of an animation) is left out.
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <optional>
+#include <span>
+
+namespace tarnwick {
+
+// A picture of 64 megapixels is shown, a larger one is not: a decoder holds four bytes a pixel.
+inline constexpr std::uint64_t kMostPixels = 64'000'000;
+
+// The largest file that is read: that many uncompressed pixels of four bytes, and headers. Whatever is larger
+// is no picture within that limit, or has more than a quarter of a gigabyte beside it.
+inline constexpr std::uint64_t kMostPictureBytes = 4 * kMostPixels + 1'000'000;
+
+enum class PictureFormat { kPng, kGif, kJpeg, kBmp };
+
+struct PictureFacts {
+  PictureFormat format = PictureFormat::kBmp;
+  // The whole picture, in pixels.
+  std::uint32_t width = 0;
+  std::uint32_t height = 0;
+  // What the decoder calls the picture; smaller than the whole only where a GIF's first picture covers a part.
+  std::uint32_t left = 0;
+  std::uint32_t top = 0;
+  std::uint32_t frameWidth = 0;
+  std::uint32_t frameHeight = 0;
+  // The first so many bytes are a file with all that makes the picture.
+  std::size_t length = 0;
+};
+
+// Looks at a whole file and moves what makes the picture to its front. Empty when it is none of the four
+// formats or is refused. Each byte is looked at once at most.
+std::optional<PictureFacts> ReducePicture(std::span<std::uint8_t> file);
+
+}  // namespace tarnwick

@@ -1,0 +1,636 @@
+// The thumbnail page's window: what it tells of real messages, what it looks like, and that it may end inside
+// any of them.
+#include "platform/windows/WindowsHeaders.h"
+
+#include <gtest/gtest.h>
+#include <objbase.h>
+
+#include <functional>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "platform/windows/AnsiText.h"
+#include "platform/windows/WindowsScrollHook.h"
+#include "platform/windows/WindowsThumbnailPage.h"
+
+namespace tarnwick {
+namespace {
+
+// Writes down what it is told, and does what a test wants in it.
+class ScriptedUser : public ThumbnailPageUser {
+ public:
+  std::vector<std::string> told;
+  std::function<void(const std::string&)> on;
+  bool tellsFocus = false;
+
+  void SlotPressed(int slot, bool right) override {
+    Tell("slot " + std::to_string(slot) + (right ? " right" : ""));
+  }
+  void BackgroundPressed(bool right) override { Tell(right ? "background right" : "background"); }
+  void KeyPressed(int key) override { Tell("key " + std::to_string(key)); }
+  void ScrollChanged(int value) override { Tell("changed " + std::to_string(value)); }
+  void ScrollDragged(int value) override { Tell("dragged " + std::to_string(value)); }
+  void LinkClicked() override { Tell("link"); }
+  void SwitchViewClicked() override { Tell("switch"); }
+  void EditorEntered() override { Tell("entered"); }
+  void EditorLeft() override { Tell("left"); }
+  void DragBegins() override { Tell("drag"); }
+  void GotFocus() override {
+    if (tellsFocus) Tell("focus");
+  }
+
+  // What was told since the last time.
+  std::vector<std::string> Take() { return std::exchange(told, {}); }
+
+ private:
+  void Tell(const std::string& what) {
+    told.push_back(what);
+    // A copy: the test may take the function away inside of it.
+    if (const auto does = on) does(what);
+  }
+};
+
+using Told = std::vector<std::string>;
+
+void Pump() {
+  MSG message = {};
+  while (PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) {
+    TranslateMessage(&message);
+    DispatchMessageW(&message);
+  }
+}
+
+std::wstring NameOf(HWND window) {
+  std::wstring text(200, L'\0');
+  text.resize(static_cast<std::size_t>(GetWindowTextW(window, text.data(), static_cast<int>(text.size()))));
+  return text;
+}
+
+std::wstring ClassOf(HWND window) {
+  std::wstring name(50, L'\0');
+  name.resize(static_cast<std::size_t>(GetClassNameW(window, name.data(), static_cast<int>(name.size()))));
+  return name;
+}
+
+std::vector<HWND> ChildrenOf(HWND parent) {
+  std::vector<HWND> children;
+  for (HWND child = GetWindow(parent, GW_CHILD); child; child = GetWindow(child, GW_HWNDNEXT))
+    children.push_back(child);
+  return children;
+}
+
+RECT PlaceOf(HWND window) {
+  RECT place = {};
+  GetWindowRect(window, &place);
+  MapWindowPoints(nullptr, GetParent(window), reinterpret_cast<POINT*>(&place), 2);
+  return place;
+}
+
+bool Inside(const RECT& inner, const RECT& outer) {
+  return inner.left >= outer.left && inner.top >= outer.top && inner.right <= outer.right &&
+         inner.bottom <= outer.bottom && inner.left < inner.right && inner.top < inner.bottom;
+}
+
+bool Same(const RECT& one, const RECT& other) {
+  return EqualRect(&one, &other) != FALSE;
+}
+
+bool Overlap(const RECT& one, const RECT& other) {
+  RECT common = {};
+  return IntersectRect(&common, &one, &other) != FALSE;
+}
+
+// A picture of one colour, in the temporary folder.
+class PictureFile {
+ public:
+  explicit PictureFile(COLORREF color) {
+    wchar_t folder[MAX_PATH] = {};
+    GetTempPathW(MAX_PATH, folder);
+    path_ = std::wstring(folder) + L"thumbnail-test.bmp";
+    // File header, information header, one pixel of 24 bits and its padding.
+    unsigned char bytes[58] = {'B', 'M', 58, 0, 0, 0, 0, 0, 0, 0, 54, 0, 0, 0,  40,
+                               0,   0,   0,  1, 0, 0, 0, 1, 0, 0, 0,  1, 0, 24, 0};
+    bytes[54] = GetBValue(color);
+    bytes[55] = GetGValue(color);
+    bytes[56] = GetRValue(color);
+    const FileOwner file(CreateFileW(path_.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr));
+    DWORD written = 0;
+    WriteFile(file.Get(), bytes, sizeof bytes, &written, nullptr);
+  }
+  ~PictureFile() { DeleteFileW(path_.c_str()); }
+  PictureFile(const PictureFile&) = delete;
+  PictureFile& operator=(const PictureFile&) = delete;
+  Text Path() const { return TextFromWide(path_); }
+
+ private:
+  std::wstring path_;
+};
+
+constexpr PicturePlace kWholeSquare = {150, 180, 1965, 1965};
+
+class ThumbnailPageTest : public testing::Test {
+ protected:
+  ThumbnailPageTest() {
+    CoInitialize(nullptr);
+    top_ = CreateWindowExW(0, L"STATIC", L"host", WS_POPUP | WS_VISIBLE, 0, 0, 600, 600, nullptr, nullptr,
+                           nullptr, nullptr);
+    other_ = CreateWindowExW(0, L"EDIT", L"", WS_CHILD | WS_VISIBLE, 0, 0, 10, 10, top_, nullptr, nullptr,
+                             nullptr);
+    Make();
+  }
+  ~ThumbnailPageTest() override {
+    page_.reset();
+    Pump();
+    DestroyWindow(top_);
+    CoUninitialize();
+  }
+
+  // A page in the host's window, with a grid of three pictures and a scroll bar from 0 to 6.
+  void Make() {
+    page_ = std::make_unique<WindowsThumbnailPage>(GetModuleHandleW(nullptr), user_);
+    page_->ShowGrid(true);
+    page_->SetEmptyTexts(u"There are no images.", u"Click here");
+    for (int slot = 1; slot < kSlotCount; ++slot) {
+      page_->SetCaption(slot, u"picture " + TextFromNumber(slot) + u".gif");
+      page_->SetPicture(slot, file_.Path(), kWholeSquare);
+    }
+    page_->SetScrollRange(6);
+    Place(page_->Window());
+    page_->Focus();
+  }
+  void Place(HWND window) {
+    const RECT size = layout::Pixels(layout::kPage, Dpi());
+    SetParent(window, top_);
+    MoveWindow(window, 0, 0, size.right, size.bottom, TRUE);
+    ShowWindow(window, SW_SHOW);
+  }
+
+  static int Dpi() {
+    const HDC screen = GetDC(nullptr);
+    const int dpi = GetDeviceCaps(screen, LOGPIXELSX);
+    ReleaseDC(nullptr, screen);
+    return dpi;
+  }
+  HWND Child(const wchar_t* className) const {
+    return FindWindowExW(page_->Window(), nullptr, className, nullptr);
+  }
+  HWND Grid() const { return Child(L"Static"); }
+  HWND ScrollBar() const { return Child(L"ScrollBar"); }
+  HWND Link() const { return Child(L"Button"); }
+  HWND Switch() const { return FindWindowExW(page_->Window(), Link(), L"Button", nullptr); }
+  HWND Editor() const { return FindWindowExW(Grid(), nullptr, L"Edit", nullptr); }
+  // The slots are the statics behind the editor.
+  HWND Slot(int slot) const {
+    HWND window = Editor();
+    for (int i = 0; i < slot; ++i) window = FindWindowExW(Grid(), window, L"Static", nullptr);
+    return window;
+  }
+  void Scroll(int code, int position = 0) const {
+    SendMessageW(page_->Window(), WM_VSCROLL, MAKEWPARAM(code, position),
+                 reinterpret_cast<LPARAM>(ScrollBar()));
+  }
+  static LPARAM At(int x, int y) { return MAKELPARAM(x, y); }
+
+  PictureFile file_{RGB(200, 30, 90)};
+  ScriptedUser user_;
+  HWND top_ = nullptr;
+  HWND other_ = nullptr;
+  std::unique_ptr<WindowsThumbnailPage> page_;
+};
+
+// --- What it shows ---
+
+TEST(ThumbnailLayout, FitsAtEveryResolution) {
+  for (const int dpi : {96, 120, 144, 168, 192}) {
+    SCOPED_TRACE(dpi);
+    const auto pixels = [&](const layout::TwipRect& area) { return layout::Pixels(area, dpi); };
+    const RECT page = pixels(layout::kPage);
+    EXPECT_EQ(MulDiv(WindowsThumbnailPage::kNaturalExtent.cx, dpi, 2540), page.right);
+    EXPECT_EQ(MulDiv(WindowsThumbnailPage::kNaturalExtent.cy, dpi, 2540), page.bottom);
+
+    const std::vector<RECT> apart = {pixels(layout::kFrames[0]), pixels(layout::kFrames[1]),
+                                     pixels(layout::kFrames[2]), pixels(layout::kFrames[3]),
+                                     pixels(layout::kScrollBar), pixels(layout::kButton)};
+    for (std::size_t i = 0; i < apart.size(); ++i) {
+      EXPECT_TRUE(Inside(apart[i], page)) << i;
+      for (std::size_t k = 0; k < i; ++k) EXPECT_FALSE(Overlap(apart[i], apart[k])) << i << " and " << k;
+    }
+    for (const layout::TwipRect& frame : layout::kFrames)
+      EXPECT_TRUE(Inside(pixels(frame), pixels(layout::kGrid)));
+    EXPECT_TRUE(Inside(pixels(layout::kMessage), page));
+    EXPECT_TRUE(Inside(pixels(layout::kLink), page));
+    EXPECT_FALSE(Overlap(pixels(layout::kMessage), pixels(layout::kLink)));
+    EXPECT_FALSE(Overlap(pixels(layout::kLink), pixels(layout::kButton)));
+
+    const RECT frame = {0, 0, apart[0].right - apart[0].left, apart[0].bottom - apart[0].top};
+    const RECT picture = pixels(layout::kPicture);
+    EXPECT_TRUE(Inside(picture, pixels(layout::kMarker)));
+    EXPECT_TRUE(Inside(pixels(layout::kMarker), frame));
+    EXPECT_TRUE(Inside(pixels(layout::kCaption), frame));
+    EXPECT_FALSE(Overlap(pixels(layout::kCaption), pixels(layout::kMarker)));
+    EXPECT_NEAR(picture.left, 150.0 * dpi / 1440, 0.5);
+    EXPECT_NEAR(picture.top, 180.0 * dpi / 1440, 0.5);
+    EXPECT_NEAR(picture.right - picture.left, 1965.0 * dpi / 1440, 1);
+    EXPECT_NEAR(picture.bottom - picture.top, 1965.0 * dpi / 1440, 1);
+
+    // Two lines of a caption, in the size of the system's small font.
+    const HDC dc = CreateCompatibleDC(nullptr);
+    const FontOwner font(CreateFontW(-MulDiv(8, dpi, 72), 0, 0, 0, FW_NORMAL, FALSE, FALSE, FALSE,
+                                     DEFAULT_CHARSET, 0, 0, 0, 0, L"Tahoma"));
+    const HGDIOBJ old = SelectObject(dc, font.Get());
+    TEXTMETRICW metrics = {};
+    GetTextMetricsW(dc, &metrics);
+    SelectObject(dc, old);
+    DeleteDC(dc);
+    const RECT caption = pixels(layout::kCaption);
+    EXPECT_LE(2 * metrics.tmHeight + 2 * layout::Pixels(15, dpi), caption.bottom - caption.top);
+  }
+}
+
+TEST_F(ThumbnailPageTest, WindowsStandAsLaidOutAndHaveNames) {
+  const auto expectFit = [&](HWND parent) {
+    const std::vector<HWND> children = ChildrenOf(parent);
+    const RECT room = PlaceOf(parent);
+    for (const HWND child : children) {
+      if (!IsWindowVisible(child)) continue;
+      const RECT place = PlaceOf(child);
+      EXPECT_TRUE(Inside(place, {0, 0, room.right - room.left, room.bottom - room.top}));
+      EXPECT_FALSE(NameOf(child).empty());
+      for (const HWND sibling : children) {
+        if (sibling != child && IsWindowVisible(sibling)) {
+          EXPECT_FALSE(Overlap(place, PlaceOf(sibling)));
+        }
+      }
+    }
+  };
+  EXPECT_FALSE(NameOf(page_->Window()).empty());
+  expectFit(page_->Window());
+  expectFit(Grid());
+  for (int slot = 1; slot <= kSlotCount; ++slot)
+    EXPECT_TRUE(Same(PlaceOf(Slot(slot)),
+                     layout::Pixels(layout::kFrames[static_cast<std::size_t>(slot) - 1], Dpi())));
+  EXPECT_TRUE(Same(PlaceOf(ScrollBar()), layout::Pixels(layout::kScrollBar, Dpi())));
+
+  page_->SetCaption(2, u"Tom && J\u00E9r\u014Dme.gif");
+  EXPECT_EQ(NameOf(Slot(2)), L"Tom && J\u00E9r\u014Dme.gif");
+  page_->ClearSlot(2);
+  EXPECT_EQ(NameOf(Slot(2)), L"Picture 2");
+
+  // A screen reader takes the static before an editor for its name.
+  page_->ShowEditor(4, u"name.jpg");
+  const HWND label = GetWindow(Editor(), GW_HWNDPREV);
+  EXPECT_EQ(ClassOf(label), L"Static");
+  EXPECT_FALSE(NameOf(label).empty());
+  EXPECT_FALSE(IsWindowVisible(label));
+  const RECT frame = PlaceOf(Slot(4));
+  RECT caption = layout::Pixels(layout::kCaption, Dpi());
+  OffsetRect(&caption, frame.left, frame.top);
+  EXPECT_TRUE(Inside(PlaceOf(Editor()), caption));
+
+  page_->ShowGrid(false);
+  expectFit(page_->Window());
+  EXPECT_FALSE(IsWindowVisible(Editor()));
+  EXPECT_FALSE(IsWindowVisible(ScrollBar()));
+  EXPECT_EQ(NameOf(Link()), L"Click here");
+  EXPECT_EQ(GetFocus(), Link());
+  page_->ShowSlot(2, false);
+  page_->ShowGrid(true);
+  for (int slot = 1; slot <= kSlotCount; ++slot) EXPECT_TRUE(IsWindowVisible(Slot(slot)));
+  EXPECT_EQ(user_.Take(), Told{});
+}
+
+TEST_F(ThumbnailPageTest, DrawsPicturesSelectionAndCaptions) {
+  const RECT size = layout::Pixels(layout::kPage, Dpi());
+  const HDC screen = GetDC(nullptr);
+  const HDC dc = CreateCompatibleDC(screen);
+  const BitmapOwner bitmap(CreateCompatibleBitmap(screen, size.right, size.bottom));
+  ReleaseDC(nullptr, screen);
+  const HGDIOBJ old = SelectObject(dc, bitmap.Get());
+  const auto pixel = [&](int slot, double x, double y) {
+    const RECT frame = layout::Pixels(layout::kFrames[static_cast<std::size_t>(slot) - 1], Dpi());
+    return GetPixel(dc, frame.left + layout::Pixels(x, Dpi()), frame.top + layout::Pixels(y, Dpi()));
+  };
+  const COLORREF window = GetSysColor(COLOR_WINDOW);
+  const COLORREF highlight = GetSysColor(COLOR_HIGHLIGHT);
+
+  page_->SetPicture(1, file_.Path(), {150, 671.5, 1965, 982});
+  page_->SetPicture(3, u"C:\\no such picture.gif", kWholeSquare);
+  page_->SetSelected(1, true);
+  page_->ShowSlot(4, false);
+  page_->Draw(dc, size);
+  EXPECT_EQ(pixel(1, 1130, 1160), RGB(200, 30, 90));
+  EXPECT_EQ(pixel(1, 160, 690), RGB(200, 30, 90));
+  EXPECT_EQ(pixel(1, 2100, 1640), RGB(200, 30, 90));
+  EXPECT_EQ(pixel(1, 1130, 640), window);
+  EXPECT_EQ(pixel(1, 1130, 1690), window);
+  EXPECT_EQ(pixel(1, 115, 1160), highlight);
+  EXPECT_EQ(pixel(1, 120, 2240), highlight);
+  EXPECT_EQ(pixel(2, 160, 190), RGB(200, 30, 90));
+  EXPECT_EQ(pixel(2, 115, 1160), window);
+  EXPECT_EQ(pixel(2, 120, 2240), RGB(255, 255, 255));
+  // A broken picture leaves its caption and an empty square.
+  EXPECT_EQ(pixel(3, 1130, 1160), window);
+  EXPECT_NE(pixel(3, 0, 1000), window);
+  EXPECT_EQ(pixel(4, 0, 1000), window);
+
+  page_->SetSelected(1, false);
+  page_->SetPicture(2, u"", kWholeSquare);
+  page_->Draw(dc, size);
+  EXPECT_EQ(pixel(1, 115, 1160), window);
+  EXPECT_EQ(pixel(2, 1130, 1160), window);
+  SelectObject(dc, old);
+  DeleteDC(dc);
+}
+
+// --- What it tells ---
+
+TEST_F(ThumbnailPageTest, TellsPressesKeysAndButtons) {
+  for (int slot = 1; slot <= kSlotCount; ++slot) {
+    const std::string name = "slot " + std::to_string(slot);
+    SendMessageW(Slot(slot), WM_LBUTTONDOWN, MK_LBUTTON, At(3, 3));
+    SendMessageW(Slot(slot), WM_LBUTTONUP, 0, At(3, 3));
+    SendMessageW(Slot(slot), WM_LBUTTONDBLCLK, MK_LBUTTON, At(60, 60));
+    SendMessageW(Slot(slot), WM_LBUTTONUP, 0, At(60, 60));
+    SendMessageW(Slot(slot), WM_RBUTTONDOWN, MK_RBUTTON, At(60, 165));
+    SendMessageW(Slot(slot), WM_MBUTTONDOWN, MK_MBUTTON, At(60, 60));
+    EXPECT_EQ(user_.Take(), (Told{name, name, name + " right", name}));
+  }
+  SendMessageW(Grid(), WM_LBUTTONDOWN, MK_LBUTTON, At(1, 1));
+  SendMessageW(page_->Window(), WM_RBUTTONDOWN, MK_RBUTTON, At(1, 1));
+  EXPECT_EQ(user_.Take(), (Told{"background", "background right"}));
+  EXPECT_EQ(GetFocus(), Grid());
+
+  for (const WPARAM key : {VK_DELETE, VK_F5, VK_F2, VK_RETURN, static_cast<int>(L'A')})
+    SendMessageW(Grid(), WM_KEYDOWN, key, 0);
+  EXPECT_EQ(user_.Take(), (Told{"key 46", "key 116", "key 113", "key 13", "key 65"}));
+
+  SendMessageW(Switch(), BM_CLICK, 0, 0);
+  SendMessageW(Switch(), WM_KEYDOWN, VK_RETURN, 0);
+  page_->ShowGrid(false);
+  SendMessageW(Link(), BM_CLICK, 0, 0);
+  SendMessageW(Link(), WM_KEYDOWN, VK_RETURN, 0);
+  EXPECT_EQ(user_.Take(), (Told{"switch", "switch", "link", "link"}));
+}
+
+TEST_F(ThumbnailPageTest, ADragBeginsBeyondTheSystemsDistanceOnly) {
+  const int far = 40 + GetSystemMetrics(SM_CXDRAG) + 1;
+  const auto drag = [&](int slot, int x, int y, int toX, int toY) {
+    SendMessageW(Slot(slot), WM_LBUTTONDOWN, MK_LBUTTON, At(x, y));
+    SendMessageW(Slot(slot), WM_MOUSEMOVE, MK_LBUTTON, At(toX, toY));
+    SendMessageW(Slot(slot), WM_MOUSEMOVE, MK_LBUTTON, At(toX, toY));
+    SendMessageW(Slot(slot), WM_LBUTTONUP, 0, At(toX, toY));
+    SendMessageW(Slot(slot), WM_MOUSEMOVE, MK_LBUTTON, At(far + 50, far + 50));
+    EXPECT_EQ(GetCapture(), nullptr);
+    return user_.Take();
+  };
+  EXPECT_EQ(drag(1, 40, 40, far, 40), (Told{"slot 1", "drag"}));
+  EXPECT_EQ(drag(2, 40, 40, 40, -far), (Told{"slot 2", "drag"}));
+  EXPECT_EQ(drag(3, 40, 40, far - 1, 40), Told{"slot 3"});
+  EXPECT_EQ(drag(4, 40, 40, far, 40), Told{"slot 4"});  // no picture
+  EXPECT_EQ(drag(1, 2, 40, far, 40), Told{"slot 1"});   // its frame
+  page_->StartDrag();
+  EXPECT_EQ(user_.Take(), Told{"drag"});
+}
+
+TEST_F(ThumbnailPageTest, TellsWhereTheScrollBarComesToRest) {
+  EXPECT_EQ(page_->ScrollValue(), 0);
+  const struct {
+    int code;
+    int position;
+    Told told;
+    int value;
+  } moves[] = {
+      {SB_LINEUP, 0, {}, 0},
+      {SB_LINEDOWN, 0, {"changed 2"}, 2},
+      {SB_PAGEDOWN, 0, {"changed 4"}, 4},
+      {SB_BOTTOM, 0, {"changed 6"}, 6},
+      {SB_LINEDOWN, 0, {}, 6},
+      {SB_ENDSCROLL, 0, {}, 6},
+      {SB_PAGEUP, 0, {"changed 4"}, 4},
+      {SB_THUMBTRACK, 4, {}, 4},
+      {SB_THUMBTRACK, 3, {"dragged 2"}, 2},
+      {SB_THUMBTRACK, 2, {}, 2},
+      {SB_THUMBTRACK, 9, {"dragged 6"}, 6},
+      {SB_THUMBPOSITION, 6, {"changed 6"}, 6},
+      {SB_THUMBTRACK, 0, {"dragged 0"}, 0},
+      {SB_THUMBTRACK, 7, {"dragged 6"}, 6},
+      {SB_THUMBPOSITION, 6, {}, 6},
+      {SB_TOP, 0, {"changed 0"}, 0},
+  };
+  for (const auto& move : moves) {
+    SCOPED_TRACE(move.code);
+    Scroll(move.code, move.position);
+    EXPECT_EQ(user_.Take(), move.told);
+    EXPECT_EQ(page_->ScrollValue(), move.value);
+    EXPECT_EQ(GetScrollPos(ScrollBar(), SB_CTL), move.value);
+  }
+
+  // Half notches add up; a notch is a row.
+  for (const int delta : {-60, -60, -240, 120}) SendMessageW(Slot(1), WM_MOUSEWHEEL, MAKEWPARAM(0, delta), 0);
+  EXPECT_EQ(user_.Take(), (Told{"changed 2", "changed 6", "changed 4"}));
+
+  // What the rules set is no news.
+  page_->SetScrollValue(2);
+  EXPECT_EQ(page_->ScrollValue(), 2);
+  page_->SetScrollRange(-1);
+  EXPECT_EQ(page_->ScrollValue(), 0);
+  Scroll(SB_LINEDOWN);
+  page_->SetScrollRange(6);
+  page_->EnableScroll(false);
+  EXPECT_FALSE(IsWindowEnabled(ScrollBar()));
+  SendMessageW(Grid(), WM_MOUSEWHEEL, MAKEWPARAM(0, -120), 0);
+  EXPECT_EQ(user_.Take(), Told{});
+
+  // A list longer than the message has room for.
+  page_->SetScrollRange(100'000);
+  page_->EnableScroll(true);
+  page_->SetScrollValue(99'998);
+  EXPECT_EQ(GetScrollPos(ScrollBar(), SB_CTL), 99'998);
+  Scroll(SB_LINEDOWN);
+  EXPECT_EQ(user_.Take(), Told{"changed 100000"});
+}
+
+TEST_F(ThumbnailPageTest, TheEditorTellsItsEndOnce) {
+  page_->ShowEditor(2, u"Bl\u00FCm\u014Dhen.gif");
+  EXPECT_EQ(GetFocus(), Editor());
+  DWORD begin = 1;
+  DWORD end = 1;
+  SendMessageW(Editor(), EM_GETSEL, reinterpret_cast<WPARAM>(&begin), reinterpret_cast<LPARAM>(&end));
+  EXPECT_EQ(begin, 0U);
+  EXPECT_EQ(end, 12U);
+  EXPECT_EQ(page_->EditorText(), u"Bl\u00FCm\u014Dhen.gif");
+  SendMessageW(Editor(), WM_CHAR, L'\u20AC', 0);
+
+  // The host shows a message inside: the focus that the editor loses then is no second end.
+  user_.on = [&](const std::string&) {
+    SetFocus(other_);
+    EXPECT_EQ(page_->EditorText(), u"\u20AC");
+    page_->HideEditor();
+  };
+  SendMessageW(Editor(), WM_KEYDOWN, VK_RETURN, 0);
+  EXPECT_EQ(user_.Take(), Told{"entered"});
+  EXPECT_FALSE(IsWindowVisible(Editor()));
+
+  user_.on = [&](const std::string&) { page_->HideEditor(); };
+  page_->ShowEditor(1, u"a");
+  SendMessageW(Editor(), WM_KEYDOWN, VK_ESCAPE, 0);
+  EXPECT_EQ(GetFocus(), Grid());
+  page_->ShowEditor(1, u"a");
+  SetFocus(other_);
+  page_->ShowEditor(1, u"a");
+  // A press elsewhere first ends the edit.
+  SendMessageW(Slot(3), WM_LBUTTONDOWN, MK_LBUTTON, At(3, 3));
+  EXPECT_EQ(user_.Take(), (Told{"left", "left", "left", "slot 3"}));
+  page_->ShowEditor(1, u"a");
+  page_->HideEditor();
+  EXPECT_EQ(GetFocus(), Grid());
+  EXPECT_EQ(user_.Take(), Told{});
+}
+
+TEST_F(ThumbnailPageTest, TheKeyboardReachesWhatIsShown) {
+  // A control that becomes active takes the focus; what has it inside keeps it then.
+  user_.tellsFocus = true;
+  user_.on = [&](const std::string&) { page_->Focus(); };
+  SetFocus(Switch());
+  EXPECT_EQ(GetFocus(), Switch());
+  SetFocus(other_);
+  SetFocus(page_->Window());
+  EXPECT_EQ(GetFocus(), Grid());
+  EXPECT_EQ(user_.Take(), (Told{"focus", "focus"}));
+  user_.on = {};
+
+  const auto walk = [&](bool backward) {
+    std::vector<HWND> stops = {GetFocus()};
+    while (page_->MoveFocus(backward) && stops.size() < 9) stops.push_back(GetFocus());
+    return stops;
+  };
+  using Windows = std::vector<HWND>;
+  EXPECT_EQ(walk(false), (Windows{Grid(), ScrollBar(), Switch()}));
+  EXPECT_EQ(walk(true), (Windows{Switch(), ScrollBar(), Grid()}));
+  page_->EnableScroll(false);
+  EXPECT_EQ(walk(false), (Windows{Grid(), Switch()}));
+  page_->ShowGrid(false);
+  page_->Focus();
+  EXPECT_EQ(walk(false), (Windows{Link(), Switch()}));
+  SetFocus(other_);
+  EXPECT_FALSE(page_->MoveFocus(false));
+}
+
+// --- How it ends ---
+
+TEST_F(ThumbnailPageTest, MayEndInsideAnyOfItsEvents) {
+  const std::int32_t before = ownedObjects;
+  user_.tellsFocus = true;
+  const struct {
+    const char* event;
+    std::function<void()> cause;
+  } cases[] = {
+      {"focus", [&] { SetFocus(Switch()); }},
+      {"slot 1", [&] { SendMessageW(Slot(1), WM_LBUTTONDOWN, MK_LBUTTON, At(60, 60)); }},
+      {"left", [&] { SendMessageW(Slot(1), WM_LBUTTONDOWN, MK_LBUTTON, At(60, 60)); }},
+      {"background", [&] { SendMessageW(Grid(), WM_LBUTTONDOWN, MK_LBUTTON, At(1, 1)); }},
+      {"key 46", [&] { SendMessageW(Grid(), WM_KEYDOWN, VK_DELETE, 0); }},
+      {"changed 2", [&] { Scroll(SB_LINEDOWN); }},
+      {"dragged 4", [&] { Scroll(SB_THUMBTRACK, 4); }},
+      {"changed 2", [&] { SendMessageW(Grid(), WM_MOUSEWHEEL, MAKEWPARAM(0, -120), 0); }},
+      {"switch", [&] { SendMessageW(Switch(), BM_CLICK, 0, 0); }},
+      {"link", [&] { SendMessageW(Link(), BM_CLICK, 0, 0); }},
+      {"entered", [&] { SendMessageW(Editor(), WM_KEYDOWN, VK_RETURN, 0); }},
+      {"left", [&] { SendMessageW(Editor(), WM_KEYDOWN, VK_ESCAPE, 0); }},
+      {"left", [&] { SetFocus(other_); }},
+      {"drag",
+       [&] {
+         SendMessageW(Slot(1), WM_LBUTTONDOWN, MK_LBUTTON, At(40, 40));
+         SendMessageW(Slot(1), WM_MOUSEMOVE, MK_LBUTTON, At(99, 99));
+       }},
+  };
+  for (const auto& each : cases) {
+    SCOPED_TRACE(each.event);
+    if (!page_) Make();
+    const HWND window = page_->Window();
+    if (std::string(each.event) == "left" || std::string(each.event) == "entered") page_->ShowEditor(1, u"a");
+    user_.Take();
+    user_.on = [&](const std::string& what) {
+      if (what != each.event) return;
+      user_.on = {};
+      page_.reset();
+    };
+    each.cause();
+    user_.on = {};
+    EXPECT_EQ(page_, nullptr);
+    EXPECT_FALSE(IsWindowVisible(window));
+    EXPECT_EQ(user_.told.back(), each.event);
+    Pump();
+    EXPECT_FALSE(IsWindow(window));
+  }
+  // All that the page of the fixture and the others owned is closed.
+  EXPECT_LT(ownedObjects, before);
+}
+
+TEST_F(ThumbnailPageTest, ShowsTheSameInANewWindow) {
+  page_->SetScrollValue(4);
+  page_->ShowSlot(3, false);
+  DestroyWindow(page_->Window());
+  page_->SetCaption(1, u"other.gif");
+  Place(page_->Window());
+  EXPECT_EQ(NameOf(Slot(1)), L"other.gif");
+  EXPECT_EQ(NameOf(Slot(2)), L"picture 2.gif");
+  EXPECT_TRUE(IsWindowVisible(Slot(2)));
+  EXPECT_FALSE(IsWindowVisible(Slot(3)));
+  EXPECT_EQ(GetScrollPos(ScrollBar(), SB_CTL), 4);
+  EXPECT_EQ(NameOf(Link()), L"Click here");
+}
+
+// --- The scroll bar's hook ---
+
+TEST_F(ThumbnailPageTest, TheHookTakesTheColourRequestAndNothingElse) {
+  const HWND window = page_->Window();
+  const auto request = [&](UINT message) {
+    const HDC dc = GetDC(ScrollBar());
+    const LRESULT result =
+        SendMessageW(window, message, reinterpret_cast<WPARAM>(dc), reinterpret_cast<LPARAM>(ScrollBar()));
+    ReleaseDC(ScrollBar(), dc);
+    return result;
+  };
+  ASSERT_NE(request(WM_CTLCOLORSCROLLBAR), 0);
+  const LRESULT statics = request(WM_CTLCOLORSTATIC);
+  ScrollHookState state;
+  {
+    WindowsScrollHook hook(state);
+    hook.Install(window);
+    hook.Install(window);
+    EXPECT_TRUE(state.hooked);
+    EXPECT_NE(state.previous, 0U);
+    EXPECT_EQ(request(WM_CTLCOLORSCROLLBAR), 0);
+    EXPECT_EQ(request(WM_CTLCOLORSTATIC), statics);
+
+    // The control goes on as before, texts that are not ANSI included.
+    page_->SetCaption(1, u"\u65E5\u672C.gif");
+    EXPECT_EQ(NameOf(Slot(1)), L"\u65E5\u672C.gif");
+    page_->ShowEditor(1, u"\u65E5");
+    EXPECT_EQ(page_->EditorText(), u"\u65E5");
+    page_->HideEditor();
+    Scroll(SB_LINEDOWN);
+    SendMessageW(Slot(2), WM_RBUTTONDOWN, MK_RBUTTON, At(3, 3));
+    EXPECT_EQ(user_.Take(), (Told{"changed 2", "slot 2 right"}));
+
+    // A second control takes the state over; both work on.
+    WindowsThumbnailPage second(GetModuleHandleW(nullptr), user_);
+    WindowsScrollHook secondHook(state);
+    secondHook.Install(second.Window());
+    EXPECT_EQ(state.window, reinterpret_cast<WindowHandle>(second.Window()));
+    EXPECT_EQ(SendMessageW(second.Window(), WM_CTLCOLORSCROLLBAR, 0, 0), 0);
+    EXPECT_EQ(request(WM_CTLCOLORSCROLLBAR), 0);
+    Scroll(SB_LINEDOWN);
+    EXPECT_EQ(user_.Take(), Told{"changed 4"});
+  }
+  // The procedure is still there, what it needs is not.
+  EXPECT_NE(request(WM_CTLCOLORSCROLLBAR), 0);
+  SendMessageW(window, WM_SETTEXT, 0, reinterpret_cast<LPARAM>(L"name"));
+  page_.reset();
+  EXPECT_FALSE(IsWindow(window));
+}
+
+}  // namespace
+}  // namespace tarnwick
