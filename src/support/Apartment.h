@@ -10,6 +10,7 @@
 #include "platform/StringResources.h"
 #include "service/CUpload.h"
 #include "support/KeyedList.h"
+#include "support/ScrollBarHook.h"
 #include "support/Text.h"
 
 namespace tarnwick {
@@ -76,6 +77,8 @@ struct Apartment {
   bool listLoaded = false;
 
   bool abortTransfer = false;
+
+  ScrollHookState scrollHook;
 
   // The host product's strings, tried once; null when there are none.
   std::unique_ptr<ResourceLibrary> resourceLibrary;

@@ -27,6 +27,7 @@ class ThumbnailPageUser {
   // A slot's picture is dragged out.
   virtual void DragBegins() = 0;
   virtual void GotFocus() = 0;
+  virtual void LostFocus() = 0;
 };
 
 }  // namespace tarnwick

@@ -35,6 +35,7 @@ class ListViewUser {
   virtual bool LabelEditEnds(std::size_t item, TextView text) = 0;
   virtual void DragBegins() = 0;
   virtual void GotFocus() = 0;
+  virtual void LostFocus() = 0;
 };
 
 class WindowsListView : public ListView, public ControlWindow {

@@ -41,6 +41,13 @@ BSTR NewBstr(TextView text) {
   return bstr;
 }
 
+void AssignChanged(BSTR* target, TextView text) {
+  if (!target || ViewOf(*target) == text) return;
+  const BSTR changed = NewBstr(text);
+  SysFreeString(*target);
+  *target = changed;
+}
+
 TextView ViewOf(BSTR text) {
   return {reinterpret_cast<const char16_t*>(text), SysStringLen(text)};
 }

@@ -54,6 +54,14 @@ BSTR NewBstr(TextView text);
 // The characters of a BSTR, which may be null; valid as long as it.
 TextView ViewOf(BSTR text);
 
+// The same of a by-reference argument, which may be null.
+inline TextView ViewOf(BSTR* text) {
+  return text ? ViewOf(*text) : TextView();
+}
+// Hands a text back through a by-reference argument, which may be null, unless it has not changed. Throws
+// std::bad_alloc.
+void AssignChanged(BSTR* target, TextView text);
+
 // The text, number or Boolean that `value` means, by the automation's own conversion; an omitted argument is
 // an empty text. Throws run-time error 13 when there is none.
 Text TextFromVariant(const VARIANT& value);

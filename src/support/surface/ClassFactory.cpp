@@ -10,12 +10,14 @@
 #include "support/surface/Module.h"
 #include "support/surface/TypeLibrary.h"
 #include "support/surface/ctrlListImageObject.h"
+#include "support/surface/ctrlThumbNailViewObject.h"
 
 namespace tarnwick {
 namespace {
 
 // In Tarnwick.rc.
 constexpr int kListImageBitmap = 101;
+constexpr int kThumbNailViewBitmap = 102;
 
 template <typename Object>
 IUnknown* Make() {
@@ -28,6 +30,9 @@ const std::array kClasses = {
     CreatableClass{CLSID_CBVAccount, L"CBVAccount", L"Tarnwick account details", 0, Make<CBVAccountObject>},
     CreatableClass{CLSID_ctrlListImage, L"ctrlListImage", L"Tarnwick list of the account's files",
                    kListImageBitmap, Make<ctrlListImageObject>},
+    CreatableClass{CLSID_ctrlThumbNailView, L"ctrlThumbNailView",
+                   L"Tarnwick thumbnails of the account's pictures", kThumbNailViewBitmap,
+                   Make<ctrlThumbNailViewObject>},
 };
 
 class ClassFactory final : public ComObject<IClassFactory> {

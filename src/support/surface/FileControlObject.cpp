@@ -13,23 +13,12 @@ constexpr DISPID kOleDragModeId = 35;
 constexpr std::array kProperties = {PersistedProperty{L"OLEDropMode", kOleDropModeId, VT_I2},
                                     PersistedProperty{L"OLEDragMode", kOleDragModeId, VT_I4}};
 
-TextView ViewOf(BSTR* text) {
-  return text ? tarnwick::ViewOf(*text) : TextView();
-}
-
-// Hands a changed text back through a by-reference argument.
-void Assign(BSTR* target, TextView text) {
-  const BSTR changed = NewBstr(text);
-  SysFreeString(*target);
-  *target = changed;
-}
-
 }  // namespace
 
 template <typename Interface>
 FileControlObject<Interface>::FileControlObject(const ControlClass& itsClass)
     : class_(itsClass),
-      ole_(*this, itsClass.events),
+      ole_(*this, itsClass.events, itsClass.extent),
       events_(ole_),
       uploader_(apartment_.Get().platform),
       downloader_(apartment_.Get(), socket_, watchdog_) {}
@@ -369,7 +358,7 @@ STDMETHODIMP FileControlObject<Interface>::CheckFileExtension(BSTR* szNewString,
   return AnsweredBoolean(result, [&] {
     Text name(ViewOf(szNewString));
     const bool kept = Rules().CheckFileExtension(name, ViewOf(szOriExt));
-    if (szNewString && name != ViewOf(szNewString)) Assign(szNewString, name);
+    AssignChanged(szNewString, name);
     return kept;
   });
 }
@@ -486,5 +475,6 @@ void FileControlObject<Interface>::Dropped(DataObject& data, DWORD& effect, cons
 }
 
 template class FileControlObject<_ctrlListImage>;
+template class FileControlObject<_ctrlThumbNailView>;
 
 }  // namespace tarnwick

@@ -22,6 +22,8 @@ struct ControlClass {
   const IID& events;
   // As error information names the source.
   const wchar_t* name;
+  // HIMETRIC.
+  SIZEL extent;
 };
 
 // `Interface` is the control's dual interface. The members' numbers are the same in both where both have
@@ -112,10 +114,12 @@ class FileControlObject : public DualObject<Interface>,
   // What rules are made with.
   ControlParts Parts() { return {apartment_.Get(), events_, uploader_, downloader_}; }
   OleControl& Ole() { return ole_; }
+  Apartment& TheApartment() { return apartment_.Get(); }
   // For the handlers of the user's actions, which run code of the host's: it may release the control inside.
   ComPtr<IUnknown> KeptAlive() { return ComPtr<IUnknown>(&Identity()); }
   // The control got the focus, or a button went down on it.
   void Activated();
+  void FocusLost() { ole_.LostFocus(); }
   // The user, or the host, begins to drag the selection; returns after the drop.
   void RunDragOut();
 

@@ -11,8 +11,6 @@ namespace tarnwick {
 namespace {
 
 constexpr int kHimetricPerInch = 2540;
-// Of a control that nobody has sized yet, at 96 dots per inch.
-constexpr SIZEL kFirstExtent = {kHimetricPerInch * 320 / 96, kHimetricPerInch * 240 / 96};
 constexpr std::uint32_t kStreamVersion = 1;
 
 // Pixels of the screen and HIMETRIC, in x direction and y direction.
@@ -64,12 +62,12 @@ bool Wants(const MSG& key) {
 
 }  // namespace
 
-OleControl::OleControl(OleControlHooks& hooks, REFIID events)
+OleControl::OleControl(OleControlHooks& hooks, REFIID events, SIZEL extent)
     : hooks_(hooks),
       events_(*this, events),
       propertyListeners_(*this, IID_IPropertyNotifySink),
       eventInterface_(events),
-      extent_(kFirstExtent) {}
+      extent_(extent) {}
 
 OleControl::~OleControl() = default;
 
@@ -108,6 +106,17 @@ void OleControl::ViewChanged() {
 
 void OleControl::Activated() {
   if (inPlace_ && !uiActive_) ActivateUi();
+  TellFocus(true);
+}
+
+void OleControl::LostFocus() {
+  TellFocus(false);
+}
+
+void OleControl::TellFocus(bool focus) {
+  ComPtr<IOleControlSite> site;
+  if (std::exchange(hasFocus_, focus) == focus || !site_) return;
+  if (SUCCEEDED(site_->QueryInterface(IID_IOleControlSite, site.ReceiveVoid()))) site->OnFocus(focus);
 }
 
 STDMETHODIMP OleControl::QueryInterface(REFIID interfaceId, void** object) {
@@ -434,10 +443,15 @@ HRESULT OleControl::OfferToSite(MSG& message) const {
 STDMETHODIMP OleControl::TranslateAccelerator(LPMSG message) {
   if (!message) return E_POINTER;
   const HWND window = inPlace_ ? hooks_.Window() : nullptr;
-  if (window && message->message == WM_KEYDOWN && IsChild(window, message->hwnd) && Wants(*message)) {
-    TranslateMessage(message);
-    DispatchMessageW(message);
-    return S_OK;
+  if (window && message->message == WM_KEYDOWN && IsChild(window, message->hwnd)) {
+    if (message->wParam == VK_TAB && GetKeyState(VK_CONTROL) >= 0 &&
+        hooks_.MoveFocus(GetKeyState(VK_SHIFT) < 0))
+      return S_OK;
+    if (Wants(*message)) {
+      TranslateMessage(message);
+      DispatchMessageW(message);
+      return S_OK;
+    }
   }
   return OfferToSite(*message);
 }

@@ -58,6 +58,8 @@ class OleControlHooks {
   virtual void AmbientChanged(const AmbientValues& values) = 0;
   // Gives the control's window the keyboard focus.
   virtual void GiveFocus() = 0;
+  // Moves the focus to the next stop inside the control, or to the one before; false at the end.
+  virtual bool MoveFocus(bool backward) = 0;
   // The container has let go of the control.
   virtual void SiteGone() = 0;
 
@@ -77,8 +79,9 @@ class OleControl final : public IOleObject,
                          public IConnectionPointContainer,
                          public IProvideClassInfo2 {
  public:
-  // `hooks` is the control that holds this object. `events` is the interface of the control's events.
-  OleControl(OleControlHooks& hooks, REFIID events);
+  // `hooks` is the control that holds this object. `events` is the interface of the control's events,
+  // `extent` its size in HIMETRIC until a container gives it another one.
+  OleControl(OleControlHooks& hooks, REFIID events, SIZEL extent);
   ~OleControl();
   OleControl(const OleControl&) = delete;
   OleControl& operator=(const OleControl&) = delete;
@@ -97,6 +100,8 @@ class OleControl final : public IOleObject,
 
   // The window got the focus, by a click or a key: the control becomes the active one of its container.
   void Activated();
+  // The focus went to a window that is not the control's.
+  void LostFocus();
 
   // IUnknown, of the control
   STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;
@@ -192,6 +197,8 @@ class OleControl final : public IOleObject,
   bool Ambient(DISPID property, Variant& value) const;
   // The container's own handling of a key that the control does not want.
   HRESULT OfferToSite(MSG& message) const;
+  // Tells the container whether the control has the focus.
+  void TellFocus(bool focus);
 
   OleControlHooks& hooks_;
   ConnectionPoint events_;
@@ -209,6 +216,7 @@ class OleControl final : public IOleObject,
   SIZEL extent_;
   bool inPlace_ = false;
   bool uiActive_ = false;
+  bool hasFocus_ = false;
   bool dirty_ = false;
   int eventsFrozen_ = 0;
 };

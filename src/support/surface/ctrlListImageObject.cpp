@@ -5,7 +5,10 @@
 namespace tarnwick {
 namespace {
 
-const ControlClass kClass = {CLSID_ctrlListImage, DIID___ctrlListImage, L"Tarnwick.ctrlListImage"};
+// 320 by 240 pixels at 96 dots per inch.
+constexpr SIZEL kExtent = {320 * 2540 / 96, 240 * 2540 / 96};
+
+const ControlClass kClass = {CLSID_ctrlListImage, DIID___ctrlListImage, L"Tarnwick.ctrlListImage", kExtent};
 
 }  // namespace
 
@@ -127,6 +130,11 @@ bool ctrlListImageObject::LabelEditEnds(std::size_t item, TextView text) {
 void ctrlListImageObject::GotFocus() {
   const ComPtr<IUnknown> alive = KeptAlive();
   Activated();
+}
+
+void ctrlListImageObject::LostFocus() {
+  const ComPtr<IUnknown> alive = KeptAlive();
+  FocusLost();
 }
 
 }  // namespace tarnwick

@@ -36,6 +36,7 @@ class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, priv
   void Park() override { view_.Park(); }
   void Draw(HDC dc, const RECT& bounds) override { view_.Draw(dc, bounds); }
   void GiveFocus() override { view_.Focus(); }
+  bool MoveFocus(bool) override { return false; }
 
   // ListViewUser
   Text ItemText(std::size_t item, std::size_t column) const override;
@@ -50,6 +51,7 @@ class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, priv
   bool LabelEditEnds(std::size_t item, TextView text) override;
   void DragBegins() override { RunDragOut(); }
   void GotFocus() override;
+  void LostFocus() override;
 
   WindowsListView view_;
   const std::unique_ptr<ctrlListImage> rules_;

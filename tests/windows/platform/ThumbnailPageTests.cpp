@@ -36,6 +36,7 @@ class ScriptedUser : public ThumbnailPageUser {
   void EditorEntered() override { Tell("entered"); }
   void EditorLeft() override { Tell("left"); }
   void DragBegins() override { Tell("drag"); }
+  void LostFocus() override {}
   void GotFocus() override {
     if (tellsFocus) Tell("focus");
   }
