@@ -101,6 +101,11 @@ bool DataObject::Has(CLIPFORMAT format) const {
          (format == CF_HDROP && !files_.empty());
 }
 
+const Text& DataObject::TextFor(CLIPFORMAT format) {
+  if (std::exchange(promised_, false) && onPromised_) onPromised_(static_cast<std::int16_t>(format));
+  return text_;
+}
+
 // --- IDataObject ---
 
 STDMETHODIMP DataObject::QueryGetData(FORMATETC* format) {
@@ -120,11 +125,13 @@ STDMETHODIMP DataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
       case CF_HDROP:
         medium->hGlobal = DropFilesOf(files_);
         break;
-      case CF_UNICODETEXT:
-        medium->hGlobal = GlobalCopy(text_.c_str(), (text_.size() + 1) * sizeof(char16_t));
+      case CF_UNICODETEXT: {
+        const Text& text = TextFor(format->cfFormat);
+        medium->hGlobal = GlobalCopy(text.c_str(), (text.size() + 1) * sizeof(char16_t));
         break;
+      }
       default: {
-        const std::string ansi = AnsiFromText(text_).value_or(std::string());
+        const std::string ansi = AnsiFromText(TextFor(format->cfFormat)).value_or(std::string());
         medium->hGlobal = GlobalCopy(ansi.c_str(), ansi.size() + 1);
         break;
       }
@@ -213,11 +220,12 @@ HRESULT DataObject::Call(DISPID member, const DISPPARAMS& arguments, VARIANT* re
   switch (member) {
     case kGetData:
       if (!Has(format(0))) throw RuntimeError(error::kInvalidFormat);
-      if (format(0) != CF_HDROP) value.Get() = VariantFromText(text_);
+      if (format(0) != CF_HDROP) value.Get() = VariantFromText(TextFor(format(0)));
       break;
     case kSetData:
       if (format(1) == CF_HDROP) throw RuntimeError(error::kInvalidFormat);
-      text_ = argument(0) ? TextFromVariant(*argument(0)) : Text();
+      promised_ = !argument(0) || V_VT(argument(0)) == VT_ERROR;
+      text_ = promised_ ? Text() : TextFromVariant(*argument(0));
       hasText_ = true;
       break;
     case kGetFormat:
@@ -226,7 +234,7 @@ HRESULT DataObject::Call(DISPID member, const DISPPARAMS& arguments, VARIANT* re
       break;
     case kClear:
       text_.clear();
-      hasText_ = false;
+      hasText_ = promised_ = false;
       files_.clear();
       break;
     case kFiles: {

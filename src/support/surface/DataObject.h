@@ -6,6 +6,8 @@
 
 #include <ole2.h>
 
+#include <functional>
+#include <utility>
 #include <vector>
 
 #include "controls/ControlEvents.h"
@@ -26,6 +28,12 @@ class DataObject final : public ComObject<IDataObject, IDispatch>, public DragDa
   DataObject(TextView text, TextView file);
   // The data of a drag that comes from elsewhere, read when the object is made.
   explicit DataObject(IDataObject& foreign);
+
+  // Who supplies a text that a host promised (SetData without a value) once a target asks for it: the handler
+  // is given the format and calls SetData, or leaves the text empty. None at first.
+  void SetPromiseHandler(std::function<void(std::int16_t format)> handler) {
+    onPromised_ = std::move(handler);
+  }
 
   const std::vector<Text>& Files() const { return files_; }
   IDispatch* Dispatch() { return this; }
@@ -51,9 +59,13 @@ class DataObject final : public ComObject<IDataObject, IDispatch>, public DragDa
  private:
   HRESULT Call(DISPID member, const DISPPARAMS& arguments, VARIANT* result);
   bool Has(CLIPFORMAT format) const;
+  // The text, which may have to be fetched first.
+  const Text& TextFor(CLIPFORMAT format);
 
   Text text_;
   bool hasText_ = false;
+  bool promised_ = false;
+  std::function<void(std::int16_t)> onPromised_;
   std::vector<Text> files_;
 };
 

@@ -446,6 +446,7 @@ void FileControlObject<Interface>::RunDragOut() {
   const ComPtr<IUnknown> alive = KeptAlive();
   const FileControl::DragContent content = Rules().ContentOfDrag();
   const auto data = ComPtr<DataObject>::Adopt(new DataObject(content.address, content.localFile));
+  data->SetPromiseHandler([&](std::int16_t format) { Rules().OnSetData(*data, format); });
   std::int32_t allowed = DROPEFFECT_COPY;
   Rules().OnStartDrag(*data, allowed);
   const DWORD done = RunDrag(*data, static_cast<DWORD>(allowed), [&](DWORD effect) {
@@ -454,6 +455,8 @@ void FileControlObject<Interface>::RunDragOut() {
     Rules().OnGiveFeedback(shown, defaultCursors);
     return defaultCursors;
   });
+  // The target may keep the data; the promise ends with the drag.
+  data->SetPromiseHandler({});
   Rules().OnCompleteDrag(static_cast<std::int32_t>(done));
 }
 
