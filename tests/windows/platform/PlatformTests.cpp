@@ -248,6 +248,28 @@ TEST_F(FilesTest, CopiesWholeOrNotAtAll) {
   EXPECT_EQ(Each(false), 6U) << "a file in between was left over";
 }
 
+TEST_F(FilesTest, ReadsABeginningAndCreatesWhatIsMissing) {
+  Write(u"a.jpg", "12345");
+  char room[3];
+  EXPECT_EQ(files_.ReadBeginning(In(u"a.jpg"), room), 3U);
+  EXPECT_EQ(std::string_view(room, 3), "123");
+  files_.SetAttributes(In(u"a.jpg"), attribute::kReadOnly | attribute::kHidden);
+  EXPECT_EQ(files_.ReadBeginning(In(u"a.jpg"), room), 3U);
+  EXPECT_EQ(files_.ReadBeginning(In(u"\u65E5.jpg"), room), 0U);
+  EXPECT_EQ(files_.Length(In(u"\u65E5.jpg")), 0U);
+  HANDLE held = CreateFileW(WideFromText(In(u"\u65E5.jpg")).c_str(), GENERIC_READ, 0, nullptr, OPEN_EXISTING,
+                            0, nullptr);
+  const std::pair<Text, std::int32_t> failures[] = {{In(u"\u65E5.jpg"), 75},
+                                                    {folder_, 75},
+                                                    {In(u"a?"), 75},
+                                                    {In(Text(u"a\0", 2)), 75},
+                                                    {In(u"none\\a"), 76}};
+  for (const auto& [path, number] : failures)
+    EXPECT_EQ(ErrorOf([&] { files_.ReadBeginning(path, room); }), number) << Utf8FromText(path);
+  CloseHandle(held);
+  EXPECT_EQ(ownedObjects, 0);
+}
+
 TEST(WindowsStringResources, ReadsOwnAndLoadedStrings) {
   WindowsStringResources strings(GetModuleHandleW(nullptr));
   wchar_t self[MAX_PATH];
