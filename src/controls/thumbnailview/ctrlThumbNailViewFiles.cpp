@@ -54,7 +54,7 @@ void ctrlThumbNailView::UpdateSelection() {
     if (selected == 0 && !shown.IsEmpty()) selected = 1;
     for (int slot = 1; slot <= kSlotCount; ++slot) page_.SetSelected(slot, slot == selected);
     iImgNo = static_cast<std::int16_t>(selected);
-    page_.Focus();
+    if (!apartment_.allFiles.IsEmpty()) page_.Focus();
   });
 }
 

@@ -196,7 +196,8 @@ void WindowsListView::EndLabelEdit() {
 }
 
 void WindowsListView::Focus() {
-  if (Window()) SetFocus(listShown_ ? list_ : Outer());
+  // A list that nobody sees takes it from nobody.
+  if (Window() && IsWindowVisible(Outer())) SetFocus(listShown_ ? list_ : Outer());
 }
 
 std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {

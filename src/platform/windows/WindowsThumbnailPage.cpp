@@ -142,8 +142,8 @@ HWND WindowsThumbnailPage::FirstStop() const {
 }
 
 void WindowsThumbnailPage::Focus() {
-  // A window inside that has just got the focus keeps it.
-  if (!tellingFocus_ && Window()) SetFocus(FirstStop());
+  // A window inside that has just got the focus keeps it. A page that nobody sees takes it from nobody.
+  if (!tellingFocus_ && Window() && IsWindowVisible(Outer())) SetFocus(FirstStop());
 }
 
 bool WindowsThumbnailPage::MoveFocus(bool backward) {
