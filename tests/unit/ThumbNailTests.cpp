@@ -250,6 +250,7 @@ TEST_F(ThumbNailTest, PagingReplacesTheFill) {
   downloader.waits = {Arrival(), [this](FakeDownloader&) { Scroll(6); }, Arrival(), Arrival(), Arrival()};
   control.ChangeFileFilter(u"*");
   EXPECT_EQ(page.Look(), "7.gif* 8.gif 9.gif ");
+  EXPECT_EQ(page.value, 6);
   EXPECT_EQ(Events(), "1234 1,9999 11,9999 11,9999 11,9999 11,1234 -1,");
   EXPECT_FALSE(HasCopy("2.gif"));
   EXPECT_FALSE(HasCopy("3.gif"));

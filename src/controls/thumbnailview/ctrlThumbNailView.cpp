@@ -117,11 +117,11 @@ void ctrlThumbNailView::Show(const Text& filter) {
     // A second file of the same address is not shown.
     ResultAsItStood(0, [&](int&) { shown.Add(record, record->FilePath); });
   }
+  // The bar stands at 0 from here on, unless the user pages on while the page is being filled.
   SetScrollRange();
   scrolledBack_ = false;
   ShowPage(0);
   UpdateSelection();
-  SetScrollValue(0);
 }
 
 int ctrlThumbNailView::SetScrollRange() {
