@@ -2,7 +2,6 @@
 
 #include "platform/FileSystem.h"
 #include "platform/Platform.h"
-#include "support/PathHelpers.h"
 #include "support/RuntimeError.h"
 
 namespace tarnwick {
@@ -96,8 +95,9 @@ void PictureDownloader::OnSocketError(std::int32_t number) {
 void PictureDownloader::WriteFile(TextView path, TextView explicitPath, std::string_view bytes) {
   ResultAsItStood(0, [&](int&) {
     FileSystem& files = apartment_.platform.files;
-    files.Write(explicitPath.empty() ? path : explicitPath, bytes);
-    if (!explicitPath.empty() && explicitPath != path) CopyLocalFile(files, explicitPath, path);
+    if (!explicitPath.empty()) files.Write(explicitPath, bytes);
+    // Not copied from the other one: the bytes are here.
+    if (explicitPath != path) files.Write(path, bytes);
   });
 }
 

@@ -2,8 +2,9 @@
 #pragma once
 
 #include <string>
+#include <string_view>
 
-#include "support/Text.h"
+#include "platform/windows/Owner.h"
 
 namespace tarnwick {
 
@@ -18,13 +19,20 @@ class StagedFile {
   // Full name of the file; empty when it could not be created.
   const std::wstring& Path() const { return path_; }
 
+  // False when not all of the bytes could be written.
+  bool Write(std::string_view bytes);
+
+  // For a call that writes to the file by its name.
+  void Close() { file_ = {}; }
+
   // Renames the file to the target, over a file of that name unless it is read-only. On failure what was
-  // there stays. The file must not be open.
+  // there stays.
   bool Commit();
 
  private:
-  std::wstring target_;
+  const std::wstring target_;
   std::wstring path_;
+  FileOwner file_;
 };
 
 }  // namespace tarnwick

@@ -94,6 +94,7 @@ void WindowsFileSystem::Copy(TextView source, TextView destination) {
   const std::wstring from = WidePath(source, error::kFileNotFound);
   StagedFile staged(WidePath(destination, error::kPathAccess));
   if (staged.Path().empty()) throw RuntimeError(error::kPathAccess);
+  staged.Close();
   if (!CopyFileW(from.c_str(), staged.Path().c_str(), FALSE))
     throw RuntimeError(NothingThere(GetLastError()) ? error::kFileNotFound : error::kPathAccess);
   if (!staged.Commit()) throw RuntimeError(error::kPathAccess);
@@ -119,20 +120,7 @@ std::size_t WindowsFileSystem::ReadBeginning(TextView path, std::span<char> room
 
 void WindowsFileSystem::Write(TextView path, std::string_view bytes) {
   StagedFile staged(WidePath(path, error::kPathAccess));
-  if (staged.Path().empty()) throw RuntimeError(error::kPathAccess);
-  {
-    const FileOwner file(
-        CreateFileW(staged.Path().c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr));
-    if (!file) throw RuntimeError(error::kPathAccess);
-    while (!bytes.empty()) {
-      DWORD count = 0;
-      const auto most = static_cast<DWORD>(std::min<std::size_t>(bytes.size(), 1U << 30));
-      if (!WriteFile(file.Get(), bytes.data(), most, &count, nullptr) || count == 0)
-        throw RuntimeError(error::kPathAccess);
-      bytes.remove_prefix(count);
-    }
-  }
-  if (!staged.Commit()) throw RuntimeError(error::kPathAccess);
+  if (!staged.Write(bytes) || !staged.Commit()) throw RuntimeError(error::kPathAccess);
 }
 
 void WindowsFileSystem::Remove(TextView path) {

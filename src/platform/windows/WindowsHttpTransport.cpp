@@ -22,8 +22,10 @@ constexpr DWORD kRequestFlags = INTERNET_FLAG_NO_AUTO_REDIRECT | INTERNET_FLAG_R
 
 constexpr std::size_t kFirstRoom = 16 * 1024;
 
-// Of a streamed body; a host hears of the progress after each.
-constexpr std::size_t kBlock = 64 * 1024;
+// Bytes of a streamed body that are sent at a time. A host hears of the progress after each block, so it is a
+// hundredth of the body, within these bounds: handing over takes as long as sending a few KiB.
+constexpr std::uint64_t kLeastBlock = 64 * 1024;
+constexpr std::uint64_t kMostBlock = 1024 * 1024;
 
 std::wstring WideFromAscii(std::string_view ascii) {
   return {ascii.begin(), ascii.end()};
@@ -129,7 +131,8 @@ std::optional<HttpAnswer> ReadAnswer(HINTERNET request, std::size_t maxBodyBytes
 }
 
 // The network's side of a streamed post. The calls that send block, so they run on a thread of their own,
-// which is given one block after the other and knows nothing of where they come from.
+// which is given one block after the other, each while the one before is sent, and knows nothing of where they
+// come from.
 class PostWorker {
  public:
   PostWorker(HINTERNET request, std::wstring headers, std::uint64_t length, std::size_t maxBodyBytes)
@@ -148,12 +151,13 @@ class PostWorker {
   PostWorker(const PostWorker&) = delete;
   PostWorker& operator=(const PostWorker&) = delete;
 
-  // Signalled when the next block is wanted, and when all is over.
+  // Signalled when the next block is wanted or the last one has left, and when all is over.
   std::array<HANDLE, 2> Events() const { return {wanted_.Get(), done_.Get()}; }
-  void Give(std::string block) {
-    block_ = std::move(block);
-    SetEvent(given_.Get());
-  }
+  // Bytes that have left.
+  std::uint32_t Sent() const { return sent_; }
+  // The next block; the caller's from when it is wanted until it is given.
+  std::string& Next() { return next_; }
+  void Give() { SetEvent(given_.Get()); }
   std::optional<HttpAnswer> TakeAnswer() { return std::move(answer_); }
 
  private:
@@ -164,11 +168,14 @@ class PostWorker {
     buffers.dwHeadersLength = static_cast<DWORD>(headers_.size());
     buffers.dwBufferTotal = static_cast<DWORD>(length_);
     if (!HttpSendRequestExW(request_, &buffers, nullptr, 0, 0)) return;
-    for (std::uint64_t sent = 0; sent < length_;) {
-      SetEvent(wanted_.Get());
+    std::string block;
+    SetEvent(wanted_.Get());
+    while (sent_ < length_) {
       WaitForSingleObject(given_.Get(), INFINITE);
       if (aborted_) return;
-      std::string_view rest = block_;
+      block.swap(next_);
+      SetEvent(wanted_.Get());
+      std::string_view rest = block;
       while (!rest.empty()) {
         DWORD written = 0;
         if (!InternetWriteFile(request_, rest.data(), static_cast<DWORD>(rest.size()), &written) ||
@@ -176,12 +183,10 @@ class PostWorker {
           return;
         rest.remove_prefix(written);
       }
-      sent += block_.size();
+      sent_ += static_cast<std::uint32_t>(block.size());
     }
-    // The last block has left.
     SetEvent(wanted_.Get());
-    WaitForSingleObject(given_.Get(), INFINITE);
-    if (aborted_ || !HttpEndRequestW(request_, nullptr, 0, 0)) return;
+    if (!HttpEndRequestW(request_, nullptr, 0, 0)) return;
     answer_ = ReadAnswer(request_, maxBodyBytes_);
   }
 
@@ -200,8 +205,9 @@ class PostWorker {
   const EventOwner given_{CreateEventW(nullptr, FALSE, FALSE, nullptr)};
   const EventOwner done_{CreateEventW(nullptr, TRUE, FALSE, nullptr)};
   std::atomic<bool> aborted_ = false;
+  std::atomic<std::uint32_t> sent_ = 0;
   // Handed over by the events.
-  std::string block_;
+  std::string next_;
   std::optional<HttpAnswer> answer_;
   std::thread thread_;
 };
@@ -231,16 +237,19 @@ std::optional<HttpAnswer> WindowsHttpTransport::PostStream(const HttpPost& post,
   const OpenedRequest closing = std::move(opened);
   const std::array<HANDLE, 2> events = worker.Events();
   WindowsMessagePump pump;
-  std::uint64_t sent = 0;
+  const std::uint64_t most = std::clamp(length / 100, kLeastBlock, kMostBlock);
+  std::uint64_t given = 0;
   for (;;) {
     const DWORD woken = MsgWaitForMultipleObjectsEx(static_cast<DWORD>(events.size()), events.data(),
                                                     INFINITE, QS_ALLINPUT, MWMO_INPUTAVAILABLE);
     if (woken == WAIT_OBJECT_0) {
-      source.Sent(sent);
-      std::string block(static_cast<std::size_t>(std::min<std::uint64_t>(kBlock, length - sent)), '\0');
+      source.Sent(worker.Sent());
+      if (given == length) continue;
+      std::string& block = worker.Next();
+      block.resize(static_cast<std::size_t>(std::min(most, length - given)));
       if (source.Read(block) != block.size()) return std::nullopt;
-      sent += block.size();
-      worker.Give(std::move(block));
+      given += block.size();
+      worker.Give();
     } else if (woken == WAIT_OBJECT_0 + 1) {
       return worker.TakeAnswer();
     } else if (woken == WAIT_FAILED) {

@@ -47,6 +47,7 @@ class WindowsFtpConnection : public FtpConnection {
     // succeed or fail by where its temporary name happens to be.
     if (!ansiServerFile || ansiServerFile->empty() || !Argument(localFile)) return false;
     StagedFile staged(WideFromText(localFile));
+    staged.Close();
     const auto ansiStaged = AnsiFromText(TextFromWide(staged.Path()));
     if (!ansiStaged || ansiStaged->empty()) return false;
     return FtpGetFileA(connection_.Get(), ansiServerFile->c_str(), ansiStaged->c_str(), FALSE, 0,

@@ -11,6 +11,10 @@ class WindowsMessagePump : public MessagePump {
  public:
   void Yield() override;
   bool Wait() override;
+
+ private:
+  // False when there is a quit message, which is put back.
+  bool Drain();
 };
 
 }  // namespace tarnwick

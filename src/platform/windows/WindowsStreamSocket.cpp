@@ -9,8 +9,6 @@
 namespace tarnwick {
 namespace {
 
-// Much at a time: each arrival costs several messages, whatever its size.
-constexpr int kReceiveRoom = 4 << 20;
 constexpr UINT kFirstMessage = WM_APP;
 // After so many connections the message numbers come again; those of the first are gone by then.
 constexpr UINT kConnections = 1000;
@@ -71,8 +69,6 @@ void WindowsStreamSocket::ConnectTo(std::uint32_t address) {
   if (socket_ == INVALID_SOCKET || WSAAsyncSelect(socket_, window_.Get(), MessageOf(Tells::kNetworkEvent),
                                                   FD_CONNECT | FD_READ | FD_WRITE | FD_CLOSE) != 0)
     return TellError(WSAGetLastError());
-  const int room = kReceiveRoom;
-  setsockopt(socket_, SOL_SOCKET, SO_RCVBUF, reinterpret_cast<const char*>(&room), sizeof room);
   sockaddr_in peer = {};
   peer.sin_family = AF_INET;
   peer.sin_port = htons(port_);

@@ -1,5 +1,7 @@
 #include "platform/windows/WindowsTimer.h"
 
+#include <algorithm>
+
 namespace tarnwick {
 namespace {
 
@@ -10,18 +12,28 @@ constexpr UINT_PTR kTimer = 1;
 WindowsTimer::WindowsTimer()
     : window_([this](UINT message, WPARAM, LPARAM) {
         if (message != WM_TIMER) return false;
-        Stop();
-        const std::function<void()> handler = handler_;
-        if (handler) handler();
+        OnTick();
         return true;
       }) {}
 
 void WindowsTimer::Start(std::uint32_t milliseconds) {
-  SetTimer(window_.Get(), kTimer, milliseconds, nullptr);
+  due_ = GetTickCount64() + milliseconds;
+  if (tick_ == 0 || tick_ > due_) TickAt(due_);
 }
 
-void WindowsTimer::Stop() {
+void WindowsTimer::OnTick() {
   KillTimer(window_.Get(), kTimer);
+  tick_ = 0;
+  if (due_ == 0) return;
+  if (GetTickCount64() < due_) return TickAt(due_);
+  due_ = 0;
+  const std::function<void()> handler = handler_;
+  if (handler) handler();
+}
+
+void WindowsTimer::TickAt(std::uint64_t time) {
+  tick_ = time;
+  SetTimer(window_.Get(), kTimer, static_cast<UINT>(time - std::min(time, GetTickCount64())), nullptr);
 }
 
 }  // namespace tarnwick

@@ -66,6 +66,10 @@ TEST(WindowsTimer, RunsOutOnceAndCountsAnew) {
   timer.Stop();
   PumpUntil([] { return false; }, 150);
   EXPECT_EQ(expired, 1);
+  // Sooner than it was to be.
+  timer.Start(10'000);
+  timer.Start(50);
+  EXPECT_TRUE(PumpUntil([&] { return expired > 1; }));
   // A wait that polls uses as much as it lasts.
   EXPECT_LE(ProcessorMs() - processor, 400U);
 }
