@@ -64,9 +64,14 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     std::abort();
   std::string sent;
   while (!input.empty()) {
-    const std::string_view piece = take();
+    std::string_view piece = take();
     sent.append(piece);
-    machine.OnData(piece);
+    while (!piece.empty()) {
+      const std::span<char> room = machine.Room(piece.size());
+      if (room.empty()) break;
+      machine.OnArrived(piece.copy(room.data(), room.size()));
+      piece.remove_prefix(room.size());
+    }
   }
   if (end & 1) machine.OnSocketError();
   if (end & 2) machine.OnWatchdog();

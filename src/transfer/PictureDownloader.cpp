@@ -1,14 +1,21 @@
 #include "transfer/PictureDownloader.h"
 
+#include <algorithm>
+#include <memory>
+
 #include "platform/FileSystem.h"
 #include "platform/Platform.h"
+#include "support/PathHelpers.h"
 #include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {
 
-// Of one arrival; a host hears of each.
-constexpr std::size_t kRoom = std::size_t{1} << 20;
+// A host hears of each arrival.
+constexpr std::size_t kMostOfArrival = std::size_t{4} << 20;
+
+// Bytes of a file that are compared at a time.
+constexpr std::size_t kCompared = std::size_t{256} << 10;
 
 // FtpErrors.
 constexpr std::int32_t kHostNotFound = 9;
@@ -32,6 +39,20 @@ std::int32_t FtpErrorOf(std::int32_t winsockError) {
     default:
       return kConnectAborted;
   }
+}
+
+// Whether the file has exactly these bytes.
+bool Holds(FileSystem& files, TextView path, std::string_view bytes) {
+  return ResultAsItStood(false, [&](bool& same) {
+    if (!FileExists(files, path) || files.Length(path) != bytes.size()) return;
+    const std::unique_ptr<FileReader> reader = files.Open(path);
+    std::string block(std::min(bytes.size(), kCompared), '\0');
+    for (; !bytes.empty(); bytes.remove_prefix(block.size())) {
+      block.resize(std::min(bytes.size(), kCompared));
+      if (reader->Read(block) != block.size() || bytes.substr(0, block.size()) != block) return;
+    }
+    same = true;
+  });
 }
 
 }  // namespace
@@ -82,9 +103,8 @@ void PictureDownloader::OnConnected() {
 }
 
 void PictureDownloader::OnReadable() {
-  room_.resize(kRoom);
-  const std::size_t count = socket_.Read(room_);
-  machine_.OnData({room_.data(), count});
+  const std::span<char> room = machine_.Room(kMostOfArrival);
+  if (!room.empty()) machine_.OnArrived(socket_.Read(room));
 }
 
 void PictureDownloader::OnSocketError(std::int32_t number) {
@@ -96,8 +116,9 @@ void PictureDownloader::WriteFile(TextView path, TextView explicitPath, std::str
   ResultAsItStood(0, [&](int&) {
     FileSystem& files = apartment_.platform.files;
     if (!explicitPath.empty()) files.Write(explicitPath, bytes);
-    // Not copied from the other one: the bytes are here.
-    if (explicitPath != path) files.Write(path, bytes);
+    // Not copied from the other one: the bytes are here. Most often the picture has been shown before, and the
+    // user's folder has it.
+    if (explicitPath != path && !Holds(files, path, bytes)) files.Write(path, bytes);
   });
 }
 

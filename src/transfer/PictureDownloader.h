@@ -1,8 +1,6 @@
 // A control's downloader: ties the machine to a socket, the watchdog and the local files.
 #pragma once
 
-#include <string>
-
 #include "platform/StreamSocket.h"
 #include "platform/Timer.h"
 #include "support/Apartment.h"
@@ -51,7 +49,6 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   SocketDownloader machine_;
   DownloadEvents* events_ = nullptr;
   std::int32_t ftpError_ = 0;
-  std::string room_;
 };
 
 }  // namespace tarnwick

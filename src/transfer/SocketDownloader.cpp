@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <charconv>
 #include <new>
+#include <utility>
 
 #include "support/PathHelpers.h"
 #include "support/RuntimeError.h"
@@ -36,8 +37,8 @@ void SocketDownloader::StartDownload(TextView url, TextView folder, TextView exp
                                      TextView proxyHost, TextView proxyPort) {
   if (url.empty()) return;
   Cancel();
-  buffer_ = {};
-  searched_ = arrived_ = 0;
+  reply_ = {};
+  searched_ = bodyStart_ = 0;
   contentLength_ = 0;
   headerFound_ = false;
   running_ = true;
@@ -67,7 +68,7 @@ void SocketDownloader::StartDownload(TextView url, TextView folder, TextView exp
 void SocketDownloader::Cancel() {
   if (!running_) return;
   running_ = false;
-  buffer_ = {};
+  reply_ = {};
   actions_.CloseSocket();
   actions_.StopWatchdog();
 }
@@ -79,18 +80,22 @@ void SocketDownloader::OnConnected() {
                 "User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n\r\n");
 }
 
-void SocketDownloader::OnData(std::span<const char> bytes) {
-  if (!running_ || bytes.empty()) return;
-  arrived_ += bytes.size();
-  if (arrived_ > kMostReplyBytes) return Fail(true);
-  const auto shown = static_cast<std::int32_t>(headerFound_ ? buffer_.size() + bytes.size() : arrived_);
+std::span<char> SocketDownloader::Room(std::size_t most) {
+  if (!running_) return {};
   try {
-    buffer_.append(bytes.data(), bytes.size());
+    return reply_.Room(most);
   } catch (const std::bad_alloc&) {
     // A file with a hole in it is worse than none.
-    return Fail(true);
+    Fail(true);
+    return {};
   }
-  actions_.Received(shown);
+}
+
+void SocketDownloader::OnArrived(std::size_t count) {
+  if (!running_ || count == 0) return;
+  reply_.Add(count);
+  if (reply_.Size() > kMostReplyBytes) return Fail(true);
+  actions_.Received(static_cast<std::int32_t>(reply_.Size() - bodyStart_));
   // The host may have ended or replaced the download in its event.
   if (!running_) return;
   actions_.RestartWatchdog();
@@ -100,16 +105,15 @@ void SocketDownloader::OnData(std::span<const char> bytes) {
 std::optional<std::string> SocketDownloader::FindHeader() {
   if (headerFound_) return std::nullopt;
   // The last three bytes may be the beginning of the empty line; all before them has been seen.
-  const std::size_t from = searched_ > 3 ? searched_ - 3 : 0;
-  const std::size_t end = buffer_.find(kHeaderEnd, from);
-  searched_ = buffer_.size();
-  if (end == std::string::npos) return std::nullopt;
+  const std::string_view arrived = reply_.Bytes();
+  const std::size_t end = arrived.find(kHeaderEnd, searched_ > 3 ? searched_ - 3 : 0);
+  searched_ = arrived.size();
+  if (end == std::string_view::npos) return std::nullopt;
   headerFound_ = true;
+  bodyStart_ = end + kHeaderEnd.size();
 
-  const std::string header = buffer_.substr(0, end);
-  buffer_.erase(0, end + kHeaderEnd.size());
-  std::string_view lines = header;
-  const std::string_view statusLine = lines.substr(0, lines.find("\r\n"));
+  std::string_view lines = arrived.substr(0, end);
+  const std::string statusLine(lines.substr(0, lines.find("\r\n")));
   while (!lines.empty()) {
     const std::string_view line = lines.substr(0, lines.find("\r\n"));
     if (line.find("Content-Length") != std::string_view::npos) {
@@ -122,22 +126,21 @@ std::optional<std::string> SocketDownloader::FindHeader() {
   // there is no room for all of it, there may be for what really comes.
   ResultAsItStood(0, [&](int&) {
     if (contentLength_ > 0)
-      buffer_.reserve(std::min<std::size_t>(static_cast<std::size_t>(contentLength_), kMostReplyBytes));
+      reply_.Reserve(bodyStart_ + std::min(static_cast<std::size_t>(contentLength_), kMostReplyBytes));
   });
-  return std::string(statusLine);
+  return statusLine;
 }
 
 void SocketDownloader::OnClosedByPeer() {
   if (!running_) return;
   // A host that pumps messages in the event of an arrival gets the close before the arrival was searched.
   const auto statusLine = FindHeader();
-  if (!headerFound_) return Fail(arrived_ == 0);
-  const std::string body = std::move(buffer_);
-  buffer_ = {};
+  if (!headerFound_) return Fail(reply_.Size() == 0);
+  const ReplyBuffer reply = std::exchange(reply_, {});
   running_ = false;
   actions_.CloseSocket();
   actions_.StopWatchdog();
-  actions_.WriteFile(target_, explicitTarget_, body);
+  actions_.WriteFile(target_, explicitTarget_, reply.Bytes().substr(bodyStart_));
   if (statusLine) actions_.ReplyLine(*statusLine);
   actions_.Finished();
 }
@@ -154,14 +157,14 @@ void SocketDownloader::OnWatchdog() {
   if (!running_) return;
   // The socket stays as it is; a new download closes it.
   running_ = false;
-  buffer_ = {};
+  reply_ = {};
   actions_.StopWatchdog();
   actions_.Failed(false);
 }
 
 void SocketDownloader::Fail(bool told) {
   running_ = false;
-  buffer_ = {};
+  reply_ = {};
   actions_.CloseSocket();
   actions_.StopWatchdog();
   actions_.Failed(told);

@@ -19,6 +19,7 @@
 #include <string_view>
 
 #include "support/Text.h"
+#include "transfer/ReplyBuffer.h"
 
 namespace tarnwick {
 
@@ -64,8 +65,11 @@ class SocketDownloader {
   void Cancel();
 
   void OnConnected();
-  // Bytes in the order of their arrival.
-  void OnData(std::span<const char> bytes);
+  // Where the next bytes that arrive are to be put, at most `most`; empty when the download is over, which it
+  // is when there is no memory for them.
+  std::span<char> Room(std::size_t most);
+  // So many bytes have arrived in the room.
+  void OnArrived(std::size_t count);
   void OnClosedByPeer();
   void OnSent();
   void OnSocketError();
@@ -77,7 +81,7 @@ class SocketDownloader {
 
  private:
   void Fail(bool told);
-  // The status line when the header, which was not known before, is whole in the buffer; takes it from there.
+  // The status line when the header, which was not known before, is whole.
   std::optional<std::string> FindHeader();
 
   DownloadActions& actions_;
@@ -86,10 +90,11 @@ class SocketDownloader {
   Text remotePath_;
   Text target_;
   Text explicitTarget_;
-  // Everything that has arrived; the body alone once the header was found.
-  std::string buffer_;
+  // Everything that has arrived.
+  ReplyBuffer reply_;
   std::size_t searched_ = 0;
-  std::size_t arrived_ = 0;
+  // Where the body begins, once the header was found.
+  std::size_t bodyStart_ = 0;
   std::int32_t contentLength_ = 0;
   bool headerFound_ = false;
   bool running_ = false;

@@ -158,6 +158,7 @@ TEST_F(ThumbNailTest, ListsAgainAfterAFailure) {
   listingFails = false;
   List("a.gif");
   EXPECT_EQ(Shown(), "a.gif,");
+  EXPECT_EQ(Selected(), AddressOf("a.gif"));
   control.mobjFileupload = nullptr;
   fake.apartment.listLoaded = false;
   EXPECT_FALSE(control.Init(u"*"));

@@ -42,7 +42,7 @@ std::size_t Find(const FileList& list, const Matches& matches) {
 void ctrlThumbNailView::UpdateSelection() {
   ResultAsItStood(0, [&](int&) {
     const FileList& shown = apartment_.shownFiles;
-    if (selectedPath_.empty() && !shown.IsEmpty()) selectedPath_ = shown.At(1)->FilePath;
+    if (Trim(selectedPath_).empty() && !shown.IsEmpty()) selectedPath_ = shown.At(1)->FilePath;
     if (firstIndex_ != selectionFirstIndex_ && !keepSelection_ && !shown.IsEmpty()) {
       const auto position = static_cast<std::size_t>(page_.ScrollValue() + 1);
       if (position <= shown.Count()) selectedPath_ = shown.At(position)->FilePath;

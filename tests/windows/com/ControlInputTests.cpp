@@ -1,9 +1,4 @@
 // What the user does with the list control: drags, drops and keys.
-#include <ole2.h>
-#include <shlobj.h>
-
-#include <cstring>
-
 #include "Form.h"
 
 namespace tarnwick::test {
@@ -55,24 +50,6 @@ class Dragged {
 
   IDispatch* object_;
 };
-
-// A drag of files as another program would offer it: the clipboard's data object.
-ComPtr<IDataObject> FilesFromOutside(HWND window, const std::vector<std::wstring>& files) {
-  std::wstring paths;
-  for (const std::wstring& file : files) paths += file + L'\0';
-  paths += L'\0';
-  const std::size_t size = paths.size() * sizeof(wchar_t);
-  const HGLOBAL block = GlobalAlloc(GMEM_MOVEABLE, sizeof(DROPFILES) + size);
-  auto* head = static_cast<DROPFILES*>(GlobalLock(block));
-  *head = {sizeof(DROPFILES), {0, 0}, FALSE, TRUE};
-  std::memcpy(head + 1, paths.data(), size);
-  GlobalUnlock(block);
-  EXPECT_TRUE(OpenClipboard(window) && EmptyClipboard() && SetClipboardData(CF_HDROP, block) &&
-              CloseClipboard());
-  ComPtr<IDataObject> data;
-  EXPECT_EQ(OleGetClipboard(data.Receive()), S_OK);
-  return data;
-}
 
 TEST(ListControl, TakesFilesThatAreDroppedOnIt) {
   Form form;

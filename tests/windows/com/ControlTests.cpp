@@ -1,4 +1,4 @@
-// The list control in a full container of our own, in the system's, and in none.
+// The controls in a full container of our own, in the system's, and in none.
 #include "Form.h"
 
 namespace tarnwick::test {
@@ -6,19 +6,25 @@ namespace {
 
 constexpr DISPID kDropModeId = 34;
 
-TEST(ListControl, KeepsItsPropertiesWithTheForm) {
+// Where both controls are alike.
+template <typename AnyForm>
+class AnyControl : public testing::Test {};
+using AnyForms = testing::Types<Form, ThumbForm>;
+TYPED_TEST_SUITE(AnyControl, AnyForms);
+
+TYPED_TEST(AnyControl, KeepsItsPropertiesWithTheForm) {
   const auto bag = ComPtr<PropertyBag>::Adopt(new PropertyBag);
   for (const auto wayIn : {ControlContainer::WayIn::kSteps, ControlContainer::WayIn::kQuickActivate}) {
-    Form form(wayIn);
+    TypeParam form(wayIn);
     ComPtr<IPersistPropertyBag> persist;
     ComPtr<IPersistStreamInit> stream;
-    ASSERT_EQ(form.list->QueryInterface(IID_IPersistPropertyBag, persist.ReceiveVoid()), S_OK);
-    ASSERT_EQ(form.list->QueryInterface(IID_IPersistStreamInit, stream.ReceiveVoid()), S_OK);
+    ASSERT_EQ(form.control->QueryInterface(IID_IPersistPropertyBag, persist.ReceiveVoid()), S_OK);
+    ASSERT_EQ(form.control->QueryInterface(IID_IPersistStreamInit, stream.ReceiveVoid()), S_OK);
     EXPECT_EQ(stream->IsDirty(), S_FALSE);
-    form.list->put_OLEDropMode(1);
+    form.control->put_OLEDropMode(1);
     EXPECT_EQ(form.container->changed, std::vector<DISPID>{kDropModeId});
     EXPECT_EQ(stream->IsDirty(), S_OK);
-    form.list->put_OLEDragMode(70000);
+    form.control->put_OLEDragMode(70000);
     EXPECT_EQ(persist->Save(bag.Get(), TRUE, FALSE), S_OK);
     EXPECT_EQ(stream->IsDirty(), S_FALSE);
 
@@ -31,21 +37,21 @@ TEST(ListControl, KeepsItsPropertiesWithTheForm) {
     for (;; --size.QuadPart) {
       memory->SetSize(size);
       memory->Seek({}, STREAM_SEEK_SET, nullptr);
-      form.list->put_OLEDropMode(9);
+      form.control->put_OLEDropMode(9);
       const HRESULT loaded = stream->Load(memory.Get());
       SHORT mode = 0;
-      form.list->get_OLEDropMode(&mode);
+      form.control->get_OLEDropMode(&mode);
       EXPECT_EQ(SUCCEEDED(loaded) ? 1 : 9, mode) << size.QuadPart;
       if (size.QuadPart == 0) break;
     }
     persist = {};
     stream = {};
   }
-  Form form(ControlContainer::WayIn::kSteps, bag.Get());
+  TypeParam form(ControlContainer::WayIn::kSteps, bag.Get());
   SHORT dropMode = 0;
   LONG dragMode = 0;
-  form.list->get_OLEDropMode(&dropMode);
-  form.list->get_OLEDragMode(&dragMode);
+  form.control->get_OLEDropMode(&dropMode);
+  form.control->get_OLEDragMode(&dragMode);
   EXPECT_EQ(dropMode, 1);
   EXPECT_EQ(dragMode, 70000);
 }
@@ -238,27 +244,38 @@ TEST(ListControl, MayBeReleasedInAnEventOfItsWait) {
   DeleteFileW(L"rose.jpg");
 }
 
-TEST(ListControl, LivesInTheSystemsContainer) {
-  const HMODULE atl = LoadLibraryW(L"atl.dll");
-  const auto init =
-      reinterpret_cast<BOOL(WINAPI*)()>(reinterpret_cast<void*>(GetProcAddress(atl, "AtlAxWinInit")));
-  const auto get = reinterpret_cast<HRESULT(WINAPI*)(HWND, IUnknown**)>(
-      reinterpret_cast<void*>(GetProcAddress(atl, "AtlAxGetControl")));
-  ASSERT_TRUE(init && get && init());
-  const HWND window = CreateWindowExW(0, L"AtlAxWin", L"Tarnwick.ctrlListImage", WS_POPUP, 0, 0, 300, 200,
-                                      nullptr, nullptr, nullptr, nullptr);
+using GetControl = HRESULT(WINAPI*)(HWND window, IUnknown** control);
+
+// Registers the system's container, once; null when there is none.
+GetControl SystemsContainer() {
+  static const GetControl get = [] {
+    const HMODULE atl = LoadLibraryW(L"atl.dll");
+    const auto init =
+        reinterpret_cast<BOOL(WINAPI*)()>(reinterpret_cast<void*>(GetProcAddress(atl, "AtlAxWinInit")));
+    return init && init()
+               ? reinterpret_cast<GetControl>(reinterpret_cast<void*>(GetProcAddress(atl, "AtlAxGetControl")))
+               : nullptr;
+  }();
+  return get;
+}
+
+TYPED_TEST(AnyControl, LivesInTheSystemsContainer) {
+  const GetControl get = SystemsContainer();
+  ASSERT_TRUE(get);
+  const HWND window = CreateWindowExW(0, L"AtlAxWin", TypeParam::kProgId, WS_POPUP, 0, 0, 300, 200, nullptr,
+                                      nullptr, nullptr, nullptr);
   ASSERT_NE(window, nullptr);
   ShowWindow(window, SW_SHOWNOACTIVATE);
   ComPtr<IUnknown> control;
   ASSERT_EQ(get(window, control.Receive()), S_OK);
-  ComPtr<_ctrlListImage> list;
-  EXPECT_EQ(control->QueryInterface(__uuidof(_ctrlListImage), list.ReceiveVoid()), S_OK);
+  typename TypeParam::Control members;
+  EXPECT_EQ(control->QueryInterface(TypeParam::InterfaceId(), members.ReceiveVoid()), S_OK);
   ComPtr<IOleWindow> oleWindow;
   HWND inner = nullptr;
   EXPECT_EQ(control->QueryInterface(IID_IOleWindow, oleWindow.ReceiveVoid()), S_OK);
   EXPECT_EQ(oleWindow->GetWindow(&inner), S_OK);
   EXPECT_TRUE(IsChild(window, inner));
-  list = {};
+  members = {};
   oleWindow = {};
   control = {};
   DestroyWindow(window);

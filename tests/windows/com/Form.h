@@ -1,8 +1,13 @@
-// A form with the list control on it, in the full container, and what the control told.
+// A form with a control on it, in the full container, and what the control told.
 #pragma once
 
 #include <gtest/gtest.h>
 
+#include <ole2.h>
+#include <shlobj.h>
+
+#include <algorithm>
+#include <cstring>
 #include <fstream>
 #include <functional>
 #include <iterator>
@@ -40,12 +45,34 @@ inline std::optional<std::string> Contents(const std::wstring& path) {
   return bytes;
 }
 
-class Form {
+// A drag of files as another program would offer it: the clipboard's data object.
+inline ComPtr<IDataObject> FilesFromOutside(HWND window, const std::vector<std::wstring>& files) {
+  std::wstring paths;
+  for (const std::wstring& file : files) paths += file + L'\0';
+  paths += L'\0';
+  const std::size_t size = paths.size() * sizeof(wchar_t);
+  const HGLOBAL block = GlobalAlloc(GMEM_MOVEABLE, sizeof(DROPFILES) + size);
+  auto* head = static_cast<DROPFILES*>(GlobalLock(block));
+  *head = {sizeof(DROPFILES), {0, 0}, FALSE, TRUE};
+  std::memcpy(head + 1, paths.data(), size);
+  GlobalUnlock(block);
+  EXPECT_TRUE(OpenClipboard(window) && EmptyClipboard() && SetClipboardData(CF_HDROP, block) &&
+              CloseClipboard());
+  ComPtr<IDataObject> data;
+  EXPECT_EQ(OleGetClipboard(data.Receive()), S_OK);
+  return data;
+}
+
+// `Interface` is the control's.
+template <typename Interface>
+class ControlForm {
  public:
   HWND frame = CreateWindowExW(WS_EX_CONTROLPARENT, L"STATIC", L"form", WS_POPUP, 0, 0, 400, 300, nullptr,
                                nullptr, nullptr, nullptr);
   ComPtr<ControlContainer> container = ComPtr<ControlContainer>::Adopt(new ControlContainer(frame));
-  ComPtr<_ctrlListImage> list;
+  using Control = ComPtr<Interface>;
+  static const IID& InterfaceId() { return __uuidof(Interface); }
+  Control control;
   // FileManagerEvents as "CODE TEXT", and the byte counts of those that tell progress.
   std::vector<std::wstring> events;
   std::vector<int> progress;
@@ -53,8 +80,7 @@ class Form {
   std::function<void(int code)> onEvent;
   std::function<void(DISPID event, std::vector<VARIANT>& arguments)> onOther;
 
-  explicit Form(ControlContainer::WayIn wayIn = ControlContainer::WayIn::kSteps,
-                IPropertyBag* bag = nullptr) {
+  ControlForm(REFCLSID classId, ControlContainer::WayIn wayIn, IPropertyBag* bag) {
     container->onEvent = [this](DISPID event, std::vector<VARIANT>& arguments) {
       if (event != kFileManagerEvent) {
         if (onOther) onOther(event, arguments);
@@ -68,24 +94,24 @@ class Form {
         events.push_back(std::to_wstring(code) + L" " + (text ? text : L""));
       if (onEvent) onEvent(code);
     };
-    EXPECT_EQ(container->Create(CLSID_ctrlListImage, wayIn, bag), S_OK);
-    EXPECT_EQ(container->Control()->QueryInterface(__uuidof(_ctrlListImage), list.ReceiveVoid()), S_OK);
+    EXPECT_EQ(container->Create(classId, wayIn, bag), S_OK);
+    EXPECT_EQ(container->Control()->QueryInterface(__uuidof(Interface), control.ReceiveVoid()), S_OK);
   }
-  ~Form() {
-    list = {};
+  ~ControlForm() {
+    control = {};
     // The container's was the last reference, and it was never called in a way that it must not be.
     EXPECT_EQ(container->Close(), 0U);
     for (const std::string& violation : container->violations) ADD_FAILURE() << violation;
     container = {};
     DestroyWindow(frame);
   }
-  Form(const Form&) = delete;
-  Form& operator=(const Form&) = delete;
+  ControlForm(const ControlForm&) = delete;
+  ControlForm& operator=(const ControlForm&) = delete;
 
   void LogOn(const std::wstring& serverName) {
     const Server& server = TheServer();
     ComPtr<_CFileUpload> client;
-    ASSERT_EQ(list->get_mobjFileupload(client.Receive()), S_OK);
+    ASSERT_EQ(control->get_mobjFileupload(client.Receive()), S_OK);
     VARIANT_BOOL done = VARIANT_FALSE;
     client->ConnectToServer(Bstr(serverName), &done);
     client->LogonAs(Bstr(server.product), Bstr(server.user), Bstr(server.password), Bstr(L""), &done);
@@ -95,7 +121,7 @@ class Form {
     Bstr text(filter);
     BSTR given = text;
     VARIANT_BOOL done = VARIANT_FALSE;
-    return SUCCEEDED(list->Init(&given, &done)) && done;
+    return SUCCEEDED(control->Init(&given, &done)) && done;
   }
   void Show() {
     ShowWindow(frame, SW_SHOWNOACTIVATE);
@@ -103,11 +129,10 @@ class Form {
   }
   HWND Window() const {
     ComPtr<IOleWindow> window;
-    HWND control = nullptr;
-    if (SUCCEEDED(list->QueryInterface(IID_IOleWindow, window.ReceiveVoid()))) window->GetWindow(&control);
-    return control;
+    HWND outer = nullptr;
+    if (SUCCEEDED(control->QueryInterface(IID_IOleWindow, window.ReceiveVoid()))) window->GetWindow(&outer);
+    return outer;
   }
-  HWND ListWindow() const { return FindWindowExW(Window(), nullptr, WC_LISTVIEWW, nullptr); }
   // As the message loop of a host handles a message of a window on the form. True when the control or its
   // site took it.
   bool Handle(MSG message) {
@@ -116,7 +141,6 @@ class Form {
     return false;
   }
   bool Press(WPARAM key, HWND window) { return Handle({window, WM_KEYDOWN, key, 0, 0, {0, 0}}); }
-  bool Press(WPARAM key) { return Press(key, ListWindow()); }
   void Pump() {
     MSG message = {};
     while (PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) Handle(message);
@@ -125,20 +149,87 @@ class Form {
     Bstr text(name);
     BSTR given = text;
     VARIANT ignored = {};
-    list->UploadedFileSetFocus(&given, &ignored);
-    Bstr selected;
-    list->SelectedFileName(selected.Receive());
-    return selected.Text();
+    control->UploadedFileSetFocus(&given, &ignored);
+    return Selected();
   }
+  std::wstring Selected() const {
+    Bstr name;
+    control->SelectedFileName(name.Receive());
+    return name.Text();
+  }
+};
+
+class Form : public ControlForm<_ctrlListImage> {
+ public:
+  static constexpr wchar_t kProgId[] = L"Tarnwick.ctrlListImage";
+  const Control& list = control;
+
+  explicit Form(ControlContainer::WayIn wayIn = ControlContainer::WayIn::kSteps, IPropertyBag* bag = nullptr)
+      : ControlForm(CLSID_ctrlListImage, wayIn, bag) {}
+  HWND ListWindow() const { return FindWindowExW(Window(), nullptr, WC_LISTVIEWW, nullptr); }
+  using ControlForm::Press;
+  bool Press(WPARAM key) { return Press(key, ListWindow()); }
   // Into the current folder. The path that the control returns.
   std::wstring Download(const wchar_t* name) {
     EXPECT_EQ(Select(name), name);
     events.clear();
     progress.clear();
     Bstr local;
-    list->DownLoadFileFromServer(Bstr(L"."), local.Receive());
+    control->DownLoadFileFromServer(Bstr(L"."), local.Receive());
     return local.Text();
   }
+};
+
+using Lines = std::vector<std::wstring>;
+
+// The account's folder, on the server and here.
+inline std::wstring FolderName() {
+  std::wstring name = TheServer().user;
+  std::replace(name.begin() + static_cast<std::ptrdiff_t>(name.find(L'@')), name.end(), L'.', L'-');
+  return name;
+}
+inline std::wstring Address(const std::wstring& file) {
+  return L"http://" + TheServer().name + L"/users/" + FolderName() + L"/" + file;
+}
+inline const Lines kJpegs = {L"Chelsea the cat.jpg", L"coffee.jpg", L"rocket.jpg", L"rose.jpg"};
+
+inline std::wstring TextOf(HWND window) {
+  wchar_t text[300] = {};
+  GetWindowTextW(window, text, 300);
+  return text;
+}
+
+class ThumbForm : public ControlForm<_ctrlThumbNailView> {
+ public:
+  static constexpr wchar_t kProgId[] = L"Tarnwick.ctrlThumbNailView";
+  // A little more than the whole page.
+  static constexpr int kWidth = 350;
+  static constexpr int kHeight = 420;
+
+  explicit ThumbForm(ControlContainer::WayIn wayIn = ControlContainer::WayIn::kSteps,
+                     IPropertyBag* bag = nullptr)
+      : ControlForm(CLSID_ctrlThumbNailView, wayIn, bag) {
+    SetWindowPos(frame, nullptr, 0, 0, 400, 440, SWP_NOZORDER | SWP_NOACTIVATE);
+    container->SetBounds({10, 10, 10 + kWidth, 10 + kHeight});
+  }
+  HWND Grid() const { return FindWindowExW(Window(), nullptr, L"STATIC", L"Pictures of the account"); }
+  HWND Editor() const { return FindWindowExW(Grid(), nullptr, L"EDIT", nullptr); }
+  HWND ScrollBar() const { return FindWindowExW(Window(), nullptr, L"SCROLLBAR", nullptr); }
+  // From 1; before the slots stands the name of the editor.
+  HWND Slot(int slot) const {
+    HWND window = nullptr;
+    for (int i = 0; i <= slot; ++i) window = FindWindowExW(Grid(), window, L"STATIC", nullptr);
+    return window;
+  }
+  // Of the page, in the order of the slots; those that are hidden are not there.
+  Lines Captions() const {
+    Lines captions;
+    for (int slot = 1; slot <= 4; ++slot)
+      if (IsWindowVisible(Slot(slot))) captions.push_back(TextOf(Slot(slot)));
+    return captions;
+  }
+  using ControlForm::Press;
+  bool Press(WPARAM key) { return Press(key, Grid()); }
 };
 
 }  // namespace tarnwick::test

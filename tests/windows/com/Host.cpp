@@ -40,8 +40,7 @@ ComPtr<_CFileUpload> LoggedOnClient() {
 }
 
 VARIANT Call(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments) {
-  VARIANT result;
-  V_VT(&result) = VT_ERROR;
+  VARIANT result = {};
   std::wstring name = member;
   LPOLESTR names = name.data();
   DISPID id = 0;
