@@ -116,8 +116,8 @@ void PictureDownloader::WriteFile(TextView path, TextView explicitPath, std::str
   ResultAsItStood(0, [&](int&) {
     FileSystem& files = apartment_.platform.files;
     if (!explicitPath.empty()) files.Write(explicitPath, bytes);
-    // Not copied from the other one: the bytes are here. Most often the picture has been shown before, and the
-    // user's folder has it.
+    // Not copied from the other one: the bytes are here. Most often the picture has been shown before, and
+    // the user's folder has it.
     if (explicitPath != path && !Holds(files, path, bytes)) files.Write(path, bytes);
   });
 }

@@ -1,5 +1,5 @@
-// What has arrived of a reply: bytes that are written where they stay, so that a large one is neither copied nor
-// cleared on its way.
+// What has arrived of a reply: bytes that are written where they stay, so that a large one is neither copied
+// nor cleared on its way.
 #pragma once
 
 #include <algorithm>

@@ -211,6 +211,15 @@ std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPA
       user_.GotFocus();
       if (IsAlive(this, window) && listShown_) SetFocus(list_);
       return 0;
+    case WM_ERASEBKGND: {
+      // Around the label; else the list covers it.
+      RECT client = {};
+      GetClientRect(window, &client);
+      const auto dc = reinterpret_cast<HDC>(wParam);
+      SetDCBrushColor(dc, BackColor());
+      FillRect(dc, &client, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
+      return TRUE;
+    }
     case WM_CTLCOLORSTATIC: {
       const auto dc = reinterpret_cast<HDC>(wParam);
       SetTextColor(dc, TextColor());
@@ -283,9 +292,28 @@ std::optional<LRESULT> WindowsListView::OnListMessage(UINT message, WPARAM wPara
     case WM_RBUTTONDOWN:
       user_.ButtonPressed();
       return std::nullopt;
+    case WM_GETDLGCODE: {
+      // Of a form that handles its keys as a dialog does, Enter would press the default button.
+      const auto* const key = reinterpret_cast<const MSG*>(lParam);
+      const bool enter = key && key->message == WM_KEYDOWN && key->wParam == VK_RETURN;
+      return DefSubclassProc(list_, message, wParam, lParam) | (enter ? DLGC_WANTMESSAGE : 0);
+    }
+    case WM_KILLFOCUS: {
+      const HWND outer = Outer();
+      const LRESULT result = DefSubclassProc(list_, message, wParam, lParam);
+      const auto to = reinterpret_cast<HWND>(wParam);
+      // The editor of a label is the list's child.
+      if (IsAlive(this, outer) && to != outer && !IsChild(outer, to)) user_.LostFocus();
+      return result;
+    }
     case WM_KEYDOWN: {
       if (wParam == VK_RETURN) {
         user_.EnterPressed();
+        return 0;
+      }
+      if (wParam == VK_F2) {
+        // The list asks whether it may, as it does after a slow second click.
+        if (const auto selected = NextSelected(0)) ListView_EditLabel(list_, static_cast<int>(*selected));
         return 0;
       }
       const HWND outer = Outer();

@@ -1,0 +1,19 @@
+// What the controls' events mean to a person.
+#pragma once
+
+#include <string>
+
+namespace tarnwick::demo {
+
+// Codes of FileManagerEvent that the host acts on.
+inline constexpr int kCodeQuickStart = 1111;
+inline constexpr int kCodeBusy = 1234;
+inline constexpr int kCodeDeleteKey = 2222;
+inline constexpr int kCodeSwitchView = 5554;
+inline constexpr int kCodeRefreshKey = 7777;
+inline constexpr int kCodeProgress = 9999;
+
+// The status line for a FileManagerEvent.
+std::wstring Wording(int code, const std::wstring& text);
+
+}  // namespace tarnwick::demo

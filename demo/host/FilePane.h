@@ -1,0 +1,131 @@
+// One of the two controls on the host's form. What both can do the host calls here, so that its commands act
+// on whichever is shown.
+#pragma once
+
+#include "ControlContainer.h"
+#include "support/surface/TypeLibrary.h"
+
+#include "Argument.h"
+
+namespace tarnwick::demo {
+
+class FilePane {
+ public:
+  using EventHandler = std::function<void(DISPID event, std::vector<VARIANT>& arguments)>;
+
+  FilePane() = default;
+  virtual ~FilePane() = default;
+  FilePane(const FilePane&) = delete;
+  FilePane& operator=(const FilePane&) = delete;
+
+  // Puts the control into `window`, hidden.
+  virtual bool Create(HWND window, const EventHandler& onEvent) = 0;
+  // The service client that the control works with.
+  virtual ComPtr<_CFileUpload> Client() const = 0;
+  virtual void UseClient(_CFileUpload* client) = 0;
+  // Lists the account.
+  virtual bool Init(const std::wstring& filter) = 0;
+  virtual void ChangeFilter(const std::wstring& filter) = 0;
+  virtual bool Upload(const std::wstring& path) = 0;
+  // Of the selected file; the path that it was written to.
+  virtual std::wstring Download(const std::wstring& folder) = 0;
+  virtual void Delete() = 0;
+  virtual void StartRename() = 0;
+  // Whether there is a file of that name to select.
+  virtual bool Select(const std::wstring& name) = 0;
+  virtual std::wstring Selected() const = 0;
+
+  void Show() { container_->Do(OLEIVERB_SHOW); }
+  void Hide() { container_->Do(OLEIVERB_HIDE); }
+  void SetBounds(const RECT& bounds) {
+    if (container_) container_->SetBounds(bounds);
+  }
+  bool TranslateKey(MSG& message) { return container_ && container_->TranslateKey(message); }
+  void Close() {
+    if (container_) container_->Close();
+  }
+  // The control's window.
+  HWND Window() const;
+
+ protected:
+  bool CreateControl(HWND window, REFCLSID classId, const EventHandler& onEvent);
+  IUnknown* Control() const { return container_->Control(); }
+
+ private:
+  ComPtr<ControlContainer> container_;
+};
+
+// The members that the interfaces of both controls have.
+template <typename Interface>
+class FilePaneOf : public FilePane {
+ public:
+  bool Create(HWND window, const EventHandler& onEvent) override {
+    return CreateControl(window, ClassId(), onEvent) &&
+           SUCCEEDED(Control()->QueryInterface(__uuidof(Interface), control_.ReceiveVoid()));
+  }
+  ComPtr<_CFileUpload> Client() const override {
+    ComPtr<_CFileUpload> client;
+    control_->get_mobjFileupload(client.Receive());
+    return client;
+  }
+  void UseClient(_CFileUpload* client) override { control_->putref_mobjFileupload(client); }
+  bool Init(const std::wstring& filter) override {
+    Argument text(filter);
+    VARIANT_BOOL done = VARIANT_FALSE;
+    VARIANT_BOOL on = VARIANT_TRUE;
+    VARIANT ignored = {};
+    control_->EnableRename(&on, &ignored);
+    return SUCCEEDED(control_->Init(text.Reference(), &done)) && done;
+  }
+  void ChangeFilter(const std::wstring& filter) override {
+    control_->ChangeFileFilter(Argument(filter).Get());
+  }
+  bool Upload(const std::wstring& path) override {
+    VARIANT_BOOL done = VARIANT_FALSE;
+    control_->UploadImage(Argument(path).Get(), &done);
+    return done;
+  }
+  std::wstring Download(const std::wstring& folder) override {
+    BSTR local = nullptr;
+    control_->DownLoadFileFromServer(Argument(folder).Get(), &local);
+    return Taken(local);
+  }
+  void Delete() override { control_->DeleteFile(); }
+  bool Select(const std::wstring& name) override {
+    Argument text(name);
+    VARIANT ignored = {};
+    control_->UploadedFileSetFocus(text.Reference(), &ignored);
+    return Selected() == name;
+  }
+  std::wstring Selected() const override {
+    BSTR name = nullptr;
+    control_->SelectedFileName(&name);
+    return Taken(name);
+  }
+
+ protected:
+  virtual REFCLSID ClassId() const = 0;
+
+  ComPtr<Interface> control_;
+};
+
+class ListPane final : public FilePaneOf<_ctrlListImage> {
+ public:
+  bool Init(const std::wstring& filter) override;
+  void StartRename() override;
+  int Count() const;
+
+ private:
+  REFCLSID ClassId() const override { return CLSID_ctrlListImage; }
+  HWND ListWindow() const;
+};
+
+class ThumbnailPane final : public FilePaneOf<_ctrlThumbNailView> {
+ public:
+  void StartRename() override;
+
+ private:
+  REFCLSID ClassId() const override { return CLSID_ctrlThumbNailView; }
+};
+
+}  // namespace tarnwick::demo
