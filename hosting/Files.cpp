@@ -35,16 +35,24 @@ TemporaryFile::~TemporaryFile() {
 }
 
 void TemporaryFile::Append(std::string_view bytes) {
+  waiting_.append(bytes);
+  size_ += bytes.size();
+  if (waiting_.size() >= kBlock) Flush();
+}
+
+void TemporaryFile::Flush() {
+  std::string_view bytes = waiting_;
   while (!bytes.empty()) {
     const ssize_t written = write(file_.Get(), bytes.data(), bytes.size());
     if (written < 0 && errno == EINTR) continue;
     if (written < 0) ThrowLastError(path_);
     bytes.remove_prefix(static_cast<std::size_t>(written));
-    size_ += static_cast<std::size_t>(written);
   }
+  waiting_.clear();
 }
 
 void TemporaryFile::Sync() {
+  Flush();
   if (fsync(file_.Get()) != 0) ThrowLastError(path_);
 }
 

@@ -4,6 +4,7 @@
 
 #include <cstdint>
 #include <filesystem>
+#include <string>
 #include <string_view>
 #include <utility>
 
@@ -36,21 +37,25 @@ class TemporaryFile {
   TemporaryFile& operator=(const TemporaryFile&) = delete;
   ~TemporaryFile();
 
+  // Collects small pieces: an upload arrives in many of them, and each write is a call of the system.
   void Append(std::string_view bytes);
   std::uint64_t Size() const { return size_; }
 
   // Puts the bytes on the disk.
   void Sync();
 
-  // Whether the file `other` holds the same bytes.
+  // Whether the file `other` holds the same bytes. Sync comes first.
   bool HasBytesOf(const std::filesystem::path& other) const;
 
   // Takes the place of `target`, whatever was there, durably. Sync comes first.
   void MoveTo(const std::filesystem::path& target);
 
  private:
+  void Flush();
+
   std::filesystem::path path_;
   FileHandle file_;
+  std::string waiting_;
   std::uint64_t size_ = 0;
 };
 

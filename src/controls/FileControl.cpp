@@ -3,7 +3,6 @@
 #include <utility>
 
 #include "controls/FileNames.h"
-#include "platform/FileSystem.h"
 #include "support/PathHelpers.h"
 #include "support/RuntimeError.h"
 #include "transfer/AcceptorPages.h"
@@ -127,7 +126,7 @@ bool FileControl::UploadImage(TextView szLocalPath) {
       downloader_.StopWatchdog();
     }
     TransferEnded();
-    if (url.empty()) return;
+    if (url.empty()) return copyWriter_.reset();
     ShowUploaded(RecordUploaded(path, url));
     uploaded = true;
     RaiseCurrentItem();
@@ -139,6 +138,7 @@ bool FileControl::SendFile(const Text& path) {
   uploadFinished_ = false;
   m_lUploadedBytes = 0;
   downloader_.RestartWatchdog();
+  BeginLocalCopy(path);
   try {
     uploader_.UploadFile(path, UsersBaseUrl(session.serverName), AcceptorPath(u"UploadAcceptor.asp"), 0,
                          Text(session.userName), Text(session.password), kProductGuid, *this);
@@ -202,11 +202,7 @@ std::shared_ptr<CUpload> FileControl::RecordUploaded(const Text& path, const Tex
   record->FilePath = url;
   record->FileSize = GetLocalFileSize(files, path);
   record->FileDate = GetLocalFileDate(files, path);
-  if (const Text copy = LocalCopyOf(url); !copy.empty() && copy != path) {
-    // The copy of the picture that was there before must not be shown for the new one.
-    RemoveLocalCopy(copy);
-    CopyLocalFile(files, path, copy);
-  }
+  FinishLocalCopy(path, url);
   // An upload that replaced a file takes over its record.
   std::size_t position = PositionOf(record->FileName);
   if (position == 0) position = all.PositionOf(url);
@@ -338,6 +334,37 @@ Text FileControl::LocalCopyOf(TextView url) const {
   const TextView name = FileNameFromUrl(url);
   if (apartment_.UserFolderPath.empty() || !IsSafeFileName(name)) return {};
   return apartment_.UserFolderPath + u"\\" + Text(name);
+}
+
+void FileControl::BeginLocalCopy(const Text& path) {
+  copyPath_ = LocalCopyOf(FileNameFromPath(path));
+  copyWriter_ = ResultAsItStood(std::unique_ptr<FileWriter>(), [&](std::unique_ptr<FileWriter>& writer) {
+    if (!copyPath_.empty() && copyPath_ != path) writer = apartment_.platform.files.Create(copyPath_);
+  });
+}
+
+void FileControl::FileBytes(std::string_view bytes) {
+  if (!copyWriter_) return;
+  // A full disk here is no reason to lose the upload.
+  const bool written = ResultAsItStood(false, [&](bool& done) {
+    copyWriter_->Write(bytes);
+    done = true;
+  });
+  if (!written) copyWriter_.reset();
+}
+
+void FileControl::FinishLocalCopy(const Text& path, const Text& url) {
+  const std::unique_ptr<FileWriter> writer = std::move(copyWriter_);
+  const Text copy = LocalCopyOf(url);
+  if (copy.empty() || copy == path) return;
+  // The copy of the picture that was there before must not be shown for the new one, whatever comes now. Some
+  // file systems write a file out before it may replace another, too, which takes as long as the upload.
+  RemoveLocalCopy(copy);
+  const bool finished = writer && copy == copyPath_ && ResultAsItStood(false, [&](bool& done) {
+                          writer->Commit();
+                          done = true;
+                        });
+  if (!finished) CopyLocalFile(apartment_.platform.files, path, copy);
 }
 
 void FileControl::MoveLocalCopy(const Text& from, const Text& to) {

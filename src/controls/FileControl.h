@@ -11,10 +11,12 @@
 #include <functional>
 #include <memory>
 #include <optional>
+#include <string_view>
 #include <vector>
 
 #include "controls/ControlEvents.h"
 #include "controls/ControlView.h"
+#include "platform/FileSystem.h"
 #include "service/CFileUpload.h"
 #include "support/Apartment.h"
 #include "support/Text.h"
@@ -230,6 +232,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   void Initializing() override { Yield(); }
   void ServerProcess() override { Yield(); }
   void UploadStarted() override;
+  void FileBytes(std::string_view bytes) override;
   void UploadProgress(std::int32_t percent, std::int32_t bytes) override;
   void UploadComplete() override;
   void RaiseUploadProgress(std::int32_t percent);
@@ -243,6 +246,9 @@ class FileControl : private UploadEvents, private DownloadEvents {
   void TellState(ConnectionState state);
 
   bool SendFile(const Text& path);
+  void BeginLocalCopy(const Text& path);
+  // Makes the file at `path` the local copy of `url`.
+  void FinishLocalCopy(const Text& path, const Text& url);
   std::shared_ptr<CUpload> RecordUploaded(const Text& path, const Text& url);
   bool RenameOnServer(const Text& oldName, const Text& newName);
   std::shared_ptr<CUpload> RecordRenamed(const Text& oldName, const Text& newName);
@@ -254,6 +260,9 @@ class FileControl : private UploadEvents, private DownloadEvents {
   Downloader& downloader_;
   const bool tellsTransfers_;
 
+  // The local copy of the file that is uploaded, written while that is read; null when there is none.
+  std::unique_ptr<FileWriter> copyWriter_;
+  Text copyPath_;
   bool transferRuns_ = false;
   bool uploadFinished_ = false;
   bool downloadFinished_ = false;

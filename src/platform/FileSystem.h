@@ -31,6 +31,19 @@ class FileReader {
   virtual std::size_t Read(std::span<char> room) = 0;
 };
 
+// A new file that takes its place whole: until Commit what was there stays, and without it nothing is left of
+// the new one.
+class FileWriter {
+ public:
+  virtual ~FileWriter() = default;
+
+  // Adds to the end. Throws 75 when not all of the bytes could be written.
+  virtual void Write(std::string_view bytes) = 0;
+
+  // Takes the place of the file of that name, unless that is read-only. Throws 75. Last call.
+  virtual void Commit() = 0;
+};
+
 class FileSystem {
  public:
   virtual ~FileSystem() = default;
@@ -57,8 +70,15 @@ class FileSystem {
   // is created empty. Throws 76 when its folder is missing, 75 on other failures, a locked file among them.
   virtual std::size_t ReadBeginning(TextView path, std::span<char> room) = 0;
 
+  // A file that will be at `path`. Throws 75 when there cannot be one in that folder.
+  virtual std::unique_ptr<FileWriter> Create(TextView path) = 0;
+
   // Writes a file of these bytes over an existing one, whole or not at all. Throws 75.
-  virtual void Write(TextView path, std::string_view bytes) = 0;
+  void Write(TextView path, std::string_view bytes) {
+    const std::unique_ptr<FileWriter> file = Create(path);
+    file->Write(bytes);
+    file->Commit();
+  }
 
   // Throws 53 when there is no such file, 75 when it cannot be removed.
   virtual void Remove(TextView path) = 0;

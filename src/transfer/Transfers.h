@@ -2,6 +2,7 @@
 #pragma once
 
 #include <cstdint>
+#include <string_view>
 
 #include "support/Text.h"
 
@@ -15,6 +16,8 @@ class UploadEvents {
   virtual void Initializing() = 0;
   virtual void ServerProcess() = 0;
   virtual void UploadStarted() = 0;
+  // The next bytes of the file as they were read, which will be sent. Must not throw.
+  virtual void FileBytes(std::string_view bytes) = 0;
   virtual void UploadProgress(std::int32_t percent, std::int32_t bytes) = 0;
   virtual void UploadComplete() = 0;
 };

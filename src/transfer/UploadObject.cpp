@@ -94,6 +94,7 @@ class UploadBody : public BodySource {
         file_->Read(room.first(static_cast<std::size_t>(std::min<std::uint64_t>(room.size(), left))));
     // The file has become shorter: what was announced cannot be kept.
     if (count == 0) throw RuntimeError(error::kPathAccess);
+    events_.FileBytes({room.data(), count});
     return count;
   }
 

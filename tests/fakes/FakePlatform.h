@@ -117,6 +117,8 @@ struct FakeFiles : FileSystem {
   std::map<Text, std::int32_t> makeErrors;
   // The error that reading the beginning of this file raises.
   std::map<Text, std::int32_t> readErrors;
+  // Room on the disk for each written file.
+  std::size_t mostWritten = SIZE_MAX;
   std::vector<std::uint32_t> attributesSet;
   Text temp = u"C:\\Temp\\";
 
@@ -154,9 +156,18 @@ struct FakeFiles : FileSystem {
       throw RuntimeError(failure->second);
     return files[Text(path)].bytes.copy(room.data(), room.size());
   }
-  void Write(TextView path, std::string_view bytes) override {
-    files[Text(path)] = {bytes.size(), 0, std::string(bytes)};
-  }
+  struct Writer : FileWriter {
+    Writer(FakeFiles& itsOwner, TextView itsPath) : owner(itsOwner), path(itsPath) {}
+    void Write(std::string_view more) override {
+      if (bytes.size() + more.size() > owner.mostWritten) throw RuntimeError(error::kPathAccess);
+      bytes += more;
+    }
+    void Commit() override { owner.files[path] = {bytes.size(), 0, bytes}; }
+    FakeFiles& owner;
+    const Text path;
+    std::string bytes;
+  };
+  std::unique_ptr<FileWriter> Create(TextView path) override { return std::make_unique<Writer>(*this, path); }
   void Remove(TextView path) override {
     At(path);
     files.erase(Text(path));

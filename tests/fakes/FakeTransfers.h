@@ -15,8 +15,9 @@
 namespace tarnwick {
 
 struct FakeUploader : Uploader {
-  explicit FakeUploader(Transcript& itsLog) : log(itsLog) {}
+  FakeUploader(Transcript& itsLog, FakeFiles& itsFiles) : log(itsLog), files(itsFiles) {}
   Transcript& log;
+  FakeFiles& files;
   // What the component tells while it works.
   std::function<void(UploadEvents&)> script;
   // The error with which the next calls end; 0 for none.
@@ -32,6 +33,7 @@ struct FakeUploader : Uploader {
   void UploadFile(TextView path, TextView base, TextView page, std::int32_t flag, TextView user,
                   TextView password, TextView product, UploadEvents& events) override {
     Called("page upload", {path, base, page, TextFromNumber(flag), user, password, product});
+    events.FileBytes(files.At(path).bytes);
     if (script) script(events);
     End();
   }

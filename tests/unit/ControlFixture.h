@@ -98,7 +98,7 @@ class ControlTest : public testing::Test {
   bool listingFails = false;
   Transcript log;
   FakeHost host{log};
-  FakeUploader uploader{log};
+  FakeUploader uploader{log, fake.files};
   FakeDownloader downloader{log, fake.files};
   const bool prepared = Prepare();
   const ControlParts parts{fake.apartment, host, uploader, downloader};

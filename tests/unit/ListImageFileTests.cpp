@@ -114,6 +114,46 @@ TEST_F(ListImageUpload, ReplacesAFile) {
   EXPECT_EQ(Names() + Records(), "old.jpg,new.jpg,two.jpg,old.jpg,new.jpg,two.jpg,");
 }
 
+TEST_F(ListImageUpload, LocalCopyHasTheBytesThatWereSent) {
+  List({});
+  const Text copy = fake.apartment.UserFolderPath + u"\\new.jpg";
+  uploader.script = [this](UploadEvents& events) {
+    events.FileBytes(", sent");
+    fake.files.files[u"C:\\new.jpg"].bytes = "later";
+    Upload(events);
+  };
+  const struct {
+    const char* name;
+    const char* url;
+    std::int32_t error;
+    std::size_t room;
+    Text copy;
+    const char* bytes;
+  } kCases[] = {
+      {"sent", "FileURL=http://h/u/new.jpg", 0, 99, copy, "file, sent"},
+      {"not taken", "FileURL=http://h/u/new.jpg", -2147220881, 99, copy, "old"},
+      {"not registered", "FileURL=", 0, 99, copy, "old"},
+      // The upload goes on; the file is copied as it is then.
+      {"disk full for a while", "FileURL=http://h/u/new.jpg", 0, 5, copy, "later"},
+      {"another name", "FileURL=http://h/u/x.jpg", 0, 99, fake.apartment.UserFolderPath + u"\\x.jpg", "later"},
+      {"no safe name", "FileURL=http://h/u/a%3Ab", 0, 99, copy, "old"},
+  };
+  for (const auto& test : kCases) {
+    SCOPED_TRACE(test.name);
+    fake.files.files[u"C:\\new.jpg"] = {4, 0, "file"};
+    fake.files.files[copy] = {3, 0, "old"};
+    fake.files.mostWritten = test.room;
+    replies["FileUploadRequest"] = test.url;
+    uploader.error = test.error;
+    control.UploadImage(u"C:\\new.jpg");
+    EXPECT_EQ(fake.files.files[test.copy].bytes, test.bytes);
+  }
+  // A file that is already where its copy would be stays the one it is.
+  uploader.error = 0;
+  EXPECT_TRUE(control.UploadImage(copy));
+  EXPECT_EQ(fake.files.files[copy].bytes, "old");
+}
+
 TEST_F(ListImageUpload, FilterHidesWhatItWouldHide) {
   const struct {
     TextView filter;

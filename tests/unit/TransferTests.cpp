@@ -172,11 +172,13 @@ TEST(FileNameGuard, AcceptsAndRefuses) {
 
 struct Uploads : UploadEvents {
   std::string log;
+  std::string file;
   void ActionComplete() override { log += "complete;"; }
   void Connecting() override { log += "connecting;"; }
   void Initializing() override { log += "initializing;"; }
   void ServerProcess() override { log += "server;"; }
   void UploadStarted() override { log += "started;"; }
+  void FileBytes(std::string_view bytes) override { file += bytes; }
   void UploadProgress(std::int32_t percent, std::int32_t bytes) override {
     log += std::to_string(percent) + " " + std::to_string(bytes) + ";";
   }
@@ -282,6 +284,7 @@ TEST(UploadObject, TellsRisingPercentsInPiecesOfAnySize) {
                           bytes + "\r\n--"),
                 std::string::npos);
       EXPECT_TRUE(body.ends_with("--\r\n"));
+      EXPECT_EQ(events.file, bytes);
     }
   }
 }

@@ -52,6 +52,23 @@ class WindowsFileReader : public FileReader {
   FileOwner file_;
 };
 
+class WindowsFileWriter : public FileWriter {
+ public:
+  explicit WindowsFileWriter(const std::wstring& path) : staged_(path) {
+    if (staged_.Path().empty()) throw RuntimeError(error::kPathAccess);
+  }
+
+  void Write(std::string_view bytes) override {
+    if (!staged_.Write(bytes)) throw RuntimeError(error::kPathAccess);
+  }
+  void Commit() override {
+    if (!staged_.Commit()) throw RuntimeError(error::kPathAccess);
+  }
+
+ private:
+  StagedFile staged_;
+};
+
 bool NothingThere(DWORD status) {
   return status == ERROR_FILE_NOT_FOUND || status == ERROR_PATH_NOT_FOUND || status == ERROR_INVALID_NAME;
 }
@@ -118,9 +135,8 @@ std::size_t WindowsFileSystem::ReadBeginning(TextView path, std::span<char> room
   return WindowsFileReader(std::move(file)).Read(room);
 }
 
-void WindowsFileSystem::Write(TextView path, std::string_view bytes) {
-  StagedFile staged(WidePath(path, error::kPathAccess));
-  if (!staged.Write(bytes) || !staged.Commit()) throw RuntimeError(error::kPathAccess);
+std::unique_ptr<FileWriter> WindowsFileSystem::Create(TextView path) {
+  return std::make_unique<WindowsFileWriter>(WidePath(path, error::kPathAccess));
 }
 
 void WindowsFileSystem::Remove(TextView path) {

@@ -13,7 +13,7 @@ class WindowsFileSystem : public FileSystem {
   void Copy(TextView source, TextView destination) override;
   std::unique_ptr<FileReader> Open(TextView path) override;
   std::size_t ReadBeginning(TextView path, std::span<char> room) override;
-  void Write(TextView path, std::string_view bytes) override;
+  std::unique_ptr<FileWriter> Create(TextView path) override;
   void Remove(TextView path) override;
   Text FirstName(TextView pattern, bool folders) override;
   void MakeFolder(TextView path) override;
