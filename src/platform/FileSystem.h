@@ -83,9 +83,9 @@ class FileSystem {
   // Throws 53 when there is no such file, 75 when it cannot be removed.
   virtual void Remove(TextView path) = 0;
 
-  // First name that matches `pattern` (wildcards in the last part): files that are neither hidden nor system
-  // files, and with `folders` folders too. Empty when there is none.
-  virtual Text FirstName(TextView pattern, bool folders) = 0;
+  // Whether a name matches `pattern` (wildcards in the last part): files that are neither hidden nor system
+  // files, and with `folders` folders too.
+  virtual bool Exists(TextView pattern, bool folders) = 0;
 
   // Creates one level. Throws 58 when the name is taken, 76 when the parent is missing, 75 otherwise.
   virtual void MakeFolder(TextView path) = 0;

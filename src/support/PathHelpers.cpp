@@ -36,11 +36,11 @@ void CopyLocalFile(FileSystem& files, TextView source, TextView destination) {
 }
 
 bool FileExists(FileSystem& files, TextView path) {
-  return !files.FirstName(path, false).empty();
+  return files.Exists(path, false);
 }
 
 bool FolderExists(FileSystem& files, TextView path) {
-  return !files.FirstName(path, true).empty();
+  return files.Exists(path, true);
 }
 
 bool CreateFolder(FileSystem& files, TextView path) {

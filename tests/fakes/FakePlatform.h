@@ -172,10 +172,8 @@ struct FakeFiles : FileSystem {
     At(path);
     files.erase(Text(path));
   }
-  Text FirstName(TextView pattern, bool withFolders) override {
-    const bool found =
-        files.contains(Text(pattern)) || (withFolders && std::ranges::count(folders, pattern) > 0);
-    return found ? Text(pattern) : Text();
+  bool Exists(TextView pattern, bool withFolders) override {
+    return files.contains(Text(pattern)) || (withFolders && std::ranges::count(folders, pattern) > 0);
   }
   void MakeFolder(TextView path) override {
     if (const auto failure = makeErrors.find(Text(path)); failure != makeErrors.end())

@@ -145,20 +145,26 @@ void WindowsFileSystem::Remove(TextView path) {
     throw RuntimeError(NothingThere(GetLastError()) ? error::kFileNotFound : error::kPathAccess);
 }
 
-Text WindowsFileSystem::FirstName(TextView pattern, bool folders) {
-  if (pattern.empty() || pattern.find(u'\0') != TextView::npos) return {};
+bool WindowsFileSystem::Exists(TextView pattern, bool folders) {
+  if (pattern.empty() || pattern.find(u'\0') != TextView::npos) return false;
   std::wstring widePattern = WideFromText(pattern);
+  const DWORD unwanted =
+      FILE_ATTRIBUTE_HIDDEN | FILE_ATTRIBUTE_SYSTEM | (folders ? 0 : DWORD{FILE_ATTRIBUTE_DIRECTORY});
+  // One name needs no walk through its folder.
+  if (widePattern.find_first_of(L"*?<>\"") == std::wstring::npos && widePattern.back() != L'\\' &&
+      widePattern.back() != L'/') {
+    const DWORD attributes = GetFileAttributesW(widePattern.c_str());
+    return attributes != INVALID_FILE_ATTRIBUTES && (attributes & unwanted) == 0;
+  }
   // A folder written with its separator means what is in it; the system would find nothing.
   if (widePattern.back() == L'\\' || widePattern.back() == L'/') widePattern += L'*';
   WIN32_FIND_DATAW found{};
   const FindOwner search(FindFirstFileW(widePattern.c_str(), &found));
-  if (!search) return {};
-  const DWORD unwanted =
-      FILE_ATTRIBUTE_HIDDEN | FILE_ATTRIBUTE_SYSTEM | (folders ? 0 : DWORD{FILE_ATTRIBUTE_DIRECTORY});
+  if (!search) return false;
   do {
-    if ((found.dwFileAttributes & unwanted) == 0) return TextFromWide(found.cFileName);
+    if ((found.dwFileAttributes & unwanted) == 0) return true;
   } while (FindNextFileW(search.Get(), &found));
-  return {};
+  return false;
 }
 
 void WindowsFileSystem::MakeFolder(TextView path) {

@@ -186,8 +186,8 @@ TEST_F(FilesTest, TellsLengthTimeAndAttributes) {
 }
 
 TEST_F(FilesTest, ListsWhatIsNeitherHiddenNorSystem) {
-  EXPECT_EQ(files_.FirstName(In(u"*"), false), u"");
-  EXPECT_EQ(files_.FirstName(In(u"*"), true), u".");
+  EXPECT_FALSE(files_.Exists(In(u"*"), false));
+  EXPECT_TRUE(files_.Exists(In(u"*"), true));
   Write(u"a.jpg", "");
   Write(u"b.jpg", "");
   Write(u"c.gif", "");
@@ -197,20 +197,17 @@ TEST_F(FilesTest, ListsWhatIsNeitherHiddenNorSystem) {
   files_.MakeFolder(In(u"folder"));
   const struct {
     Text pattern;
-    TextView name, nameWithFolders;
-  } kCases[] = {{In(u"*.jpg"), u"b.jpg", u"b.jpg"},
-                {In(u"a.jpg"), u"", u""},
-                {In(u"*.gif"), u"", u""},
-                {In(u"B.JPG"), u"b.jpg", u"b.jpg"},
-                {In(u"none"), u"", u""},
-                {In(u"none\\x"), u"", u""},
-                {In(u"folder"), u"", u"folder"},
-                {In(u"folder\\"), u"", u"."},
-                {In(u""), u"b.jpg", u"."},
-                {Text(), u"", u""}};
+    bool file, withFolders;
+  } kCases[] = {{In(u"*.jpg"), true, true},       {In(u"a.jpg"), false, false},
+                {In(u"a*.jpg"), false, false},    {In(u"*.gif"), false, false},
+                {In(u"c.gif"), false, false},     {In(u"B.JPG"), true, true},
+                {In(u"none"), false, false},      {In(u"none\\x"), false, false},
+                {In(u"folder"), false, true},     {In(u"fold?r"), false, true},
+                {In(u"folder\\"), false, true}, {In(u""), true, true},
+                {Text(), false, false}};
   for (const auto& item : kCases) {
-    EXPECT_EQ(files_.FirstName(item.pattern, false), item.name) << Utf8FromText(item.pattern);
-    EXPECT_EQ(files_.FirstName(item.pattern, true), item.nameWithFolders) << Utf8FromText(item.pattern);
+    EXPECT_EQ(files_.Exists(item.pattern, false), item.file) << Utf8FromText(item.pattern);
+    EXPECT_EQ(files_.Exists(item.pattern, true), item.withFolders) << Utf8FromText(item.pattern);
   }
   EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"folder")); }), 58);
   EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"b.jpg")); }), 58);
