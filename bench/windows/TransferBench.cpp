@@ -1,67 +1,19 @@
-// Measures transfers of the list control side by side with a plain loop over WinINet and with
-// URLDownloadToFile, and the filling of the list beside a bare owner-data list. Prints one table of ratios;
-// ends with 1 when one is out of bounds.
+// Transfers of the list control beside a plain loop over WinINet and URLDownloadToFile.
 //
-//   tarnwick_transfer_bench SERVER USER PASSWORD PRODUCT LARGE SMALL-COUNT
-//
-// The account holds the file "large.jpg" of LARGE bytes and SMALL-COUNT files "small-N.jpg". Each figure is
-// the fastest of several runs that take turns.
-#include "ControlContainer.h"
-#include "platform/windows/CommonControls.h"
-#include "support/surface/TypeLibrary.h"
+// The account holds the file "large.jpg" of LARGE bytes, SMALL-COUNT files "small-N.jpg", and "stall.jpg",
+// for which the server sends nothing.
+#include "Bench.h"
 
-#include <psapi.h>
 #include <urlmon.h>
 #include <wininet.h>
 
-#include <algorithm>
 #include <cstdio>
-#include <functional>
-#include <string>
-#include <vector>
+#include <fstream>
 
 namespace tarnwick::bench {
 namespace {
 
-constexpr int kRuns = 3;
-
-[[noreturn]] void Stop(const char* what) {
-  std::fprintf(stderr, "transfer bench: %s\n", what);
-  ExitProcess(2);
-}
-
-double Seconds(const std::function<void()>& work) {
-  LARGE_INTEGER frequency = {};
-  LARGE_INTEGER begin = {};
-  LARGE_INTEGER end = {};
-  QueryPerformanceFrequency(&frequency);
-  QueryPerformanceCounter(&begin);
-  work();
-  QueryPerformanceCounter(&end);
-  return static_cast<double>(end.QuadPart - begin.QuadPart) / static_cast<double>(frequency.QuadPart);
-}
-
-// The fastest of several runs of each; they take turns, so that a busy moment hits all alike.
-std::vector<double> Fastest(const std::vector<std::function<void()>>& works) {
-  std::vector<double> best(works.size(), 1e9);
-  for (int run = 0; run < kRuns; ++run)
-    for (std::size_t i = 0; i < works.size(); ++i) best[i] = std::min(best[i], Seconds(works[i]));
-  return best;
-}
-
-class Bstr {
- public:
-  explicit Bstr(const std::wstring& text)
-      : text_(SysAllocStringLen(text.data(), static_cast<UINT>(text.size()))) {}
-  ~Bstr() { SysFreeString(text_); }
-  Bstr(const Bstr&) = delete;
-  Bstr& operator=(const Bstr&) = delete;
-  operator BSTR() const { return text_; }  // NOLINT(google-explicit-constructor)
-  BSTR* Reference() { return &text_; }
-
- private:
-  BSTR text_;
-};
+// --- The peers ---
 
 // The plain loop: read a block, write a block.
 void WinInetDownload(const std::wstring& url, const wchar_t* path) {
@@ -118,113 +70,136 @@ void WinInetUpload(const std::wstring& host, INTERNET_PORT port,
   CloseHandle(file);
 }
 
-bool within = true;
+// --- What Wine's counters do not tell ---
 
-// `most`: the ratio may be at most, else at least, `limit`.
-void Row(const char* what, double ours, const char* peer, double theirs, double limit, bool most) {
-  const double ratio = most ? ours / theirs : theirs / ours;
-  const bool good = most ? ratio <= limit : ratio >= limit;
-  within = within && good;
-  std::printf("%-34s %9.1f ms  %-22s %9.1f ms  %6.2f  %s %5.2f  %s\n", what, ours * 1000, peer, theirs * 1000,
-              ratio, most ? "at most " : "at least", limit, good ? "good" : "OUT OF BOUNDS");
+// A file of this process's that Linux keeps. Its number comes from the script, as Wine has numbers of its
+// own.
+std::wstring ProcessFile(const wchar_t* name) {
+  wchar_t number[16] = {};
+  if (GetEnvironmentVariableW(L"TARNWICK_UNIX_PROCESS", number, 16) == 0) Stop("no TARNWICK_UNIX_PROCESS");
+  return std::wstring(L"Z:\\proc\\") + number + L"\\" + name;
 }
 
-std::size_t PeakBytes() {
-  PROCESS_MEMORY_COUNTERS counters = {};
-  GetProcessMemoryInfo(GetCurrentProcess(), &counters, sizeof counters);
-  return counters.PeakPagefileUsage;
+// Bytes of a line of the process's status, such as "VmRSS:".
+double StatusBytes(const std::string& wanted) {
+  std::ifstream status(ProcessFile(L"status").c_str());
+  for (std::string line; std::getline(status, line);)
+    if (line.starts_with(wanted)) return std::stod(line.substr(wanted.size())) * 1024;
+  Stop("the process has no status");
 }
 
-int Run(int count, wchar_t** words) {
-  if (count < 7) Stop("SERVER USER PASSWORD PRODUCT LARGE SMALL-COUNT");
-  const std::wstring server = words[1];
-  const auto large = static_cast<std::size_t>(_wtoi(words[5]));
-  const int small = _wtoi(words[6]);
+// Most bytes that `work` had in memory beyond those that were there before.
+double PeakBytes(const std::function<void()>& work) {
+  const double before = StatusBytes("VmRSS:");
+  // The peak begins anew.
+  std::ofstream(ProcessFile(L"clear_refs").c_str()) << "5";
+  work();
+  return StatusBytes("VmHWM:") - before;
+}
 
-  ComPtr<_ctrlListImage> list;
-  if (FAILED(CoCreateInstance(CLSID_ctrlListImage, nullptr, CLSCTX_INPROC_SERVER, __uuidof(_ctrlListImage),
-                              list.ReceiveVoid())))
-    Stop("the library is not registered");
-  ComPtr<_CFileUpload> client;
-  list->get_mobjFileupload(client.Receive());
-  VARIANT_BOOL done = VARIANT_FALSE;
-  client->ConnectToServer(Bstr(server), &done);
-  client->LogonAs(Bstr(words[4]), Bstr(words[2]), Bstr(words[3]), Bstr(L""), &done);
-  Bstr all(L"*");
-  if (!done || FAILED(list->Init(all.Reference(), &done))) Stop("no account");
-  BSTR base = nullptr;
-  client->GetUserBasePath(&base);
-  const std::wstring folder = std::wstring(base) + L"/";
-  SysFreeString(base);
+// Processor milliseconds of the process up to now.
+double ProcessorMs() {
+  FILETIME created = {};
+  FILETIME ended = {};
+  FILETIME kernel = {};
+  FILETIME user = {};
+  GetProcessTimes(GetCurrentProcess(), &created, &ended, &kernel, &user);
+  return (kernel.dwLowDateTime + static_cast<double>(user.dwLowDateTime)) / 10'000;
+}
 
-  CreateDirectoryW(L"bench-files", nullptr);
-  const auto ours = [&](const std::wstring& name) {
-    Bstr text(name);
-    VARIANT ignored = {};
-    list->UploadedFileSetFocus(text.Reference(), &ignored);
-    BSTR local = nullptr;
-    list->DownLoadFileFromServer(Bstr(L"bench-files"), &local);
-    if (GetFileAttributesW(local) == INVALID_FILE_ATTRIBUTES) Stop("a download failed");
-    SysFreeString(local);
-  };
-  const std::size_t before = PeakBytes();
-  ours(L"large.jpg");
-  const std::size_t peak = PeakBytes() - before;
-  const auto big = Fastest({[&] { ours(L"large.jpg"); },
-                            [&] { WinInetDownload(folder + L"large.jpg", L"bench-files\\large.wininet"); },
-                            [&] {
-                              DeleteUrlCacheEntryW((folder + L"large.jpg").c_str());
-                              URLDownloadToFileW(nullptr, (folder + L"large.jpg").c_str(),
-                                                 L"bench-files\\large.urlmon", 0, nullptr);
-                            }});
-  const auto each = [&](const std::function<void(const std::wstring&)>& work) {
-    return [&, work] {
-      for (int i = 0; i < small; ++i) work(L"small-" + std::to_wstring(i) + L".jpg");
-    };
-  };
-  const auto many = Fastest(
-      {each(ours),
-       each([&](const std::wstring& name) { WinInetDownload(folder + name, L"bench-files\\small.wininet"); }),
-       each([&](const std::wstring& name) {
-         DeleteUrlCacheEntryW((folder + name).c_str());
-         URLDownloadToFileW(nullptr, (folder + name).c_str(), L"bench-files\\small.urlmon", 0, nullptr);
-       })});
-  CopyFileW(L"bench-files\\large.jpg", L"bench-files\\upload.jpg", FALSE);
-  const auto ansi = [](const std::wstring& text) { return std::string(text.begin(), text.end()); };
-  const std::size_t colon = server.find(L':');
-  const std::vector<std::pair<std::string, std::string>> fields = {
-      {"UsersBaseUrl", "http://" + ansi(server) + "/users/"},
-      {"Flag", "0"},
-      {"User", ansi(words[2])},
-      {"Password", ansi(words[3])},
-      {"ProductID", "4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E"}};
-  const auto up =
-      Fastest({[&] { list->UploadImage(Bstr(L"bench-files\\upload.jpg"), &done); },
-               [&] {
-                 WinInetUpload(server.substr(0, colon),
-                               static_cast<INTERNET_PORT>(_wtoi(server.substr(colon + 1).c_str())), fields,
-                               L"bench-files\\upload.jpg");
-               }});
+// --- The library ---
 
-  std::printf("%-34s %12s  %-22s %12s  %6s\n", "the library", "", "peer", "", "ratio");
-  Row("download, one large file", big[0], "WinINet loop", big[1], 1.0, false);
-  Row("download, one large file", big[0], "URLDownloadToFile", big[2], 3.0, false);
-  Row("download, many small files", many[0], "URLDownloadToFile", many[2], 1.0, false);
-  Row("download, many small files", many[0], "WinINet loop", many[1], 0.8, false);
-  Row("upload, one large file", up[0], "WinINet loop", up[1], 1.0, false);
-  const double share = static_cast<double>(peak) / static_cast<double>(large);
-  within = within && share <= 1.25;
-  std::printf("peak memory of the large download: %.2f times the file, at most 1.25  %s\n", share,
-              share <= 1.25 ? "good" : "OUT OF BOUNDS");
-  return within ? 0 : 1;
+ComPtr<_ctrlListImage> list;
+
+void Select(const std::wstring& name) {
+  Bstr text(name);
+  VARIANT ignored = {};
+  list->UploadedFileSetFocus(text.Reference(), &ignored);
+}
+
+void Download(const std::wstring& name) {
+  Select(name);
+  BSTR local = nullptr;
+  list->DownLoadFileFromServer(Bstr(L"bench-files"), &local);
+  if (GetFileAttributesW(local) == INVALID_FILE_ATTRIBUTES) Stop("a download failed");
+  SysFreeString(local);
+}
+
+// Processor milliseconds of a download for which nothing comes in 10 seconds.
+double StallMs() {
+  Select(L"stall.jpg");
+  SetTimer(nullptr, 0, 10'000, [](HWND, UINT, UINT_PTR timer, DWORD) {
+    KillTimer(nullptr, timer);
+    list->put_gbConnectionFailed(VARIANT_TRUE);
+  });
+  const double before = ProcessorMs();
+  BSTR local = nullptr;
+  const double seconds = Seconds([&] { list->DownLoadFileFromServer(Bstr(L"bench-files"), &local); });
+  SysFreeString(local);
+  if (seconds < 9.5) Stop("the stalled download ended early");
+  return ProcessorMs() - before;
 }
 
 }  // namespace
-}  // namespace tarnwick::bench
 
-int wmain(int count, wchar_t** words) {
-  OleInitialize(nullptr);
-  const int result = tarnwick::bench::Run(count, words);
-  OleUninitialize();
-  return result;
+void TransferBench(const Account& account, std::size_t largeBytes, int smallCount) {
+  if (FAILED(CoCreateInstance(CLSID_ctrlListImage, nullptr, CLSCTX_INPROC_SERVER, __uuidof(_ctrlListImage),
+                              list.ReceiveVoid())))
+    Stop("the library is not registered");
+  const std::wstring folder = LogOn(*list, account);
+  CreateDirectoryW(L"bench-files", nullptr);
+
+  const double peak = PeakBytes([] { Download(L"large.jpg"); });
+  const std::wstring large = folder + L"large.jpg";
+  const auto big = Fastest(
+      3, {[] { Download(L"large.jpg"); }, [&] { WinInetDownload(large, L"bench-files\\large.wininet"); },
+          [&] {
+            DeleteUrlCacheEntryW(large.c_str());
+            URLDownloadToFileW(nullptr, large.c_str(), L"bench-files\\large.urlmon", 0, nullptr);
+          }});
+  AtLeast(1.0, "download, one large file", big[0], "WinINet loop", big[1]);
+  AtLeast(3.0, "download, one large file", big[0], "URLDownloadToFile", big[2]);
+
+  const auto each = [&](const std::function<void(const std::wstring&)>& work) {
+    return [=] {
+      for (int i = 0; i < smallCount; ++i) work(L"small-" + std::to_wstring(i) + L".jpg");
+    };
+  };
+  const auto many = Fastest(3, {each(Download), each([&](const std::wstring& name) {
+                                  WinInetDownload(folder + name, L"bench-files\\small.wininet");
+                                }),
+                                each([&](const std::wstring& name) {
+                                  DeleteUrlCacheEntryW((folder + name).c_str());
+                                  URLDownloadToFileW(nullptr, (folder + name).c_str(),
+                                                     L"bench-files\\small.urlmon", 0, nullptr);
+                                })});
+  AtLeast(1.0, "download, many small files", many[0], "URLDownloadToFile", many[2]);
+  AtLeast(0.8, "download, many small files", many[0], "WinINet loop", many[1]);
+
+  const wchar_t* const upload = L"bench-files\\upload.jpg";
+  CopyFileW(L"bench-files\\large.jpg", upload, FALSE);
+  const auto ansi = [](const std::wstring& text) { return std::string(text.begin(), text.end()); };
+  const std::size_t colon = account.server.find(L':');
+  const std::wstring host = account.server.substr(0, colon);
+  const auto port = static_cast<INTERNET_PORT>(_wtoi(account.server.c_str() + colon + 1));
+  const std::vector<std::pair<std::string, std::string>> fields = {
+      {"UsersBaseUrl", "http://" + ansi(account.server) + "/users/"},
+      {"Flag", "0"},
+      {"User", ansi(account.user)},
+      {"Password", ansi(account.password)},
+      {"ProductID", "4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E"}};
+  // Asks the service before and after, and keeps a copy in the user's folder, which the loop does not.
+  const auto up = Fastest(9, {[&] {
+                                VARIANT_BOOL done = VARIANT_FALSE;
+                                list->UploadImage(Bstr(upload), &done);
+                                if (!done) Stop("an upload failed");
+                              },
+                              [&] { WinInetUpload(host, port, fields, upload); }});
+  AtLeast(1.0, "upload, one large file", up[0], "WinINet loop", up[1]);
+
+  AtMost(1.25, "peak memory of the large download", peak / static_cast<double>(largeBytes), "times the file");
+  AtMost(50, "download that stalls for 10 s", StallMs(), "ms of processor time");
+  list = {};
 }
+
+}  // namespace tarnwick::bench

@@ -365,7 +365,8 @@ STDMETHODIMP ControlContainer::TranslateAccelerator(MSG* message, DWORD modifier
   return IsDialogMessageW(form, message) ? S_OK : S_FALSE;
 }
 
-STDMETHODIMP ControlContainer::OnFocus(BOOL) {
+STDMETHODIMP ControlContainer::OnFocus(BOOL got) {
+  hasFocus_ = got != FALSE;
   return S_OK;
 }
 

@@ -83,6 +83,8 @@ class ControlContainer final : public IOleClientSite,
 
   IUnknown* Control() const { return control_.Get(); }
   bool IsUiActive() const { return static_cast<bool>(active_); }
+  // Whether the control has said that it has the focus, and not that it lost it.
+  bool HasFocus() const { return hasFocus_; }
 
   STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;
   STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
@@ -162,6 +164,7 @@ class ControlContainer final : public IOleClientSite,
   DWORD eventCookie_ = 0;
   DWORD notifyCookie_ = 0;
   bool inPlace_ = false;
+  bool hasFocus_ = false;
 };
 
 }  // namespace tarnwick::demo

@@ -64,8 +64,12 @@ HWND ControlWindow::MakeChild(HWND parent, const wchar_t* className, const wchar
   const HWND child =
       CreateWindowExW(0, className, name, WS_CHILD | style, place.left, place.top, place.right - place.left,
                       place.bottom - place.top, parent, nullptr, module_, nullptr);
-  if (child) SetWindowSubclass(child, ChildProc, kSubclass, reinterpret_cast<DWORD_PTR>(window_));
+  if (child) Watch(child);
   return child;
+}
+
+void ControlWindow::Watch(HWND window) {
+  SetWindowSubclass(window, ChildProc, kSubclass, reinterpret_cast<DWORD_PTR>(window_));
 }
 
 int ControlWindow::Dpi() {
@@ -113,6 +117,12 @@ LRESULT ControlWindow::Handle(HWND outer, Body&& body) {
   return result;
 }
 
+void ControlWindow::TellFocusLeft(ControlWindow* self, HWND outer, UINT message, WPARAM wParam) {
+  const auto to = reinterpret_cast<HWND>(wParam);
+  if (message == WM_KILLFOCUS && IsAlive(self, outer) && to != outer && !IsChild(outer, to))
+    self->FocusLeft();
+}
+
 LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   if (message == WM_NCCREATE) {
     const auto* create = reinterpret_cast<const CREATESTRUCTW*>(lParam);
@@ -133,7 +143,9 @@ LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wPa
         return LRESULT{TRUE};
       }
       const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
-      return answer ? *answer : DefWindowProcW(window, message, wParam, lParam);
+      const LRESULT result = answer ? *answer : DefWindowProcW(window, message, wParam, lParam);
+      TellFocusLeft(self, window, message, wParam);
+      return result;
     });
   }
   return DefWindowProcW(window, message, wParam, lParam);
@@ -150,7 +162,9 @@ LRESULT CALLBACK ControlWindow::ChildProc(HWND window, UINT message, WPARAM wPar
     // meanwhile.
     return self->Handle(outer, [&] {
       const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
-      return answer ? *answer : DefSubclassProc(window, message, wParam, lParam);
+      const LRESULT result = answer ? *answer : DefSubclassProc(window, message, wParam, lParam);
+      TellFocusLeft(self, outer, message, wParam);
+      return result;
     });
   }
   return DefSubclassProc(window, message, wParam, lParam);

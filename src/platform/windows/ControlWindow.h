@@ -33,6 +33,8 @@ class ControlWindow {
   virtual bool MakeChildren() = 0;
   // The window and all inside it are gone, although the control is not.
   virtual void WindowGone() = 0;
+  // The keyboard focus has left the window and all inside it.
+  virtual void FocusLeft() = 0;
   // Font or colours are others now. Called only while there is a window.
   virtual void ApplyLook() = 0;
   // A message for the window of the control or for a child of it; nullopt leaves it to that window's own
@@ -42,6 +44,8 @@ class ControlWindow {
   // A child, or a child's child, whose messages come to OnMessage too; null on failure. `name` is its text.
   HWND MakeChild(HWND parent, const wchar_t* className, const wchar_t* name, DWORD style,
                  const RECT& place = {});
+  // Lets the messages of a window that a child made for itself come to OnMessage too.
+  void Watch(HWND window);
 
   // The window; null when there is none yet.
   HWND Outer() const { return window_; }
@@ -65,6 +69,7 @@ class ControlWindow {
   static ControlWindow* Of(HWND outer);
   template <typename Body>
   LRESULT Handle(HWND outer, Body&& body);
+  static void TellFocusLeft(ControlWindow* self, HWND outer, UINT message, WPARAM wParam);
   bool MakeWindow();
 
   const HINSTANCE module_;

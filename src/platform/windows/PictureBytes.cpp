@@ -58,7 +58,8 @@ class Kept {
   std::size_t length_ = 0;
 };
 
-// ---- PNG -----------------------------------------------------------------------------------------------------
+// ---- PNG
+// -----------------------------------------------------------------------------------------------------
 
 // The smallest pieces that programs write are of about 8 KiB, or of a line; this is more than either needs.
 constexpr int kMostPngChunks = 200'000;
@@ -74,9 +75,11 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
   const unsigned depth = file[24];
   const unsigned colorType = file[25];
   const unsigned channels = (colorType & 1) != 0 ? 1 : ((colorType & 2) != 0 ? 3 : 1) + (colorType >> 2 & 1);
-  // A line begins with its filter. What unpacks to four bytes a pixel is within the decoder's bound.
+  // A line begins with its filter. What unpacks to four bytes a pixel is within the decoder's bound; putting
+  // interlaced lines together takes as long again.
   const std::uint64_t unpacked = (std::uint64_t{width} * channels * depth / 8 + 2) * height;
-  if (std::uint64_t{width} * height * channels * depth / 8 > 4 * kMostPixels) return {};
+  const std::uint64_t bytes = std::uint64_t{width} * height * channels * depth / 8;
+  if ((file[28] != 0 ? 2 * bytes : bytes) > 4 * kMostPixels) return {};
 
   Kept kept(file);
   kept.Keep(0, kSignature);
@@ -105,7 +108,8 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
   return facts;
 }
 
-// ---- GIF -----------------------------------------------------------------------------------------------------
+// ---- GIF
+// -----------------------------------------------------------------------------------------------------
 
 // A decoder empties its table of 4,096 entries with each clear code.
 constexpr std::uint64_t kMostClearCodes = 500'000;
@@ -214,13 +218,16 @@ std::optional<PictureFacts> ReduceGif(std::span<std::uint8_t> file) {
   return facts;
 }
 
-// ---- JPEG ----------------------------------------------------------------------------------------------------
+// ---- JPEG
+// ----------------------------------------------------------------------------------------------------
 
 // Tables of all scans together. A scan of a camera's or an image program's picture has about 1 KiB.
 constexpr std::size_t kMostJpegTables = 1'000'000;
 
-// A decoder goes over the whole picture with each scan. Programs write 10 for colour, some up to 20.
+// A decoder goes over the whole picture with each scan, which takes about a twelfth of what the rest of the
+// work does. Programs write 10 for colour, some up to 20: so many can be in a picture of 24 megapixels.
 constexpr int kMostJpegScans = 40;
+constexpr std::uint64_t kScanOfWork = 12;
 
 std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
   Kept kept(file);
@@ -232,7 +239,8 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
   unsigned components = 0;
   for (std::size_t at = 2;;) {
     // Up to the next marker: 0xFF, repeated at will, and its number.
-    const auto* mark = static_cast<const std::uint8_t*>(std::memchr(file.data() + at, 0xFF, file.size() - at));
+    const auto* mark =
+        static_cast<const std::uint8_t*>(std::memchr(file.data() + at, 0xFF, file.size() - at));
     if (!mark) return {};
     at = static_cast<std::size_t>(mark - file.data());
     while (at < file.size() && file[at] == 0xFF) ++at;
@@ -285,14 +293,17 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
     kept.Keep(codes, at);
   }
   if (!facts || scans == 0) return {};
+  const std::uint64_t work = static_cast<std::uint64_t>(scans - 1) + kScanOfWork;
+  if (std::uint64_t{facts->width} * facts->height * work > kMostPixels * kScanOfWork) return {};
   facts->length = kept.Length();
   return facts;
 }
 
-// ---- BMP -----------------------------------------------------------------------------------------------------
+// ---- BMP
+// -----------------------------------------------------------------------------------------------------
 
-// True when the run-length code fills every line of the picture. A decoder may leave what is skipped as it found
-// the memory.
+// True when the run-length code fills every line of the picture. A decoder may leave what is skipped as it
+// found the memory.
 bool FillsAll(Bytes code, std::uint32_t width, std::uint32_t height, unsigned bits) {
   std::uint32_t x = 0;
   std::uint32_t y = 0;

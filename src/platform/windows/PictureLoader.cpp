@@ -56,10 +56,10 @@ constexpr std::uint32_t BytesPerPixel(Layout layout) {
 // Sums of blue, green, red and opacity.
 using Sums = std::array<std::uint64_t, 4>;
 
-// Averages the lines of a picture, which come from the top, over the pixels of the target. All is exact: along
-// each side the unit is one part of (source pixels x target pixels), in which both kinds of pixels have whole
-// borders. A target pixel then weighs (source width x source height) in all, so that a sum of 64 megapixels, with
-// colours times opacity, is far below 64 bits.
+// Averages the lines of a picture, which come from the top, over the pixels of the target. All is exact:
+// along each side the unit is one part of (source pixels x target pixels), in which both kinds of pixels have
+// whole borders. A target pixel then weighs (source width x source height) in all, so that a sum of 64
+// megapixels, with colours times opacity, is far below 64 bits.
 class Averager {
  public:
   // `pixels` has room for the target.
@@ -113,7 +113,8 @@ class Averager {
   }
 
  private:
-  // What a target pixel covers of a line: a part of the first pixel, all pixels up to the last, a part of that.
+  // What a target pixel covers of a line: a part of the first pixel, all pixels up to the last, a part of
+  // that.
   struct Span {
     std::size_t first = 0;
     std::size_t last = 0;

@@ -131,8 +131,8 @@ std::optional<HttpAnswer> ReadAnswer(HINTERNET request, std::size_t maxBodyBytes
 }
 
 // The network's side of a streamed post. The calls that send block, so they run on a thread of their own,
-// which is given one block after the other, each while the one before is sent, and knows nothing of where they
-// come from.
+// which is given one block after the other, each while the one before is sent, and knows nothing of where
+// they come from.
 class PostWorker {
  public:
   PostWorker(HINTERNET request, std::wstring headers, std::uint64_t length, std::size_t maxBodyBytes)

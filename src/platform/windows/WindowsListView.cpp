@@ -202,7 +202,8 @@ void WindowsListView::Focus() {
 
 std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   if (window == list_) return OnListMessage(message, wParam, lParam);
-  if (window == label_) return std::nullopt;
+  // The label, or the editor of an item's name.
+  if (window != Outer()) return std::nullopt;
   switch (message) {
     case WM_SIZE:
       Layout();
@@ -259,7 +260,11 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
     case LVN_BEGINLABELEDITW: {
       const auto& info = *reinterpret_cast<const NMLVDISPINFOW*>(&header);
       // True keeps the list from editing.
-      return user_.LabelEditBegins(static_cast<std::size_t>(info.item.iItem)) ? FALSE : TRUE;
+      const HWND outer = Outer();
+      if (!user_.LabelEditBegins(static_cast<std::size_t>(info.item.iItem))) return TRUE;
+      if (!IsAlive(this, outer)) return FALSE;
+      if (const HWND editor = ListView_GetEditControl(list_)) Watch(editor);
+      return FALSE;
     }
     case LVN_ENDLABELEDITW: {
       const auto& info = *reinterpret_cast<const NMLVDISPINFOW*>(&header);
@@ -297,14 +302,6 @@ std::optional<LRESULT> WindowsListView::OnListMessage(UINT message, WPARAM wPara
       const auto* const key = reinterpret_cast<const MSG*>(lParam);
       const bool enter = key && key->message == WM_KEYDOWN && key->wParam == VK_RETURN;
       return DefSubclassProc(list_, message, wParam, lParam) | (enter ? DLGC_WANTMESSAGE : 0);
-    }
-    case WM_KILLFOCUS: {
-      const HWND outer = Outer();
-      const LRESULT result = DefSubclassProc(list_, message, wParam, lParam);
-      const auto to = reinterpret_cast<HWND>(wParam);
-      // The editor of a label is the list's child.
-      if (IsAlive(this, outer) && to != outer && !IsChild(outer, to)) user_.LostFocus();
-      return result;
     }
     case WM_KEYDOWN: {
       if (wParam == VK_RETURN) {

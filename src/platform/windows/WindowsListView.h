@@ -68,6 +68,7 @@ class WindowsListView : public ListView, public ControlWindow {
 
  private:
   bool MakeChildren() override;
+  void FocusLeft() override { user_.LostFocus(); }
   void WindowGone() override;
   void ApplyLook() override;
   std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;

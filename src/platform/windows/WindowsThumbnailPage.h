@@ -73,6 +73,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   enum class Content { kNothing, kGrid, kEmptyAccount };
 
   bool MakeChildren() override;
+  void FocusLeft() override { user_.LostFocus(); }
   void WindowGone() override;
   void ApplyLook() override;
   std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;

@@ -101,8 +101,9 @@ bool DataObject::Has(CLIPFORMAT format) const {
          (format == CF_HDROP && !files_.empty());
 }
 
-const Text& DataObject::TextFor(CLIPFORMAT format) {
-  if (std::exchange(promised_, false) && onPromised_) onPromised_(static_cast<std::int16_t>(format));
+const Text& DataObject::TheText() {
+  const std::optional<CLIPFORMAT> promised = std::exchange(promised_, std::nullopt);
+  if (promised && onPromised_) onPromised_(static_cast<std::int16_t>(*promised));
   return text_;
 }
 
@@ -126,12 +127,12 @@ STDMETHODIMP DataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
         medium->hGlobal = DropFilesOf(files_);
         break;
       case CF_UNICODETEXT: {
-        const Text& text = TextFor(format->cfFormat);
+        const Text& text = TheText();
         medium->hGlobal = GlobalCopy(text.c_str(), (text.size() + 1) * sizeof(char16_t));
         break;
       }
       default: {
-        const std::string ansi = AnsiFromText(TextFor(format->cfFormat)).value_or(std::string());
+        const std::string ansi = AnsiFromText(TheText()).value_or(std::string());
         medium->hGlobal = GlobalCopy(ansi.c_str(), ansi.size() + 1);
         break;
       }
@@ -220,11 +221,12 @@ HRESULT DataObject::Call(DISPID member, const DISPPARAMS& arguments, VARIANT* re
   switch (member) {
     case kGetData:
       if (!Has(format(0))) throw RuntimeError(error::kInvalidFormat);
-      if (format(0) != CF_HDROP) value.Get() = VariantFromText(TextFor(format(0)));
+      if (format(0) != CF_HDROP) value.Get() = VariantFromText(TheText());
       break;
     case kSetData:
       if (format(1) == CF_HDROP) throw RuntimeError(error::kInvalidFormat);
-      promised_ = !argument(0) || V_VT(argument(0)) == VT_ERROR;
+      promised_.reset();
+      if (!argument(0) || V_VT(argument(0)) == VT_ERROR) promised_ = format(1);
       text_ = promised_ ? Text() : TextFromVariant(*argument(0));
       hasText_ = true;
       break;
@@ -234,7 +236,8 @@ HRESULT DataObject::Call(DISPID member, const DISPPARAMS& arguments, VARIANT* re
       break;
     case kClear:
       text_.clear();
-      hasText_ = promised_ = false;
+      hasText_ = false;
+      promised_.reset();
       files_.clear();
       break;
     case kFiles: {

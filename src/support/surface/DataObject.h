@@ -7,6 +7,7 @@
 #include <ole2.h>
 
 #include <functional>
+#include <optional>
 #include <utility>
 #include <vector>
 
@@ -30,7 +31,7 @@ class DataObject final : public ComObject<IDataObject, IDispatch>, public DragDa
   explicit DataObject(IDataObject& foreign);
 
   // Who supplies a text that a host promised (SetData without a value) once a target asks for it: the handler
-  // is given the format and calls SetData, or leaves the text empty. None at first.
+  // is given the format as the host wrote it and calls SetData, or leaves the text empty. None at first.
   void SetPromiseHandler(std::function<void(std::int16_t format)> handler) {
     onPromised_ = std::move(handler);
   }
@@ -60,11 +61,12 @@ class DataObject final : public ComObject<IDataObject, IDispatch>, public DragDa
   HRESULT Call(DISPID member, const DISPPARAMS& arguments, VARIANT* result);
   bool Has(CLIPFORMAT format) const;
   // The text, which may have to be fetched first.
-  const Text& TextFor(CLIPFORMAT format);
+  const Text& TheText();
 
   Text text_;
   bool hasText_ = false;
-  bool promised_ = false;
+  // The format in which the host promised the text.
+  std::optional<CLIPFORMAT> promised_;
   std::function<void(std::int16_t)> onPromised_;
   std::vector<Text> files_;
 };

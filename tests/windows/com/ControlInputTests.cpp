@@ -26,6 +26,14 @@ class Dragged {
     const VARIANT done = Call(object_, L"SetData", {VariantOf(kText), VariantOf(owned)});
     EXPECT_EQ(V_VT(&done), VT_EMPTY);
   }
+  // Says that there will be a text, without giving it.
+  void PromiseText() const {
+    VARIANT missing = {};
+    V_VT(&missing) = VT_ERROR;
+    V_ERROR(&missing) = DISP_E_PARAMNOTFOUND;
+    const VARIANT done = Call(object_, L"SetData", {VariantOf(kText), missing});
+    EXPECT_EQ(V_VT(&done), VT_EMPTY);
+  }
   void Clear() const {
     const VARIANT done = Call(object_, L"Clear", {});
     EXPECT_EQ(V_VT(&done), VT_EMPTY);
@@ -139,14 +147,17 @@ TEST(ListControl, DragsItsOwnFile) {
     bool hasCopy;
     bool byCall;  // of OLEDrag, in place of the mouse
     BYTE key;     // that ends the drag, 0 for the mouse button
+    bool promises;
     LONG allowed;
     const wchar_t* told;
     std::vector<std::wstring> events;
   } rows[] = {
-      {false, false, 0, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1015 ", L"1021 "}},
-      {true, false, 0, DROPEFFECT_NONE, L"start over complete:0 ", {}},
-      {true, false, VK_ESCAPE, DROPEFFECT_COPY, L"start over complete:0 ", {}},
-      {true, true, 0, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1021 "}},
+      {false, false, 0, false, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1015 ", L"1021 "}},
+      {true, false, 0, false, DROPEFFECT_NONE, L"start over complete:0 ", {}},
+      {true, false, VK_ESCAPE, false, DROPEFFECT_COPY, L"start over complete:0 ", {}},
+      {true, true, 0, false, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1021 "}},
+      // What the host promised is asked for when it is wanted.
+      {true, true, 0, true, DROPEFFECT_COPY, L"start set over drop complete:1 ", {L"1021 "}},
   };
   for (const auto& line : rows) {
     SCOPED_TRACE(line.told);
@@ -168,6 +179,7 @@ TEST(ListControl, DragsItsOwnFile) {
           EXPECT_EQ(dragged.Has(kFiles), line.hasCopy);
           if (!files.empty()) copy = files[0];
           EXPECT_EQ(*V_I4REF(&arguments[1]), DROPEFFECT_COPY);
+          if (line.promises) dragged.PromiseText();
           *V_I4REF(&arguments[1]) = line.allowed;
           break;
         }
@@ -175,8 +187,15 @@ TEST(ListControl, DragsItsOwnFile) {
           EXPECT_EQ(*V_I4REF(&arguments[0]), line.allowed);
           EXPECT_EQ(*V_BOOLREF(&arguments[1]), VARIANT_TRUE);
           break;
+        case kOLESetData:
+          told += L"set ";
+          EXPECT_EQ(*V_I2REF(&arguments[1]), kText);
+          Dragged(arguments[0]).SetText(L"kept");
+          break;
         case kOLEDragOver:
-          EXPECT_EQ(Dragged(arguments[0]).Text(), address);
+          if (!line.promises) {
+            EXPECT_EQ(Dragged(arguments[0]).Text(), address);
+          }
           if (std::exchange(isOver, true)) break;
           told += L"over ";
           if (line.key)
@@ -185,6 +204,9 @@ TEST(ListControl, DragsItsOwnFile) {
             Mouse(MOUSEEVENTF_LEFTUP);
           break;
         case kOLEDragDrop:
+          if (line.promises) {
+            EXPECT_EQ(Dragged(arguments[0]).Text(), L"kept");
+          }
           told += L"drop ";
           break;
         case kOLECompleteDrag:
@@ -242,8 +264,10 @@ TEST(ListControl, SharesTheKeyboardWithItsForm) {
   form.Press(VK_TAB, button);
   EXPECT_EQ(GetFocus(), form.ListWindow());
   EXPECT_TRUE(form.container->IsUiActive());
+  EXPECT_TRUE(form.container->HasFocus());
   form.Press(VK_TAB);
   EXPECT_EQ(GetFocus(), button);
+  EXPECT_FALSE(form.container->HasFocus());
   form.Press(VK_TAB, button);
   EXPECT_EQ(GetFocus(), form.ListWindow());
 
@@ -275,6 +299,11 @@ TEST(ListControl, SharesTheKeyboardWithItsForm) {
   form.container->onKey = [](const MSG&, DWORD) { return false; };
   ComPtr<IOleInPlaceActiveObject> active;
   ASSERT_EQ(form.list->QueryInterface(IID_IOleInPlaceActiveObject, active.ReceiveVoid()), S_OK);
+  // A form that knows nothing of controls would press its default button.
+  MSG enter = {form.ListWindow(), WM_KEYDOWN, VK_RETURN, 0, 0, {0, 0}};
+  form.events.clear();
+  IsDialogMessageW(form.frame, &enter);
+  EXPECT_EQ(form.events, Lines{L"1024 "});
   MSG outside = {GetDesktopWindow(), WM_KEYDOWN, VK_F5, 0, 0, {0, 0}};
   EXPECT_EQ(active->TranslateAccelerator(&outside), S_FALSE);
 }
@@ -309,11 +338,10 @@ TEST(ListControl, RenamesByEditingALabel) {
   };
   for (const auto& row : rows) {
     SCOPED_TRACE(testing::Message() << row.typed << " " << row.key);
-    const auto item = static_cast<WPARAM>(
-        SendMessageW(form.ListWindow(), LVM_GETNEXTITEM, static_cast<WPARAM>(-1), LVNI_SELECTED));
     form.list->put_bRenameEnabled(row.enabled ? VARIANT_TRUE : VARIANT_FALSE);
     form.events.clear();
-    const auto edit = reinterpret_cast<HWND>(SendMessageW(form.ListWindow(), LVM_EDITLABELW, item, 0));
+    SendMessageW(form.ListWindow(), WM_KEYDOWN, VK_F2, 0);
+    const auto edit = reinterpret_cast<HWND>(SendMessageW(form.ListWindow(), LVM_GETEDITCONTROL, 0, 0));
     ASSERT_EQ(edit != nullptr, row.enabled);
     if (edit) {
       EXPECT_EQ(GetFocus(), edit);
@@ -332,6 +360,12 @@ TEST(ListControl, RenamesByEditingALabel) {
   }
   // While a label is edited all of these keys are the label's.
   EXPECT_EQ(offers, 0);
+  // The focus leaves the control from the editor, too.
+  SendMessageW(form.ListWindow(), WM_KEYDOWN, VK_F2, 0);
+  EXPECT_TRUE(form.container->HasFocus());
+  SetFocus(form.frame);
+  EXPECT_FALSE(form.container->HasFocus());
+  EXPECT_EQ(SendMessageW(form.ListWindow(), LVM_GETEDITCONTROL, 0, 0), 0);
   // The server has it under the new name.
   ASSERT_TRUE(form.Init(L"*"));
   EXPECT_EQ(form.Select(L"l\u00E4bel.two.jpg"), L"l\u00E4bel.two.jpg");

@@ -27,6 +27,7 @@ using demo::PropertyBag;
 // Events of the control by their numbers.
 inline constexpr DISPID kFileManagerEvent = 1;
 inline constexpr DISPID kOLEStartDrag = 2;
+inline constexpr DISPID kOLESetData = 3;
 inline constexpr DISPID kOLEGiveFeedback = 4;
 inline constexpr DISPID kOLEDragOver = 5;
 inline constexpr DISPID kOLEDragDrop = 6;

@@ -198,12 +198,10 @@ TEST_F(FilesTest, ListsWhatIsNeitherHiddenNorSystem) {
   const struct {
     Text pattern;
     bool file, withFolders;
-  } kCases[] = {{In(u"*.jpg"), true, true},       {In(u"a.jpg"), false, false},
-                {In(u"a*.jpg"), false, false},    {In(u"*.gif"), false, false},
-                {In(u"c.gif"), false, false},     {In(u"B.JPG"), true, true},
-                {In(u"none"), false, false},      {In(u"none\\x"), false, false},
-                {In(u"folder"), false, true},     {In(u"fold?r"), false, true},
-                {In(u"folder\\"), false, true}, {In(u""), true, true},
+  } kCases[] = {{In(u"*.jpg"), true, true},   {In(u"a.jpg"), false, false},   {In(u"a*.jpg"), false, false},
+                {In(u"*.gif"), false, false}, {In(u"c.gif"), false, false},   {In(u"B.JPG"), true, true},
+                {In(u"none"), false, false},  {In(u"none\\x"), false, false}, {In(u"folder"), false, true},
+                {In(u"fold?r"), false, true}, {In(u"folder\\"), false, true}, {In(u""), true, true},
                 {Text(), false, false}};
   for (const auto& item : kCases) {
     EXPECT_EQ(files_.Exists(item.pattern, false), item.file) << Utf8FromText(item.pattern);

@@ -36,7 +36,9 @@ class ScriptedUser : public ThumbnailPageUser {
   void EditorEntered() override { Tell("entered"); }
   void EditorLeft() override { Tell("left"); }
   void DragBegins() override { Tell("drag"); }
-  void LostFocus() override {}
+  void LostFocus() override {
+    if (tellsFocus) Tell("focus left");
+  }
   void GotFocus() override {
     if (tellsFocus) Tell("focus");
   }
@@ -493,14 +495,22 @@ TEST_F(ThumbnailPageTest, TheEditorTellsItsEndOnce) {
 TEST_F(ThumbnailPageTest, TheKeyboardReachesWhatIsShown) {
   // A control that becomes active takes the focus; what has it inside keeps it then.
   user_.tellsFocus = true;
-  user_.on = [&](const std::string&) { page_->Focus(); };
+  user_.on = [&](const std::string& what) {
+    if (what == "focus") page_->Focus();
+  };
   SetFocus(Switch());
   EXPECT_EQ(GetFocus(), Switch());
   SetFocus(other_);
   SetFocus(page_->Window());
   EXPECT_EQ(GetFocus(), Grid());
-  EXPECT_EQ(user_.Take(), (Told{"focus", "focus"}));
+  EXPECT_EQ(user_.Take(), (Told{"focus", "focus left", "focus"}));
   user_.on = {};
+  page_->ShowEditor(1, u"a");
+  SetFocus(other_);
+  EXPECT_EQ(user_.Take(), (Told{"focus", "left", "focus left"}));
+  page_->HideEditor();
+  user_.tellsFocus = false;
+  SetFocus(Grid());
 
   const auto walk = [&](bool backward) {
     std::vector<HWND> stops = {GetFocus()};
