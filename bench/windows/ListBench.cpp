@@ -46,6 +46,13 @@ void ShowBareList(HWND frame, int items) {
   DestroyWindow(view);
 }
 
+BOOL CALLBACK CountItems(HWND child, LPARAM count) {
+  wchar_t name[32] = {};
+  GetClassNameW(child, name, 32);
+  if (wcscmp(name, WC_LISTVIEWW) == 0) *reinterpret_cast<int*>(count) = ListView_GetItemCount(child);
+  return TRUE;
+}
+
 }  // namespace
 
 void ListBench(const Account& account, int records) {
@@ -66,15 +73,7 @@ void ListBench(const Account& account, int records) {
   container->Control()->QueryInterface(__uuidof(_ctrlListImage), list.ReceiveVoid());
   LogOn(*list, account);
   int items = 0;
-  EnumChildWindows(
-      frame,
-      [](HWND child, LPARAM count) -> BOOL {
-        wchar_t name[32] = {};
-        GetClassNameW(child, name, 32);
-        if (wcscmp(name, WC_LISTVIEWW) == 0) *reinterpret_cast<int*>(count) = ListView_GetItemCount(child);
-        return TRUE;
-      },
-      reinterpret_cast<LPARAM>(&items));
+  EnumChildWindows(frame, CountItems, reinterpret_cast<LPARAM>(&items));
   if (items != records) Stop("the list does not show all records");
 
   const Bstr filter(L"*");

@@ -125,13 +125,15 @@ void Download(const std::wstring& name) {
   SysFreeString(local);
 }
 
+void CALLBACK LoseConnection(HWND, UINT, UINT_PTR timer, DWORD) {
+  KillTimer(nullptr, timer);
+  list->put_gbConnectionFailed(VARIANT_TRUE);
+}
+
 // Processor milliseconds of a download for which nothing comes in 10 seconds.
 double StallMs() {
   Select(L"stall.jpg");
-  SetTimer(nullptr, 0, 10'000, [](HWND, UINT, UINT_PTR timer, DWORD) {
-    KillTimer(nullptr, timer);
-    list->put_gbConnectionFailed(VARIANT_TRUE);
-  });
+  SetTimer(nullptr, 0, 10'000, LoseConnection);
   const double before = ProcessorMs();
   BSTR local = nullptr;
   const double seconds = Seconds([&] { list->DownLoadFileFromServer(Bstr(L"bench-files"), &local); });
