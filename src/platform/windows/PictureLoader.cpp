@@ -9,7 +9,7 @@
 #include <optional>
 #include <vector>
 
-#include "platform/windows/PictureBytes.h"
+#include "support/PictureBytes.h"
 #include "support/surface/ComPtr.h"
 
 namespace tarnwick {

@@ -1,4 +1,4 @@
-#include "platform/windows/PictureBytes.h"
+#include "support/PictureBytes.h"
 
 #include <algorithm>
 #include <array>

@@ -32,6 +32,8 @@ struct PictureFacts {
   std::uint32_t frameHeight = 0;
   // The first so many bytes are a file with all that makes the picture.
   std::size_t length = 0;
+
+  bool operator==(const PictureFacts&) const = default;
 };
 
 // Looks at a whole file and moves what makes the picture to its front. Empty when it is none of the four

@@ -1,0 +1,136 @@
+// What is left of a picture file before a decoder gets it, and which files it does not get.
+#include "support/PictureBytes.h"
+
+#include <gtest/gtest.h>
+
+#include <string>
+
+namespace tarnwick {
+namespace {
+
+// What ReducePicture leaves of a file; "refused" when it does.
+std::string Reduced(std::string file) {
+  const auto facts = ReducePicture({reinterpret_cast<std::uint8_t*>(file.data()), file.size()});
+  return facts ? file.substr(0, facts->length) : "refused";
+}
+
+std::string Big(std::uint32_t value, int bytes) {
+  std::string text;
+  while (bytes-- > 0) text += static_cast<char>(value >> (8 * bytes));
+  return text;
+}
+
+std::string Chunk(const std::string& name, const std::string& data) {
+  return Big(static_cast<std::uint32_t>(data.size()), 4) + name + data + "SUM.";
+}
+
+std::string Png(std::uint32_t width, std::uint32_t height, int depth, int colorType, bool interlaced,
+                const std::string& chunks) {
+  std::string header = Big(width, 4) + Big(height, 4);
+  for (const int byte : {depth, colorType, 0, 0, interlaced ? 1 : 0}) header += static_cast<char>(byte);
+  return "\x89PNG\r\n\x1A\n" + Chunk("IHDR", header) + chunks;
+}
+
+std::string Segment(int marker, const std::string& data) {
+  return "\xFF" + Big(static_cast<std::uint32_t>(marker), 1) +
+         Big(static_cast<std::uint32_t>(data.size()) + 2, 2) + data;
+}
+
+std::string Frame(int marker, std::uint32_t width, std::uint32_t height) {
+  return Segment(marker, "\x08" + Big(height, 2) + Big(width, 2) + "\x03");
+}
+
+std::string Times(int count, const std::string& text) {
+  std::string all;
+  while (count-- > 0) all += text;
+  return all;
+}
+
+const std::string kSoi = "\xFF\xD8";
+const std::string kEoi = "\xFF\xD9";
+constexpr int kBaseline = 0xC0;
+constexpr int kProgressive = 0xC2;
+
+TEST(PictureBytes, PngKeepsWhatMakesThePixels) {
+  const std::string palette = Chunk("PLTE", "RGB");
+  const std::string clear = Chunk("tRNS", "A");
+  const std::string data = Chunk("IDAT", "packed");
+  const std::string end = Chunk("IEND", "");
+  EXPECT_EQ(Png(2, 2, 8, 3, false, palette + clear + data + data + end),
+            Reduced(Png(2, 2, 8, 3, false,
+                        Chunk("iCCP", std::string(5000, 'p')) + palette + Chunk("tEXt", "a") + clear + data +
+                            Chunk("IDAT", "") + data + end + "behind the end")));
+
+  EXPECT_EQ("refused", Reduced(Png(2, 2, 8, 3, false, Big(1000, 4) + "IDATshort")));
+  // Blocks that unpack to nothing.
+  EXPECT_EQ("refused", Reduced(Png(2, 2, 8, 3, false, Chunk("IDAT", std::string(5000, '\0')) + end)));
+  // 64 megapixels, and what a decoder would need for them.
+  const auto shown = [&](std::uint32_t width, std::uint32_t height, int depth, int colorType,
+                         bool interlaced) {
+    return Reduced(Png(width, height, depth, colorType, interlaced, data + end)) != "refused";
+  };
+  EXPECT_TRUE(shown(8000, 8000, 8, 6, false));
+  EXPECT_FALSE(shown(8001, 8000, 8, 6, false));
+  EXPECT_FALSE(shown(8000, 8000, 16, 6, false));
+  EXPECT_TRUE(shown(5600, 5600, 8, 6, true));
+  EXPECT_FALSE(shown(8000, 8000, 8, 6, true));
+  EXPECT_FALSE(shown(0, 8, 8, 6, false));
+  EXPECT_FALSE(shown(0xFFFFFFFF, 0xFFFFFFFF, 8, 6, false));
+}
+
+TEST(PictureBytes, JpegKeepsWhatMakesThePixels) {
+  const std::string jfif = Segment(0xE0, "JFIF");
+  const std::string adobe = Segment(0xEE, "Adobe");
+  const std::string tables = Segment(0xDB, std::string(65, 'q')) + Segment(0xC4, std::string(20, 'h'));
+  const std::string all = Segment(0xDA, "\x03......");
+  const std::string one = Segment(0xDA, "\x01..");
+  const std::string codes = "codes\xFF" + std::string(1, '\0') + "\xFF\xD0more";
+  // A camera's small picture of its own stands within its data.
+  const std::string exif = Segment(0xE1, "Exif" + kSoi + Frame(kBaseline, 9, 9) + kEoi);
+  EXPECT_EQ(kSoi + jfif + adobe + tables + Frame(kBaseline, 8, 8) + all + codes + kEoi,
+            Reduced(kSoi + jfif + exif + adobe + Segment(0xFE, "comment") + tables + "\xFF\xFF" +
+                    Frame(kBaseline, 8, 8) + all + codes + kEoi));
+  EXPECT_EQ(kSoi + Frame(kProgressive, 8, 8) + one + codes + tables + one + codes + kEoi,
+            Reduced(kSoi + exif + Frame(kProgressive, 8, 8) + one + codes + exif + tables + one + codes +
+                    kEoi + "behind the end"));
+
+  const auto shown = [&](int kind, std::uint32_t width, std::uint32_t height, int scans) {
+    return Reduced(kSoi + Frame(kind, width, height) + Times(scans, one + codes) + kEoi) != "refused";
+  };
+  EXPECT_TRUE(shown(kBaseline, 8000, 8000, 1));
+  EXPECT_FALSE(shown(kBaseline, 8001, 8000, 1));
+  EXPECT_TRUE(shown(kProgressive, 4000, 3000, 40));
+  EXPECT_FALSE(shown(kProgressive, 4000, 3000, 41));
+  EXPECT_FALSE(shown(kProgressive, 8000, 8000, 10));
+  EXPECT_FALSE(shown(kProgressive, 8, 8, 0));
+  EXPECT_EQ("refused", Reduced(kSoi + Frame(kBaseline, 8, 8) + Frame(kBaseline, 9, 9) + all + codes + kEoi));
+  EXPECT_EQ("refused", Reduced(kSoi + Frame(kBaseline, 8, 8)));
+  EXPECT_EQ("refused", Reduced(kSoi + Frame(kBaseline, 8, 8) +
+                               Times(16, Segment(0xDB, std::string(65'000, 'q'))) + all + kEoi));
+}
+
+TEST(PictureBytes, GifKeepsItsFirstPicture) {
+  const auto gif = [](const std::string& blocks) {
+    const std::string screen("\x04\0\x04\0\x80\0\0", 7);
+    return "GIF89a" + screen + "RGBRGB" + blocks;
+  };
+  const std::string comment("\x21\xFE\x02hi\0", 6);
+  const std::string control("\x21\xF9\x04\x01..\x01\0", 8);
+  const std::string picture("\x2C\x01\0\x01\0\x02\0\x02\0\0\x02\x03\x44\0\x05\0", 16);
+  EXPECT_EQ(gif(control + picture + ";"),
+            Reduced(gif(comment + control + comment + picture + control + picture + ";")));
+  EXPECT_EQ("refused", Reduced(gif(comment + ";")));
+  EXPECT_EQ("refused", Reduced(gif(control + picture.substr(0, 14))));
+
+  // Nothing but clear codes, of three bits each: a decoder empties its table for each.
+  const std::string clears = "\xFF" + Times(85, "\x24\x49\x92");
+  const std::string begin("\x2C\0\0\0\0\x02\0\x02\0\0\x02", 11);
+  const auto shown = [&](int blocks) {
+    return Reduced(gif(begin + Times(blocks, clears) + std::string(1, '\0') + ";")) != "refused";
+  };
+  EXPECT_TRUE(shown(700));
+  EXPECT_FALSE(shown(800));
+}
+
+}  // namespace
+}  // namespace tarnwick

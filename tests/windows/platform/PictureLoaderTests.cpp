@@ -1,0 +1,303 @@
+// Pictures for small views: what a file's pixels become, and which files become nothing.
+#include "platform/windows/PictureLoader.h"
+
+#include <gtest/gtest.h>
+#include <objbase.h>
+#include <wincodec.h>
+
+#include <algorithm>
+#include <cstdint>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "support/surface/ComPtr.h"
+
+namespace tarnwick {
+namespace {
+
+using Bytes = std::vector<std::uint8_t>;
+using Pixels = std::vector<std::uint32_t>;  // 0xAARRGGBB, from the top
+
+constexpr COLORREF kBackground = RGB(0x40, 0x80, 0xC0);
+constexpr std::uint32_t kShownBackground = 0xFF4080C0;
+
+struct Picture {
+  int width = 0;
+  int height = 0;
+  Pixels pixels;
+};
+
+// Every pixel of another colour, all opaque.
+Picture Colours(int width, int height) {
+  Picture picture = {width, height, {}};
+  std::uint32_t random = 12345;
+  for (int i = 0; i < width * height; ++i) {
+    random = random * 1664525 + 1013904223;
+    picture.pixels.push_back(0xFF000000 | random >> 8);
+  }
+  return picture;
+}
+
+void Append(Bytes& bytes, std::uint32_t value, int count) {
+  for (int i = 0; i < count; ++i) bytes.push_back(static_cast<std::uint8_t>(value >> (8 * i)));
+}
+
+// 24 bits a pixel, from the bottom.
+Bytes Bmp(const Picture& picture) {
+  const auto stride = static_cast<std::uint32_t>((picture.width * 3 + 3) / 4 * 4);
+  Bytes bytes = {'B', 'M'};
+  Append(bytes, 54 + stride * static_cast<std::uint32_t>(picture.height), 4);
+  Append(bytes, 0, 4);
+  Append(bytes, 54, 4);
+  Append(bytes, 40, 4);
+  Append(bytes, static_cast<std::uint32_t>(picture.width), 4);
+  Append(bytes, static_cast<std::uint32_t>(picture.height), 4);
+  Append(bytes, 1, 2);
+  Append(bytes, 24, 2);
+  bytes.resize(54);
+  for (int y = picture.height; y-- > 0;) {
+    const std::size_t end = bytes.size() + stride;
+    for (int x = 0; x < picture.width; ++x)
+      Append(bytes, picture.pixels[static_cast<std::size_t>(y * picture.width + x)], 3);
+    bytes.resize(end);
+  }
+  return bytes;
+}
+
+// What Windows makes of the picture in `container`'s format. A GIF has its pixels' first eight colours.
+Bytes Encoded(const Picture& picture, const GUID& container) {
+  ComPtr<IWICImagingFactory> factory;
+  ComPtr<IStream> stream;
+  ComPtr<IWICBitmapEncoder> encoder;
+  ComPtr<IWICBitmapFrameEncode> frame;
+  EXPECT_EQ(S_OK, CoCreateInstance(CLSID_WICImagingFactory, nullptr, CLSCTX_INPROC_SERVER,
+                                   __uuidof(IWICImagingFactory), factory.ReceiveVoid()));
+  EXPECT_EQ(S_OK, CreateStreamOnHGlobal(nullptr, TRUE, stream.Receive()));
+  EXPECT_EQ(S_OK, factory->CreateEncoder(container, nullptr, encoder.Receive()));
+  EXPECT_EQ(S_OK, encoder->Initialize(stream.Get(), WICBitmapEncoderNoCache));
+  EXPECT_EQ(S_OK, encoder->CreateNewFrame(frame.Receive(), nullptr));
+  EXPECT_EQ(S_OK, frame->Initialize(nullptr));
+  EXPECT_EQ(S_OK, frame->SetSize(static_cast<UINT>(picture.width), static_cast<UINT>(picture.height)));
+  WICPixelFormatGUID format = GUID_WICPixelFormat32bppBGRA;
+  std::size_t pixelBytes = 4;
+  Bytes data;
+  if (container == GUID_ContainerFormatGif) {
+    format = GUID_WICPixelFormat8bppIndexed;
+    pixelBytes = 1;
+    Pixels colors(picture.pixels.begin(),
+                  picture.pixels.begin() + std::min<std::ptrdiff_t>(8, std::ssize(picture.pixels)));
+    for (const std::uint32_t pixel : picture.pixels)
+      data.push_back(static_cast<std::uint8_t>(std::ranges::find(colors, pixel) - colors.begin()));
+    ComPtr<IWICPalette> palette;
+    EXPECT_EQ(S_OK, factory->CreatePalette(palette.Receive()));
+    EXPECT_EQ(S_OK, palette->InitializeCustom(colors.data(), static_cast<UINT>(colors.size())));
+    EXPECT_EQ(S_OK, frame->SetPalette(palette.Get()));
+  } else if (container == GUID_ContainerFormatJpeg) {
+    format = GUID_WICPixelFormat24bppBGR;
+    pixelBytes = 3;
+    for (const std::uint32_t pixel : picture.pixels) Append(data, pixel, 3);
+  } else {
+    for (const std::uint32_t pixel : picture.pixels) Append(data, pixel, 4);
+  }
+  const WICPixelFormatGUID wanted = format;
+  EXPECT_EQ(S_OK, frame->SetPixelFormat(&format));
+  EXPECT_TRUE(format == wanted);
+  EXPECT_EQ(S_OK, frame->WritePixels(static_cast<UINT>(picture.height),
+                                     static_cast<UINT>(static_cast<std::size_t>(picture.width) * pixelBytes),
+                                     static_cast<UINT>(data.size()), data.data()));
+  EXPECT_EQ(S_OK, frame->Commit());
+  EXPECT_EQ(S_OK, encoder->Commit());
+
+  STATSTG facts = {};
+  EXPECT_EQ(S_OK, stream->Stat(&facts, STATFLAG_NONAME));
+  Bytes bytes(static_cast<std::size_t>(facts.cbSize.QuadPart));
+  EXPECT_EQ(S_OK, stream->Seek({}, STREAM_SEEK_SET, nullptr));
+  EXPECT_EQ(S_OK, stream->Read(bytes.data(), static_cast<ULONG>(bytes.size()), nullptr));
+  return bytes;
+}
+
+class PictureLoaderTest : public testing::Test {
+ protected:
+  PictureLoaderTest() {
+    CoInitialize(nullptr);
+    wchar_t folder[MAX_PATH] = {};
+    GetTempPathW(MAX_PATH, folder);
+    path_ = std::wstring(folder) + L"loader-test.picture";
+  }
+  ~PictureLoaderTest() override {
+    // Also shows that the loader has closed it.
+    EXPECT_TRUE(DeleteFileW(path_.c_str()) || GetLastError() == ERROR_FILE_NOT_FOUND);
+    CoUninitialize();
+  }
+
+  void Write(const Bytes& bytes) {
+    const FileOwner file(CreateFileW(path_.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr));
+    DWORD written = 0;
+    EXPECT_TRUE(WriteFile(file.Get(), bytes.data(), static_cast<DWORD>(bytes.size()), &written, nullptr));
+  }
+  // The pixels that the file with these bytes is shown with; none when it is not.
+  Pixels Shown(const Bytes& bytes, int width, int height) {
+    Write(bytes);
+    return ShownFile(width, height);
+  }
+  Pixels ShownFile(int width, int height) {
+    const BitmapOwner bitmap = LoadPicture(path_, width, height, kBackground);
+    if (!bitmap) return {};
+    DIBSECTION section = {};
+    EXPECT_EQ(sizeof section, static_cast<std::size_t>(GetObjectW(bitmap.Get(), sizeof section, &section)));
+    EXPECT_EQ(width, section.dsBm.bmWidth);
+    EXPECT_EQ(height, section.dsBm.bmHeight);
+    const auto* first = static_cast<const std::uint32_t*>(section.dsBm.bmBits);
+    return {first, first + width * height};
+  }
+
+  std::wstring path_;
+};
+
+// The exact average of what each pixel of the target covers, by the definition: both grids are put on one
+// whose lines hold all borders.
+Pixels Averages(const Picture& source, int width, int height) {
+  Pixels result;
+  for (int y = 0; y < height; ++y)
+    for (int x = 0; x < width; ++x) {
+      std::uint32_t color = 0xFF;
+      for (const int shift : {16, 8, 0}) {
+        int sum = 0;
+        for (int v = y * source.height; v < (y + 1) * source.height; ++v)
+          for (int u = x * source.width; u < (x + 1) * source.width; ++u)
+            sum += static_cast<int>(
+                source.pixels[static_cast<std::size_t>(v / height * source.width + u / width)] >> shift &
+                0xFF);
+        const int cells = source.width * source.height;
+        color = color << 8 | static_cast<std::uint32_t>((sum + cells / 2) / cells);
+      }
+      result.push_back(color);
+    }
+  return result;
+}
+
+TEST_F(PictureLoaderTest, EachPixelIsTheAverageOfWhatItCovers) {
+  struct Row {
+    int width, height, shownWidth, shownHeight;
+  };
+  for (const Row row : {Row{5, 5, 5, 5}, Row{8, 6, 4, 2}, Row{7, 5, 3, 2}, Row{61, 1, 1, 1}, Row{3, 50, 2, 7},
+                        Row{2, 2, 5, 3}, Row{1, 4, 3, 3}, Row{100, 90, 13, 89}}) {
+    const Picture picture = Colours(row.width, row.height);
+    EXPECT_EQ(Averages(picture, row.shownWidth, row.shownHeight),
+              Shown(Bmp(picture), row.shownWidth, row.shownHeight))
+        << row.width << " x " << row.height << " at " << row.shownWidth << " x " << row.shownHeight;
+  }
+}
+
+TEST_F(PictureLoaderTest, EachFormatIsToldByItsBytes) {
+  const Picture eight = Colours(4, 2);
+  EXPECT_EQ(eight.pixels, Shown(Encoded(eight, GUID_ContainerFormatPng), 4, 2));
+  EXPECT_EQ(eight.pixels, Shown(Encoded(eight, GUID_ContainerFormatGif), 4, 2));
+  EXPECT_EQ(eight.pixels, Shown(Bmp(eight), 4, 2));
+
+  // A JPEG's colours are near.
+  const Picture plain = {40, 30, Pixels(1200, 0xFFC83250)};
+  const Pixels shown = Shown(Encoded(plain, GUID_ContainerFormatJpeg), 3, 2);
+  ASSERT_EQ(6U, shown.size());
+  for (const std::uint32_t pixel : shown)
+    for (const int shift : {0, 8, 16})
+      EXPECT_NEAR(0xC83250 >> shift & 0xFF, static_cast<int>(pixel >> shift & 0xFF), 3);
+}
+
+TEST_F(PictureLoaderTest, TheBackgroundShowsThrough) {
+  // What is not seen, seen half and seen; then a hidden and a seen one in one, without the hidden one's
+  // colour.
+  const Picture picture = {3, 1, {0x00FFFFFF, 0x80000000, 0xFF102030}};
+  const Bytes png = Encoded(picture, GUID_ContainerFormatPng);
+  EXPECT_EQ((Pixels{kShownBackground, 0xFF204060, 0xFF102030}), Shown(png, 3, 1));
+  const Picture two = {2, 1, {0x00FFFFFF, 0xFF000000}};
+  EXPECT_EQ((Pixels{0xFF204060}), Shown(Encoded(two, GUID_ContainerFormatPng), 1, 1));
+
+  // A GIF of 4 x 4 whose first picture is the 2 x 2 at (1, 1): red, the transparent colour, and twice red. A
+  // further picture is not shown.
+  const Bytes first = {'G', 'I',  'F',  '8', '9',  'a',  4, 0,    4, 0,    0x80, 0,    0,    0xFF, 0,
+                       0,   0xFF, 0xFF, 0,   0x21, 0xF9, 4, 0x01, 0, 0,    1,    0,    0x2C, 1,    0,
+                       1,   0,    2,    0,   2,    0,    0, 2,    3, 0x44, 0x00, 0x05, 0};
+  const Bytes further = {0x2C, 0, 0, 0, 0, 4, 0, 4, 0, 0, 2, 1, 0x2C, 0, 0x3B};
+  Bytes gif = first;
+  gif.insert(gif.end(), further.begin(), further.end());
+  Pixels expected(16, kShownBackground);
+  expected[5] = expected[9] = expected[10] = 0xFFFF0000;
+  EXPECT_EQ(expected, Shown(gif, 4, 4));
+}
+
+TEST_F(PictureLoaderTest, ABrokenFileIsNotShown) {
+  const Picture picture = Colours(4, 2);
+  const Picture large = Colours(64, 64);
+  const std::pair<const char*, Bytes> files[] = {
+      {"PNG", Encoded(large, GUID_ContainerFormatPng)},
+      {"GIF", Encoded(picture, GUID_ContainerFormatGif)},
+      {"JPEG", Encoded(large, GUID_ContainerFormatJpeg)},
+      {"BMP", Bmp(large)},
+  };
+  for (const auto& [name, bytes] : files) {
+    EXPECT_FALSE(Shown(bytes, 2, 2).empty()) << name;
+    for (const std::size_t length :
+         {bytes.size() / 2, bytes.size() * 9 / 10, std::size_t{30}, std::size_t{3}})
+      EXPECT_TRUE(
+          Shown(Bytes(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(length)), 2, 2).empty())
+          << name << " cut after " << length << " of " << bytes.size();
+    Bytes noise = bytes;
+    for (std::size_t i = 12; i < noise.size(); ++i) noise[i] = static_cast<std::uint8_t>(i * 77);
+    EXPECT_TRUE(Shown(noise, 2, 2).empty()) << name << " with noise";
+  }
+  EXPECT_TRUE(Shown({}, 2, 2).empty());
+  EXPECT_TRUE(Shown(Bytes(200, 'x'), 2, 2).empty());
+
+  Write(files[0].second);
+  for (const SIZE size : {SIZE{0, 2}, SIZE{2, 0}, SIZE{-1, 2}, SIZE{20'000, 1}})
+    EXPECT_TRUE(ShownFile(size.cx, size.cy).empty());
+  const std::wstring file = std::exchange(path_, path_ + std::wstring(1, L'\0'));
+  EXPECT_TRUE(ShownFile(2, 2).empty()) << "a name with NUL";
+  path_ = file + L".none";
+  EXPECT_TRUE(ShownFile(2, 2).empty()) << "no file";
+  path_ = L"C:\\windows";
+  EXPECT_TRUE(ShownFile(2, 2).empty()) << "a folder";
+  path_ = file;
+}
+
+// A few bytes that say how large the picture is are not believed.
+TEST_F(PictureLoaderTest, AFileThatClaimsTooMuchIsNotShown) {
+  struct Row {
+    const char* name;
+    Bytes file;
+    // Where its sides stand, from the mark on, and in how many bytes.
+    Bytes mark;
+    std::size_t width, height;
+    int bytes;
+    bool bigEndian;
+  };
+  const Picture picture = Colours(4, 2);
+  for (const Row& row :
+       {Row{"PNG", Encoded(picture, GUID_ContainerFormatPng), {'I', 'H', 'D', 'R'}, 4, 8, 4, true},
+        Row{"GIF", Encoded(picture, GUID_ContainerFormatGif), {'G', 'I', 'F'}, 6, 8, 2, false},
+        Row{"JPEG", Encoded(picture, GUID_ContainerFormatJpeg), {0xFF, 0xC0}, 7, 5, 2, true},
+        Row{"BMP", Bmp(picture), {'B', 'M'}, 18, 22, 4, false}}) {
+    Bytes bytes = row.file;
+    EXPECT_FALSE(Shown(bytes, 2, 2).empty()) << row.name;
+    const auto mark = static_cast<std::size_t>(std::ranges::search(bytes, row.mark).begin() - bytes.begin());
+    ASSERT_LT(mark, bytes.size()) << row.name;
+    const auto put = [&](std::size_t at, std::uint32_t value) {
+      for (int i = 0; i < row.bytes; ++i)
+        bytes[mark + at + static_cast<std::size_t>(i)] =
+            static_cast<std::uint8_t>(value >> 8 * (row.bigEndian ? row.bytes - 1 - i : i));
+    };
+    put(row.width, 8001);
+    put(row.height, 8000);
+    EXPECT_TRUE(Shown(bytes, 2, 2).empty()) << row.name;
+    if (row.bytes < 4) continue;
+    // 2 to the power of 32 pixels: none in 32 bits.
+    put(row.width, 0x10000);
+    put(row.height, 0x10000);
+    EXPECT_TRUE(Shown(bytes, 2, 2).empty()) << row.name << " at 65536 x 65536";
+  }
+}
+
+}  // namespace
+}  // namespace tarnwick
