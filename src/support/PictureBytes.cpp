@@ -68,7 +68,9 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
   constexpr std::size_t kSignature = 8;
   constexpr std::size_t kAround = 12;  // length and name before the data, the check sum behind it
   constexpr std::size_t kHeaderEnd = kSignature + kAround + 13;
-  if (file.size() < kHeaderEnd || !StartsWith(file.subspan(kSignature + 4), "IHDR")) return {};
+  if (file.size() < kHeaderEnd || BigEndian(file.subspan(kSignature, 4)) != 13 ||
+      !StartsWith(file.subspan(kSignature + 4), "IHDR"))
+    return {};
   const std::uint32_t width = BigEndian(file.subspan(16, 4));
   const std::uint32_t height = BigEndian(file.subspan(20, 4));
   if (!Shown(width, height)) return {};
@@ -122,6 +124,7 @@ class GifCodes {
   // False when there are too many clear codes.
   bool Read(Bytes block) {
     for (const std::uint8_t byte : block) {
+      if (ended_) break;
       bits_ |= std::uint32_t{byte} << count_;
       count_ += 8;
       while (count_ >= width_ && !ended_) {
@@ -137,7 +140,6 @@ class GifCodes {
           ++width_;
         }
       }
-      if (ended_) return true;
     }
     return true;
   }
@@ -271,11 +273,13 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
       components = data[5];
       progressive = marker == 0xC2;
     }
+    // Told before the segment moves: what is kept may lie over where it was.
+    const bool hasAll = !progressive && !data.empty() && data[0] == components;
     kept.Keep(begin, at);
     if (marker != 0xDA) continue;
 
     if (!facts || data.empty() || ++scans > kMostJpegScans) return {};
-    if (!progressive && data[0] == components) {
+    if (hasAll) {
       // One scan has it all; the decoder stops at its end.
       kept.Keep(at, file.size());
       break;
