@@ -403,8 +403,16 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
       Fail(ftp_error::kAborted, u"The file's name is not safe.");
       return Raise(event::kDownloadFailed);
     }
-    FileSystem& files = apartment_.platform.files;
-    if (FileExists(files, target)) files.Remove(target);
+    // What is there would pass for the download: somebody has it open, or it is not to be changed.
+    const bool free = ResultAsItStood(false, [&](bool& done) {
+      FileSystem& files = apartment_.platform.files;
+      if (FileExists(files, target)) files.Remove(target);
+      done = true;
+    });
+    if (!free) {
+      Fail(ftp_error::kAborted, u"The local file could not be replaced.");
+      return Raise(event::kDownloadFailed);
+    }
     if (Download(url, target, target, [] { return false; })) Yield();
     TransferEnded();
   });

@@ -169,7 +169,8 @@ struct FakeFiles : FileSystem {
   };
   std::unique_ptr<FileWriter> Create(TextView path) override { return std::make_unique<Writer>(*this, path); }
   void Remove(TextView path) override {
-    At(path);
+    constexpr std::uint32_t kReadOnly = 1;
+    if ((At(path).attributes & kReadOnly) != 0) throw RuntimeError(error::kPathAccess);
     files.erase(Text(path));
   }
   bool Exists(TextView pattern, bool withFolders) override {

@@ -474,6 +474,16 @@ TEST_F(ListImageDownload, Failures) {
   downloader.waits = {[](FakeDownloader& d) { d.events->Finished(); }};
   EXPECT_EQ(download(), "");
   EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+  // What is there already stays and is not taken for the download.
+  constexpr std::uint32_t kReadOnly = 1;
+  fake.files.files[u"C:\\To\\a.jpg"] = {3, kReadOnly, "old"};
+  control.m_LastError = 0;
+  log.clear();
+  EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
+  EXPECT_EQ(Events(), "5555 ,");
+  EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+  EXPECT_EQ(fake.files.files[u"C:\\To\\a.jpg"].bytes, "old");
+  fake.files.files.erase(u"C:\\To\\a.jpg");
   // The host gives up, before or meanwhile.
   control.gbConnectionFailed = true;
   EXPECT_EQ(download(), "");
