@@ -227,7 +227,10 @@ bool FileControl::DeleteOnServer(CFileUpload& client, const CUpload& file) {
     uploader_.DeleteFile(UsersBaseUrl(session.serverName), name, AcceptorPath(u"DeleteAcceptor.asp"),
                          session.userName, session.password, kProductGuid);
   });
-  if (client.DeleteFileForUser(name) != status::kSuccess) return false;
+  if (client.DeleteFileForUser(name) != status::kSuccess) {
+    Fail(ftp_error::kNotTaken, u"The file was not deleted.");
+    return false;
+  }
   RemoveLocalCopy(copy);
   return true;
 }

@@ -58,7 +58,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
 
   // The service client; may be null.
   std::shared_ptr<CFileUpload> mobjFileupload;
-  // An FtpErrors value and its text, of the transfer that ran last or was refused.
+  // An FtpErrors value and its text, of the transfer that ran last or was refused, or of a failed delete.
   std::int32_t m_LastError = 0;
   Text m_strLastErrorDesc;
   // A transfer runs. What a host writes here does not stop it.

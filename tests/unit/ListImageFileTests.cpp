@@ -267,6 +267,7 @@ TEST_F(ListImageTest, DeleteOutcomes) {
     control.DeleteFile();
     EXPECT_EQ(Events(), "1015 http://h/u/a.jpg,") << answer;
     EXPECT_EQ(Names(), "a.jpg,");
+    EXPECT_EQ(std::exchange(control.m_LastError, 0), ftp_error::kNotTaken);
   }
 
   // A listing that fails afterwards is told by the list alone.

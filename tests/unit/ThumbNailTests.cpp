@@ -370,6 +370,14 @@ TEST_F(ThumbNailTest, EditsTheNameInPlace) {
   EXPECT_TRUE(HasCopy("new & old.gif"));
   EXPECT_FALSE(HasCopy("2.gif"));
 
+  // The same name without its extension changes nothing, and is not what the caption says then.
+  log.clear();
+  control.OnKeyDown(113);
+  page.edited = u"new & old";
+  control.OnEditorEntered();
+  ExpectLog({"8888 ", "editor 2 new & old.gif", "caption 2 new && old", "editor hides", "caption 2 new && old.gif",
+             "1031 "});
+
   // A refused character restores the caption; leaving the editor changes nothing.
   log.clear();
   control.OnKeyDown(113);

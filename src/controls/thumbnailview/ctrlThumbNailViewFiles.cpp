@@ -158,19 +158,20 @@ void ctrlThumbNailView::ValidateFileName(Text& NewString) {
   ResultAsItStood(0, [&](int&) {
     const Text edited = std::exchange(editedName_, Text());
     const Text oldName = edited.empty() ? SelectedFileName() : edited;
-    const auto refuse = [&](std::int16_t code) {
+    const auto keepName = [&](std::int16_t code) {
       SetLabelText(oldName);
       Raise(code);
     };
     NewString = Text(Trim(NewString));
-    if (BeginsUnfit(NewString)) return refuse(event::kNameUnfit);
+    if (BeginsUnfit(NewString)) return keepName(event::kNameUnfit);
     CheckFileExtension(NewString, ExtensionOf(oldName));
-    if (NewString == oldName) return Raise(event::kRenamed);
+    // The caption may show what was typed, such as the name without its extension.
+    if (NewString == oldName) return keepName(event::kRenamed);
     if (Find(apartment_.shownFiles,
              [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), NewString); }) != 0)
-      return refuse(event::kNameTaken);
+      return keepName(event::kNameTaken);
     const Hourglass pointer(*this);
-    if (!Rename(oldName, NewString)) return refuse(event::kRenameFailed);
+    if (!Rename(oldName, NewString)) return keepName(event::kRenameFailed);
     Raise(event::kRenamed);
   });
 }
