@@ -172,9 +172,10 @@ wine_prefix() {
   touch "$prefix/complete"
 }
 
-# registry_of ARCH FILE: what is registered for all users, as text.
+# registry_of ARCH FILE [ROOT]: what is registered for all users (HKLM) or, with HKCU, for the current one, as text.
 registry_of() {
-  wine_run "$1" reg export 'HKLM\Software\Classes' "$2" /y
+  wine_run "$1" reg export "${3-HKLM}\\Software\\Classes" "$2.utf16" /y
+  iconv -f UTF-16 -t UTF-8 "$2.utf16" | tr -d '\r' >"$2"
 }
 
 # ---- The hosting server --------------------------------------------------------------------------------------------

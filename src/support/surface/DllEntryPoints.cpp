@@ -35,9 +35,18 @@ STDAPI DllCanUnloadNow() {
 }
 
 STDAPI DllRegisterServer() {
-  return tarnwick::Register();
+  return tarnwick::Register(tarnwick::Scope::kMachine);
 }
 
 STDAPI DllUnregisterServer() {
-  return tarnwick::Unregister();
+  return tarnwick::Unregister(tarnwick::Scope::kMachine);
+}
+
+// "user" registers for the current user alone, without an administrator; an empty line for all.
+STDAPI DllInstall(BOOL install, LPCWSTR commandLine) {
+  using tarnwick::Scope;
+  const bool user = commandLine && _wcsicmp(commandLine, L"user") == 0;
+  if (!user && commandLine && *commandLine != L'\0') return E_INVALIDARG;
+  const Scope scope = user ? Scope::kUser : Scope::kMachine;
+  return install ? tarnwick::Register(scope) : tarnwick::Unregister(scope);
 }

@@ -1,0 +1,337 @@
+// The type library inside the built library, read back as a host's compiler reads it, beside the surface that hosts were
+// promised.
+#include "SurfaceTable.h"
+
+#include <gtest/gtest.h>
+
+#include <map>
+#include <sstream>
+
+#include "Host.h"
+
+namespace tarnwick::test {
+namespace {
+
+std::string Narrow(const std::wstring& text) {
+  return {text.begin(), text.end()};  // names are ASCII
+}
+
+std::string GuidText(const GUID& guid) {
+  wchar_t text[39];
+  StringFromGUID2(guid, text, 39);
+  return Narrow(text);
+}
+
+ComPtr<ITypeLib> TheLibrary() {
+  // The registration names the built file.
+  wchar_t path[MAX_PATH] = {};
+  DWORD size = sizeof path;
+  const std::wstring key = L"CLSID\\{8114E25E-B445-4D77-866F-FDA3EA5D6812}\\InprocServer32";
+  ComPtr<ITypeLib> library;
+  if (RegGetValueW(HKEY_CLASSES_ROOT, key.c_str(), nullptr, RRF_RT_REG_SZ, nullptr, path, &size) == ERROR_SUCCESS)
+    LoadTypeLibEx(path, REGKIND_NONE, library.Receive());
+  return library;
+}
+
+struct Named {
+  std::string name;
+  std::string help;
+};
+
+// Of a member, or with MEMBERID_NIL of the type itself.
+Named NamesOf(ITypeInfo& type, MEMBERID member) {
+  Bstr name;
+  Bstr help;
+  type.GetDocumentation(member, name.Receive(), help.Receive(), nullptr, nullptr);
+  return {Narrow(name.Text()), Narrow(help.Text())};
+}
+
+// A description that the type library lends.
+template <typename Description, void (STDMETHODCALLTYPE ITypeInfo::*release)(Description*)>
+class Lent {
+ public:
+  explicit Lent(ITypeInfo& type) : type_(type) {}
+  ~Lent() {
+    if (description_) (type_.*release)(description_);
+  }
+  Lent(const Lent&) = delete;
+  Lent& operator=(const Lent&) = delete;
+  Description** Receive() { return &description_; }
+  const Description* operator->() const { return description_; }
+
+ private:
+  ITypeInfo& type_;
+  Description* description_ = nullptr;
+};
+using Attributes = Lent<TYPEATTR, &ITypeInfo::ReleaseTypeAttr>;
+using Function = Lent<FUNCDESC, &ITypeInfo::ReleaseFuncDesc>;
+using Variable = Lent<VARDESC, &ITypeInfo::ReleaseVarDesc>;
+
+// The words of the table for a type; pointers to interfaces are objects of that interface.
+std::string WordOf(ITypeInfo& type, const TYPEDESC& described) {
+  switch (described.vt) {
+    case VT_BSTR:
+      return "text";
+    case VT_I2:
+      return "short";
+    case VT_I4:
+      return "long";
+    case VT_R4:
+      return "single";
+    case VT_R8:
+      return "double";
+    case VT_BOOL:
+      return "boolean";
+    case VT_VARIANT:
+      return "variant";
+    case VT_DISPATCH:
+      return "object";
+    case VT_PTR:
+      // To an interface; what is by reference has been taken off before.
+      return described.lptdesc->vt == VT_USERDEFINED ? WordOf(type, *described.lptdesc) : "pointer";
+    case VT_USERDEFINED: {
+      ComPtr<ITypeInfo> other;
+      if (FAILED(type.GetRefTypeInfo(described.hreftype, other.Receive()))) return "unknown";
+      const std::string name = NamesOf(*other, MEMBERID_NIL).name;
+      if (name == "IDispatch") return "object";
+      if (name == "IPictureDisp" || name == "Picture") return "picture";
+      return name.starts_with('_') ? name.substr(1) : name;
+    }
+    default:
+      return "vt" + std::to_string(described.vt);
+  }
+}
+
+std::string DefaultOf(const PARAMDESC& described) {
+  if ((described.wParamFlags & PARAMFLAG_FHASDEFAULT) == 0) return "";
+  VARIANT& value = described.pparamdescex->varDefaultValue;
+  if (V_VT(&value) == VT_BSTR) return " = \"" + Narrow(std::wstring(V_BSTR(&value) ? V_BSTR(&value) : L"")) + "\"";
+  VARIANT number;
+  VariantInit(&number);
+  return SUCCEEDED(VariantChangeType(&number, &value, 0, VT_I4)) ? " = " + std::to_string(V_I4(&number)) : " = ?";
+}
+
+// "name(parameters): result"
+std::string SignatureOf(ITypeInfo& type, const FUNCDESC& function) {
+  BSTR names[20] = {};
+  UINT count = 0;
+  type.GetNames(function.memid, names, 20, &count);
+  std::ostringstream text;
+  std::string result;
+  text << Narrow(names[0]) << "(";
+  for (int i = 0; i < function.cParams; ++i) {
+    const ELEMDESC& parameter = function.lprgelemdescParam[i];
+    const USHORT flags = parameter.paramdesc.wParamFlags;
+    if ((flags & PARAMFLAG_FRETVAL) != 0) {
+      result = ": " + WordOf(type, *parameter.tdesc.lptdesc);
+      continue;
+    }
+    const bool reference = (flags & PARAMFLAG_FOUT) != 0;
+    text << (i > 0 ? ", " : "") << ((flags & PARAMFLAG_FOPT) != 0 ? "optional " : "")
+         << ((flags & PARAMFLAG_FIN) != 0 ? "" : "only ") << (reference ? "ref " : "")
+         << (static_cast<UINT>(i) + 1 < count ? Narrow(names[i + 1]) : "?") << ": "
+         << WordOf(type, reference ? *parameter.tdesc.lptdesc : parameter.tdesc) << DefaultOf(parameter.paramdesc);
+  }
+  text << ")" << result;
+  for (const BSTR name : names) SysFreeString(name);
+  return text.str();
+}
+
+// The members in the order of the interface; a property that can be read and set is one line.
+std::string InterfaceLines(ITypeInfo& shown) {
+  std::ostringstream lines;
+  const Named names = NamesOf(shown, MEMBERID_NIL);
+  Attributes attributes(shown);
+  shown.GetTypeAttr(attributes.Receive());
+  EXPECT_NE(names.help, "") << names.name;
+  EXPECT_NE(attributes->wTypeFlags & TYPEFLAG_FHIDDEN, 0) << names.name;
+  lines << "interface " << names.name << "\n";
+
+  // The side with a slot for each member, which early-bound hosts call.
+  HREFTYPE handle = 0;
+  ComPtr<ITypeInfo> type;
+  if (FAILED(shown.GetRefTypeOfImplType(static_cast<UINT>(-1), &handle)) ||
+      FAILED(shown.GetRefTypeInfo(handle, type.Receive())))
+    return lines.str() + "not dual\n";
+  Attributes slots(*type);
+  type->GetTypeAttr(slots.Receive());
+  EXPECT_EQ(slots->wTypeFlags,
+            TYPEFLAG_FHIDDEN | TYPEFLAG_FDUAL | TYPEFLAG_FOLEAUTOMATION | TYPEFLAG_FDISPATCHABLE)
+      << names.name;
+  std::map<MEMBERID, std::string> readable;
+  std::map<MEMBERID, bool> settable;
+  for (UINT i = 0; i < slots->cFuncs; ++i) {
+    Function function(*type);
+    type->GetFuncDesc(i, function.Receive());
+    const Named member = NamesOf(*type, function->memid);
+    EXPECT_NE(member.help, "") << names.name << "." << member.name;
+    EXPECT_EQ(function->elemdescFunc.tdesc.vt, VT_HRESULT) << names.name << "." << member.name;
+    if (function->invkind == INVOKE_FUNC) {
+      lines << SignatureOf(*type, *function.operator->()) << "\n";
+    } else if (function->invkind == INVOKE_PROPERTYGET) {
+      const std::string word = WordOf(*type, *function->lprgelemdescParam[0].tdesc.lptdesc);
+      readable[function->memid] = word;
+      lines << member.name << ": " << word << "\n";
+    } else {
+      EXPECT_EQ(readable[function->memid], WordOf(*type, function->lprgelemdescParam[0].tdesc))
+          << names.name << "." << member.name;
+      settable[function->memid] = true;
+    }
+  }
+  EXPECT_EQ(readable.size(), settable.size()) << names.name << " has a property that can be read or set only";
+  return lines.str();
+}
+
+std::string EventLines(ITypeInfo& type) {
+  std::ostringstream lines;
+  const Named names = NamesOf(type, MEMBERID_NIL);
+  Attributes attributes(type);
+  type.GetTypeAttr(attributes.Receive());
+  EXPECT_NE(attributes->wTypeFlags & TYPEFLAG_FHIDDEN, 0) << names.name;
+  EXPECT_NE(names.help, "") << names.name;
+  lines << "events " << names.name << "\n";
+  for (UINT i = 0; i < attributes->cFuncs; ++i) {
+    Function function(type);
+    type.GetFuncDesc(i, function.Receive());
+    // Those of IUnknown and IDispatch come first.
+    if ((function->wFuncFlags & FUNCFLAG_FRESTRICTED) != 0) continue;
+    EXPECT_NE(NamesOf(type, function->memid).help, "") << names.name << " " << function->memid;
+    EXPECT_EQ(function->elemdescFunc.tdesc.vt, VT_VOID) << names.name << " " << function->memid;
+    lines << function->memid << " " << SignatureOf(type, *function.operator->()) << "\n";
+  }
+  return lines.str();
+}
+
+std::string EnumerationLines(ITypeInfo& type) {
+  std::ostringstream lines;
+  const Named names = NamesOf(type, MEMBERID_NIL);
+  Attributes attributes(type);
+  type.GetTypeAttr(attributes.Receive());
+  EXPECT_NE(names.help, "") << names.name;
+  lines << "enumeration " << names.name << "\n";
+  for (UINT i = 0; i < attributes->cVars; ++i) {
+    Variable variable(type);
+    type.GetVarDesc(i, variable.Receive());
+    const VARIANT& value = *variable->lpvarValue;
+    EXPECT_EQ(V_VT(&value), VT_I4) << names.name;
+    lines << NamesOf(type, variable->memid).name << " = " << V_I4(&value) << "\n";
+  }
+  return lines.str();
+}
+
+// "class NAME [creatable] [control] default INTERFACE [events INTERFACE]"
+std::string ClassLine(ITypeInfo& type) {
+  std::ostringstream line;
+  const Named names = NamesOf(type, MEMBERID_NIL);
+  Attributes attributes(type);
+  type.GetTypeAttr(attributes.Receive());
+  EXPECT_NE(names.help, "") << names.name;
+  line << "class " << names.name << ((attributes->wTypeFlags & TYPEFLAG_FCANCREATE) != 0 ? " creatable" : "")
+       << ((attributes->wTypeFlags & TYPEFLAG_FCONTROL) != 0 ? " control" : "");
+  for (UINT i = 0; i < attributes->cImplTypes; ++i) {
+    INT flags = 0;
+    HREFTYPE handle = 0;
+    ComPtr<ITypeInfo> other;
+    type.GetImplTypeFlags(i, &flags);
+    type.GetRefTypeOfImplType(i, &handle);
+    type.GetRefTypeInfo(handle, other.Receive());
+    EXPECT_NE(flags & IMPLTYPEFLAG_FDEFAULT, 0) << names.name;
+    line << ((flags & IMPLTYPEFLAG_FSOURCE) != 0 ? " events " : " default ") << NamesOf(*other, MEMBERID_NIL).name;
+  }
+  line << "\n";
+  return line.str();
+}
+
+// The parts of the table, each beginning with one of its headings, by that first line.
+std::map<std::string, std::string> PartsOf(const std::string& table) {
+  std::map<std::string, std::string> parts;
+  std::istringstream lines(table);
+  std::string heading;
+  for (std::string line; std::getline(lines, line);) {
+    if (line.empty()) continue;
+    for (const char* kind : {"class ", "interface ", "events ", "enumeration "})
+      if (line.starts_with(kind)) heading = line;
+    parts[heading] += line + "\n";
+  }
+  return parts;
+}
+
+TEST(Surface, IsWhatHostsWerePromised) {
+  const ComPtr<ITypeLib> library = TheLibrary();
+  ASSERT_TRUE(library);
+  TLIBATTR* attributes = nullptr;
+  ASSERT_EQ(library->GetLibAttr(&attributes), S_OK);
+  Bstr name;
+  Bstr help;
+  library->GetDocumentation(-1, name.Receive(), help.Receive(), nullptr, nullptr);
+  EXPECT_EQ(name.Text(), L"Tarnwick");
+  EXPECT_EQ(help.Text(), L"Tarnwick");
+  EXPECT_EQ(attributes->wMajorVerNum, 1);
+  EXPECT_EQ(attributes->wMinorVerNum, 1);
+  EXPECT_EQ(attributes->lcid, 0x409U);
+  EXPECT_EQ(attributes->syskind, sizeof(void*) == 8 ? SYS_WIN64 : SYS_WIN32);
+  EXPECT_EQ(GuidText(attributes->guid), "{754704D0-90F5-4500-99D4-9C568F21FE56}");
+  library->ReleaseTLibAttr(attributes);
+
+  std::string built;
+  for (UINT i = 0; i < library->GetTypeInfoCount(); ++i) {
+    ComPtr<ITypeInfo> type;
+    TYPEKIND kind = TKIND_MAX;
+    ASSERT_EQ(library->GetTypeInfo(i, type.Receive()), S_OK);
+    library->GetTypeInfoType(i, &kind);
+    if (kind == TKIND_COCLASS) {
+      built += ClassLine(*type);
+    } else if (kind == TKIND_ENUM) {
+      built += EnumerationLines(*type);
+    } else if (kind == TKIND_DISPATCH) {
+      const std::string itsName = NamesOf(*type, MEMBERID_NIL).name;
+      built += itsName.starts_with("__") ? EventLines(*type) : InterfaceLines(*type);
+    } else {
+      // An alias that the compiler made of an enumeration's name is no declaration of its own.
+      EXPECT_EQ(kind, TKIND_ALIAS) << NamesOf(*type, MEMBERID_NIL).name;
+    }
+  }
+  const auto promised = PartsOf(kSurface);
+  const auto found = PartsOf(built);
+  for (const auto& [heading, lines] : promised) {
+    const auto at = found.find(heading);
+    EXPECT_EQ(lines, at == found.end() ? "missing" : at->second);
+  }
+  for (const auto& [heading, lines] : found) EXPECT_TRUE(promised.contains(heading)) << heading;
+}
+
+// Compiled hosts hold these numbers.
+TEST(Surface, IdentifiersNeverChange) {
+  const std::pair<const char*, const char*> identifiers[] = {
+      {"CFileUpload", "{8114E25E-B445-4D77-866F-FDA3EA5D6812}"},
+      {"CUpload", "{8D9338FE-F656-4D71-9336-6B09E0E67523}"},
+      {"CBVAccount", "{1B6D0A96-5E5D-4AA2-8BA7-4B5E17F1E2FB}"},
+      {"CRegistry", "{3A8449AE-8DA1-4935-BD12-30B65E4FA234}"},
+      {"ctrlListImage", "{DFAFD94C-0F50-4AC7-A38D-E36205B4B1F3}"},
+      {"ctrlThumbNailView", "{53D96008-537F-4F77-B41E-B3B7B217A1E2}"},
+      {"_CUpload", "{16BC4A50-C22D-4B00-9814-C94C5E25FE02}"},
+      {"_CBVAccount", "{F97AA79D-F6C7-4FEE-A732-3A4E42F4E181}"},
+      {"_CRegistry", "{CE55C7AA-2153-4A53-B0F5-04A068C8A9AD}"},
+      {"_CFileUpload", "{890C965C-C9AF-43E7-B1C8-377064CBDD62}"},
+      {"_ctrlListImage", "{F1D5E6FB-29DC-4165-9E6E-7A2418F558FD}"},
+      {"_ctrlThumbNailView", "{8E223A50-97D3-4259-AA1A-FCC2A472C808}"},
+      {"__ctrlListImage", "{4DD02738-7127-4DA9-9657-47AB47B51BA2}"},
+      {"__ctrlThumbNailView", "{91CB9DCC-98F4-43C9-847C-A1D1C02B8323}"},
+  };
+  const ComPtr<ITypeLib> library = TheLibrary();
+  ASSERT_TRUE(library);
+  for (const auto& [name, identifier] : identifiers) {
+    std::wstring wanted(name, name + strlen(name));
+    ComPtr<ITypeInfo> type;
+    MEMBERID member = 0;
+    USHORT count = 1;
+    ASSERT_EQ(library->FindName(wanted.data(), 0, type.Receive(), &member, &count), S_OK) << name;
+    ASSERT_EQ(count, 1) << name;
+    Attributes attributes(*type);
+    type->GetTypeAttr(attributes.Receive());
+    EXPECT_EQ(GuidText(attributes->guid), identifier) << name;
+  }
+}
+
+}  // namespace
+}  // namespace tarnwick::test
