@@ -84,6 +84,8 @@ start_server() {
   local name=$1 log=$logs/${1// /-}.log pattern=$2 i
   shift 2
   printf '== %s ... ' "$name"
+  # Emptied here: the server may be slower to begin than its line is looked for, and the last one's would be taken.
+  : >"$log"
   "$@" >"$log" 2>&1 </dev/null &
   local pid=$!
   started+=("$pid")

@@ -1,5 +1,8 @@
 #include "platform/windows/ControlWindow.h"
 
+#include <atomic>
+#include <mutex>
+
 #include "platform/windows/CommonControls.h"
 
 namespace tarnwick {
@@ -11,10 +14,17 @@ HCURSOR PointerOf(bool hourglass) {
   return LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(hourglass ? IDC_WAIT : IDC_ARROW));
 }
 
+std::atomic<int> windows{0};
+
+// Held from the registration of a window class to the making of a window of it, so that no other thread takes
+// the class away in between. Recursive: programs may hook the making of windows.
+std::recursive_mutex classes;
+
 // A hidden window that holds the windows of controls that are in no container. Each thread has its own:
 // windows go with the thread that made them, and take along what they hold.
+thread_local HWND parking = nullptr;
+
 HWND ParkingWindow(HINSTANCE module) {
-  static thread_local HWND parking = nullptr;
   if (!IsWindow(parking))
     parking = CreateWindowExW(WS_EX_TOOLWINDOW, L"STATIC", L"", WS_POPUP, 0, 0, 0, 0, nullptr, nullptr,
                               module, nullptr);
@@ -29,12 +39,24 @@ ControlWindow::~ControlWindow() {
   SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
   if (depth_ == 0) {
     DestroyWindow(window_);
+    LeaveNothing(module_, className_);
     return;
   }
   // The host ended the control inside one of its own messages. The windows are not done with that message
   // yet, so they go with the next one.
   Park();
   PostMessageW(window_, WM_CLOSE, 0, 0);
+}
+
+// Classes of windows outlive the library that registered them, with an address in it.
+void ControlWindow::LeaveNothing(HINSTANCE module, const wchar_t* className) {
+  if (IsWindow(parking) && !GetWindow(parking, GW_CHILD)) DestroyWindow(parking);
+  const std::lock_guard guard(classes);
+  UnregisterClassW(className, module);  // fails while there are windows of it
+}
+
+bool ControlWindow::AnyLeft() {
+  return windows > 0;
 }
 
 HWND ControlWindow::Window() {
@@ -50,9 +72,12 @@ bool ControlWindow::MakeWindow() {
   windowClass.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_WINDOW + 1);
   windowClass.hCursor = PointerOf(false);
   windowClass.lpszClassName = className_;
-  RegisterClassExW(&windowClass);  // fails when it is registered already
-  window_ = CreateWindowExW(WS_EX_CONTROLPARENT, className_, L"", WS_CHILD | WS_CLIPCHILDREN, 0, 0, 0, 0,
-                            ParkingWindow(module_), nullptr, module_, this);
+  {
+    const std::lock_guard guard(classes);
+    RegisterClassExW(&windowClass);  // fails when it is registered already
+    window_ = CreateWindowExW(WS_EX_CONTROLPARENT, className_, L"", WS_CHILD | WS_CLIPCHILDREN, 0, 0, 0, 0,
+                              ParkingWindow(module_), nullptr, module_, this);
+  }
   if (!window_ || !MakeChildren()) return false;
   made_ = true;
   ApplyLook();
@@ -123,11 +148,35 @@ void ControlWindow::TellFocusLeft(ControlWindow* self, HWND outer, UINT message,
     self->FocusLeft();
 }
 
+// What is seen beside the children, and behind the texts of labels.
+LRESULT ControlWindow::OnLook(UINT message, WPARAM wParam, LPARAM lParam) const {
+  const auto dc = reinterpret_cast<HDC>(wParam);
+  const auto brush = static_cast<HBRUSH>(GetStockObject(DC_BRUSH));
+  switch (message) {
+    case WM_ERASEBKGND: {
+      RECT client = {};
+      GetClientRect(window_, &client);
+      SetDCBrushColor(dc, BackColor());
+      FillRect(dc, &client, brush);
+      return TRUE;
+    }
+    case WM_CTLCOLORSTATIC:
+      SetTextColor(dc, TextColor());
+      SetBkColor(dc, BackColor());
+      SetDCBrushColor(dc, BackColor());
+      return reinterpret_cast<LRESULT>(brush);
+    default:
+      return DefWindowProcW(window_, message, wParam, lParam);
+  }
+}
+
 LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   if (message == WM_NCCREATE) {
+    ++windows;
     const auto* create = reinterpret_cast<const CREATESTRUCTW*>(lParam);
     SetWindowLongPtrW(window, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(create->lpCreateParams));
   }
+  if (message == WM_NCDESTROY) --windows;
   ControlWindow* self = Of(window);
   if (self && message == WM_NCDESTROY) {
     SetWindowLongPtrW(window, GWLP_USERDATA, 0);
@@ -143,7 +192,9 @@ LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wPa
         return LRESULT{TRUE};
       }
       const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
-      const LRESULT result = answer ? *answer : DefWindowProcW(window, message, wParam, lParam);
+      const LRESULT result = answer                  ? *answer
+                             : IsAlive(self, window) ? self->OnLook(message, wParam, lParam)
+                                                     : DefWindowProcW(window, message, wParam, lParam);
       TellFocusLeft(self, window, message, wParam);
       return result;
     });

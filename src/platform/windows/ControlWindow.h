@@ -21,6 +21,8 @@ class ControlWindow {
   HWND Window();
   // Takes the window out of its container and hides it; what it shows stays.
   void Park();
+  // Whether windows of controls are left in the process. One may outlive its control by a message.
+  static bool AnyLeft();
   // Null for the system's own font, nullopt for the system's own colour. The font stays the caller's.
   void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background);
 
@@ -67,8 +69,10 @@ class ControlWindow {
   static LRESULT CALLBACK ChildProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR id,
                                     DWORD_PTR outer);
   static ControlWindow* Of(HWND outer);
+  static void LeaveNothing(HINSTANCE module, const wchar_t* className);
   template <typename Body>
   LRESULT Handle(HWND outer, Body&& body);
+  LRESULT OnLook(UINT message, WPARAM wParam, LPARAM lParam) const;
   static void TellFocusLeft(ControlWindow* self, HWND outer, UINT message, WPARAM wParam);
   bool MakeWindow();
 

@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "platform/windows/Owner.h"
 #include "support/RuntimeError.h"
 
 namespace tarnwick {
@@ -10,6 +11,7 @@ MessageWindow::MessageWindow(Handler handler) : handler_(std::move(handler)) {
   // A class of the system's, so that none of ours has to go with the library.
   window_ = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
   if (!window_) return;
+  ++ownedObjects;
   SetWindowLongPtrW(window_, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(this));
   SetWindowLongPtrW(window_, GWLP_WNDPROC, reinterpret_cast<LONG_PTR>(WindowProc));
 }
@@ -18,6 +20,7 @@ MessageWindow::~MessageWindow() {
   if (!window_) return;
   SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
   DestroyWindow(window_);
+  --ownedObjects;
 }
 
 LRESULT CALLBACK MessageWindow::WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {

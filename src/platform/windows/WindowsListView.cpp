@@ -212,22 +212,6 @@ std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPA
       user_.GotFocus();
       if (IsAlive(this, window) && listShown_) SetFocus(list_);
       return 0;
-    case WM_ERASEBKGND: {
-      // Around the label; else the list covers it.
-      RECT client = {};
-      GetClientRect(window, &client);
-      const auto dc = reinterpret_cast<HDC>(wParam);
-      SetDCBrushColor(dc, BackColor());
-      FillRect(dc, &client, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
-      return TRUE;
-    }
-    case WM_CTLCOLORSTATIC: {
-      const auto dc = reinterpret_cast<HDC>(wParam);
-      SetTextColor(dc, TextColor());
-      SetBkColor(dc, BackColor());
-      SetDCBrushColor(dc, BackColor());
-      return reinterpret_cast<LRESULT>(GetStockObject(DC_BRUSH));
-    }
     case WM_NOTIFY: {
       const auto& header = *reinterpret_cast<const NMHDR*>(lParam);
       if (header.hwndFrom != list_) return std::nullopt;

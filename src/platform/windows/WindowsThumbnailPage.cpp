@@ -432,19 +432,6 @@ std::optional<LRESULT> WindowsThumbnailPage::OnOuterMessage(UINT message, WPARAM
       if (item.hwndItem == linkWindow_) DrawLink(item.hDC, item.rcItem, GetFocus() == linkWindow_);
       return TRUE;
     }
-    case WM_CTLCOLORSTATIC: {
-      const auto dc = reinterpret_cast<HDC>(wParam);
-      SetTextColor(dc, TextColor());
-      SetBkColor(dc, BackColor());
-      SetDCBrushColor(dc, BackColor());
-      return reinterpret_cast<LRESULT>(GetStockObject(DC_BRUSH));
-    }
-    case WM_ERASEBKGND: {
-      RECT client = {};
-      GetClientRect(Outer(), &client);
-      Fill(reinterpret_cast<HDC>(wParam), client, BackColor());
-      return TRUE;
-    }
     default:
       return std::nullopt;
   }

@@ -3,6 +3,7 @@
 
 #include <olectl.h>
 
+#include "platform/windows/ControlWindow.h"
 #include "support/surface/ClassFactory.h"
 #include "support/surface/Module.h"
 #include "support/surface/Registration.h"
@@ -31,7 +32,7 @@ STDAPI DllGetClassObject(REFCLSID classId, REFIID interfaceId, LPVOID* factory) 
 }
 
 STDAPI DllCanUnloadNow() {
-  return tarnwick::module::IsHeld() ? S_FALSE : S_OK;
+  return tarnwick::module::IsHeld() || tarnwick::ControlWindow::AnyLeft() ? S_FALSE : S_OK;
 }
 
 STDAPI DllRegisterServer() {
