@@ -42,7 +42,10 @@ void WindowsScrollHook::Install(HWND window) {
 
 LRESULT CALLBACK WindowsScrollHook::HookProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
   auto* state = static_cast<ScrollHookState*>(GetPropW(window, kStateProperty));
-  if (!state) return DefWindowProcA(window, message, wParam, lParam);
+  // The hook may go before its window; then it is as if it had not been there.
+  if (!state)
+    return CallWindowProcA(reinterpret_cast<WNDPROC>(GetClassLongPtrA(window, GCLP_WNDPROC)), window, message,
+                           wParam, lParam);
   SystemProcedures procedures(HookProc);
   return ScrollBarHook(*state, procedures)
       .Answer(reinterpret_cast<WindowHandle>(window), message, wParam, lParam);
