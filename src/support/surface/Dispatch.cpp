@@ -23,6 +23,28 @@ class MemberDescription {
   MemberDescription(const MemberDescription&) = delete;
   MemberDescription& operator=(const MemberDescription&) = delete;
 
+  // Arguments that a caller may give; the result is none.
+  UINT ParameterCount() const {
+    UINT count = 0;
+    for (int i = 0; function_ && i < function_->cParams; ++i)
+      if ((Flags(i) & PARAMFLAG_FRETVAL) == 0) ++count;
+    return count;
+  }
+
+  bool IsOptional(UINT index) const {
+    return index < ParameterCount() && (Flags(static_cast<int>(index)) & PARAMFLAG_FOPT) != 0;
+  }
+
+  // What an omitted argument stands for, in `value`, which has the parameter's type without VT_BYREF and is
+  // zero.
+  HRESULT Default(UINT index, VARIANT& value) const {
+    if ((Flags(static_cast<int>(index)) & PARAMFLAG_FHASDEFAULT) == 0) return S_OK;
+    VARIANT& known = function_->lprgelemdescParam[index].paramdesc.pparamdescex->varDefaultValue;
+    return VariantChangeTypeEx(&value, &known, kConversionLocale, 0, V_VT(&value));
+  }
+
+  bool IsKnown() const { return function_ != nullptr; }
+
   // Type that automation passes for the parameter, VT_BYREF included; VT_EMPTY when there is no such
   // parameter or it is of no interest here.
   VARTYPE ParameterType(UINT index) const {
@@ -35,6 +57,8 @@ class MemberDescription {
     if (function_) owner_.ReleaseFuncDesc(function_);
     function_ = nullptr;
   }
+
+  USHORT Flags(int index) const { return function_->lprgelemdescParam[index].paramdesc.wParamFlags; }
 
   VARTYPE TypeOf(const TYPEDESC& type) const {
     if (type.vt == VT_USERDEFINED) return UserDefinedType(type.hreftype);
@@ -106,6 +130,14 @@ HRESULT Convert(const VARIANT& argument, VARTYPE type, StandIn& standIn) {
   return S_OK;
 }
 
+// Makes `standIn` what an omitted argument for an optional by-reference parameter of `type` stands for.
+HRESULT TakeDefault(const MemberDescription& known, UINT index, VARTYPE type, StandIn& standIn) {
+  VARIANT& value = standIn.value.Get();
+  V_I8(&value) = 0;
+  V_VT(&value) = type;
+  return known.Default(index, value);
+}
+
 // Address of the value inside a VARIANT, for use as a typed reference.
 void MakeReference(VARIANT& reference, VARIANT& target) {
   V_VT(&reference) = static_cast<VARTYPE>(V_VT(&target) | VT_BYREF);
@@ -130,25 +162,35 @@ HRESULT InvokeMember(ITypeInfo& description, void* object, DISPID member, WORD f
     return description.Invoke(object, member, flags, arguments, result, exception, argumentError);
   return Guarded([&] {
     const MemberDescription known(description, member, flags);
+    // Here and below errors that not every version of the system finds.
+    if (known.IsKnown() && arguments->cArgs > known.ParameterCount()) return DISP_E_BADPARAMCOUNT;
+    const auto refuse = [&](UINT argument, HRESULT error) {
+      if (argumentError) *argumentError = argument;
+      return error;
+    };
     std::vector<VARIANT> values(arguments->rgvarg, arguments->rgvarg + arguments->cArgs);
     std::vector<StandIn> standIns;
     // References into it are taken below, so it must not move.
     standIns.reserve(values.size());
     for (UINT i = 0; i < values.size(); ++i) {
-      const VARTYPE type = known.ParameterType(ParameterIndex(*arguments, i));
+      const UINT index = ParameterIndex(*arguments, i);
+      const VARTYPE type = known.ParameterType(index);
+      if ((V_VT(&values[i]) & VT_BYREF) != 0 && !V_BYREF(&values[i])) return refuse(i, E_POINTER);
       if (type == VT_DISPATCH && MeansNoObject(values[i])) MakeNoObject(values[i]);
-      if (!(type & VT_BYREF) || V_VT(&values[i]) == type || IsOmitted(values[i])) continue;
+      const bool omitted = IsOmitted(values[i]);
+      if (omitted && type != VT_EMPTY && type != VT_VARIANT && !known.IsOptional(index))
+        return refuse(i, DISP_E_PARAMNOTOPTIONAL);
+      if (!(type & VT_BYREF) || V_VT(&values[i]) == type) continue;
       if (type == (VT_VARIANT | VT_BYREF)) {
         V_VT(&values[i]) = type;
         V_VARIANTREF(&values[i]) = &arguments->rgvarg[i];
         continue;
       }
       StandIn& standIn = standIns.emplace_back();
-      const HRESULT converted = Convert(values[i], type & ~VT_BYREF, standIn);
-      if (FAILED(converted)) {
-        if (argumentError) *argumentError = i;
-        return converted;
-      }
+      const VARTYPE target = type & ~VT_BYREF;
+      const HRESULT converted =
+          omitted ? TakeDefault(known, index, target, standIn) : Convert(values[i], target, standIn);
+      if (FAILED(converted)) return refuse(i, converted);
       MakeReference(values[i], standIn.value.Get());
     }
     DISPPARAMS prepared = *arguments;

@@ -1,5 +1,5 @@
-// The type library inside the built library, read back as a host's compiler reads it, beside the surface that hosts were
-// promised.
+// The type library inside the built library, read back as a host's compiler reads it, beside the surface that
+// hosts were promised.
 #include "SurfaceTable.h"
 
 #include <gtest/gtest.h>
@@ -28,7 +28,8 @@ ComPtr<ITypeLib> TheLibrary() {
   DWORD size = sizeof path;
   const std::wstring key = L"CLSID\\{8114E25E-B445-4D77-866F-FDA3EA5D6812}\\InprocServer32";
   ComPtr<ITypeLib> library;
-  if (RegGetValueW(HKEY_CLASSES_ROOT, key.c_str(), nullptr, RRF_RT_REG_SZ, nullptr, path, &size) == ERROR_SUCCESS)
+  if (RegGetValueW(HKEY_CLASSES_ROOT, key.c_str(), nullptr, RRF_RT_REG_SZ, nullptr, path, &size) ==
+      ERROR_SUCCESS)
     LoadTypeLibEx(path, REGKIND_NONE, library.Receive());
   return library;
 }
@@ -105,10 +106,12 @@ std::string WordOf(ITypeInfo& type, const TYPEDESC& described) {
 std::string DefaultOf(const PARAMDESC& described) {
   if ((described.wParamFlags & PARAMFLAG_FHASDEFAULT) == 0) return "";
   VARIANT& value = described.pparamdescex->varDefaultValue;
-  if (V_VT(&value) == VT_BSTR) return " = \"" + Narrow(std::wstring(V_BSTR(&value) ? V_BSTR(&value) : L"")) + "\"";
+  if (V_VT(&value) == VT_BSTR)
+    return " = \"" + Narrow(std::wstring(V_BSTR(&value) ? V_BSTR(&value) : L"")) + "\"";
   VARIANT number;
   VariantInit(&number);
-  return SUCCEEDED(VariantChangeType(&number, &value, 0, VT_I4)) ? " = " + std::to_string(V_I4(&number)) : " = ?";
+  return SUCCEEDED(VariantChangeType(&number, &value, 0, VT_I4)) ? " = " + std::to_string(V_I4(&number))
+                                                                 : " = ?";
 }
 
 // "name(parameters): result"
@@ -130,7 +133,8 @@ std::string SignatureOf(ITypeInfo& type, const FUNCDESC& function) {
     text << (i > 0 ? ", " : "") << ((flags & PARAMFLAG_FOPT) != 0 ? "optional " : "")
          << ((flags & PARAMFLAG_FIN) != 0 ? "" : "only ") << (reference ? "ref " : "")
          << (static_cast<UINT>(i) + 1 < count ? Narrow(names[i + 1]) : "?") << ": "
-         << WordOf(type, reference ? *parameter.tdesc.lptdesc : parameter.tdesc) << DefaultOf(parameter.paramdesc);
+         << WordOf(type, reference ? *parameter.tdesc.lptdesc : parameter.tdesc)
+         << DefaultOf(parameter.paramdesc);
   }
   text << ")" << result;
   for (const BSTR name : names) SysFreeString(name);
@@ -236,7 +240,8 @@ std::string ClassLine(ITypeInfo& type) {
     type.GetRefTypeOfImplType(i, &handle);
     type.GetRefTypeInfo(handle, other.Receive());
     EXPECT_NE(flags & IMPLTYPEFLAG_FDEFAULT, 0) << names.name;
-    line << ((flags & IMPLTYPEFLAG_FSOURCE) != 0 ? " events " : " default ") << NamesOf(*other, MEMBERID_NIL).name;
+    line << ((flags & IMPLTYPEFLAG_FSOURCE) != 0 ? " events " : " default ")
+         << NamesOf(*other, MEMBERID_NIL).name;
   }
   line << "\n";
   return line.str();
