@@ -78,7 +78,7 @@ std::wstring LogOn(_ctrlListImage& list, const Account& account) {
   if (!done || FAILED(list.Init(all.Reference(), &done)) || !done) Stop("no account");
   BSTR base = nullptr;
   client->GetUserBasePath(&base);
-  const std::wstring folder = std::wstring(base) + L"/";
+  std::wstring folder = std::wstring(base) + L"/";
   SysFreeString(base);
   return folder;
 }

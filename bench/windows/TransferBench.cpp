@@ -36,12 +36,11 @@ void WinInetDownload(const std::wstring& url, const wchar_t* path) {
 void WinInetUpload(const std::wstring& host, INTERNET_PORT port,
                    const std::vector<std::pair<std::string, std::string>>& fields, const wchar_t* path) {
   const std::string boundary = "bench0123456789";
+  const std::string part = "--" + boundary + "\r\nContent-Disposition: form-data; name=\"";
   std::string head;
   for (const auto& [name, value] : fields)
-    head += "--" + boundary + "\r\nContent-Disposition: form-data; name=\"" + name + "\"\r\n\r\n" + value +
-            "\r\n";
-  head +=
-      "--" + boundary + "\r\nContent-Disposition: form-data; name=\"File\"; filename=\"upload.jpg\"\r\n\r\n";
+    head.append(part).append(name).append("\"\r\n\r\n").append(value).append("\r\n");
+  head.append(part).append("File\"; filename=\"upload.jpg\"\r\n\r\n");
   const std::string tail = "\r\n--" + boundary + "--\r\n";
   const HANDLE file = CreateFileW(path, GENERIC_READ, FILE_SHARE_READ, nullptr, OPEN_EXISTING, 0, nullptr);
   const HINTERNET session = InternetOpenW(L"bench", INTERNET_OPEN_TYPE_DIRECT, nullptr, nullptr, 0);

@@ -232,7 +232,7 @@ bool DemoHost::Upload(const std::wstring& path) {
 
 std::wstring DemoHost::Download() {
   SendMessageW(progress_, PBM_SETRANGE32, 0, 300000);
-  const std::wstring path = shown_->Download(Given(kDownloads));
+  std::wstring path = shown_->Download(Given(kDownloads));
   SetStatus(L"Downloaded to " + path);
   return path;
 }

@@ -210,7 +210,7 @@ std::shared_ptr<CUpload> FileControl::RecordUploaded(const Text& path, const Tex
     all.Add(record, url);
     return record;
   }
-  const std::shared_ptr<CUpload> known = all.At(position);
+  std::shared_ptr<CUpload> known = all.At(position);
   *known = *record;
   SetAddress(all, position, url);
   return known;
@@ -277,7 +277,7 @@ bool FileControl::RenameOnServer(const Text& oldName, const Text& newName) {
 std::shared_ptr<CUpload> FileControl::RecordRenamed(const Text& oldName, const Text& newName) {
   FileList& all = apartment_.allFiles;
   for (std::size_t i = 1; i <= all.Count(); ++i) {
-    const std::shared_ptr<CUpload> record = all.At(i);
+    std::shared_ptr<CUpload> record = all.At(i);
     if (record->FileName != oldName) continue;
     const Text oldCopy = LocalCopyOf(record->FilePath);
     GiveName(*record, newName);

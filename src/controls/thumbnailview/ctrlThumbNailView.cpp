@@ -174,23 +174,24 @@ void ctrlThumbNailView::FillPage(int first) {
   }
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     // The list may change in any event of the fill.
-    const std::size_t position = static_cast<std::size_t>(first + slot);
-    if (position > apartment_.shownFiles.Count()) {
+    const int position = first + slot;
+    FileList& shown = apartment_.shownFiles;
+    if (position > static_cast<int>(shown.Count())) {
       page_.ShowSlot(slot, false);
-    } else if (!FillSlot(slot, apartment_.shownFiles.At(position))) {
-      return;
+      continue;
     }
+    const std::shared_ptr<CUpload> record = shown.At(static_cast<std::size_t>(position));
+    if (!FillSlot(slot, *record)) return;
   }
   UpdateSelection();
 }
 
-bool ctrlThumbNailView::FillSlot(int slot, const std::shared_ptr<CUpload>& itsRecord) {
-  const std::shared_ptr<CUpload> record = itsRecord;
-  const Text copy = LocalCopyOf(record->FilePath);
+bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
+  const Text copy = LocalCopyOf(record.FilePath);
   FileSystem& files = apartment_.platform.files;
-  if (!copy.empty() && !FileExists(files, copy) && !Fetch(slot, *record, copy)) return false;
-  page_.SetCaption(slot, FormatLabelText(record->FileName));
-  PathOf(slot) = record->FilePath;
+  if (!copy.empty() && !FileExists(files, copy) && !Fetch(slot, record, copy)) return false;
+  page_.SetCaption(slot, FormatLabelText(record.FileName));
+  PathOf(slot) = record.FilePath;
   // A picture that cannot be read leaves the caption and an empty square.
   if (!copy.empty() && FileExists(files, copy)) ResultAsItStood(0, [&](int&) { ShowPicture(slot, copy); });
   page_.ShowSlot(slot, true);

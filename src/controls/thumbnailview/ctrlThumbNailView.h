@@ -83,7 +83,7 @@ class ctrlThumbNailView final : public FileControl {
   void ShowPage(int first);
   void FillPage(int first);
   // False when the page is not wanted any more.
-  bool FillSlot(int slot, const std::shared_ptr<CUpload>& record);
+  bool FillSlot(int slot, const CUpload& record);
   bool Fetch(int slot, const CUpload& record, const Text& copy);
   void ShowPicture(int slot, const Text& copy);
   bool IsReplaced() const { return nextPage_.has_value() || IsClosed(); }

@@ -44,8 +44,8 @@ void ctrlThumbNailView::UpdateSelection() {
     const FileList& shown = apartment_.shownFiles;
     if (Trim(selectedPath_).empty() && !shown.IsEmpty()) selectedPath_ = shown.At(1)->FilePath;
     if (firstIndex_ != selectionFirstIndex_ && !keepSelection_ && !shown.IsEmpty()) {
-      const auto position = static_cast<std::size_t>(page_.ScrollValue() + 1);
-      if (position <= shown.Count()) selectedPath_ = shown.At(position)->FilePath;
+      const auto first = static_cast<std::size_t>(page_.ScrollValue());
+      if (first < shown.Count()) selectedPath_ = shown.At(first + 1)->FilePath;
       selectionFirstIndex_ = firstIndex_;
     }
     if (selectedPath_.empty()) selectedPath_ = kNoPath;

@@ -12,7 +12,7 @@ template <typename Value>
 VARIANT VariantWith(VARTYPE type, Value value) {
   VARIANT variant = {};
   V_VT(&variant) = type;
-  std::memcpy(&V_I4(&variant), &value, sizeof value);
+  std::memcpy(&V_I4(&variant), &value, sizeof value);  // NOLINT(bugprone-sizeof-expression): may be a pointer
   return variant;
 }
 

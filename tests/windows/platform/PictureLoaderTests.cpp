@@ -26,6 +26,11 @@ struct Picture {
   int width = 0;
   int height = 0;
   Pixels pixels;
+
+  std::uint32_t At(int x, int y) const {
+    return pixels[static_cast<std::size_t>(y) * static_cast<std::size_t>(width) +
+                  static_cast<std::size_t>(x)];
+  }
 };
 
 // Every pixel of another colour, all opaque.
@@ -58,8 +63,7 @@ Bytes Bmp(const Picture& picture) {
   bytes.resize(54);
   for (int y = picture.height; y-- > 0;) {
     const std::size_t end = bytes.size() + stride;
-    for (int x = 0; x < picture.width; ++x)
-      Append(bytes, picture.pixels[static_cast<std::size_t>(y * picture.width + x)], 3);
+    for (int x = 0; x < picture.width; ++x) Append(bytes, picture.At(x, y), 3);
     bytes.resize(end);
   }
   return bytes;
@@ -166,9 +170,7 @@ Pixels Averages(const Picture& source, int width, int height) {
         int sum = 0;
         for (int v = y * source.height; v < (y + 1) * source.height; ++v)
           for (int u = x * source.width; u < (x + 1) * source.width; ++u)
-            sum += static_cast<int>(
-                source.pixels[static_cast<std::size_t>(v / height * source.width + u / width)] >> shift &
-                0xFF);
+            sum += static_cast<int>(source.At(u / width, v / height) >> shift & 0xFF);
         const int cells = source.width * source.height;
         color = color << 8 | static_cast<std::uint32_t>((sum + cells / 2) / cells);
       }
@@ -281,7 +283,8 @@ TEST_F(PictureLoaderTest, AFileThatClaimsTooMuchIsNotShown) {
         Row{"BMP", Bmp(picture), {'B', 'M'}, 18, 22, 4, false}}) {
     Bytes bytes = row.file;
     EXPECT_FALSE(Shown(bytes, 2, 2).empty()) << row.name;
-    const auto mark = static_cast<std::size_t>(std::ranges::search(bytes, row.mark).begin() - bytes.begin());
+    const auto mark = static_cast<std::size_t>(
+        std::search(bytes.begin(), bytes.end(), row.mark.begin(), row.mark.end()) - bytes.begin());
     ASSERT_LT(mark, bytes.size()) << row.name;
     const auto put = [&](std::size_t at, std::uint32_t value) {
       for (int i = 0; i < row.bytes; ++i)

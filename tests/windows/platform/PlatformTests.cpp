@@ -259,8 +259,9 @@ TEST_F(FilesTest, ReadsABeginningAndCreatesWhatIsMissing) {
                                                     {In(u"a?"), 75},
                                                     {In(Text(u"a\0", 2)), 75},
                                                     {In(u"none\\a"), 76}};
-  for (const auto& [path, number] : failures)
-    EXPECT_EQ(ErrorOf([&] { files_.ReadBeginning(path, room); }), number) << Utf8FromText(path);
+  for (const auto& failure : failures)
+    EXPECT_EQ(ErrorOf([&] { files_.ReadBeginning(failure.first, room); }), failure.second)
+        << Utf8FromText(failure.first);
   CloseHandle(held);
   EXPECT_EQ(ownedObjects, 0);
 }
