@@ -35,10 +35,14 @@ double Seconds(const std::function<void()>& work) {
   return static_cast<double>(end.QuadPart - begin.QuadPart) / static_cast<double>(frequency.QuadPart);
 }
 
-std::vector<double> Fastest(int runs, const std::vector<std::function<void()>>& works) {
+std::vector<double> Fastest(int runs, const std::vector<std::function<void()>>& works,
+                            const std::function<void()>& before) {
   std::vector<double> best(works.size(), 1e9);
   for (int run = 0; run < runs; ++run)
-    for (std::size_t i = 0; i < works.size(); ++i) best[i] = std::min(best[i], Seconds(works[i]));
+    for (std::size_t i = 0; i < works.size(); ++i) {
+      before();
+      best[i] = std::min(best[i], Seconds(works[i]));
+    }
   return best;
 }
 

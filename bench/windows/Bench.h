@@ -19,8 +19,10 @@ namespace tarnwick::bench {
 // By the clock on the wall.
 double Seconds(const std::function<void()>& work);
 
-// The fastest of several runs of each; they take turns, so that a busy moment hits all alike.
-std::vector<double> Fastest(int runs, const std::vector<std::function<void()>>& works);
+// The fastest of several runs of each; they take turns, so that a busy moment hits all alike. `before` runs
+// before each, and its time does not count.
+std::vector<double> Fastest(
+    int runs, const std::vector<std::function<void()>>& works, const std::function<void()>& before = [] {});
 
 // Prints a row and remembers whether it is within its limit.
 // `peer` took `theirs` seconds; the library, which took `ours`, is to be at least `least` times as fast.
