@@ -7,13 +7,17 @@
 
 namespace tarnwick {
 
-MessageWindow::MessageWindow(Handler handler) : handler_(std::move(handler)) {
+MessageWindow::MessageWindow(Handler handler) : handler_(std::move(handler)) {}
+
+HWND MessageWindow::Get() {
+  if (window_) return window_;
   // A class of the system's, so that none of ours has to go with the library.
   window_ = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
-  if (!window_) return;
+  if (!window_) return nullptr;
   ++ownedObjects;
   SetWindowLongPtrW(window_, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(this));
   SetWindowLongPtrW(window_, GWLP_WNDPROC, reinterpret_cast<LONG_PTR>(WindowProc));
+  return window_;
 }
 
 MessageWindow::~MessageWindow() {

@@ -17,8 +17,8 @@ class MessageWindow {
   MessageWindow(const MessageWindow&) = delete;
   MessageWindow& operator=(const MessageWindow&) = delete;
 
-  // Null when it could not be made.
-  HWND Get() const { return window_; }
+  // Made on the first call, so that what is never used costs nothing; null when it could not be made.
+  HWND Get();
 
  private:
   static LRESULT CALLBACK WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);

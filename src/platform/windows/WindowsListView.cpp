@@ -37,7 +37,7 @@ bool WindowsListView::MakeChildren() {
   list_ = MakeChild(Outer(), WC_LISTVIEWW, kListName,
                     WS_VISIBLE | WS_TABSTOP | LVS_REPORT | LVS_OWNERDATA | LVS_SHOWSELALWAYS |
                         LVS_EDITLABELS | LVS_SHAREIMAGELISTS | LVS_SINGLESEL);
-  label_ = MakeChild(Outer(), L"STATIC", L"", SS_CENTER | SS_NOPREFIX);
+  label_ = MakeChild(Outer(), L"STATIC", WideFromText(labelText_).c_str(), SS_CENTER | SS_NOPREFIX);
   if (!list_ || !label_) return false;
   largeIcons_ = MakeLargeIcons(Dpi());
   smallIcons_ = MakeSmallIcons(Dpi());
@@ -157,7 +157,7 @@ void WindowsListView::ShowList(bool list) {
 
 void WindowsListView::SetLabelText(TextView text) {
   labelText_ = text;
-  if (Window()) SetWindowTextW(label_, WideFromText(text).c_str());
+  if (label_) SetWindowTextW(label_, WideFromText(text).c_str());
 }
 
 bool WindowsListView::IsSelected(std::size_t index) const {

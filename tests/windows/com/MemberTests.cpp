@@ -243,38 +243,28 @@ class MemberCall {
   UINT refused_ = 0;
 };
 
-// The test build's own export; null when it is not there.
-ComPtr<IDispatch> NewRegistry() {
-  static const HMODULE library = [] {
-    wchar_t path[MAX_PATH] = {};
-    GetModuleFileNameW(nullptr, path, MAX_PATH);
-    // BUILD\tests\windows\com\PROGRAM
-    std::wstring folder = path;
-    for (int i = 0; i < 4; ++i) folder.resize(folder.rfind(L'\\'));
-    return LoadLibraryW((folder + L"\\TarnwickTest.ocx").c_str());
-  }();
-  ComPtr<IDispatch> registry;
-  const auto make =
-      reinterpret_cast<MakeRegistry>(reinterpret_cast<void*>(GetProcAddress(library, "MakeRegistry")));
-  if (make) make(registry.Receive());
-  return registry;
-}
-
 ComPtr<IDispatch> NewObject(REFCLSID classId) {
   ComPtr<IDispatch> object;
   CoCreateInstance(classId, nullptr, CLSCTX_INPROC_SERVER, IID_IDispatch, object.ReceiveVoid());
   return object;
 }
 
+ComPtr<IDispatch> NewRecord() {
+  const ComPtr<_CFileUpload> client = NewClient();
+  ComPtr<_CUpload> record;
+  if (client) client->get_UploadObject(record.Receive());
+  return ComPtr<IDispatch>(record.Get());
+}
+
 struct Subject {
   const char* name;
-  ComPtr<IDispatch> (*make)();
+  ComPtr<IDispatch> (*make)(const TestLibrary& library);
 };
 
 class Members : public testing::TestWithParam<Subject> {
  protected:
-  Members() : object_(GetParam().make()) {}
-  ComPtr<IDispatch> object_;
+  TestLibrary library_;
+  ComPtr<IDispatch> object_ = GetParam().make(library_);
 };
 
 TEST_P(Members, DoTheSameBySlotByNameAndWithNamedArguments) {
@@ -358,17 +348,18 @@ TEST_P(Members, RefuseArgumentsOfOtherTypesAndNumbers) {
 
 INSTANTIATE_TEST_SUITE_P(
     Of, Members,
-    testing::Values(Subject{"CFileUpload", [] { return NewObject(CLSID_CFileUpload); }},
-                    Subject{"CUpload",
-                            []() -> ComPtr<IDispatch> {
-                              ComPtr<_CUpload> record;
-                              NewClient()->get_UploadObject(record.Receive());
-                              return ComPtr<IDispatch>(record.Get());
-                            }},
-                    Subject{"CBVAccount", [] { return NewObject(CLSID_CBVAccount); }},
-                    Subject{"CRegistry", NewRegistry},
-                    Subject{"ctrlListImage", [] { return NewObject(CLSID_ctrlListImage); }},
-                    Subject{"ctrlThumbNailView", [] { return NewObject(CLSID_ctrlThumbNailView); }}),
+    testing::Values(
+        Subject{"CFileUpload", [](const TestLibrary&) { return NewObject(CLSID_CFileUpload); }},
+        Subject{"CUpload", [](const TestLibrary&) { return NewRecord(); }},
+        Subject{"CBVAccount", [](const TestLibrary&) { return NewObject(CLSID_CBVAccount); }},
+        Subject{"CRegistry",
+                [](const TestLibrary& library) {
+                  ComPtr<IDispatch> registry;
+                  library.Get<MakeRegistry>("MakeRegistry")(registry.Receive());
+                  return registry;
+                }},
+        Subject{"ctrlListImage", [](const TestLibrary&) { return NewObject(CLSID_ctrlListImage); }},
+        Subject{"ctrlThumbNailView", [](const TestLibrary&) { return NewObject(CLSID_ctrlThumbNailView); }}),
     [](const testing::TestParamInfo<Subject>& subject) { return subject.param.name; });
 
 }  // namespace

@@ -1,0 +1,162 @@
+// What is left when objects are gone: nothing. The test build of the library counts what it holds, because
+// the system's own counts are not to be had everywhere.
+#include <gtest/gtest.h>
+
+#include <functional>
+
+#include "../library/TestLibrary.h"
+#include "ControlContainer.h"
+#include "Form.h"
+#include "Host.h"
+
+namespace tarnwick::test {
+namespace {
+
+using GetClassObject = HRESULT(STDAPICALLTYPE*)(REFCLSID, REFIID, void**);
+using CanUnloadNow = HRESULT(STDAPICALLTYPE*)();
+
+// Windows of this process below `parent`, at any depth.
+int WindowsBelow(HWND parent) {
+  int count = 0;
+  for (HWND child = nullptr; (child = FindWindowExW(parent, child, nullptr, nullptr)) != nullptr;) {
+    DWORD process = 0;
+    GetWindowThreadProcessId(child, &process);
+    if (process == GetCurrentProcessId()) count += 1 + WindowsBelow(child);
+  }
+  return count;
+}
+
+class Lifetime : public testing::Test {
+ protected:
+  HRESULT Make(REFCLSID classId, REFIID interfaceId, void** object) const {
+    ComPtr<IClassFactory> factory;
+    const HRESULT found =
+        library_.Get<GetClassObject>("DllGetClassObject")(classId, IID_IClassFactory, factory.ReceiveVoid());
+    return FAILED(found) ? found : factory->CreateInstance(nullptr, interfaceId, object);
+  }
+  HRESULT CanUnload() const { return library_.Get<CanUnloadNow>("DllCanUnloadNow")(); }
+  // The library as well as the windows that it made.
+  Held Count() const {
+    for (MSG message; PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE);) DispatchMessageW(&message);
+    Held held;
+    library_.Get<CountHeld>("CountHeld")(&held);
+    held.objects += WindowsBelow(nullptr) + WindowsBelow(HWND_MESSAGE);
+    return held;
+  }
+  void Expect(const Held& before, const char* what) const {
+    const Held now = Count();
+    EXPECT_EQ(now.allocations, before.allocations) << what;
+    EXPECT_EQ(now.objects, before.objects) << what;
+    EXPECT_EQ(CanUnload(), S_OK) << what;
+  }
+  // Does it some times for what stays after the first time, then `times`, and looks what is left of those.
+  void LeavesNothing(const char* what, int times, const std::function<void()>& work) {
+    for (int i = 0; i < 3; ++i) work();
+    const Held before = Count();
+    for (int i = 0; i < times; ++i) work();
+    Expect(before, what);
+  }
+
+  TestLibrary library_;
+};
+
+struct Class {
+  const char* name;
+  const CLSID& id;
+};
+const Class kControls[] = {{"ctrlListImage", CLSID_ctrlListImage},
+                           {"ctrlThumbNailView", CLSID_ctrlThumbNailView}};
+
+TEST_F(Lifetime, ObjectsLeaveNothing) {
+  const Class classes[] = {
+      {"CFileUpload", CLSID_CFileUpload}, {"CBVAccount", CLSID_CBVAccount}, kControls[0], kControls[1]};
+  for (const Class& known : classes) {
+    int made = 0;
+    LeavesNothing(known.name, 10'000, [&] {
+      ComPtr<IDispatch> object;
+      ASSERT_EQ(Make(known.id, IID_IDispatch, object.ReceiveVoid()), S_OK);
+      if (++made % 100 != 0) return;
+      // Reads the type library, which takes much longer than all else.
+      DISPID id = 0;
+      LPOLESTR name = const_cast<LPOLESTR>(L"HTTPServer");
+      object->GetIDsOfNames(IID_NULL, &name, 1, 0, &id);
+    });
+  }
+}
+
+TEST_F(Lifetime, ControlsWithWindowsAndSinksLeaveNothing) {
+  const HWND form =
+      CreateWindowExW(0, L"STATIC", L"form", WS_POPUP, 0, 0, 400, 300, nullptr, nullptr, nullptr, nullptr);
+  for (const Class& known : kControls) {
+    // What is created by its class comes from the test library then.
+    ComPtr<IClassFactory> factory;
+    ASSERT_EQ(
+        library_.Get<GetClassObject>("DllGetClassObject")(known.id, IID_IClassFactory, factory.ReceiveVoid()),
+        S_OK);
+    DWORD cookie = 0;
+    ASSERT_EQ(
+        CoRegisterClassObject(known.id, factory.Get(), CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE, &cookie),
+        S_OK);
+    factory = {};
+    const auto show = [&] {
+      auto container = ComPtr<demo::ControlContainer>::Adopt(new demo::ControlContainer(form));
+      ASSERT_EQ(container->Create(known.id, demo::ControlContainer::WayIn::kSteps, nullptr), S_OK);
+      container->SetBounds({0, 0, 300, 200});
+      ASSERT_EQ(container->Do(OLEIVERB_SHOW), S_OK);
+      EXPECT_EQ(container->Close(), 0U);
+    };
+    for (int i = 0; i < 3; ++i) show();
+    const Held before = Count();
+    for (int i = 0; i < 500; ++i) show();
+    const Held after = Count();
+    EXPECT_EQ(after.allocations, before.allocations) << known.name;
+    EXPECT_EQ(after.objects, before.objects) << known.name;
+    CoRevokeClassObject(cookie);
+
+    LeavesNothing("sinks", 1, [&] {
+      ComPtr<IConnectionPointContainer> control;
+      ASSERT_EQ(Make(known.id, IID_IConnectionPointContainer, control.ReceiveVoid()), S_OK);
+      ComPtr<IConnectionPoint> point;
+      ASSERT_EQ(control->FindConnectionPoint(IID_IPropertyNotifySink, point.Receive()), S_OK);
+      auto sink = ComPtr<demo::ControlContainer>::Adopt(new demo::ControlContainer(nullptr));
+      for (int i = 0; i < 10'000; ++i) {
+        DWORD sunk = 0;
+        ASSERT_EQ(point->Advise(static_cast<IPropertyNotifySink*>(sink.Get()), &sunk), S_OK);
+        ASSERT_EQ(point->Unadvise(sunk), S_OK);
+      }
+    });
+  }
+  DestroyWindow(form);
+}
+
+// A library that is unloaded takes its window classes along, and works when it is loaded again.
+TEST(Unloading, IsClean) {
+  std::wstring path;
+  for (int i = 0; i < 3; ++i) {
+    const TestLibrary library;
+    ASSERT_NE(library.Module(), nullptr);
+    wchar_t file[MAX_PATH] = {};
+    GetModuleFileNameW(library.Module(), file, MAX_PATH);
+    path = file;
+    const auto canUnload = library.Get<CanUnloadNow>("DllCanUnloadNow");
+    for (const Class& known : kControls) {
+      ComPtr<IClassFactory> factory;
+      ComPtr<IOleObject> control;
+      ASSERT_EQ(library.Get<GetClassObject>("DllGetClassObject")(known.id, IID_IClassFactory,
+                                                                 factory.ReceiveVoid()),
+                S_OK);
+      ASSERT_EQ(factory->CreateInstance(nullptr, IID_IOleObject, control.ReceiveVoid()), S_OK);
+      // Makes its window.
+      ComPtr<IOleWindow> inPlace;
+      HWND window = nullptr;
+      ASSERT_EQ(control->QueryInterface(IID_IOleWindow, inPlace.ReceiveVoid()), S_OK);
+      inPlace->GetWindow(&window);
+      EXPECT_EQ(canUnload(), S_FALSE);
+    }
+    EXPECT_EQ(canUnload(), S_OK);
+  }
+  EXPECT_EQ(GetModuleHandleW(path.c_str()), nullptr);
+}
+
+}  // namespace
+}  // namespace tarnwick::test
