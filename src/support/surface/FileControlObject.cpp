@@ -417,7 +417,7 @@ void FileControlObject<Interface>::ApplyLook() {
 
 template <typename Interface>
 void FileControlObject<Interface>::Activated() {
-  if (ambient_.userMode) ole_.Activated();
+  ole_.Activated();
 }
 
 template <typename Interface>

@@ -105,6 +105,7 @@ void OleControl::ViewChanged() {
 }
 
 void OleControl::Activated() {
+  if (!userMode_) return;
   if (inPlace_ && !uiActive_) ActivateUi();
   TellFocus(true);
 }
@@ -181,6 +182,8 @@ STDMETHODIMP OleControl::DoVerb(LONG verb, LPMSG, IOleClientSite* site, LONG, HW
   switch (verb) {
     case OLEIVERB_PRIMARY:
     case OLEIVERB_SHOW:
+      // While a form is designed, the control takes no keyboard for being shown.
+      return Activate(userMode_);
     case OLEIVERB_UIACTIVATE:
       return Activate(true);
     case OLEIVERB_INPLACEACTIVATE:
@@ -306,6 +309,7 @@ void OleControl::ReadAmbientValues() {
   Variant mode;
   if (Ambient(DISPID_AMBIENT_USERMODE, mode) && V_VT(&mode.Get()) == VT_BOOL)
     values.userMode = V_BOOL(&mode.Get()) != VARIANT_FALSE;
+  userMode_ = values.userMode;
   hooks_.AmbientChanged(values);
   ViewChanged();
 }

@@ -216,6 +216,8 @@ class OleControl final : public IOleObject,
   SIZEL extent_;
   bool inPlace_ = false;
   bool uiActive_ = false;
+  // False while the form is designed.
+  bool userMode_ = true;
   bool hasFocus_ = false;
   bool dirty_ = false;
   int eventsFrozen_ = 0;

@@ -244,41 +244,107 @@ TEST(ListControl, MayBeReleasedInAnEventOfItsWait) {
   DeleteFileW(L"rose.jpg");
 }
 
-using GetControl = HRESULT(WINAPI*)(HWND window, IUnknown** control);
-
-// Registers the system's container, once; null when there is none.
-GetControl SystemsContainer() {
-  static const GetControl get = [] {
-    const HMODULE atl = LoadLibraryW(L"atl.dll");
-    const auto init =
-        reinterpret_cast<BOOL(WINAPI*)()>(reinterpret_cast<void*>(GetProcAddress(atl, "AtlAxWinInit")));
-    return init && init()
-               ? reinterpret_cast<GetControl>(reinterpret_cast<void*>(GetProcAddress(atl, "AtlAxGetControl")))
-               : nullptr;
-  }();
-  return get;
+// A container that shows a picture of the control only, as a form in design does, or a report.
+TYPED_TEST(AnyControl, DrawsItselfWithoutAWindowOfTheContainer) {
+  CLSID classId = {};
+  ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
+  ComPtr<IViewObject2> view;
+  ASSERT_EQ(CoCreateInstance(classId, nullptr, CLSCTX_INPROC_SERVER, IID_IViewObject2, view.ReceiveVoid()),
+            S_OK);
+  const HDC screen = GetDC(nullptr);
+  const HDC dc = CreateCompatibleDC(screen);
+  const HBITMAP bitmap = CreateCompatibleBitmap(screen, 100, 80);
+  const HGDIOBJ old = SelectObject(dc, bitmap);
+  const RECT all = {0, 0, 100, 80};
+  constexpr COLORREF kBefore = RGB(255, 0, 255);
+  SetDCBrushColor(dc, kBefore);
+  FillRect(dc, &all, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
+  const RECTL bounds = {10, 10, 90, 70};
+  EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
+            S_OK);
+  EXPECT_NE(GetPixel(dc, 50, 60), kBefore);
+  EXPECT_EQ(GetPixel(dc, 5, 5), kBefore) << "drawn beside its place";
+  EXPECT_EQ(view->Draw(DVASPECT_ICON, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
+            DV_E_DVASPECT);
+  SelectObject(dc, old);
+  DeleteObject(bitmap);
+  DeleteDC(dc);
+  ReleaseDC(nullptr, screen);
 }
 
-TYPED_TEST(AnyControl, LivesInTheSystemsContainer) {
-  const GetControl get = SystemsContainer();
-  ASSERT_TRUE(get);
-  const HWND window = CreateWindowExW(0, L"AtlAxWin", TypeParam::kProgId, WS_POPUP, 0, 0, 300, 200, nullptr,
-                                      nullptr, nullptr, nullptr);
-  ASSERT_NE(window, nullptr);
-  ShowWindow(window, SW_SHOWNOACTIVATE);
-  ComPtr<IUnknown> control;
-  ASSERT_EQ(get(window, control.Receive()), S_OK);
-  typename TypeParam::Control members;
-  EXPECT_EQ(control->QueryInterface(TypeParam::InterfaceId(), members.ReceiveVoid()), S_OK);
-  ComPtr<IOleWindow> oleWindow;
-  HWND inner = nullptr;
-  EXPECT_EQ(control->QueryInterface(IID_IOleWindow, oleWindow.ReceiveVoid()), S_OK);
-  EXPECT_EQ(oleWindow->GetWindow(&inner), S_OK);
-  EXPECT_TRUE(IsChild(window, inner));
-  members = {};
-  oleWindow = {};
-  control = {};
-  DestroyWindow(window);
+TYPED_TEST(AnyControl, IsShownHiddenMovedAndDesigned) {
+  TypeParam form;
+  ShowWindow(form.frame, SW_SHOWNOACTIVATE);
+  EXPECT_EQ(form.container->Do(OLEIVERB_SHOW), S_OK);
+  const HWND window = form.Window();
+  ASSERT_TRUE(IsWindowVisible(window));
+  form.container->SetBounds({10, 20, 210, 140});
+  RECT place = {};
+  GetWindowRect(window, &place);
+  MapWindowPoints(nullptr, form.frame, reinterpret_cast<POINT*>(&place), 2);
+  const RECT wanted = {10, 20, 210, 140};
+  EXPECT_TRUE(EqualRect(&place, &wanted)) << place.left << " " << place.top;
+  EXPECT_EQ(form.container->Do(OLEIVERB_HIDE), S_OK);
+  EXPECT_FALSE(IsWindowVisible(window));
+  EXPECT_EQ(form.container->Do(OLEIVERB_SHOW), S_OK);
+  EXPECT_TRUE(IsWindowVisible(form.Window()));
+
+  // The form moves to another window of the host's.
+  const HWND other = CreateWindowExW(0, L"STATIC", L"other", WS_POPUP, 0, 0, 500, 400, nullptr,
+                                     nullptr, nullptr, nullptr);
+  SetParent(form.frame, other);
+  EXPECT_EQ(GetParent(form.Window()), form.frame);
+  EXPECT_EQ(form.container->Do(OLEIVERB_UIACTIVATE), S_OK);
+  EXPECT_TRUE(form.container->IsUiActive());
+  SetParent(form.frame, nullptr);
+  DestroyWindow(other);
+
+  // While it is designed, the form has the mouse and the keyboard.
+  TypeParam designed;
+  designed.container->ambient.userMode = false;
+  designed.container->AmbientChanged(DISPID_AMBIENT_USERMODE);
+  ShowWindow(designed.frame, SW_SHOWNOACTIVATE);
+  EXPECT_EQ(designed.container->Do(OLEIVERB_SHOW), S_OK);
+  SetFocus(designed.Window());
+  EXPECT_FALSE(designed.container->IsUiActive());
+}
+
+// Every version of the system's container for controls, each with a window class of its own.
+TYPED_TEST(AnyControl, LivesInTheSystemsContainers) {
+  for (const std::wstring version : {L"", L"80", L"90", L"100", L"110"}) {
+    SCOPED_TRACE(std::string(version.begin(), version.end()));
+    const HMODULE library = LoadLibraryW((L"atl" + version + L".dll").c_str());
+    ASSERT_NE(library, nullptr);
+    const auto init =
+        reinterpret_cast<BOOL(WINAPI*)()>(reinterpret_cast<void*>(GetProcAddress(library, "AtlAxWinInit")));
+    const auto get = reinterpret_cast<HRESULT(WINAPI*)(HWND, IUnknown**)>(
+        reinterpret_cast<void*>(GetProcAddress(library, "AtlAxGetControl")));
+    ASSERT_TRUE(init && get);
+    init();  // false when the class is there already
+    const HWND window = CreateWindowExW(0, (L"AtlAxWin" + version).c_str(), TypeParam::kProgId, WS_POPUP, 0,
+                                        0, 300, 200, nullptr, nullptr, nullptr, nullptr);
+    ASSERT_NE(window, nullptr);
+    ShowWindow(window, SW_SHOWNOACTIVATE);
+    ComPtr<IUnknown> control;
+    ASSERT_EQ(get(window, control.Receive()), S_OK);
+    typename TypeParam::Control members;
+    EXPECT_EQ(control->QueryInterface(TypeParam::InterfaceId(), members.ReceiveVoid()), S_OK);
+    ComPtr<IOleWindow> oleWindow;
+    HWND inner = nullptr;
+    EXPECT_EQ(control->QueryInterface(IID_IOleWindow, oleWindow.ReceiveVoid()), S_OK);
+    EXPECT_EQ(oleWindow->GetWindow(&inner), S_OK);
+    EXPECT_TRUE(IsChild(window, inner));
+    MoveWindow(window, 0, 0, 200, 150, TRUE);
+    RECT place = {};
+    GetClientRect(inner, &place);
+    EXPECT_EQ(place.right, 200);
+    EXPECT_EQ(place.bottom, 150);
+    members = {};
+    oleWindow = {};
+    control = {};
+    DestroyWindow(window);
+    EXPECT_FALSE(IsWindow(inner));
+  }
 }
 
 }  // namespace

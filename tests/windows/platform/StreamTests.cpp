@@ -302,9 +302,9 @@ TEST(PostStream, EndsWithItsSourceAndWithAQuitMessage) {
   LoopbackServer server({{kOk, End::kClose, std::numeric_limits<std::size_t>::max(), 10}});
   Source source(kLarge);
   WindowsTimer timer;
-  const int owned = ownedObjects;
   timer.SetHandler([] { PostQuitMessage(7); });
   timer.Start(150);
+  const int owned = ownedObjects;
   EXPECT_FALSE(Stream(server.Port(), source, 5000));
   EXPECT_LT(source.position, kLarge);
   MSG message{};
