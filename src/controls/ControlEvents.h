@@ -14,14 +14,16 @@ inline constexpr std::int16_t kDeleted = 1001;
 inline constexpr std::int16_t kNotSelected = 1002;    // a delete passed over the item
 inline constexpr std::int16_t kNotAllowed = 1005;     // by the account
 inline constexpr std::int16_t kUploadRefused = 1014;  // the quota is used up
-inline constexpr std::int16_t kCurrentItem = 1015;    // description: its address, empty when there is none
-inline constexpr std::int16_t kContextMenu = 1016;    // the right button; description as for kCurrentItem
-inline constexpr std::int16_t kDragOver = 1020;       // files are dragged over the thumbnails
-inline constexpr std::int16_t kOwnDrop = 1021;        // a drop that comes from the control itself
+// Description: its address; without one an empty text, in the thumbnails three blanks.
+inline constexpr std::int16_t kCurrentItem = 1015;
+inline constexpr std::int16_t kContextMenu = 1016;  // the right button; description as for kCurrentItem
+inline constexpr std::int16_t kDragOver = 1020;     // files are dragged over the thumbnails
+// A drop that comes from a control of ours; in the thumbnails any without files.
+inline constexpr std::int16_t kOwnDrop = 1021;
 inline constexpr std::int16_t kClickBegins = 1022;
 inline constexpr std::int16_t kFileDrop = 1023;  // description: a file's path; empty after the last one
 inline constexpr std::int16_t kClickEnds = 1024;
-inline constexpr std::int16_t kRenamed = 1031;  // description: the new name
+inline constexpr std::int16_t kRenamed = 1031;  // description: the new name, empty when it was given in place
 inline constexpr std::int16_t kNameTaken = 1032;
 inline constexpr std::int16_t kRenameFailed = 1033;
 inline constexpr std::int16_t kNameRefused = 1034;

@@ -54,8 +54,8 @@ FileControl::~FileControl() {
 
 void FileControl::Close() {
   closed_ = true;
-  // A wait must end even when the control is opened again before it looks.
-  if (transferRuns_) gbConnectionFailed = true;
+  // A wait must end even when the control is opened again before it looks. It clears the flag.
+  if (downloadRuns_) gbConnectionFailed = true;
   downloader_.SetEvents(nullptr);
   downloader_.Cancel();
 }
@@ -282,6 +282,9 @@ std::shared_ptr<CUpload> FileControl::RecordRenamed(const Text& oldName, const T
     const Text oldCopy = LocalCopyOf(record->FilePath);
     GiveName(*record, newName);
     SetAddress(all, i, record->FilePath);
+    FileList& shown = apartment_.shownFiles;
+    for (std::size_t k = 1; k <= shown.Count(); ++k)
+      if (shown.At(k) == record) SetAddress(shown, k, record->FilePath);
     MoveLocalCopy(oldCopy, LocalCopyOf(record->FilePath));
     return record;
   }
@@ -372,7 +375,11 @@ void FileControl::FinishLocalCopy(const Text& path, const Text& url) {
 
 void FileControl::MoveLocalCopy(const Text& from, const Text& to) {
   FileSystem& files = apartment_.platform.files;
-  if (from.empty() || !FileExists(files, from)) return;
+  // What is there under the new name is another picture's.
+  if (from.empty() || !FileExists(files, from)) {
+    if (to != from) RemoveLocalCopy(to);
+    return;
+  }
   if (!to.empty() && to != from) CopyLocalFile(files, from, to);
   if (to != from) RemoveLocalCopy(from);
 }
@@ -426,8 +433,10 @@ bool FileControl::Download(const Text& url, const Text& explicitTarget, const Te
   const RunningTransfer running(*this);
   m_lDownloadedBytes = 0;
   downloadFinished_ = false;
+  downloadRuns_ = true;
   downloader_.Start(url, explicitTarget);
   while (!gbConnectionFailed && !downloadFinished_ && !closed_ && !stop()) downloader_.Wait();
+  downloadRuns_ = false;
   gbConnectionFailed = false;
   // The host may have set the flag; then the transfer would go on behind the back of the next one.
   if (!downloadFinished_) downloader_.Cancel();
@@ -440,8 +449,9 @@ bool FileControl::Download(const Text& url, const Text& explicitTarget, const Te
   return false;
 }
 
-void FileControl::ReplyLine(TextView line) {
-  if (tellsTransfers_) events_.ReplyMessage(line);
+void FileControl::HeaderFound(TextView statusLine, std::int32_t bytes) {
+  m_lDownloadedBytes = bytes;
+  if (tellsTransfers_) events_.ReplyMessage(statusLine);
 }
 
 void FileControl::Received(std::int32_t bytes) {
@@ -472,17 +482,19 @@ FileControl::DragContent FileControl::ContentOfDrag() const {
 }
 
 void FileControl::OnStartDrag(DragData& data, std::int32_t& allowedEffects) {
-  dragIsOurs_ = true;
+  apartment_.dragIsOurs = true;
   events_.OLEStartDrag(data, allowedEffects);
 }
 
 void FileControl::OnDrop(DragData& data, const std::vector<Text>& files, std::int32_t& effect,
                          const DragPoint& at) {
   // What the host does in the event may end the drag.
-  const bool own = dragIsOurs_;
+  const bool own = apartment_.dragIsOurs;
   events_.OLEDragDrop(data, effect, at);
   if (own || files.empty()) return DroppedNoFiles(own);
-  for (const Text& path : files) {
+  // The host may clear the data in an event of the walk.
+  const std::vector<Text> walked(files);
+  for (const Text& path : walked) {
     if (StopsDrop()) break;
     Raise(event::kFileDrop, path);
   }
@@ -490,7 +502,7 @@ void FileControl::OnDrop(DragData& data, const std::vector<Text>& files, std::in
 }
 
 void FileControl::OnCompleteDrag(std::int32_t effect) {
-  if (std::exchange(dragIsOurs_, false)) events_.OLECompleteDrag(effect);
+  if (std::exchange(apartment_.dragIsOurs, false)) events_.OLECompleteDrag(effect);
 }
 
 }  // namespace tarnwick

@@ -128,8 +128,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool EnableRename(bool bEnableRename);
   void OLEDrag() { controlView_.StartDrag(); }
 
-  // Ends a running wait at its next pass, as if the connection had failed, and lets nothing start until
-  // Open. For a control that its container closes while an operation runs.
+  // Ends a running download at its next pass, as if the connection had failed, and lets no transfer start
+  // until Open; an upload goes on. For a control that its container closes while an operation runs.
   void Close();
   // The control is in a container (again).
   void Open();
@@ -239,7 +239,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   void Resolving() override { TellState(ConnectionState::kResolvingHost); }
   void Connected() override { TellState(ConnectionState::kConnected); }
   void TransferStarting() override { TellState(ConnectionState::kTransferStarting); }
-  void ReplyLine(TextView line) override;
+  void HeaderFound(TextView statusLine, std::int32_t bytes) override;
   void Received(std::int32_t bytes) override;
   void Finished() override;
   void Failed(std::int32_t ftpError, TextView description, bool told) override;
@@ -265,9 +265,9 @@ class FileControl : private UploadEvents, private DownloadEvents {
   Text copyPath_;
   bool transferRuns_ = false;
   bool uploadFinished_ = false;
+  bool downloadRuns_ = false;
   bool downloadFinished_ = false;
   bool renameInProgress_ = false;
-  bool dragIsOurs_ = false;
   bool closed_ = false;
   int hourglasses_ = 0;
 };

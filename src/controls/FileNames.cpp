@@ -8,10 +8,6 @@
 namespace tarnwick {
 namespace {
 
-char16_t Lower(char16_t unit) {
-  return unit >= u'A' && unit <= u'Z' ? static_cast<char16_t>(unit - u'A' + u'a') : unit;
-}
-
 bool IsDigit(char16_t unit) {
   return unit >= u'0' && unit <= u'9';
 }
@@ -33,7 +29,7 @@ void TakeSign(TextView& text) {
 bool EqualsIgnoringCase(TextView left, TextView right) {
   return left.size() == right.size() &&
          std::equal(left.begin(), left.end(), right.begin(),
-                    [](char16_t a, char16_t b) { return Lower(a) == Lower(b); });
+                    [](char16_t a, char16_t b) { return LowerCase(a) == LowerCase(b); });
 }
 
 bool StartsWithIgnoringCase(TextView text, TextView prefix) {

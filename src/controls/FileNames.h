@@ -7,7 +7,7 @@
 
 namespace tarnwick {
 
-// A to Z and a to z count as the same.
+// Letters in LowerCase count as the same.
 bool EqualsIgnoringCase(TextView left, TextView right);
 bool StartsWithIgnoringCase(TextView text, TextView prefix);
 bool EndsWithIgnoringCase(TextView text, TextView ending);

@@ -77,6 +77,8 @@ struct Apartment {
   bool listLoaded = false;
 
   bool abortTransfer = false;
+  // A drag that began in one of the controls is under way.
+  bool dragIsOurs = false;
 
   ScrollHookState scrollHook;
 

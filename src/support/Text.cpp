@@ -105,10 +105,23 @@ TextView Trim(TextView text) {
   return text.substr(first, text.find_last_not_of(u' ') - first + 1);
 }
 
+char16_t LowerCase(char16_t unit) {
+  const auto within = [unit](char16_t first, char16_t last) { return unit >= first && unit <= last; };
+  const auto plus = [unit](int distance) { return static_cast<char16_t>(unit + distance); };
+  if (within(u'A', u'Z')) return plus(32);
+  if (unit < 0xC0) return unit;
+  if (within(0xC0, 0xDE)) return unit == 0xD7 ? unit : plus(32);  // Latin-1
+  if (within(0x100, 0x137) || within(0x14A, 0x177)) return plus(unit % 2 == 0 ? 1 : 0);
+  if (within(0x139, 0x148) || within(0x179, 0x17E)) return plus(unit % 2 == 0 ? 0 : 1);
+  if (within(0x391, 0x3A9)) return plus(32);  // Greek
+  if (within(0x400, 0x40F)) return plus(80);  // Cyrillic
+  if (within(0x410, 0x42F)) return plus(32);
+  return unit;
+}
+
 Text LowerCase(TextView text) {
   Text lower(text);
-  for (char16_t& unit : lower)
-    if (unit >= u'A' && unit <= u'Z') unit = static_cast<char16_t>(unit - u'A' + u'a');
+  for (char16_t& unit : lower) unit = LowerCase(unit);
   return lower;
 }
 

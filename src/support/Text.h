@@ -25,7 +25,9 @@ Text TextFromLatin1(std::string_view bytes);
 // `text` without leading and trailing blanks (U+0020 only).
 TextView Trim(TextView text);
 
-// A to Z become a to z; every other character stays.
+// The small letter of a capital one of the Latin (up to U+017E), Greek and Cyrillic alphabets, the same on
+// every machine; every other character stays.
+char16_t LowerCase(char16_t unit);
 Text LowerCase(TextView text);
 
 // `text` with every occurrence of `what` (not empty), found from left to right, replaced by `with`.

@@ -126,8 +126,8 @@ void PictureDownloader::Received(std::int32_t bytes) {
   if (events_) events_->Received(bytes);
 }
 
-void PictureDownloader::ReplyLine(std::string_view line) {
-  if (events_) events_->ReplyLine(TextFromLatin1(line));
+void PictureDownloader::HeaderFound(std::string_view statusLine, std::int32_t bytes) {
+  if (events_) events_->HeaderFound(TextFromLatin1(statusLine), bytes);
 }
 
 void PictureDownloader::Finished() {

@@ -31,7 +31,7 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   void CloseSocket() override { socket_.Close(); }
   void WriteFile(TextView path, TextView explicitPath, std::string_view bytes) override;
   void Received(std::int32_t bytes) override;
-  void ReplyLine(std::string_view line) override;
+  void HeaderFound(std::string_view statusLine, std::int32_t bytes) override;
   void Finished() override;
   void Failed(bool told) override;
 

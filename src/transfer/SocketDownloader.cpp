@@ -95,11 +95,11 @@ void SocketDownloader::OnArrived(std::size_t count) {
   if (!running_ || count == 0) return;
   reply_.Add(count);
   if (reply_.Size() > kMostReplyBytes) return Fail(true);
-  actions_.Received(static_cast<std::int32_t>(reply_.Size() - bodyStart_));
+  actions_.Received(BodyBytes());
   // The host may have ended or replaced the download in its event.
   if (!running_) return;
   actions_.RestartWatchdog();
-  if (const auto statusLine = FindHeader()) actions_.ReplyLine(*statusLine);
+  if (const auto statusLine = FindHeader()) actions_.HeaderFound(*statusLine, BodyBytes());
 }
 
 std::optional<std::string> SocketDownloader::FindHeader() {
@@ -136,12 +136,13 @@ void SocketDownloader::OnClosedByPeer() {
   // A host that pumps messages in the event of an arrival gets the close before the arrival was searched.
   const auto statusLine = FindHeader();
   if (!headerFound_) return Fail(reply_.Size() == 0);
+  const std::int32_t bytes = BodyBytes();
   const ReplyBuffer reply = std::exchange(reply_, {});
   running_ = false;
   actions_.CloseSocket();
   actions_.StopWatchdog();
   actions_.WriteFile(target_, explicitTarget_, reply.Bytes().substr(bodyStart_));
-  if (statusLine) actions_.ReplyLine(*statusLine);
+  if (statusLine) actions_.HeaderFound(*statusLine, bytes);
   actions_.Finished();
 }
 

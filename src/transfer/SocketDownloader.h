@@ -44,7 +44,8 @@ class DownloadActions {
   virtual void WriteFile(TextView path, TextView explicitPath, std::string_view bytes) = 0;
 
   virtual void Received(std::int32_t bytes) = 0;
-  virtual void ReplyLine(std::string_view line) = 0;
+  // The header is whole: its first line, and the bytes behind it that have arrived.
+  virtual void HeaderFound(std::string_view statusLine, std::int32_t bytes) = 0;
   virtual void Finished() = 0;
   // The download is over without a file. `told`: hosts hear of it.
   virtual void Failed(bool told) = 0;
@@ -83,6 +84,7 @@ class SocketDownloader {
   void Fail(bool told);
   // The status line when the header, which was not known before, is whole.
   std::optional<std::string> FindHeader();
+  std::int32_t BodyBytes() const { return static_cast<std::int32_t>(reply_.Size() - bodyStart_); }
 
   DownloadActions& actions_;
   Text remoteHost_;

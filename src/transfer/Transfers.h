@@ -40,7 +40,8 @@ class DownloadEvents {
   virtual void Resolving() = 0;
   virtual void Connected() = 0;
   virtual void TransferStarting() = 0;
-  virtual void ReplyLine(TextView line) = 0;
+  // The header of the reply is whole: its first line, and the bytes of the file so far.
+  virtual void HeaderFound(TextView statusLine, std::int32_t bytes) = 0;
   // Bytes so far.
   virtual void Received(std::int32_t bytes) = 0;
   // Closed by the peer, and the file writer has run.

@@ -135,7 +135,8 @@ TEST_F(ListImageUpload, LocalCopyHasTheBytesThatWereSent) {
       {"not registered", "FileURL=", 0, 99, copy, "old"},
       // The upload goes on; the file is copied as it is then.
       {"disk full for a while", "FileURL=http://h/u/new.jpg", 0, 5, copy, "later"},
-      {"another name", "FileURL=http://h/u/x.jpg", 0, 99, fake.apartment.UserFolderPath + u"\\x.jpg", "later"},
+      {"another name", "FileURL=http://h/u/x.jpg", 0, 99, fake.apartment.UserFolderPath + u"\\x.jpg",
+       "later"},
       {"no safe name", "FileURL=http://h/u/a%3Ab", 0, 99, copy, "old"},
   };
   for (const auto& test : kCases) {
@@ -385,7 +386,10 @@ class ListImageDownload : public ListImageTest {
           d.events->TransferStarting();
         },
         [](FakeDownloader& d) { d.events->Received(20); },
-        [](FakeDownloader& d) { d.events->ReplyLine(u"HTTP/1.1 200 OK"); },
+        [this](FakeDownloader& d) {
+          d.events->HeaderFound(u"HTTP/1.1 200 OK", 3);
+          EXPECT_EQ(control.m_lDownloadedBytes, 3);
+        },
         [](FakeDownloader& d) { d.events->Received(5); },
         [](FakeDownloader& d) {
           d.files.files[d.target] = {5, 0};

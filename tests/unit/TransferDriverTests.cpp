@@ -25,7 +25,9 @@ struct Host : DownloadEvents {
   void Resolving() override { Tell("resolving"); }
   void Connected() override { Tell("connected"); }
   void TransferStarting() override { Tell("starting"); }
-  void ReplyLine(TextView line) override { Tell("reply " + Utf8FromText(line)); }
+  void HeaderFound(TextView line, std::int32_t bytes) override {
+    Tell("reply " + Utf8FromText(line) + " " + std::to_string(bytes));
+  }
   void Received(std::int32_t bytes) override { Tell("received " + std::to_string(bytes)); }
   void Finished() override { Tell("finished"); }
   void Failed(std::int32_t ftpError, TextView, bool told) override {
@@ -72,7 +74,7 @@ TEST_F(DriverTest, TellsADownloadInOrderAndWritesBothFiles) {
   EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "old");
   socket.events->OnClosedByPeer();
   EXPECT_EQ(log, (Transcript{"connect h:80", "resolving", "connected", "send GET /users/a@b/a.jpg HTTP/1.1",
-                             "starting", "received 21", "reply HTTP/1.1 200 OK", "received 3", "close",
+                             "starting", "received 21", "reply HTTP/1.1 200 OK 2", "received 3", "close",
                              "finished"}));
   EXPECT_EQ(Saved(kTarget), "abc");
   EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "abc");

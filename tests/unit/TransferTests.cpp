@@ -28,7 +28,9 @@ struct Actions : DownloadActions {
     body = bytes;
   }
   void Received(std::int32_t bytes) override { log += std::to_string(bytes) + ";"; }
-  void ReplyLine(std::string_view line) override { log += "reply " + std::string(line) + ";"; }
+  void HeaderFound(std::string_view line, std::int32_t bytes) override {
+    log += "reply " + std::string(line) + " " + std::to_string(bytes) + ";";
+  }
   void Finished() override { log += "finished;"; }
   void Failed(bool told) override { log += told ? "failed told;" : "failed;"; }
 };
@@ -63,7 +65,7 @@ TEST_F(DownloaderTest, FetchesAFile) {
             "w+;connect h 8080;send GET /users/a@b/my%20\xC3\xA9.jpg HTTP/1.1\r\nHost: h:8080\r\nConnection: "
             "close\r\n"
             "Accept: */*\r\nUser-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n\r\n;w+;"
-            "42;w+;reply HTTP/1.1 404 Nope;3;w+;close;w-;write C:\\t\\my \xC3\xA9.jpg D:\\x.jpg;finished;");
+            "42;w+;reply HTTP/1.1 404 Nope 2;3;w+;close;w-;write C:\\t\\my \xC3\xA9.jpg D:\\x.jpg;finished;");
   EXPECT_EQ(actions.body, "abc");
   EXPECT_EQ(machine.ContentLength(), 3);
 }
@@ -132,7 +134,7 @@ TEST_F(DownloaderTest, FailsAsALostConnectionDoes) {
   } rows[] = {
       {"closed without a byte", [&] { machine.OnClosedByPeer(); }, "close;w-;failed told;"},
       {"closed in the header", [&] { Data("HTTP"), machine.OnClosedByPeer(); }, "4;w+;close;w-;failed;"},
-      {"reset", [&] { Data("A\r\n\r\nx"), machine.OnSocketError(); }, "6;w+;reply A;close;w-;failed told;"},
+      {"reset", [&] { Data("A\r\n\r\nx"), machine.OnSocketError(); }, "6;w+;reply A 1;close;w-;failed told;"},
       {"silence", [&] { machine.OnWatchdog(); }, "w-;failed;"},
       {"cancelled", [&] { machine.Cancel(); }, "close;w-;"},
   };

@@ -46,12 +46,18 @@ ctrlListImage::~ctrlListImage() {
 
 bool ctrlListImage::Init(TextView szFileFilter) {
   Text filter(szFileFilter);
-  if (!apartment_.listingIsCurrent) apartment_.allFiles.Clear();
+  // Until the listing is there, the thumbnails have none either.
+  const bool loaded = apartment_.listLoaded;
+  if (!apartment_.listingIsCurrent) {
+    apartment_.allFiles.Clear();
+    apartment_.listLoaded = false;
+  }
   if (!mobjFileupload) throw RuntimeError(init_error::kNoClient);
   PrepareUserFolder(apartment_);
   const bool listed = mobjFileupload->ListFilesForUser(
       [&](const std::shared_ptr<CUpload>& record, TextView key) { apartment_.allFiles.Add(record, key); });
   if (!listed) throw RuntimeError(init_error::kListingFailed);
+  apartment_.listLoaded = loaded;
   ShowListOrLabel();
   view_.SetColumns(kColumns);
   currentFilter_ = std::move(filter);

@@ -23,8 +23,8 @@ class ctrlListImage final : public FileControl {
   // --- Listing ---
 
   // Fills the list from the service, or from the records of the last listing while they are current. Filters
-  // are "*", "gif" and "jpg" in exactly this spelling; any other shows nothing. Throws an init_error; the list
-  // is then as it was.
+  // are "*", "gif" and "jpg" in exactly this spelling; any other shows nothing. Throws an init_error; the
+  // list is then as it was.
   bool Init(TextView szFileFilter) override;
 
   // Shows the cached records again through another filter: "gif" and "jpg" in any letter case, else all.
@@ -62,7 +62,7 @@ class ctrlListImage final : public FileControl {
   // Another item was selected in other ways than by the arrow keys or a click.
   void OnSelectionChanged();
   void OnClick();
-  // Any mouse button, on an item or beside them.
+  // The left or right mouse button, on an item or beside them.
   void OnMouseButton();
   // Whether the user may edit the label.
   bool OnBeforeLabelEdit() const;

@@ -71,7 +71,9 @@ ctrlThumbNailView::~ctrlThumbNailView() {
 bool ctrlThumbNailView::Init(TextView szFileFilter) {
   return ResultAsItStood(false, [&](bool& done) {
     const Text filter(szFileFilter);
-    const bool listed = apartment_.listLoaded || List();
+    // Set before the page pumps messages: what forgets the listing meanwhile is not to be undone.
+    if (!apartment_.listLoaded) apartment_.listLoaded = List();
+    done = apartment_.listLoaded;
     ResultAsItStood(0, [&](int&) {
       Text link;
       for (const std::uint16_t id : kLinkStrings)
@@ -79,7 +81,6 @@ bool ctrlThumbNailView::Init(TextView szFileFilter) {
       page_.SetEmptyTexts(GetResourceString(apartment_, kNoImagesString), link);
     });
     Show(filter);
-    apartment_.listLoaded = done = listed;
   });
 }
 
@@ -163,6 +164,7 @@ void ctrlThumbNailView::FillPage(int first) {
   const bool empty = apartment_.allFiles.IsEmpty();
   page_.ShowGrid(!empty);
   if (empty) {
+    editedName_.clear();
     page_.EnableScroll(false);
     iImgNo = 0;
     return;
@@ -193,7 +195,8 @@ bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
   page_.SetCaption(slot, FormatLabelText(record.FileName));
   PathOf(slot) = record.FilePath;
   // A picture that cannot be read leaves the caption and an empty square.
-  if (!copy.empty() && FileExists(files, copy)) ResultAsItStood(0, [&](int&) { ShowPicture(slot, copy); });
+  if (!copy.empty() && FileExists(files, copy))
+    ResultAsItStood(0, [&](int&) { ShowPicture(slot, copy, record.FileSize); });
   page_.ShowSlot(slot, true);
   return true;
 }
@@ -214,14 +217,14 @@ bool ctrlThumbNailView::Fetch(int slot, const CUpload& record, const Text& copy)
   return !IsReplaced();
 }
 
-void ctrlThumbNailView::ShowPicture(int slot, const Text& copy) {
+void ctrlThumbNailView::ShowPicture(int slot, const Text& copy, double fileSize) {
   header_.ReadImageInfo(copy);
-  if (header_.ImageType() == kImageUnknown) {
-    // What a server sent in place of the picture; the next page with it asks again.
-    apartment_.platform.files.Remove(copy);
-    return;
-  }
-  page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width()));
+  if (header_.ImageType() != kImageUnknown)
+    return page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width()));
+  // A file of another kind, or what a server sent in place of the picture; then the next page with it asks
+  // again.
+  FileSystem& files = apartment_.platform.files;
+  if (static_cast<double>(files.Length(copy)) != fileSize) files.Remove(copy);
 }
 
 void ctrlThumbNailView::TransferEnded() {
@@ -262,6 +265,7 @@ void ctrlThumbNailView::ShowFrom(int first, std::optional<std::size_t> position)
   selectedPath_ = apartment_.shownFiles.At(position.value_or(static_cast<std::size_t>(first) + 1))->FilePath;
   // The page does not choose a selection of its own.
   selectionFirstIndex_ = first;
+  firstIndex_ = first;
   SetScrollValue(first);
   scrolledBack_ = false;
   ShowPage(first);

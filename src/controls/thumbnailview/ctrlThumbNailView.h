@@ -85,7 +85,8 @@ class ctrlThumbNailView final : public FileControl {
   // False when the page is not wanted any more.
   bool FillSlot(int slot, const CUpload& record);
   bool Fetch(int slot, const CUpload& record, const Text& copy);
-  void ShowPicture(int slot, const Text& copy);
+  // `fileSize` is what the listing says.
+  void ShowPicture(int slot, const Text& copy, double fileSize);
   bool IsReplaced() const { return nextPage_.has_value() || IsClosed(); }
   void UpdateSelection();
   // Shows the page with the item at that position, counted from 1, and selects it.
@@ -97,6 +98,8 @@ class ctrlThumbNailView final : public FileControl {
   // 0 when the picture is not on the page.
   int SlotOf(TextView path) const;
   void RaiseSelection();
+  // The steps of ValidateFileName.
+  void GiveNewName(Text& name, const Text& oldName);
 
   ThumbnailPage& page_;
   // Kept, because it holds the memory that it reads into.

@@ -155,15 +155,22 @@ void ctrlThumbNailView::SetLabelText(TextView szString) {
 }
 
 void ctrlThumbNailView::ValidateFileName(Text& NewString) {
+  const Text edited = std::exchange(editedName_, Text());
+  if (edited.empty()) return GiveNewName(NewString, SelectedFileName());
+  page_.HideEditor();
+  GiveNewName(NewString, edited);
+}
+
+void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
   ResultAsItStood(0, [&](int&) {
-    const Text edited = std::exchange(editedName_, Text());
-    const Text oldName = edited.empty() ? SelectedFileName() : edited;
     const auto keepName = [&](std::int16_t code) {
       SetLabelText(oldName);
       Raise(code);
     };
     NewString = Text(Trim(NewString));
     if (BeginsUnfit(NewString)) return keepName(event::kNameUnfit);
+    // Nothing is selected, so there is nothing to rename.
+    if (oldName.empty()) return Raise(event::kRenameFailed);
     CheckFileExtension(NewString, ExtensionOf(oldName));
     // The caption may show what was typed, such as the name without its extension.
     if (NewString == oldName) return keepName(event::kRenamed);
@@ -232,9 +239,7 @@ void ctrlThumbNailView::OnEditorEntered() {
   SetLabelText(valid ? name : oldName);
   page_.HideEditor();
   page_.Focus();
-  if (!valid) return;
-  editedName_ = oldName;
-  ValidateFileName(name);
+  if (valid) GiveNewName(name, oldName);
 }
 
 void ctrlThumbNailView::OnEditorLeft() {

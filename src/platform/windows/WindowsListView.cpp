@@ -43,6 +43,12 @@ bool WindowsListView::MakeChildren() {
   smallIcons_ = MakeSmallIcons(Dpi());
   ListView_SetImageList(list_, largeIcons_.Get(), LVSIL_NORMAL);
   ListView_SetImageList(list_, smallIcons_.Get(), LVSIL_SMALL);
+  // What an earlier window showed; its selection is lost.
+  if (multiple_) SetWindowLongW(list_, GWL_STYLE, GetWindowLongW(list_, GWL_STYLE) & ~LVS_SINGLESEL);
+  AddColumns();
+  ListView_SetItemCountEx(list_, static_cast<int>(count_), 0);
+  ShowWindow(listShown_ ? list_ : label_, SW_SHOWNA);
+  ShowWindow(listShown_ ? label_ : list_, SW_HIDE);
   return true;
 }
 
@@ -113,16 +119,20 @@ void WindowsListView::SetColumns(std::span<const ListColumn> columns) {
   while (ListView_DeleteColumn(list_, 0)) {
   }
   titles_.clear();
+  for (const ListColumn& column : columns) titles_.emplace_back(column.title);
+  AddColumns();
+}
+
+void WindowsListView::AddColumns() {
   const int width = MulDiv(kColumnWidth, Dpi(), 96);
-  for (const ListColumn& column : columns) {
-    titles_.emplace_back(column.title);
-    std::wstring title = WideFromText(column.title);
+  for (std::size_t i = 0; i < titles_.size(); ++i) {
+    std::wstring title = WideFromText(titles_[i]);
     LVCOLUMNW added = {};
     added.mask = LVCF_TEXT | LVCF_WIDTH | LVCF_FMT | LVCF_SUBITEM;
     added.fmt = LVCFMT_LEFT;
     added.cx = width;
     added.pszText = title.data();
-    added.iSubItem = static_cast<int>(titles_.size()) - 1;
+    added.iSubItem = static_cast<int>(i);
     SendMessageW(list_, LVM_INSERTCOLUMNW, static_cast<WPARAM>(added.iSubItem),
                  reinterpret_cast<LPARAM>(&added));
   }
@@ -184,6 +194,7 @@ void WindowsListView::SetFocusTo(std::size_t index) {
 }
 
 void WindowsListView::SetMultiSelect(bool multiple) {
+  multiple_ = multiple;
   if (!Window()) return;
   const std::optional<std::size_t> first = NextSelected(0);
   const LONG style = GetWindowLongW(list_, GWL_STYLE);

@@ -75,6 +75,7 @@ class WindowsListView : public ListView, public ControlWindow {
   std::optional<LRESULT> OnListMessage(UINT message, WPARAM wParam, LPARAM lParam);
   LRESULT OnNotify(const NMHDR& header);
   void Layout() const;
+  void AddColumns();
 
   ListViewUser& user_;
   HWND list_ = nullptr;
@@ -84,6 +85,7 @@ class WindowsListView : public ListView, public ControlWindow {
   std::vector<Text> titles_;
   std::size_t count_ = 0;
   bool listShown_ = true;
+  bool multiple_ = false;
   Text labelText_;
 };
 

@@ -37,7 +37,11 @@ WindowsStreamSocket::~WindowsStreamSocket() {
 }
 
 void WindowsStreamSocket::Close() {
-  if (lookup_) WSACancelAsyncRequest(lookup_);
+  if (lookup_) {
+    WSACancelAsyncRequest(lookup_);
+    // Not every version of the system stops it: it may still write its answer, which stays with it then.
+    static_cast<void>(lookupAnswer_.release());
+  }
   lookup_ = nullptr;
   pending_.clear();
   if (socket_ != INVALID_SOCKET) closesocket(socket_);
@@ -58,9 +62,9 @@ void WindowsStreamSocket::Connect(TextView host, std::uint16_t port) {
   // A number needs no look-up, which would cost a thread each time.
   const unsigned long number = inet_addr(name->c_str());
   if (number != INADDR_NONE) return ConnectTo(number);
-  lookupAnswer_.assign(MAXGETHOSTSTRUCT, '\0');
+  lookupAnswer_ = std::make_unique<char[]>(MAXGETHOSTSTRUCT);
   lookup_ = WSAAsyncGetHostByName(window_.Get(), MessageOf(Tells::kLookedUp), name->c_str(),
-                                  lookupAnswer_.data(), static_cast<int>(lookupAnswer_.size()));
+                                  lookupAnswer_.get(), MAXGETHOSTSTRUCT);
   if (!lookup_) TellError(WSAGetLastError());
 }
 
@@ -92,6 +96,7 @@ void WindowsStreamSocket::Send(std::string_view bytes) {
 
 std::size_t WindowsStreamSocket::Read(std::span<char> room) {
   const int most = static_cast<int>(std::min<std::size_t>(room.size(), std::numeric_limits<int>::max()));
+  read_ = true;
   const int count = recv(socket_, room.data(), most, 0);
   return count > 0 ? static_cast<std::size_t>(count) : 0;
 }
@@ -120,7 +125,7 @@ bool WindowsStreamSocket::OnMessage(UINT message, WPARAM wParam, LPARAM lParam) 
 
 void WindowsStreamSocket::OnLookedUp(int error) {
   lookup_ = nullptr;
-  const auto* found = reinterpret_cast<const hostent*>(lookupAnswer_.data());
+  const auto* found = reinterpret_cast<const hostent*>(lookupAnswer_.get());
   if (error != 0 || found->h_length != sizeof(std::uint32_t))
     return events_->OnSocketError(WSAHOST_NOT_FOUND);
   std::uint32_t address = 0;
@@ -159,7 +164,10 @@ void WindowsStreamSocket::OnClose() {
       if (send(socket_, &next, 0, 0) != 0) return events_->OnSocketError(WSAECONNRESET);
       return events_->OnClosedByPeer();
     }
+    read_ = false;
     events_->OnReadable();
+    // Nobody wants it: the download is over, and its socket was left open.
+    if (!read_) return;
   }
 }
 

@@ -42,10 +42,12 @@ class WindowsStreamSocket : public StreamSocket {
   UINT connection_ = 0;
   // Of the look-up that runs; null when none does.
   HANDLE lookup_ = nullptr;
-  std::string lookupAnswer_;
+  std::unique_ptr<char[]> lookupAnswer_;
   std::uint16_t port_ = 0;
   std::string pending_;
   bool started_ = false;
+  // Whether something was read since it was set back.
+  bool read_ = false;
   MessageWindow window_;
 };
 

@@ -321,6 +321,7 @@ void WindowsThumbnailPage::OnScroll(int code, int position) {
     case SB_THUMBTRACK:
       if (dragged == scrollValue_) break;
       scrollValue_ = dragged;
+      draggedAway_ = true;
       user_.ScrollDragged(dragged);
       break;
     default:
@@ -331,7 +332,9 @@ void WindowsThumbnailPage::OnScroll(int code, int position) {
 void WindowsThumbnailPage::ScrollTo(int value) {
   scrollValue_ = std::clamp(value, 0, scrollMax_);
   ApplyScroll();
-  if (scrollValue_ == restValue_) return;
+  // Let go where it was, it has shown other pages meanwhile.
+  if (scrollValue_ == restValue_ && !draggedAway_) return;
+  draggedAway_ = false;
   restValue_ = scrollValue_;
   user_.ScrollChanged(scrollValue_);
 }

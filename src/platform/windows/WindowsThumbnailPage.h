@@ -33,8 +33,6 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   // which reads the pictures.
   WindowsThumbnailPage(HINSTANCE module, ThumbnailPageUser& user);
 
-  // Where drops land: the whole control.
-  HWND DropWindow() { return Window(); }
   // Draws the page as the window would show it, into `bounds` in pixels of the screen, which `dc` may map to
   // others.
   void Draw(HDC dc, const RECT& bounds) const;
@@ -116,6 +114,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   int scrollValue_ = 0;
   // Where the bar was at rest last; differs from the value while the thumb is dragged.
   int restValue_ = 0;
+  // A drag of the thumb has shown another page since.
+  bool draggedAway_ = false;
   bool scrollEnabled_ = true;
   // What is left of the wheel's turn, less than a notch.
   int wheelRest_ = 0;

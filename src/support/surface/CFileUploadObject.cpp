@@ -95,6 +95,8 @@ STDMETHODIMP CFileUploadObject::EnCodeString(BSTR szString, BSTR* result) {
 // --- Files ---
 
 STDMETHODIMP CFileUploadObject::ListFilesForUser(IDispatch** colFiles, VARIANT_BOOL* result) {
+  // The collection is the host's, and may release the client.
+  const ComPtr<IUnknown> alive(static_cast<IDispatch*>(this));
   return AnsweredBoolean(result, [&] {
     // A current list is the answer itself: nothing is asked and the collection is left alone.
     if (client_->ListIsCurrent()) return true;
@@ -256,6 +258,8 @@ STDMETHODIMP CFileUploadObject::GetCurrentDateTimeFromServer(BSTR* result) {
 
 STDMETHODIMP CFileUploadObject::GetAccountDetailsForMGUID(BSTR MGUID, BSTR Username, BSTR ProductID,
                                                           IDispatch** col, LONG* result) {
+  // The collection is the host's, and may release the client.
+  const ComPtr<IUnknown> alive(static_cast<IDispatch*>(this));
   return Answered(result, 0, [&] {
     if (!col) return;
     const HostCollection collection(col);

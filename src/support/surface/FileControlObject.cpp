@@ -264,6 +264,7 @@ STDMETHODIMP FileControlObject<Interface>::put_OLEDragMode(LONG value) {
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::Init(BSTR* szFileFilter, VARIANT_BOOL* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   if (!result) return E_POINTER;
   *result = VARIANT_FALSE;
   return Guarded([&]() -> HRESULT {
@@ -281,6 +282,7 @@ STDMETHODIMP FileControlObject<Interface>::Init(BSTR* szFileFilter, VARIANT_BOOL
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::ChangeFileFilter(BSTR szFileFilter) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Done([&] {
     Rules().ChangeFileFilter(ViewOf(szFileFilter));
     ole_.ViewChanged();
@@ -290,6 +292,7 @@ STDMETHODIMP FileControlObject<Interface>::ChangeFileFilter(BSTR szFileFilter) {
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::GetFileDetails(VARIANT FileName, IDispatch** colFiles,
                                                           VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     if (colFiles) {
       const HostCollection collection(colFiles);
@@ -317,6 +320,7 @@ STDMETHODIMP FileControlObject<Interface>::GetSelectedFilesHttpPath(VARIANT* res
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::UploadedFileSetFocus(BSTR* szFileName, VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     Rules().UploadedFileSetFocus(ViewOf(szFileName));
     return VARIANT{};
@@ -327,28 +331,33 @@ STDMETHODIMP FileControlObject<Interface>::UploadedFileSetFocus(BSTR* szFileName
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::UploadImage(BSTR szLocalPath, VARIANT_BOOL* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredBoolean(result, [&] { return Rules().UploadImage(ViewOf(szLocalPath)); });
 }
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::DeleteFile() {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Done([&] { Rules().DeleteFile(); });
 }
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::RenameFile(BSTR* strOldFileName, BSTR* strNewFileName,
                                                       VARIANT_BOOL* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredBoolean(result,
                          [&] { return Rules().RenameFile(ViewOf(strOldFileName), ViewOf(strNewFileName)); });
 }
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::DownLoadFileFromServer(BSTR szLocalFilePath, BSTR* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredText(result, [&] { return Rules().DownLoadFileFromServer(ViewOf(szLocalFilePath)); });
 }
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::IsFileNameValid(BSTR* szFileName, VARIANT_BOOL* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredBoolean(result, [&] { return Rules().IsFileNameValid(ViewOf(szFileName)); });
 }
 
@@ -381,6 +390,7 @@ STDMETHODIMP FileControlObject<Interface>::EnableRename(VARIANT_BOOL* bEnableRen
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::OLEDrag() {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Done([&] { Rules().OLEDrag(); });
 }
 
@@ -389,10 +399,12 @@ STDMETHODIMP FileControlObject<Interface>::OLEDrag() {
 template <typename Interface>
 HWND FileControlObject<Interface>::Window() {
   const HWND window = MakeWindow();
-  // A host that did not initialise OLE has a control without drops.
-  if (window && !dropTarget_)
+  // A host that did not initialise OLE has a control without drops. A container may end the window and ask
+  // for another.
+  if (window && window != dropWindow_)
     Done([&] {
-      dropTarget_ = ComPtr<DropTarget>::Adopt(new DropTarget(DropWindow(), Identity(), *this));
+      dropWindow_ = window;
+      dropTarget_ = ComPtr<DropTarget>::Adopt(new DropTarget(window, Identity(), *this));
       ApplyLook();
     });
   return window;

@@ -104,8 +104,6 @@ class FileControlObject : public DualObject<Interface>,
   void StopDrops();
 
   virtual FileControl& Rules() = 0;
-  // Where drops land; the window is there.
-  virtual HWND DropWindow() = 0;
   // The control's window, made on the first call, without what a container gives it.
   virtual HWND MakeWindow() = 0;
   // Null and nullopt stand for the system's own font and colours.
@@ -115,7 +113,8 @@ class FileControlObject : public DualObject<Interface>,
   ControlParts Parts() { return {apartment_.Get(), events_, uploader_, downloader_}; }
   OleControl& Ole() { return ole_; }
   Apartment& TheApartment() { return apartment_.Get(); }
-  // For the handlers of the user's actions, which run code of the host's: it may release the control inside.
+  // For what runs code of the host's, in events and while messages are pumped: it may release the control
+  // inside.
   ComPtr<IUnknown> KeptAlive() { return ComPtr<IUnknown>(&Identity()); }
   // The control got the focus, or a button went down on it.
   void Activated();
@@ -155,6 +154,8 @@ class FileControlObject : public DualObject<Interface>,
   WindowsTimer watchdog_;
   PictureDownloader downloader_;
   ComPtr<DropTarget> dropTarget_;
+  // The window that it stands for.
+  HWND dropWindow_ = nullptr;
   AmbientValues ambient_;
   // What the host was last given for the rules' client, so that it gets the same object again.
   ComPtr<CFileUploadObject> clientObject_;

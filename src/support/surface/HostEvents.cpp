@@ -31,6 +31,23 @@ VARIANT ReferenceTo(VARTYPE type, Value& value) {
   return reference;
 }
 
+// An object for a by-reference parameter: what the host puts in its place is released like the object itself.
+class ObjectReference {
+ public:
+  explicit ObjectReference(DragData& data) : object_(static_cast<DataObject&>(data).Dispatch()) {
+    object_->AddRef();
+  }
+  ~ObjectReference() {
+    if (object_) object_->Release();
+  }
+  ObjectReference(const ObjectReference&) = delete;
+  ObjectReference& operator=(const ObjectReference&) = delete;
+  VARIANT Argument() { return ReferenceTo(VT_DISPATCH, object_); }
+
+ private:
+  IDispatch* object_;
+};
+
 }  // namespace
 
 void HostEvents::FileManagerEvent(std::int16_t code, TextView description) {
@@ -46,16 +63,16 @@ void HostEvents::FileManagerEvent(std::int16_t code, TextView description) {
 }
 
 void HostEvents::OLEStartDrag(DragData& data, std::int32_t& allowedEffects) {
-  IDispatch* object = static_cast<DataObject&>(data).Dispatch();
+  ObjectReference object(data);
   LONG effects = allowedEffects;
-  std::array arguments = {ReferenceTo(VT_DISPATCH, object), ReferenceTo(VT_I4, effects)};
+  std::array arguments = {object.Argument(), ReferenceTo(VT_I4, effects)};
   ole_.Raise(kOLEStartDrag, arguments);
   allowedEffects = effects;
 }
 
 void HostEvents::OLESetData(DragData& data, std::int16_t format) {
-  IDispatch* object = static_cast<DataObject&>(data).Dispatch();
-  std::array arguments = {ReferenceTo(VT_DISPATCH, object), ReferenceTo(VT_I2, format)};
+  ObjectReference object(data);
+  std::array arguments = {object.Argument(), ReferenceTo(VT_I2, format)};
   ole_.Raise(kOLESetData, arguments);
 }
 
@@ -69,24 +86,30 @@ void HostEvents::OLEGiveFeedback(std::int32_t& effect, bool& defaultCursors) {
 }
 
 void HostEvents::OLEDragOver(DragData& data, std::int32_t& effect, const DragPoint& at, std::int16_t state) {
-  IDispatch* object = static_cast<DataObject&>(data).Dispatch();
+  ObjectReference object(data);
   LONG wanted = effect;
   DragPoint point = at;
-  std::array arguments = {ReferenceTo(VT_DISPATCH, object), ReferenceTo(VT_I4, wanted),
-                          ReferenceTo(VT_I2, point.button), ReferenceTo(VT_I2, point.shift),
-                          ReferenceTo(VT_R4, point.x),      ReferenceTo(VT_R4, point.y),
+  std::array arguments = {object.Argument(),
+                          ReferenceTo(VT_I4, wanted),
+                          ReferenceTo(VT_I2, point.button),
+                          ReferenceTo(VT_I2, point.shift),
+                          ReferenceTo(VT_R4, point.x),
+                          ReferenceTo(VT_R4, point.y),
                           ReferenceTo(VT_I2, state)};
   ole_.Raise(kOLEDragOver, arguments);
   effect = wanted;
 }
 
 void HostEvents::OLEDragDrop(DragData& data, std::int32_t& effect, const DragPoint& at) {
-  IDispatch* object = static_cast<DataObject&>(data).Dispatch();
+  ObjectReference object(data);
   LONG wanted = effect;
   DragPoint point = at;
-  std::array arguments = {ReferenceTo(VT_DISPATCH, object), ReferenceTo(VT_I4, wanted),
-                          ReferenceTo(VT_I2, point.button), ReferenceTo(VT_I2, point.shift),
-                          ReferenceTo(VT_R4, point.x),      ReferenceTo(VT_R4, point.y)};
+  std::array arguments = {object.Argument(),
+                          ReferenceTo(VT_I4, wanted),
+                          ReferenceTo(VT_I2, point.button),
+                          ReferenceTo(VT_I2, point.shift),
+                          ReferenceTo(VT_R4, point.x),
+                          ReferenceTo(VT_R4, point.y)};
   ole_.Raise(kOLEDragDrop, arguments);
   effect = wanted;
 }

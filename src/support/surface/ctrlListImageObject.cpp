@@ -41,6 +41,7 @@ STDMETHODIMP ctrlListImageObject::GetFileNames(VARIANT* result) {
 }
 
 STDMETHODIMP ctrlListImageObject::SetMultiSelectProperty(VARIANT_BOOL* bVal, VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     rules_->SetMultiSelectProperty(bVal && *bVal != VARIANT_FALSE);
     return VARIANT{};
@@ -48,6 +49,7 @@ STDMETHODIMP ctrlListImageObject::SetMultiSelectProperty(VARIANT_BOOL* bVal, VAR
 }
 
 STDMETHODIMP ctrlListImageObject::ListViewSetFocus(VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     rules_->ListViewSetFocus();
     return VARIANT{};
@@ -55,6 +57,7 @@ STDMETHODIMP ctrlListImageObject::ListViewSetFocus(VARIANT* result) {
 }
 
 STDMETHODIMP ctrlListImageObject::StartLabelExit(VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     rules_->StartLabelExit();
     return VARIANT{};

@@ -26,7 +26,6 @@ class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, priv
 
   // FileControlObject
   FileControl& Rules() override { return *rules_; }
-  HWND DropWindow() override { return view_.List(); }
   HWND MakeWindow() override { return view_.Window(); }
   void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background) override {
     view_.SetLook(font, text, background);

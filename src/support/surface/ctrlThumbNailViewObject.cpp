@@ -28,6 +28,7 @@ STDMETHODIMP ctrlThumbNailViewObject::EditFileLabel(VARIANT_BOOL* result) {
 }
 
 STDMETHODIMP ctrlThumbNailViewObject::SetLabelText(BSTR* szString, VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     rules_->SetLabelText(ViewOf(szString));
     return VARIANT{};
@@ -35,6 +36,7 @@ STDMETHODIMP ctrlThumbNailViewObject::SetLabelText(BSTR* szString, VARIANT* resu
 }
 
 STDMETHODIMP ctrlThumbNailViewObject::ValidateFileName(BSTR* NewString, VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     Text name(ViewOf(NewString));
     rules_->ValidateFileName(name);
@@ -44,6 +46,7 @@ STDMETHODIMP ctrlThumbNailViewObject::ValidateFileName(BSTR* NewString, VARIANT*
 }
 
 STDMETHODIMP ctrlThumbNailViewObject::PictureSetFocus(VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     rules_->PictureSetFocus();
     return VARIANT{};

@@ -28,7 +28,6 @@ class ctrlThumbNailViewObject final : public FileControlObject<_ctrlThumbNailVie
 
   // FileControlObject
   FileControl& Rules() override { return *rules_; }
-  HWND DropWindow() override { return page_.DropWindow(); }
   HWND MakeWindow() override;
   void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background) override {
     page_.SetLook(font, text, background);

@@ -65,7 +65,7 @@ TEST(ListControl, TakesFilesThatAreDroppedOnIt) {
   form.Show();
   const std::vector<std::wstring> files = {L"C:\\one.jpg", L"C:\\Bl\u00FCmchen.gif"};
   const ComPtr<IDataObject> data = FilesFromOutside(form.frame, files);
-  auto* target = static_cast<IDropTarget*>(GetPropW(form.ListWindow(), L"OleDropTargetInterface"));
+  auto* target = static_cast<IDropTarget*>(GetPropW(form.Window(), L"OleDropTargetInterface"));
   ASSERT_TRUE(data && target);
   POINT corner = {0, 0};
   ClientToScreen(form.ListWindow(), &corner);
@@ -123,6 +123,30 @@ TEST(ListControl, TakesFilesThatAreDroppedOnIt) {
     form.events.clear();
     empties = !leaves;
   }
+}
+
+// The parameter is by reference, and the object may be kept and changed.
+TEST(ListControl, SurvivesWhatAHostDoesWithDroppedData) {
+  Form form;
+  form.Show();
+  const ComPtr<IDataObject> data = FilesFromOutside(form.frame, {L"C:\\one.jpg", L"C:\\two.jpg"});
+  auto* target = static_cast<IDropTarget*>(GetPropW(form.Window(), L"OleDropTargetInterface"));
+  ASSERT_TRUE(data && target);
+  ComPtr<IDispatch> kept;
+  form.onOther = [&](DISPID, Arguments& arguments) {
+    IDispatch*& object = *V_DISPATCHREF(&arguments[0]);
+    kept = ComPtr<IDispatch>(object);
+    object->Release();
+    object = nullptr;
+  };
+  form.onEvent = [&](int) { Call(kept.Get(), L"Clear", {}); };
+  DWORD effect = DROPEFFECT_COPY;
+  EXPECT_EQ(target->DragEnter(data.Get(), MK_LBUTTON, {50, 50}, &effect), S_OK);
+  effect = DROPEFFECT_COPY;
+  EXPECT_EQ(target->Drop(data.Get(), MK_LBUTTON, {50, 50}, &effect), S_OK);
+  EXPECT_EQ(form.events, (std::vector<std::wstring>{L"1023 C:\\one.jpg", L"1023 C:\\two.jpg", L"1023 "}));
+  kept->AddRef();
+  EXPECT_EQ(kept->Release(), 1U) << "the control has let go of it";
 }
 
 // The next events of the mouse, as if a person made them.

@@ -226,21 +226,60 @@ TEST(ListControl, UploadsDownloadsRenamesAndDeletes) {
   EXPECT_NE(form.Select(L"renamed test.jpg"), L"renamed test.jpg");
 }
 
-TEST(ListControl, MayBeReleasedInAnEventOfItsWait) {
-  auto form = std::make_unique<Form>();
-  form->LogOn(TheServer().name);
-  ASSERT_TRUE(form->Init(L"*"));
-  form->Show();
-  ASSERT_EQ(form->Select(L"rose.jpg"), L"rose.jpg");
-  _ctrlListImage* list = form->list.Get();
-  list->AddRef();
-  bool released = false;
-  form->onEvent = [&](int) {
-    if (!std::exchange(released, true)) list->Release();
-  };
+// A host without a container, which lets go of the control in the first event.
+class ReleasingSink final : public IDispatch {
+ public:
+  IUnknown* object = nullptr;
+  ULONG left = 0;
+  ULONG references = 1;
+  STDMETHODIMP QueryInterface(REFIID, void** found) override {
+    *found = this;
+    AddRef();
+    return S_OK;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return ++references; }
+  STDMETHODIMP_(ULONG) Release() override { return --references; }
+  STDMETHODIMP GetTypeInfoCount(UINT*) override { return E_NOTIMPL; }
+  STDMETHODIMP GetTypeInfo(UINT, LCID, ITypeInfo**) override { return E_NOTIMPL; }
+  STDMETHODIMP GetIDsOfNames(REFIID, LPOLESTR*, UINT, LCID, DISPID*) override { return E_NOTIMPL; }
+  STDMETHODIMP Invoke(DISPID, REFIID, LCID, WORD, DISPPARAMS*, VARIANT*, EXCEPINFO*, UINT*) override {
+    if (IUnknown* const last = std::exchange(object, nullptr)) left = last->Release();
+    return S_OK;
+  }
+};
+
+TYPED_TEST(AnyControl, MayBeReleasedInAnEventOfItsWait) {
+  CLSID classId = {};
+  ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
+  typename TypeParam::Control control;
+  ASSERT_EQ(CoCreateInstance(classId, nullptr, CLSCTX_INPROC_SERVER, TypeParam::InterfaceId(),
+                             control.ReceiveVoid()),
+            S_OK);
+  control->putref_mobjFileupload(LoggedOnClient().Get());
+  Bstr text(L"*");
+  BSTR given = text;
+  VARIANT_BOOL done = VARIANT_FALSE;
+  ASSERT_EQ(control->Init(&given, &done), S_OK);
+  Bstr file(L"rose.jpg");
+  given = file;
+  VARIANT ignored = {};
+  EXPECT_EQ(control->UploadedFileSetFocus(&given, &ignored), S_OK);
+  ReleasingSink sink;
+  {
+    ComPtr<IConnectionPointContainer> points;
+    ComPtr<IConnectionPoint> point;
+    ASSERT_EQ(control->QueryInterface(IID_IConnectionPointContainer, points.ReceiveVoid()), S_OK);
+    ASSERT_EQ(points->FindConnectionPoint(TypeParam::EventsId(), point.Receive()), S_OK);
+    DWORD cookie = 0;
+    ASSERT_EQ(point->Advise(&sink, &cookie), S_OK);
+  }
+  auto* const called = control.Detach();
+  sink.object = called;
   Bstr local;
-  form->list->DownLoadFileFromServer(Bstr(L"."), local.Receive());
-  EXPECT_TRUE(released);
+  called->DownLoadFileFromServer(Bstr(L"."), local.Receive());
+  EXPECT_EQ(sink.object, nullptr) << "no event";
+  EXPECT_GT(sink.left, 0U) << "gone while it ran";
+  EXPECT_EQ(sink.references, 1U) << "still there afterwards";
   DeleteFileW(L"rose.jpg");
 }
 
@@ -290,8 +329,8 @@ TYPED_TEST(AnyControl, IsShownHiddenMovedAndDesigned) {
   EXPECT_TRUE(IsWindowVisible(form.Window()));
 
   // The form moves to another window of the host's.
-  const HWND other = CreateWindowExW(0, L"STATIC", L"other", WS_POPUP, 0, 0, 500, 400, nullptr,
-                                     nullptr, nullptr, nullptr);
+  const HWND other =
+      CreateWindowExW(0, L"STATIC", L"other", WS_POPUP, 0, 0, 500, 400, nullptr, nullptr, nullptr, nullptr);
   SetParent(form.frame, other);
   EXPECT_EQ(GetParent(form.Window()), form.frame);
   EXPECT_EQ(form.container->Do(OLEIVERB_UIACTIVATE), S_OK);

@@ -163,6 +163,7 @@ class ControlForm {
 class Form : public ControlForm<_ctrlListImage> {
  public:
   static constexpr wchar_t kProgId[] = L"Tarnwick.ctrlListImage";
+  static const IID& EventsId() { return __uuidof(__ctrlListImage); }
   const Control& list = control;
 
   explicit Form(ControlContainer::WayIn wayIn = ControlContainer::WayIn::kSteps, IPropertyBag* bag = nullptr)
@@ -203,6 +204,7 @@ inline std::wstring TextOf(HWND window) {
 class ThumbForm : public ControlForm<_ctrlThumbNailView> {
  public:
   static constexpr wchar_t kProgId[] = L"Tarnwick.ctrlThumbNailView";
+  static const IID& EventsId() { return __uuidof(__ctrlThumbNailView); }
   // A little more than the whole page.
   static constexpr int kWidth = 350;
   static constexpr int kHeight = 420;

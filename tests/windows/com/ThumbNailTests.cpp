@@ -354,13 +354,12 @@ TEST(ThumbNailControl, LeavesTheSquareOfABrokenPictureEmpty) {
   const struct {
     const char* what;
     std::string bytes;
-    bool kept;  // as a local copy
   } rows[] = {
-      {"words", "<html>No picture here</html>", false},
-      {"nothing", "", false},
-      {"only a head", rocket.substr(0, 300), true},
-      {"half", rocket.substr(0, rocket.size() / 2), true},
-      {"60,000 pixels square", std::string("GIF89a\x60\xEA\x60\xEA\xF0\0\0", 13), true},
+      {"words", "<html>No picture here</html>"},
+      {"nothing", ""},
+      {"only a head", rocket.substr(0, 300)},
+      {"half", rocket.substr(0, rocket.size() / 2)},
+      {"60,000 pixels square", std::string("GIF89a\x60\xEA\x60\xEA\xF0\0\0", 13)},
   };
   for (const auto& row : rows) {
     SCOPED_TRACE(row.what);
@@ -377,7 +376,8 @@ TEST(ThumbNailControl, LeavesTheSquareOfABrokenPictureEmpty) {
       EXPECT_EQ(form.Captions(), (Lines{kJpegs[2], kJpegs[3], L"x.jpg"}));
       EXPECT_TRUE(Picture(form, 3).empty());
       EXPECT_FALSE(Picture(form, 1).empty());
-      EXPECT_EQ(Contents(CopyOf(L"x.jpg")).has_value(), row.kept);
+      // It is what the account has, so it is not fetched again and again.
+      EXPECT_EQ(Contents(CopyOf(L"x.jpg")), row.bytes);
     }
     EXPECT_FALSE(Holds(form.events, L"5555 "));
     EXPECT_EQ(form.Select(L"x.jpg"), L"x.jpg");

@@ -416,8 +416,13 @@ TEST_F(ThumbnailPageTest, TellsWhereTheScrollBarComesToRest) {
       {SB_THUMBPOSITION, 6, {"changed 6"}, 6},
       {SB_THUMBTRACK, 0, {"dragged 0"}, 0},
       {SB_THUMBTRACK, 7, {"dragged 6"}, 6},
-      {SB_THUMBPOSITION, 6, {}, 6},
+      {SB_THUMBPOSITION, 6, {"changed 6"}, 6},
       {SB_TOP, 0, {"changed 0"}, 0},
+      // Back to where it was, past another page.
+      {SB_THUMBTRACK, 4, {"dragged 4"}, 4},
+      {SB_THUMBTRACK, 0, {"dragged 0"}, 0},
+      {SB_THUMBPOSITION, 0, {"changed 0"}, 0},
+      {SB_THUMBPOSITION, 0, {}, 0},
   };
   for (const auto& move : moves) {
     SCOPED_TRACE(move.code);
