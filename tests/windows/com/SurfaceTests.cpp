@@ -4,6 +4,8 @@
 
 #include <gtest/gtest.h>
 
+#include <fstream>
+#include <iterator>
 #include <map>
 #include <sstream>
 
@@ -303,6 +305,33 @@ TEST(Surface, IsWhatHostsWerePromised) {
     EXPECT_EQ(lines, at == found.end() ? "missing" : at->second);
   }
   for (const auto& [heading, lines] : found) EXPECT_TRUE(promised.contains(heading)) << heading;
+}
+
+// Every public name has its place in the reference, which is read from the current folder.
+TEST(Surface, IsInTheReference) {
+  std::ifstream file("docs/reference.md", std::ios::binary);
+  const std::string reference(std::istreambuf_iterator<char>(file), {});
+  ASSERT_FALSE(reference.empty());
+  std::istringstream lines{std::string(kSurface)};
+  std::string heading;
+  for (std::string line; std::getline(lines, line);) {
+    if (line.starts_with("interface ") || line.starts_with("events ") || line.starts_with("enumeration "))
+      heading = line;
+    std::string name;
+    if (line.starts_with("class ") || line.starts_with("enumeration "))
+      name = line.substr(line.find(' ') + 1);
+    else if (heading.starts_with("interface ") && line != heading)
+      name = line;
+    else if (heading.starts_with("events ") && line != heading)
+      name = line.substr(std::min(line.size(), line.find(' ') + 1));
+    name = name.substr(0, name.find_first_of(" (:"));
+    if (name.empty()) continue;
+    const bool found = reference.find("`" + name + "`") != std::string::npos ||
+                       reference.find("`" + name + "(") != std::string::npos ||
+                       reference.find("# " + name) != std::string::npos ||
+                       reference.find("and " + name + "\n") != std::string::npos;
+    EXPECT_TRUE(found) << name << " of " << heading;
+  }
 }
 
 // Compiled hosts hold these numbers.
