@@ -1,7 +1,7 @@
 // What stands in the bytes of a picture file, looked at before a decoder gets them. A decoder believes what a
 // file says: it reserves the memory and takes the time that a few bytes ask for. So files that claim too much
-// are refused here, and what does not make the pixels (thumbnails in thumbnails, profiles, comments, the further
-// pictures of an animation) is left out.
+// are refused here, and what does not make the pixels (thumbnails in thumbnails, profiles, comments, the
+// further pictures of an animation) is left out.
 #pragma once
 
 #include <cstddef>
@@ -25,7 +25,8 @@ struct PictureFacts {
   // The whole picture, in pixels.
   std::uint32_t width = 0;
   std::uint32_t height = 0;
-  // What the decoder calls the picture; smaller than the whole only where a GIF's first picture covers a part.
+  // What the decoder calls the picture; smaller than the whole only where a GIF's first picture covers a
+  // part.
   std::uint32_t left = 0;
   std::uint32_t top = 0;
   std::uint32_t frameWidth = 0;

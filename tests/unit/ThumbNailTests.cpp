@@ -375,8 +375,8 @@ TEST_F(ThumbNailTest, EditsTheNameInPlace) {
   control.OnKeyDown(113);
   page.edited = u"new & old";
   control.OnEditorEntered();
-  ExpectLog({"8888 ", "editor 2 new & old.gif", "caption 2 new && old", "editor hides", "caption 2 new && old.gif",
-             "1031 "});
+  ExpectLog({"8888 ", "editor 2 new & old.gif", "caption 2 new && old", "editor hides",
+             "caption 2 new && old.gif", "1031 "});
 
   // A refused character restores the caption; leaving the editor changes nothing.
   log.clear();

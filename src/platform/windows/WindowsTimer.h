@@ -5,8 +5,8 @@
 
 namespace tarnwick {
 
-// Restarted with each arrival of a transfer, so the system's timer is left running then, and told the rest of the
-// time when it ticks too early.
+// Restarted with each arrival of a transfer, so the system's timer is left running then, and told the rest of
+// the time when it ticks too early.
 class WindowsTimer : public Timer {
  public:
   WindowsTimer();
