@@ -526,7 +526,8 @@ std::optional<LRESULT> WindowsThumbnailPage::OnEditorMessage(UINT message, WPARA
   };
   switch (message) {
     case WM_GETDLGCODE:
-      if (wParam == VK_RETURN || wParam == VK_ESCAPE) return DLGC_WANTMESSAGE;
+      // Delete deletes a letter, whatever the host's own key for it does.
+      if (wParam != 0 && wParam != VK_TAB) return DLGC_WANTALLKEYS;
       return std::nullopt;
     case WM_KEYDOWN:
       if (wParam == VK_RETURN)

@@ -269,6 +269,11 @@ TEST(ThumbNailControl, UploadsRenamesInPlaceAndDeletes) {
       {L"R\u00F6se & co.gif", VK_RETURN, {L"1031 "}, renamed, L"R\u00F6se && co.jpg"},
       {L"thumb test.jpg", VK_RETURN, {L"1031 "}, first, first},
   };
+  int offers = 0;
+  form.container->onKey = [&](const MSG& message, DWORD) {
+    offers += message.message == WM_KEYDOWN && message.wParam != VK_F2 ? 1 : 0;
+    return false;
+  };
   for (const auto& row : rows) {
     SCOPED_TRACE(testing::Message() << row.typed << " " << row.key);
     form.events.clear();
@@ -279,7 +284,10 @@ TEST(ThumbNailControl, UploadsRenamesInPlaceAndDeletes) {
     const std::wstring before = form.Selected();
     EXPECT_EQ(TextOf(form.Editor()), before);
     form.events.clear();
-    // All of the name is selected, so typing replaces it.
+    // These keys are the editor's, not the form's. All of the name is selected.
+    form.Press(VK_DELETE, form.Editor());
+    form.Press(VK_F5, form.Editor());
+    EXPECT_EQ(TextOf(form.Editor()), L"");
     for (const wchar_t* letter = row.typed; *letter; ++letter)
       SendMessageW(form.Editor(), WM_CHAR, static_cast<WPARAM>(*letter), 0);
     form.Press(row.key, form.Editor());
@@ -295,6 +303,7 @@ TEST(ThumbNailControl, UploadsRenamesInPlaceAndDeletes) {
     const Lines account = Account();
     EXPECT_TRUE(Holds(account, row.name) && !Holds(account, before));
   }
+  EXPECT_EQ(offers, 0);
 
   form.events.clear();
   form.control->DeleteFile();
