@@ -1,4 +1,6 @@
 // The controls in a full container of our own, in the system's, and in none.
+#include <thread>
+
 #include "Form.h"
 
 namespace tarnwick::test {
@@ -224,6 +226,46 @@ TEST(ListControl, UploadsDownloadsRenamesAndDeletes) {
   form.list->DeleteFile();
   EXPECT_NE(std::find(form.events.begin(), form.events.end(), L"1001 "), form.events.end());
   EXPECT_NE(form.Select(L"renamed test.jpg"), L"renamed test.jpg");
+}
+
+// Two threads with a control each, at the same time: each has a session, a listing and a filter of its own.
+TEST(ListControl, TwoApartmentsWorkAtOnce) {
+  struct Apartment {
+    const wchar_t* filter;
+    const wchar_t* shown;
+    const wchar_t* hidden;
+    int right = 0;
+  } apartments[] = {{L"gif", L"wizard.gif", L"rose.jpg"}, {L"jpg", L"rose.jpg", L"wizard.gif"}};
+  std::vector<std::thread> threads;
+  for (Apartment& apartment : apartments)
+    threads.emplace_back([&apartment] {
+      OleInitialize(nullptr);
+      {
+        ComPtr<_ctrlListImage> list;
+        CoCreateInstance(CLSID_ctrlListImage, nullptr, CLSCTX_INPROC_SERVER, __uuidof(_ctrlListImage),
+                         list.ReceiveVoid());
+        list->putref_mobjFileupload(LoggedOnClient().Get());
+        const auto selects = [&](const wchar_t* name) {
+          Bstr text(name);
+          BSTR given = text;
+          VARIANT ignored = {};
+          list->UploadedFileSetFocus(&given, &ignored);
+          Bstr selected;
+          list->SelectedFileName(selected.Receive());
+          return selected.Text() == name;
+        };
+        for (int i = 0; i < 20; ++i) {
+          Bstr text(apartment.filter);
+          BSTR given = text;
+          VARIANT_BOOL done = VARIANT_FALSE;
+          list->Init(&given, &done);
+          apartment.right += done && selects(apartment.shown) && !selects(apartment.hidden) ? 1 : 0;
+        }
+      }
+      OleUninitialize();
+    });
+  for (std::thread& thread : threads) thread.join();
+  for (const Apartment& apartment : apartments) EXPECT_EQ(apartment.right, 20) << apartment.filter;
 }
 
 // A host without a container, which lets go of the control in the first event.
