@@ -391,6 +391,38 @@ TEST_F(ThumbNailTest, EditsTheNameInPlace) {
   ExpectLog({"8888 ", "editor 2 new & old.gif", "editor hides"});
 }
 
+// A host calls the control while the editor is open, or while a page waits for its pictures.
+TEST_F(ThumbNailTest, TakesCallsOfTheHostInBetween) {
+  ListNumbers(8);
+  control.EnableRename(true);
+  control.OnKeyDown(113);
+  EXPECT_EQ(Validate("x.gif"), "1031 ,");
+  EXPECT_EQ(std::ranges::count(log, "editor hides"), 1);
+  EXPECT_EQ(page.Look(), "x.gif* 2.gif 3.gif 4.gif ");
+
+  // The file that is asked for during the fill of another page is the selected one.
+  fake.files.files.erase(CopyOf("5.gif"));
+  downloader.waits = {[&](FakeDownloader& from) {
+    control.UploadedFileSetFocus(u"8.gif");
+    Arrives(from);
+  }};
+  Scroll(2);
+  EXPECT_EQ(page.Look(), "5.gif 6.gif 7.gif 8.gif* ");
+
+  // Somebody logs on during the fill: the listing is not taken for the new user's.
+  fake.files.files.erase(CopyOf("x.gif"));
+  downloader.waits = {[&](FakeDownloader& from) {
+    fake.apartment.listLoaded = false;
+    Arrives(from);
+  }};
+  EXPECT_TRUE(control.Init(u"*"));
+  EXPECT_FALSE(fake.apartment.listLoaded);
+
+  // Without a selected picture there is nothing to rename, and nobody is asked to.
+  List("");
+  EXPECT_EQ(Validate("y.gif"), "1033 ,");
+}
+
 TEST_F(ThumbNailTest, NamesThatAreRefusedOrTaken) {
   ListNumbers(3);
   const struct {
