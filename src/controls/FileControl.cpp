@@ -493,7 +493,7 @@ void FileControl::OnDrop(DragData& data, const std::vector<Text>& files, std::in
   events_.OLEDragDrop(data, effect, at);
   if (own || files.empty()) return DroppedNoFiles(own);
   // The host may clear the data in an event of the walk.
-  const std::vector<Text> walked(files);
+  const std::vector<Text> walked(files.begin(), files.end());
   for (const Text& path : walked) {
     if (StopsDrop()) break;
     Raise(event::kFileDrop, path);
