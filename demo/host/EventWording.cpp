@@ -20,7 +20,7 @@ const wchar_t* Words(int code) {
     case 1020:
       return L"files are dragged over";
     case 1021:
-      return L"dropped from the control itself";
+      return L"dropped, but no files from outside";
     case 1022:
       return L"selection about to change";
     case 1023:
@@ -28,7 +28,7 @@ const wchar_t* Words(int code) {
     case 1024:
       return L"open";
     case 1031:
-      return L"renamed to";
+      return L"renamed";
     case 1032:
       return L"another picture has this name";
     case 1033:

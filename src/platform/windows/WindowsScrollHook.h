@@ -11,7 +11,8 @@ class WindowsScrollHook {
  public:
   // `state` is the apartment's; it outlives this object.
   explicit WindowsScrollHook(ScrollHookState& state) : state_(state) {}
-  // The procedure stays with the window. What still comes for it then goes to the system's own handling.
+  // The procedure stays with the window. What still comes for it then goes to its class's own
+  // procedure.
   ~WindowsScrollHook();
   WindowsScrollHook(const WindowsScrollHook&) = delete;
   WindowsScrollHook& operator=(const WindowsScrollHook&) = delete;
