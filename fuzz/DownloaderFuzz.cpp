@@ -32,7 +32,7 @@ struct Actions : DownloadActions {
   void Received(std::int32_t bytes) override {
     if (bytes < 0) std::abort();
   }
-  void ReplyLine(std::string_view) override {}
+  void HeaderFound(std::string_view, std::int32_t) override {}
   void Finished() override { ++ends; }
   void Failed(bool) override { ++ends; }
 };
