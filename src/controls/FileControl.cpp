@@ -280,11 +280,11 @@ std::shared_ptr<CUpload> FileControl::RecordRenamed(const Text& oldName, const T
     std::shared_ptr<CUpload> record = all.At(i);
     if (record->FileName != oldName) continue;
     const Text oldCopy = LocalCopyOf(record->FilePath);
+    FileList& shown = apartment_.shownFiles;
+    const std::size_t shownAt = shown.PositionOf(record->FilePath);
     GiveName(*record, newName);
     SetAddress(all, i, record->FilePath);
-    FileList& shown = apartment_.shownFiles;
-    for (std::size_t k = 1; k <= shown.Count(); ++k)
-      if (shown.At(k) == record) SetAddress(shown, k, record->FilePath);
+    if (shownAt != 0 && shown.At(shownAt) == record) SetAddress(shown, shownAt, record->FilePath);
     MoveLocalCopy(oldCopy, LocalCopyOf(record->FilePath));
     return record;
   }

@@ -154,8 +154,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   }
   // Files are dragged over the control's edge.
   virtual void OnFilesEnter() {}
-  // `files` are the paths of the dropped files, empty when the data holds none; they last as long as the
-  // call.
+  // `files` are the paths of the dropped files, empty when the data holds none. The host may clear
+  // the data in the events.
   void OnDrop(DragData& data, const std::vector<Text>& files, std::int32_t& effect, const DragPoint& at);
   void OnCompleteDrag(std::int32_t effect);
 

@@ -58,8 +58,7 @@ class Kept {
   std::size_t length_ = 0;
 };
 
-// ---- PNG
-// -----------------------------------------------------------------------------------------------------
+// --- PNG ---
 
 // The smallest pieces that programs write are of about 8 KiB, or of a line; this is more than either needs.
 constexpr int kMostPngChunks = 200'000;
@@ -110,8 +109,7 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
   return facts;
 }
 
-// ---- GIF
-// -----------------------------------------------------------------------------------------------------
+// --- GIF ---
 
 // A decoder empties its table of 4,096 entries with each clear code.
 constexpr std::uint64_t kMostClearCodes = 500'000;
@@ -220,8 +218,7 @@ std::optional<PictureFacts> ReduceGif(std::span<std::uint8_t> file) {
   return facts;
 }
 
-// ---- JPEG
-// ----------------------------------------------------------------------------------------------------
+// --- JPEG ---
 
 // Tables of all scans together. A scan of a camera's or an image program's picture has about 1 KiB.
 constexpr std::size_t kMostJpegTables = 1'000'000;
@@ -303,8 +300,7 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
   return facts;
 }
 
-// ---- BMP
-// -----------------------------------------------------------------------------------------------------
+// --- BMP ---
 
 // True when the run-length code fills every line of the picture. A decoder may leave what is skipped as it
 // found the memory.

@@ -111,7 +111,9 @@ char16_t LowerCase(char16_t unit) {
   if (within(u'A', u'Z')) return plus(32);
   if (unit < 0xC0) return unit;
   if (within(0xC0, 0xDE)) return unit == 0xD7 ? unit : plus(32);  // Latin-1
-  if (within(0x100, 0x137) || within(0x14A, 0x177)) return plus(unit % 2 == 0 ? 1 : 0);
+  // Pairs, except for the Turkish I with and without a dot, which are letters of their own.
+  if (within(0x100, 0x12F) || within(0x132, 0x137) || within(0x14A, 0x177))
+    return plus(unit % 2 == 0 ? 1 : 0);
   if (within(0x139, 0x148) || within(0x179, 0x17E)) return plus(unit % 2 == 0 ? 0 : 1);
   if (within(0x391, 0x3A9)) return plus(32);  // Greek
   if (within(0x400, 0x40F)) return plus(80);  // Cyrillic

@@ -399,6 +399,14 @@ class ListImageDownload : public ListImageTest {
   }
 };
 
+TEST_F(ListImageDownload, ARenameIsKnownToTheThumbnails) {
+  List({{"a.jpg", "1"}});
+  const auto record = fake.apartment.allFiles.At(1);
+  fake.apartment.shownFiles.Add(record, record->FilePath);
+  EXPECT_TRUE(control.RenameFile(u"a.jpg", u"b.jpg"));
+  EXPECT_EQ(fake.apartment.shownFiles.PositionOf(u"http://h/u/b.jpg"), 1U);
+}
+
 TEST_F(ListImageDownload, Transcript) {
   List({{"a.jpg", "1"}, {"b.jpg", "5"}});
   view.Select(1, true);

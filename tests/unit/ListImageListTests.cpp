@@ -159,6 +159,7 @@ TEST_F(ListImageTest, ChecksNames) {
   EXPECT_TRUE(EqualsIgnoringCase(u"\u00C4\u0152\u017D\u03A3\u0416\u0401.JPG",
                                  u"\u00E4\u0153\u017E\u03C3\u0436\u0451.jpg"));
   EXPECT_FALSE(EqualsIgnoringCase(u"\u00D7\u0138", u"\u00F7\u0139"));
+  EXPECT_FALSE(EqualsIgnoringCase(u"\u0130", u"\u0131"));
   for (const TextView free : {u"", u"a", u"a.jpgx"}) EXPECT_TRUE(control.CheckIfFileDoesNotExist(free));
   // The list counts too.
   fake.apartment.allFiles.Clear();

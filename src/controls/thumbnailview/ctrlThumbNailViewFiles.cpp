@@ -140,8 +140,10 @@ void ctrlThumbNailView::ShowRenamed(const std::shared_ptr<CUpload>& record, cons
       Find(shown, [&](const CUpload& file) { return &file == record.get() || file.FileName == oldName; });
   if (position == 0) return;
   const std::shared_ptr<CUpload> renamed = shown.At(position);
-  if (renamed != record) GiveName(*renamed, newName);
-  SetAddress(shown, position, renamed->FilePath);
+  if (renamed != record) {
+    GiveName(*renamed, newName);
+    SetAddress(shown, position, renamed->FilePath);
+  }
   if (FileNameFromUrl(selectedPath_) == oldName) selectedPath_ = renamed->FilePath;
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     if (FileNameFromUrl(PathOf(slot)) != oldName) continue;

@@ -70,6 +70,16 @@ using Attributes = Lent<TYPEATTR, &ITypeInfo::ReleaseTypeAttr>;
 using Function = Lent<FUNCDESC, &ITypeInfo::ReleaseFuncDesc>;
 using Variable = Lent<VARDESC, &ITypeInfo::ReleaseVarDesc>;
 
+// What a type says of itself; each has a help string.
+struct Described {
+  explicit Described(ITypeInfo& type) : names(NamesOf(type, MEMBERID_NIL)), attributes(type) {
+    type.GetTypeAttr(attributes.Receive());
+    EXPECT_NE(names.help, "") << names.name;
+  }
+  const Named names;
+  Attributes attributes;
+};
+
 // The words of the table for a type; pointers to interfaces are objects of that interface.
 std::string WordOf(ITypeInfo& type, const TYPEDESC& described) {
   switch (described.vt) {
@@ -146,10 +156,9 @@ std::string SignatureOf(ITypeInfo& type, const FUNCDESC& function) {
 // The members in the order of the interface; a property that can be read and set is one line.
 std::string InterfaceLines(ITypeInfo& shown) {
   std::ostringstream lines;
-  const Named names = NamesOf(shown, MEMBERID_NIL);
-  Attributes attributes(shown);
-  shown.GetTypeAttr(attributes.Receive());
-  EXPECT_NE(names.help, "") << names.name;
+  const Described described(shown);
+  const Named& names = described.names;
+  const Attributes& attributes = described.attributes;
   EXPECT_NE(attributes->wTypeFlags & TYPEFLAG_FHIDDEN, 0) << names.name;
   lines << "interface " << names.name << "\n";
 
@@ -190,11 +199,10 @@ std::string InterfaceLines(ITypeInfo& shown) {
 
 std::string EventLines(ITypeInfo& type) {
   std::ostringstream lines;
-  const Named names = NamesOf(type, MEMBERID_NIL);
-  Attributes attributes(type);
-  type.GetTypeAttr(attributes.Receive());
+  const Described described(type);
+  const Named& names = described.names;
+  const Attributes& attributes = described.attributes;
   EXPECT_NE(attributes->wTypeFlags & TYPEFLAG_FHIDDEN, 0) << names.name;
-  EXPECT_NE(names.help, "") << names.name;
   lines << "events " << names.name << "\n";
   for (UINT i = 0; i < attributes->cFuncs; ++i) {
     Function function(type);
@@ -210,10 +218,9 @@ std::string EventLines(ITypeInfo& type) {
 
 std::string EnumerationLines(ITypeInfo& type) {
   std::ostringstream lines;
-  const Named names = NamesOf(type, MEMBERID_NIL);
-  Attributes attributes(type);
-  type.GetTypeAttr(attributes.Receive());
-  EXPECT_NE(names.help, "") << names.name;
+  const Described described(type);
+  const Named& names = described.names;
+  const Attributes& attributes = described.attributes;
   lines << "enumeration " << names.name << "\n";
   for (UINT i = 0; i < attributes->cVars; ++i) {
     Variable variable(type);
@@ -228,10 +235,9 @@ std::string EnumerationLines(ITypeInfo& type) {
 // "class NAME [creatable] [control] default INTERFACE [events INTERFACE]"
 std::string ClassLine(ITypeInfo& type) {
   std::ostringstream line;
-  const Named names = NamesOf(type, MEMBERID_NIL);
-  Attributes attributes(type);
-  type.GetTypeAttr(attributes.Receive());
-  EXPECT_NE(names.help, "") << names.name;
+  const Described described(type);
+  const Named& names = described.names;
+  const Attributes& attributes = described.attributes;
   line << "class " << names.name << ((attributes->wTypeFlags & TYPEFLAG_FCANCREATE) != 0 ? " creatable" : "")
        << ((attributes->wTypeFlags & TYPEFLAG_FCONTROL) != 0 ? " control" : "");
   for (UINT i = 0; i < attributes->cImplTypes; ++i) {
