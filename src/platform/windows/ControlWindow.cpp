@@ -31,7 +31,25 @@ HWND ParkingWindow(HINSTANCE module) {
   return parking;
 }
 
+int SystemDpi() {
+  const HDC screen = GetDC(nullptr);
+  const int dpi = GetDeviceCaps(screen, LOGPIXELSX);
+  ReleaseDC(nullptr, screen);
+  return dpi;
+}
+
+// Before Windows 10 all screens have the system's.
+int DpiOf(HWND window) {
+  static const auto get = reinterpret_cast<UINT(WINAPI*)(HWND)>(
+      reinterpret_cast<void*>(GetProcAddress(GetModuleHandleW(L"user32.dll"), "GetDpiForWindow")));
+  const UINT dpi = get ? get(window) : 0;
+  return dpi != 0 ? static_cast<int>(dpi) : SystemDpi();
+}
+
 }  // namespace
+
+ControlWindow::ControlWindow(HINSTANCE module, const wchar_t* className)
+    : module_(module), className_(className), dpi_(SystemDpi()) {}
 
 ControlWindow::~ControlWindow() {
   if (!window_) return;
@@ -97,11 +115,29 @@ void ControlWindow::Watch(HWND window) {
   SetWindowSubclass(window, ChildProc, kSubclass, reinterpret_cast<DWORD_PTR>(window_));
 }
 
-int ControlWindow::Dpi() {
-  const HDC screen = GetDC(nullptr);
-  const int dpi = GetDeviceCaps(screen, LOGPIXELSX);
-  ReleaseDC(nullptr, screen);
-  return dpi;
+HFONT ControlWindow::Font() const {
+  if (font_) return font_;
+  return ownFont_ ? ownFont_.Get() : static_cast<HFONT>(GetStockObject(DEFAULT_GUI_FONT));
+}
+
+void ControlWindow::FollowDpi() {
+  // Nobody sees it, and it may come back to where it was.
+  if (GetAncestor(window_, GA_PARENT) == parking) return;
+  const int now = DpiOf(window_);
+  if (now == dpi_) return;
+  const int before = std::exchange(dpi_, now);
+  const int system = SystemDpi();
+  // The old one is in use until the look is applied.
+  const FontOwner old = std::exchange(ownFont_, {});
+  if (now != system) {
+    LOGFONTW font = {};
+    GetObjectW(GetStockObject(DEFAULT_GUI_FONT), sizeof font, &font);
+    font.lfHeight = MulDiv(font.lfHeight, now, system);
+    ownFont_ = FontOwner(CreateFontIndirectW(&font));
+  }
+  DpiChanged(before);
+  ApplyLook();
+  InvalidateRect(window_, nullptr, TRUE);
 }
 
 void ControlWindow::Park() {
@@ -191,6 +227,8 @@ LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wPa
         SetCursor(PointerOf(true));
         return LRESULT{TRUE};
       }
+      // Programs that follow the screen are told so; others move the control to another window.
+      if (message == WM_DPICHANGED_AFTERPARENT || message == WM_WINDOWPOSCHANGED) self->FollowDpi();
       const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
       const LRESULT result = answer                  ? *answer
                              : IsAlive(self, window) ? self->OnLook(message, wParam, lParam)

@@ -8,6 +8,7 @@
 #include <optional>
 #include <utility>
 
+#include "platform/windows/Owner.h"
 #include "support/RuntimeError.h"
 
 namespace tarnwick {
@@ -28,7 +29,7 @@ class ControlWindow {
 
  protected:
   // `module` is where the window's class belongs.
-  ControlWindow(HINSTANCE module, const wchar_t* className) : module_(module), className_(className) {}
+  ControlWindow(HINSTANCE module, const wchar_t* className);
   ~ControlWindow();
 
   // Makes what is inside the window; false on failure.
@@ -39,6 +40,8 @@ class ControlWindow {
   virtual void FocusLeft() = 0;
   // Font or colours are others now. Called only while there is a window.
   virtual void ApplyLook() = 0;
+  // The window is on a screen of other dots per inch than `before`. ApplyLook follows.
+  virtual void DpiChanged(int before) = 0;
   // A message for the window of the control or for a child of it; nullopt leaves it to that window's own
   // procedure. The control may have ended when a call that runs code of the host returns: see IsAlive.
   virtual std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) = 0;
@@ -55,11 +58,13 @@ class ControlWindow {
   // question that may be asked of an object that is gone.
   static bool IsAlive(const ControlWindow* object, HWND outer) { return Of(outer) == object; }
 
-  HFONT Font() const { return font_ ? font_ : static_cast<HFONT>(GetStockObject(DEFAULT_GUI_FONT)); }
+  // The container's, as it is: one that follows the screen gives another one there. Else the system's, as
+  // large as the screen needs it.
+  HFONT Font() const;
   COLORREF TextColor() const { return textColor_.value_or(GetSysColor(COLOR_WINDOWTEXT)); }
   COLORREF BackColor() const { return backColor_.value_or(GetSysColor(COLOR_WINDOW)); }
-  // Dots per inch of the screen.
-  static int Dpi();
+  // Dots per inch of the screen that the window is on; of the system before there is a window.
+  int Dpi() const { return dpi_; }
 
   void ShowHourglass(bool hourglass);
   bool HasHourglass() const { return hourglass_; }
@@ -75,6 +80,7 @@ class ControlWindow {
   LRESULT OnLook(UINT message, WPARAM wParam, LPARAM lParam) const;
   static void TellFocusLeft(ControlWindow* self, HWND outer, UINT message, WPARAM wParam);
   bool MakeWindow();
+  void FollowDpi();
 
   const HINSTANCE module_;
   const wchar_t* const className_;
@@ -84,7 +90,10 @@ class ControlWindow {
   // Handlers of messages that run now, one inside the other.
   int depth_ = 0;
   bool hourglass_ = false;
+  int dpi_;
   HFONT font_ = nullptr;
+  // The system's font for a screen of other dots per inch than the system's; empty on such a screen.
+  FontOwner ownFont_;
   std::optional<COLORREF> textColor_;
   std::optional<COLORREF> backColor_;
 };

@@ -72,4 +72,11 @@ struct FindKind {
 };
 using FindOwner = Owner<FindKind>;
 
+struct FontKind {
+  using Handle = HFONT;
+  static Handle None() { return nullptr; }
+  static void Close(Handle handle) { DeleteObject(handle); }
+};
+using FontOwner = Owner<FontKind>;
+
 }  // namespace tarnwick

@@ -39,10 +39,7 @@ bool WindowsListView::MakeChildren() {
                         LVS_EDITLABELS | LVS_SHAREIMAGELISTS | LVS_SINGLESEL);
   label_ = MakeChild(Outer(), L"STATIC", WideFromText(labelText_).c_str(), SS_CENTER | SS_NOPREFIX);
   if (!list_ || !label_) return false;
-  largeIcons_ = MakeLargeIcons(Dpi());
-  smallIcons_ = MakeSmallIcons(Dpi());
-  ListView_SetImageList(list_, largeIcons_.Get(), LVSIL_NORMAL);
-  ListView_SetImageList(list_, smallIcons_.Get(), LVSIL_SMALL);
+  SetIcons();
   // What an earlier window showed; its selection is lost.
   if (multiple_) SetWindowLongW(list_, GWL_STYLE, GetWindowLongW(list_, GWL_STYLE) & ~LVS_SINGLESEL);
   AddColumns();
@@ -64,6 +61,23 @@ void WindowsListView::ApplyLook() {
   ListView_SetBkColor(list_, BackColor());
 }
 
+void WindowsListView::SetIcons() {
+  ImageListOwner large = MakeLargeIcons(Dpi());
+  ImageListOwner small = MakeSmallIcons(Dpi());
+  ListView_SetImageList(list_, large.Get(), LVSIL_NORMAL);
+  ListView_SetImageList(list_, small.Get(), LVSIL_SMALL);
+  largeIcons_ = std::move(large);
+  smallIcons_ = std::move(small);
+}
+
+void WindowsListView::DpiChanged(int before) {
+  SetIcons();
+  // The user may have made them wider.
+  for (int column = 0; column < static_cast<int>(titles_.size()); ++column)
+    ListView_SetColumnWidth(list_, column, MulDiv(ListView_GetColumnWidth(list_, column), Dpi(), before));
+  Layout();
+}
+
 void WindowsListView::Layout() const {
   RECT client = {};
   GetClientRect(Outer(), &client);
@@ -74,7 +88,6 @@ void WindowsListView::Layout() const {
 }
 
 void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
-  const int dpi = GetDeviceCaps(dc, LOGPIXELSX);
   const HGDIOBJ oldFont = SelectObject(dc, Font());
   SetDCBrushColor(dc, BackColor());
   FillRect(dc, &bounds, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
@@ -90,7 +103,7 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
     SelectObject(dc, oldFont);
     return;
   }
-  const int width = MulDiv(kColumnWidth, dpi, 96);
+  const int width = MulDiv(kColumnWidth, Dpi(), 96);
   int top = bounds.top;
   for (std::size_t row = 0; row <= count_ && top < bounds.bottom; ++row, top += line) {
     int left = bounds.left;
@@ -105,7 +118,7 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
       if (row > 0 && column == 0 && smallIcons_) {
         ImageList_Draw(smallIcons_.Get(), (user_.IsGif(row - 1) ? icon::kSmallGif : icon::kSmallJpeg) - 1, dc,
                        cell.left, cell.top, ILD_TRANSPARENT);
-        cell.left += MulDiv(18, dpi, 96);
+        cell.left += MulDiv(18, Dpi(), 96);
       }
       const Text text = row == 0 ? titles_[column] : user_.ItemText(row - 1, column);
       DrawTextW(dc, WideFromText(text).c_str(), -1, &cell, kCell);

@@ -71,10 +71,12 @@ class WindowsListView : public ListView, public ControlWindow {
   void FocusLeft() override { user_.LostFocus(); }
   void WindowGone() override;
   void ApplyLook() override;
+  void DpiChanged(int before) override;
   std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;
   std::optional<LRESULT> OnListMessage(UINT message, WPARAM wParam, LPARAM lParam);
   LRESULT OnNotify(const NMHDR& header);
   void Layout() const;
+  void SetIcons();
   void AddColumns();
 
   ListViewUser& user_;

@@ -81,20 +81,17 @@ bool WindowsThumbnailPage::MakeChildren() {
   // The system's own classes, so that screen readers know what they are.
   const HWND outer = Outer();
   SetWindowTextW(outer, kPageName);
-  gridWindow_ = MakeChild(outer, L"STATIC", kPageName,
-                          WS_TABSTOP | WS_CLIPCHILDREN | SS_OWNERDRAW | SS_NOTIFY, Pixels(layout::kGrid));
+  gridWindow_ =
+      MakeChild(outer, L"STATIC", kPageName, WS_TABSTOP | WS_CLIPCHILDREN | SS_OWNERDRAW | SS_NOTIFY);
   // The editor lies above the slots. What stands before it is its name, even if it is never shown.
   MakeChild(gridWindow_, L"STATIC", kEditorName, SS_NOPREFIX);
   editorWindow_ = MakeChild(gridWindow_, L"EDIT", L"", WS_BORDER | WS_CLIPSIBLINGS | ES_AUTOHSCROLL);
   for (std::size_t slot = 0; slot < kSlotCount; ++slot)
-    slots_[slot].window = MakeChild(gridWindow_, L"STATIC", L"", WS_CLIPSIBLINGS | SS_OWNERDRAW | SS_NOTIFY,
-                                    Pixels(kFrames[slot]));
-  scrollWindow_ =
-      MakeChild(outer, L"SCROLLBAR", kScrollName, WS_TABSTOP | SBS_VERT, Pixels(layout::kScrollBar));
-  messageWindow_ = MakeChild(outer, L"STATIC", L"", SS_CENTER | SS_NOPREFIX, Pixels(layout::kMessage));
+    slots_[slot].window = MakeChild(gridWindow_, L"STATIC", L"", WS_CLIPSIBLINGS | SS_OWNERDRAW | SS_NOTIFY);
+  scrollWindow_ = MakeChild(outer, L"SCROLLBAR", kScrollName, WS_TABSTOP | SBS_VERT);
+  messageWindow_ = MakeChild(outer, L"STATIC", L"", SS_CENTER | SS_NOPREFIX);
   linkWindow_ = MakeChild(outer, L"BUTTON", L"", WS_TABSTOP | BS_OWNERDRAW);
-  switchWindow_ = MakeChild(outer, L"BUTTON", kSwitchText, WS_TABSTOP | WS_VISIBLE | BS_PUSHBUTTON,
-                            Pixels(layout::kButton));
+  switchWindow_ = MakeChild(outer, L"BUTTON", kSwitchText, WS_TABSTOP | WS_VISIBLE | BS_PUSHBUTTON);
   for (const HWND window :
        {gridWindow_, editorWindow_, scrollWindow_, messageWindow_, linkWindow_, switchWindow_})
     if (!window) return false;
@@ -102,15 +99,37 @@ bool WindowsThumbnailPage::MakeChildren() {
     if (!At(slot).window) return false;
     ApplyCaption(slot);
   }
+  PlaceChildren();
   ApplyScroll();
   ApplyContent();
   return true;
 }
 
+// All but the link, whose place depends on its text.
+void WindowsThumbnailPage::PlaceChildren() const {
+  const auto place = [this](HWND window, const layout::TwipRect& area) {
+    const RECT at = Pixels(area);
+    MoveWindow(window, at.left, at.top, at.right - at.left, at.bottom - at.top, TRUE);
+  };
+  place(gridWindow_, layout::kGrid);
+  for (std::size_t slot = 0; slot < kSlotCount; ++slot) place(slots_[slot].window, kFrames[slot]);
+  place(scrollWindow_, layout::kScrollBar);
+  place(messageWindow_, layout::kMessage);
+  place(switchWindow_, layout::kButton);
+}
+
+void WindowsThumbnailPage::DpiChanged(int) {
+  PlaceChildren();
+  for (Slot& slot : slots_)
+    if (slot.picture) LoadPictureOf(slot);
+  PlaceEditor();
+}
+
 void WindowsThumbnailPage::WindowGone() {
   gridWindow_ = scrollWindow_ = messageWindow_ = linkWindow_ = switchWindow_ = editorWindow_ = nullptr;
   for (Slot& slot : slots_) slot.window = nullptr;
-  editing_ = tellingFocus_ = tellingEditor_ = false;
+  edited_ = 0;
+  tellingFocus_ = tellingEditor_ = false;
   dragFrom_.reset();
 }
 
@@ -236,20 +255,29 @@ void WindowsThumbnailPage::ApplyCaption(int slot) {
 
 void WindowsThumbnailPage::SetPicture(int slot, TextView path, const PicturePlace& place) {
   Slot& changed = At(slot);
-  const auto pixels = [&](double twips) { return layout::Pixels(twips, dpi_); };
-  changed.place = {pixels(place.left), pixels(place.top), pixels(place.left + place.width),
-                   pixels(place.top + place.height)};
-  // Of a very long or very high picture a line remains.
-  const int width = std::max<int>(1, changed.place.right - changed.place.left);
-  const int height = std::max<int>(1, changed.place.bottom - changed.place.top);
-  changed.place.right = changed.place.left + width;
-  changed.place.bottom = changed.place.top + height;
+  changed.path = WideFromText(path);
+  changed.twips = place;
   changed.picture = {};
-  changed.picture = LoadPicture(WideFromText(path), width, height, BackColor());
+  LoadPictureOf(changed);
   if (!changed.window) return;
   // At once: the next picture may take its time.
   InvalidateRect(changed.window, nullptr, FALSE);
   UpdateWindow(changed.window);
+}
+
+// A picture that is no longer there to be loaded again stays as it was loaded.
+void WindowsThumbnailPage::LoadPictureOf(Slot& slot) const {
+  const auto pixels = [this](double twips) { return layout::Pixels(twips, Dpi()); };
+  const PicturePlace& twips = slot.twips;
+  slot.place = {pixels(twips.left), pixels(twips.top), pixels(twips.left + twips.width),
+                pixels(twips.top + twips.height)};
+  // Of a very long or very high picture a line remains.
+  const int width = std::max<int>(1, slot.place.right - slot.place.left);
+  const int height = std::max<int>(1, slot.place.bottom - slot.place.top);
+  slot.place.right = slot.place.left + width;
+  slot.place.bottom = slot.place.top + height;
+  if (BitmapOwner picture = LoadPicture(slot.path, width, height, BackColor()))
+    slot.picture = std::move(picture);
 }
 
 void WindowsThumbnailPage::SetSelected(int slot, bool selected) {
@@ -341,9 +369,9 @@ void WindowsThumbnailPage::ScrollTo(int value) {
 
 // --- The editor ---
 
-void WindowsThumbnailPage::ShowEditor(int slot, TextView name) {
-  if (!Window()) return;
-  const RECT frame = Pixels(kFrames[static_cast<std::size_t>(slot) - 1]);
+void WindowsThumbnailPage::PlaceEditor() const {
+  if (edited_ == 0) return;
+  const RECT frame = Pixels(kFrames[static_cast<std::size_t>(edited_) - 1]);
   const RECT caption = Pixels(kCaption);
   TEXTMETRICW metrics = {};
   const HDC dc = GetDC(editorWindow_);
@@ -355,16 +383,21 @@ void WindowsThumbnailPage::ShowEditor(int slot, TextView name) {
   const int height = std::min<int>(metrics.tmHeight + 2 * Pixels(45), caption.bottom - caption.top);
   MoveWindow(editorWindow_, frame.left + caption.left, frame.top + caption.top, caption.right - caption.left,
              height, TRUE);
+}
+
+void WindowsThumbnailPage::ShowEditor(int slot, TextView name) {
+  if (!Window()) return;
+  edited_ = slot;
+  PlaceEditor();
   SetWindowTextW(editorWindow_, WideFromText(name).c_str());
-  editing_ = true;
   ShowWindow(editorWindow_, SW_SHOW);
   SetFocus(editorWindow_);
   SendMessageW(editorWindow_, EM_SETSEL, 0, -1);
 }
 
 void WindowsThumbnailPage::HideEditor() {
-  if (!editing_) return;
-  editing_ = false;
+  if (edited_ == 0) return;
+  edited_ = 0;
   if (GetFocus() == editorWindow_) SetFocus(gridWindow_);
   ShowWindow(editorWindow_, SW_HIDE);
 }
@@ -543,7 +576,7 @@ std::optional<LRESULT> WindowsThumbnailPage::OnEditorMessage(UINT message, WPARA
       return std::nullopt;
     case WM_KILLFOCUS: {
       const LRESULT result = DefSubclassProc(editorWindow_, message, wParam, lParam);
-      if (editing_ && !tellingEditor_) tell(&ThumbnailPageUser::EditorLeft);
+      if (edited_ != 0 && !tellingEditor_) tell(&ThumbnailPageUser::EditorLeft);
       return result;
     }
     default:
@@ -609,12 +642,13 @@ void WindowsThumbnailPage::DrawSlot(HDC dc, const RECT& frame, const Slot& slot,
     const RECT place = placed(slot.place);
     const MemoryDcOwner memory(CreateCompatibleDC(nullptr));
     const Selected picture(memory.Get(), slot.picture.Get());
-    const int width = place.right - place.left;
-    const int height = place.bottom - place.top;
-    // One to one on the screen; a printer may map pixels to many.
+    BITMAP bitmap = {};
+    GetObjectW(slot.picture.Get(), sizeof bitmap, &bitmap);
+    // One to one on the screen, as a rule; a printer may map pixels to many.
     SetStretchBltMode(dc, HALFTONE);
     SetBrushOrgEx(dc, 0, 0, nullptr);
-    StretchBlt(dc, place.left, place.top, width, height, memory.Get(), 0, 0, width, height, SRCCOPY);
+    StretchBlt(dc, place.left, place.top, place.right - place.left, place.bottom - place.top, memory.Get(), 0,
+               0, bitmap.bmWidth, bitmap.bmHeight, SRCCOPY);
   }
   DrawCaption(dc, placed(Pixels(kCaption)), slot);
   if (slot.selected && focus) {

@@ -17,13 +17,6 @@
 
 namespace tarnwick {
 
-struct FontKind {
-  using Handle = HFONT;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { DeleteObject(handle); }
-};
-using FontOwner = Owner<FontKind>;
-
 class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
  public:
   // Size of a control that shows all of the page, in HIMETRIC.
@@ -62,6 +55,9 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   struct Slot {
     HWND window = nullptr;
     Text caption;
+    // Where the picture comes from and goes to.
+    std::wstring path;
+    PicturePlace twips;
     // As large as it is shown, at `place` in the frame; empty when there is none.
     BitmapOwner picture;
     RECT place = {};
@@ -74,6 +70,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void FocusLeft() override { user_.LostFocus(); }
   void WindowGone() override;
   void ApplyLook() override;
+  void DpiChanged(int before) override;
   std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;
   std::optional<LRESULT> OnOuterMessage(UINT message, WPARAM wParam, LPARAM lParam);
   std::optional<LRESULT> OnGridMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
@@ -89,6 +86,9 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   Slot& At(int slot) { return slots_[static_cast<std::size_t>(slot) - 1]; }
   int SlotOf(HWND window) const;
   HWND FirstStop() const;
+  void PlaceChildren() const;
+  void LoadPictureOf(Slot& slot) const;
+  void PlaceEditor() const;
   void ApplyContent() const;
   void ApplyCaption(int slot);
   void ApplyScroll() const;
@@ -99,11 +99,10 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void DrawCaption(HDC dc, RECT area, const Slot& slot) const;
   void DrawLink(HDC dc, RECT area, bool focus) const;
   void DrawScrollBar(HDC dc, const RECT& area) const;
-  int Pixels(int twips) const { return layout::Pixels(twips, dpi_); }
-  RECT Pixels(const layout::TwipRect& area) const { return layout::Pixels(area, dpi_); }
+  int Pixels(int twips) const { return layout::Pixels(twips, Dpi()); }
+  RECT Pixels(const layout::TwipRect& area) const { return layout::Pixels(area, Dpi()); }
 
   ThumbnailPageUser& user_;
-  const int dpi_ = Dpi();
   std::array<Slot, kSlotCount> slots_;
   Content content_ = Content::kNothing;
   Text message_;
@@ -126,7 +125,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   HWND linkWindow_ = nullptr;
   HWND switchWindow_ = nullptr;
   HWND editorWindow_ = nullptr;
-  bool editing_ = false;
+  // The slot whose name is edited, or 0.
+  int edited_ = 0;
   // The user is being told of the focus, or of the end of the edit: what follows from that is no news.
   bool tellingFocus_ = false;
   bool tellingEditor_ = false;
