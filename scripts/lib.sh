@@ -202,3 +202,38 @@ start_hosting() {
 start_ftp() {
   start_server "$1" '^listening on ' scripts/ftp-server "$hosting_address" 21 "$2" "$hosting_user" "$hosting_password"
 }
+
+# ---- The demo host -------------------------------------------------------------------------------------------------
+
+# demo_folders FOLDER: what the demo host uploads, and where it downloads to.
+demo_folders() {
+  mkdir -p "$1/downloads" "$1/upload"
+  # A name with a blank, which the account does not have yet.
+  cp demo/pictures/deep-field.png "$1/upload/deep field.png"
+}
+
+# demo_host ARCH FOLDER LOG [SHOTS]: the host program. FOLDER is relative to the checkout, the others to FOLDER.
+demo_host() {
+  local arch=$1 folder=${2//\//\\}
+  shift 2
+  wine_run "$arch" "build\\windows-$arch\\demo\\host\\tarnwick-demo.exe" "$hosting_server" "$hosting_user" \
+    "$hosting_password" "$hosting_product" "$folder\\upload" "$folder\\downloads" "${@/#/$folder\\}"
+}
+
+# demo_tour ARCH FOLDER NAME: the host program walks through all that it can do, with its log in FOLDER/events-NAME.log
+# and a picture of each step in FOLDER/screenshots-NAME. It waits for each picture.
+demo_tour() {
+  local folder=$2 log=$2/events-$3.log shots=$2/screenshots-$3 host shown
+  mkdir -p "$shots"
+  demo_host "$1" "$folder" "events-$3.log" "screenshots-$3" &
+  host=$!
+  while kill -0 "$host" 2>/dev/null; do
+    shown=$(sed -n 's/\r//; s/^== //p' "$log" 2>/dev/null | tail -n 1)
+    if [[ -n $shown && ! -e $shots/$shown.png ]]; then
+      import -window root "$folder/unfinished.png"
+      mv "$folder/unfinished.png" "$shots/$shown.png"
+    fi
+    sleep 0.1
+  done
+  wait "$host"
+}

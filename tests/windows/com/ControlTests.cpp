@@ -390,6 +390,70 @@ TYPED_TEST(AnyControl, IsShownHiddenMovedAndDesigned) {
   EXPECT_FALSE(designed.container->IsUiActive());
 }
 
+int MeasureOf(const Form& form) {
+  return static_cast<int>(SendMessageW(form.ListWindow(), LVM_GETCOLUMNWIDTH, 0, 0));
+}
+int MeasureOf(const ThumbForm& form) {
+  RECT slot = {};
+  GetClientRect(form.Slot(1), &slot);
+  return slot.right;
+}
+
+// A program that knows nothing of screens has windows of 96 dots per inch on any screen. Moved there, a
+// control of a program that does looks like one that has never been elsewhere.
+TYPED_TEST(AnyControl, FollowsTheScreenOfItsWindow) {
+  const auto set = reinterpret_cast<HANDLE(WINAPI*)(HANDLE)>(reinterpret_cast<void*>(
+      GetProcAddress(GetModuleHandleW(L"user32.dll"), "SetThreadDpiAwarenessContext")));
+  const HDC screen = GetDC(nullptr);
+  const int dpi = GetDeviceCaps(screen, LOGPIXELSX);
+  ReleaseDC(nullptr, screen);
+  if (!set || dpi == 96) GTEST_SKIP() << "needs a finer screen";
+  constexpr int kSize = 400;
+  const auto kUnaware = reinterpret_cast<HANDLE>(-1);
+  const auto kSystemAware = reinterpret_cast<HANDLE>(-2);
+  const auto draw = [&](ControlContainer& container) {
+    container.SetBounds({0, 0, kSize, kSize});
+    EXPECT_EQ(container.Do(OLEIVERB_UIACTIVATE), S_OK);
+    ComPtr<IViewObject2> view;
+    EXPECT_EQ(container.Control()->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
+    return Drawn(kSize, kSize, [&](HDC dc) {
+      constexpr RECTL kAll = {0, 0, kSize, kSize};
+      EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &kAll, nullptr, nullptr, 0),
+                S_OK);
+    });
+  };
+
+  const HANDLE before = set(kUnaware);
+  TypeParam native;
+  native.LogOn(TheServer().name);
+  native.Show();
+  ASSERT_TRUE(native.Init(L"*"));
+  const Pixels expected = draw(*native.container);
+  const int measure = MeasureOf(native);
+
+  set(kSystemAware);
+  TypeParam form;
+  form.LogOn(TheServer().name);
+  form.Show();
+  ASSERT_TRUE(form.Init(L"*"));
+  const Pixels fine = draw(*form.container);
+  EXPECT_FALSE(fine == expected);
+  EXPECT_NEAR(MeasureOf(form), MulDiv(measure, dpi, 96), 1);
+  form.container->Close();
+
+  const auto moved = ComPtr<ControlContainer>::Adopt(new ControlContainer(native.frame));
+  ASSERT_EQ(moved->TakeUp(*form.control, ControlContainer::WayIn::kSteps), S_OK);
+  set(kUnaware);
+  EXPECT_TRUE(draw(*moved) == expected);
+  EXPECT_EQ(MeasureOf(form), measure);
+  set(kSystemAware);
+  moved->Close();
+
+  ASSERT_EQ(form.container->TakeUp(*form.control, ControlContainer::WayIn::kSteps), S_OK);
+  EXPECT_TRUE(draw(*form.container) == fine);
+  set(before);
+}
+
 // Every version of the system's container for controls, each with a window class of its own.
 TYPED_TEST(AnyControl, LivesInTheSystemsContainers) {
   for (const std::wstring version : {L"", L"80", L"90", L"100", L"110"}) {

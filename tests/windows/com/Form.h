@@ -46,6 +46,26 @@ inline std::optional<std::string> Contents(const std::wstring& path) {
   return bytes;
 }
 
+using Pixels = std::vector<std::uint32_t>;
+// What `draw` draws.
+inline Pixels Drawn(int width, int height, const std::function<void(HDC)>& draw) {
+  BITMAPINFO info = {};
+  info.bmiHeader = {sizeof info.bmiHeader, width, -height, 1, 32, BI_RGB, 0, 0, 0, 0, 0};
+  void* bits = nullptr;
+  const HDC dc = CreateCompatibleDC(nullptr);
+  const HBITMAP bitmap = CreateDIBSection(dc, &info, DIB_RGB_COLORS, &bits, nullptr, 0);
+  const HGDIOBJ old = SelectObject(dc, bitmap);
+  draw(dc);
+  GdiFlush();
+  const auto* first = static_cast<const std::uint32_t*>(bits);
+  Pixels pixels(first, first + width * height);
+  for (std::uint32_t& pixel : pixels) pixel &= 0xFFFFFF;
+  SelectObject(dc, old);
+  DeleteObject(bitmap);
+  DeleteDC(dc);
+  return pixels;
+}
+
 // A drag of files as another program would offer it: the clipboard's data object.
 inline ComPtr<IDataObject> FilesFromOutside(HWND window, const std::vector<std::wstring>& files) {
   std::wstring paths;

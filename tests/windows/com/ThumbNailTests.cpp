@@ -60,31 +60,12 @@ bool Holds(const Lines& lines, const std::wstring& line) {
   return std::find(lines.begin(), lines.end(), line) != lines.end();
 }
 
-using Pixels = std::vector<std::uint32_t>;
 constexpr int kSide = 131;  // of a slot's picture, at 96 dots per inch
 
-// What `draw` draws in a square.
-Pixels Drawn(const std::function<void(HDC)>& draw) {
-  BITMAPINFO info = {};
-  info.bmiHeader = {sizeof info.bmiHeader, kSide, -kSide, 1, 32, BI_RGB, 0, 0, 0, 0, 0};
-  void* bits = nullptr;
-  const HDC dc = CreateCompatibleDC(nullptr);
-  const HBITMAP bitmap = CreateDIBSection(dc, &info, DIB_RGB_COLORS, &bits, nullptr, 0);
-  const HGDIOBJ old = SelectObject(dc, bitmap);
-  draw(dc);
-  GdiFlush();
-  const auto* first = static_cast<const std::uint32_t*>(bits);
-  Pixels pixels(first, first + kSide * kSide);
-  for (std::uint32_t& pixel : pixels) pixel &= 0xFFFFFF;
-  SelectObject(dc, old);
-  DeleteObject(bitmap);
-  DeleteDC(dc);
-  return pixels;
-}
 // The square of a slot's picture on the screen; empty when it shows nothing.
 Pixels Picture(const ThumbForm& form, int slot) {
   UpdateWindow(form.Slot(slot));
-  Pixels pixels = Drawn([&](HDC dc) {
+  Pixels pixels = Drawn(kSide, kSide, [&](HDC dc) {
     const RECT square = layout::Pixels(layout::kPicture, 96);
     const HDC window = GetDC(form.Slot(slot));
     BitBlt(dc, 0, 0, kSide, kSide, window, square.left, square.top, SRCCOPY);
@@ -484,7 +465,7 @@ TEST(ThumbNailControl, WorksWithoutAWindow) {
   ASSERT_EQ(form.control->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
   const RECT frame = layout::Pixels(layout::kFrames[1], 96);
   const RECT square = layout::Pixels(layout::kPicture, 96);
-  const Pixels drawn = Drawn([&](HDC dc) {
+  const Pixels drawn = Drawn(kSide, kSide, [&](HDC dc) {
     const LONG left = -frame.left - square.left;
     const LONG top = -frame.top - square.top;
     const RECTL bounds = {left, top, left + ThumbForm::kWidth, top + ThumbForm::kHeight};
