@@ -75,6 +75,18 @@ bool FileControl::RefusesTransfer() {
   return transferRuns_ || closed_;
 }
 
+// --- Listing ---
+
+bool FileControl::ListAccount() {
+  FileList& all = apartment_.allFiles;
+  const std::shared_ptr<CFileUpload> client = mobjFileupload;
+  const bool listed = client && client->ListFilesForUser([&](const std::shared_ptr<CUpload>& record,
+                                                             TextView key) { all.Add(record, key); });
+  // Half a listing would pass for the account.
+  if (!listed) all.Clear();
+  return listed;
+}
+
 // --- Selection ---
 
 Text FileControl::SelectedFileName() const {

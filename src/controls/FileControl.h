@@ -202,6 +202,9 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Whether a transfer must not start now; tells the host why.
   bool RefusesTransfer();
   void Fail(std::int32_t ftpError, TextView description);
+  // Adds the account's files to the list of all files; false, with that list empty, when the service did not
+  // tell them all or there is no client.
+  bool ListAccount();
   // Fetches `url` into the user's folder, and to `explicitTarget` first unless that is empty. Waits, pumping,
   // for its end or until `stop` says so; whether `expected` is there then.
   bool Download(const Text& url, const Text& explicitTarget, const Text& expected,

@@ -221,12 +221,26 @@ TEST_F(ListImageTest, DeleteTranscript) {
   view.Select(2, true);
   account = {{"a.jpg", "1"}, {"c.gif", "1"}};
   control.DeleteFile();
-  ExpectLog({"view hourglass", "1002 ", "page delete|http://h:81/users/|b.jpg" + kDeleteTail,
-             "ask DeleteFileRequest Username=u@x&ProductID=7&FileToBeDeleted=b.jpg", "1001 ",
-             "1015 " + AddressOf("b.jpg"), "page delete|http://h:81/users/|d.jpg" + kDeleteTail,
-             "ask DeleteFileRequest Username=u@x&ProductID=7&FileToBeDeleted=d.jpg", "1001 ",
-             "1015 " + AddressOf("b.jpg"), "view items 0", kAskList, "view list", "view columns",
-             "view items 1", "view at 0", "1015 " + AddressOf("a.jpg"), "view pointer"});
+  ExpectLog({"view hourglass",
+             "1002 ",
+             "page delete|http://h:81/users/|b.jpg" + kDeleteTail,
+             "ask DeleteFileRequest Username=u@x&ProductID=7&FileToBeDeleted=b.jpg",
+             "1001 ",
+             "1015 " + AddressOf("b.jpg"),
+             "yield",
+             "page delete|http://h:81/users/|d.jpg" + kDeleteTail,
+             "ask DeleteFileRequest Username=u@x&ProductID=7&FileToBeDeleted=d.jpg",
+             "1001 ",
+             "1015 " + AddressOf("b.jpg"),
+             "yield",
+             "view items 0",
+             kAskList,
+             "view list",
+             "view columns",
+             "view items 1",
+             "view at 0",
+             "1015 " + AddressOf("a.jpg"),
+             "view pointer"});
   EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"a.jpg"});
   EXPECT_TRUE(fake.apartment.listingIsCurrent);
 }
@@ -297,6 +311,11 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
        "a.jpg,"},
       {"takes the client", [](ctrlListImage& list) { list.mobjFileupload.reset(); }, "a.jpg,"},
       {"closes", [](ctrlListImage& list) { list.Close(); }, "a.jpg,"},
+      {"selects others",
+       [this](ctrlListImage&) {
+         view.selected = {true, false, false};
+       },
+       "a.jpg,b.jpg,c.jpg,"},
       {"deletes again", [](ctrlListImage& list) { list.DeleteFile(); }, "a.jpg,b.jpg,c.jpg,"},
   };
   for (const auto& test : kCases) {

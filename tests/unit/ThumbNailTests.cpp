@@ -156,6 +156,10 @@ TEST_F(ThumbNailTest, ListsAgainAfterAFailure) {
   EXPECT_FALSE(control.Init(u"*"));
   EXPECT_EQ(page.Look(), "No pictures./Click here for it");
   listingFails = false;
+  // Two files of one address: the half that was listed does not pass for the account.
+  account = {{"a.gif", "1"}, {"a.gif", "1"}};
+  EXPECT_FALSE(control.Init(u"*"));
+  EXPECT_EQ(Records() + Shown(), "");
   List("a.gif");
   EXPECT_EQ(Shown(), "a.gif,");
   EXPECT_EQ(Selected(), AddressOf("a.gif"));

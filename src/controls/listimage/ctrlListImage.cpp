@@ -54,9 +54,7 @@ bool ctrlListImage::Init(TextView szFileFilter) {
   }
   if (!mobjFileupload) throw RuntimeError(init_error::kNoClient);
   PrepareUserFolder(apartment_);
-  const bool listed = mobjFileupload->ListFilesForUser(
-      [&](const std::shared_ptr<CUpload>& record, TextView key) { apartment_.allFiles.Add(record, key); });
-  if (!listed) throw RuntimeError(init_error::kListingFailed);
+  if (!ListAccount()) throw RuntimeError(init_error::kListingFailed);
   apartment_.listLoaded = loaded;
   ShowListOrLabel();
   view_.SetColumns(kColumns);

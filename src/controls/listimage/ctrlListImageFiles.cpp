@@ -61,19 +61,25 @@ void ctrlListImage::DeleteSelected() {
   const std::uint32_t filling = filling_;
   // Where the last record was. The next one follows, so that many deletes stay one walk through the records.
   std::size_t position = 1;
+  // What the user selects between two files is not meant.
+  std::vector<bool> chosen(items_.size());
+  for (std::size_t i = 0; i < chosen.size(); ++i) chosen[i] = view_.IsSelected(i);
   // The host may fill the list anew or take the client away in any event; the rest then stays.
-  for (std::size_t i = 0; i < items_.size() && filling == filling_ && !IsClosed(); ++i) {
-    if (!view_.IsSelected(i)) {
+  for (std::size_t i = 0; i < chosen.size() && filling == filling_ && !IsClosed(); ++i) {
+    if (!chosen[i]) {
       Raise(event::kNotSelected);
       continue;
     }
     const std::shared_ptr<CFileUpload> client = mobjFileupload;
     if (!client) return;
     const std::shared_ptr<CUpload> record = items_[i].record;
-    if (!DeleteOnServer(*client, *record)) continue;
-    position = RemoveRecord(record->FileName, position);
-    Raise(event::kDeleted);
-    RaiseCurrentItem();
+    if (DeleteOnServer(*client, *record)) {
+      position = RemoveRecord(record->FileName, position);
+      Raise(event::kDeleted);
+      RaiseCurrentItem();
+    }
+    // The next request keeps the thread again.
+    Yield();
   }
 }
 

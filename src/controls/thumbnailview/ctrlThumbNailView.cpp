@@ -87,10 +87,7 @@ bool ctrlThumbNailView::Init(TextView szFileFilter) {
 bool ctrlThumbNailView::List() {
   apartment_.allFiles.Clear();
   PrepareUserFolder(apartment_);
-  const std::shared_ptr<CFileUpload> client = mobjFileupload;
-  return client && client->ListFilesForUser([&](const std::shared_ptr<CUpload>& record, TextView key) {
-    apartment_.allFiles.Add(record, key);
-  });
+  return ListAccount();
 }
 
 void ctrlThumbNailView::ChangeFileFilter(TextView szFileFilter) {
