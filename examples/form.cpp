@@ -4,7 +4,7 @@
 //
 //   form SERVER USER PASSWORD PRODUCT [once]
 //
-// With "once" it says how many files the account has and what the controls told, and ends.
+// With "once" it says what the controls told and which picture is selected, and ends.
 #include <windows.h>
 
 #include <cstdio>
@@ -51,7 +51,7 @@ class EventSink final : public IDispatch {
 // A text for the time of a call.
 class Text {
  public:
-  explicit Text(const wchar_t* text) : text_(SysAllocString(text)) {}
+  explicit Text(const wchar_t* text = nullptr) : text_(SysAllocString(text)) {}
   ~Text() { SysFreeString(text_); }
   Text(const Text&) = delete;
   Text& operator=(const Text&) = delete;
@@ -121,14 +121,13 @@ int Run(const std::vector<std::wstring>& arguments) {
   client->Release();
   if (!done || !List(*list) || !List(*thumbnails)) return 4;
 
-  int result = 0;
   if (arguments.size() > 5 && arguments[5] == L"once") {
-    Text name(L"");
-    list->SelectedFileName(&name);
-    Text file(L"rose.jpg");
+    // The list selects the picture that the thumbnails begin with.
+    Text name;
+    thumbnails->SelectedFileName(&name);
     VARIANT ignored = {};
-    list->UploadedFileSetFocus(&file, &ignored);
-    Text selected(L"");
+    list->UploadedFileSetFocus(&name, &ignored);
+    Text selected;
     list->SelectedFileName(&selected);
     std::wprintf(L"selected %ls\n", static_cast<BSTR>(selected));
   } else {
@@ -141,7 +140,7 @@ int Run(const std::vector<std::wstring>& arguments) {
   list->Release();
   thumbnails->Release();
   if (IsWindow(form)) DestroyWindow(form);
-  return result;
+  return 0;
 }
 
 }  // namespace

@@ -134,7 +134,10 @@ bool FileControl::UploadImage(TextView szLocalPath) {
     {
       const RunningTransfer running(*this);
       // What is on the server is registered, whatever the host made of the control meanwhile.
-      if (SendFile(path)) url = client->SaveUploadFile(path);
+      if (SendFile(path)) {
+        url = client->SaveUploadFile(path);
+        if (url.empty()) Fail(ftp_error::kNotTaken, u"The file was not registered.");
+      }
       downloader_.StopWatchdog();
     }
     TransferEnded();

@@ -89,6 +89,9 @@ TEST_F(ListImageUpload, Outcomes) {
     EXPECT_EQ(Events(), test.events);
     const auto asks = [](const std::string& line) { return line.starts_with("ask FileUpload"); };
     EXPECT_EQ(std::ranges::count_if(log, asks), test.registered ? 1 : 0);
+    if (test.registered) {
+      EXPECT_EQ(control.m_LastError, test.result ? ftp_error::kSuccess : ftp_error::kNotTaken);
+    }
     EXPECT_EQ(Names(), test.result ? "new.jpg," : "");
     EXPECT_EQ(Records(), test.result ? "new.jpg," : "");
     EXPECT_EQ(log.back(), "view pointer");
