@@ -390,6 +390,41 @@ TYPED_TEST(AnyControl, IsShownHiddenMovedAndDesigned) {
   EXPECT_FALSE(designed.container->IsUiActive());
 }
 
+std::vector<HWND> StopsOf(const Form& form) {
+  return {form.ListWindow()};
+}
+std::vector<HWND> StopsOf(const ThumbForm& form) {
+  return {form.Grid(), form.ScrollBar(), FindWindowExW(form.Window(), nullptr, L"BUTTON", L"List view")};
+}
+
+TYPED_TEST(AnyControl, IsPartOfTheTabOrderOfItsForm) {
+  TypeParam form;
+  form.LogOn(TheServer().name);
+  ASSERT_TRUE(form.Init(L"*"));
+  const HWND button = CreateWindowExW(0, L"BUTTON", L"other", WS_CHILD | WS_VISIBLE | WS_TABSTOP, 0, 0, 9, 9,
+                                      form.frame, nullptr, nullptr, nullptr);
+  ShowWindow(form.frame, SW_SHOWNOACTIVATE);
+  ASSERT_EQ(form.container->Do(OLEIVERB_INPLACEACTIVATE), S_OK);
+  EXPECT_FALSE(form.container->IsUiActive());
+  std::vector<HWND> stops = StopsOf(form);
+  for (const bool backward : {false, true}) {
+    SCOPED_TRACE(backward);
+    if (backward) Hold(VK_SHIFT, true);
+    SetFocus(button);
+    for (const HWND stop : stops) {
+      form.Press(VK_TAB, GetFocus());
+      EXPECT_EQ(GetFocus(), stop);
+      EXPECT_TRUE(form.container->IsUiActive());
+      EXPECT_TRUE(form.container->HasFocus());
+    }
+    form.Press(VK_TAB, GetFocus());
+    EXPECT_EQ(GetFocus(), button);
+    EXPECT_FALSE(form.container->HasFocus());
+    if (backward) Hold(VK_SHIFT, false);
+    std::reverse(stops.begin(), stops.end());
+  }
+}
+
 int MeasureOf(const Form& form) {
   return static_cast<int>(SendMessageW(form.ListWindow(), LVM_GETCOLUMNWIDTH, 0, 0));
 }

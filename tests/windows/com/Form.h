@@ -46,6 +46,14 @@ inline std::optional<std::string> Contents(const std::wstring& path) {
   return bytes;
 }
 
+// For what the program itself asks about the keyboard.
+inline void Hold(BYTE key, bool down) {
+  BYTE keys[256] = {};
+  GetKeyboardState(keys);
+  keys[key] = down ? 0x80 : 0;
+  SetKeyboardState(keys);
+}
+
 using Pixels = std::vector<std::uint32_t>;
 // What `draw` draws.
 inline Pixels Drawn(int width, int height, const std::function<void(HDC)>& draw) {
