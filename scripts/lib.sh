@@ -19,26 +19,33 @@ wine_home=$build/wine
 
 # ---- Steps --------------------------------------------------------------------------------------------------------
 
-# step NAME COMMAND...: runs the command with its output in build/logs/NAME.log; tells the time that it took, or the
-# log and its last lines when it fails. The result is the command's. The command runs in a subshell: what shall outlive
-# the step (a server, a variable) is started with start_server.
-step() {
+# try_step NAME COMMAND...: runs the command with its output in build/logs/NAME.log; tells the time that it took, or the
+# log and its last lines when it fails. The command's result is left in `step_result`. The command runs in a subshell:
+# what shall outlive the step (a server, a variable) is started with start_server.
+try_step() {
   local name=$1 log=$logs/${1// /-}.log begin=$SECONDS
   shift
-  printf '== %s ... ' "$name"
-  # Not "if ! command": inside a condition the shell ignores errors in the middle of a function.
-  local result=0
   set +e
+  # Below a condition, however far, the shell ignores errors in the middle of a function.
+  (set -e; false; true)
+  step_result=$?
+  ((step_result != 0)) || die "the step $name is part of a condition, where it could not fail"
+  printf '== %s ... ' "$name"
   (set -e; "$@") >"$log" 2>&1 </dev/null
-  result=$?
+  step_result=$?
   set -e
-  if ((result == 0)); then
+  if ((step_result == 0)); then
     printf 'done, %d s\n' $((SECONDS - begin))
   else
-    printf 'FAILED with %d after %d s; log: %s\n' "$result" $((SECONDS - begin)) "${log#"$root"/}"
+    printf 'FAILED with %d after %d s; log: %s\n' "$step_result" $((SECONDS - begin)) "${log#"$root"/}"
     tail -n 25 "$log" | sed 's/^/   | /'
   fi
-  return "$result"
+}
+
+# The same, for a step without which the rest makes no sense.
+step() {
+  try_step "$@"
+  ((step_result == 0)) || exit 1
 }
 
 die() {
@@ -228,7 +235,7 @@ demo_tour() {
   demo_host "$1" "$folder" "events-$3.log" "screenshots-$3" &
   host=$!
   while kill -0 "$host" 2>/dev/null; do
-    shown=$(sed -n 's/\r//; s/^== //p' "$log" 2>/dev/null | tail -n 1)
+    shown=$(sed -n 's/\r//; s/^== //p' "$log" 2>/dev/null | tail -n 1) || true
     if [[ -n $shown && ! -e $shots/$shown.png ]]; then
       import -window root "$folder/unfinished.png"
       mv "$folder/unfinished.png" "$shots/$shown.png"
