@@ -133,9 +133,11 @@ bool FileControl::UploadImage(TextView szLocalPath) {
     Text url;
     {
       const RunningTransfer running(*this);
-      // What is on the server is registered, whatever the host made of the control meanwhile.
+      const SessionValues session = apartment_.session;
+      // What is on the server is registered, whatever the host made of the control meanwhile, but not with
+      // another user.
       if (SendFile(path)) {
-        url = client->SaveUploadFile(path);
+        if (apartment_.session.IsSameAccount(session)) url = client->SaveUploadFile(path);
         if (url.empty()) Fail(ftp_error::kNotTaken, u"The file was not registered.");
       }
       downloader_.StopWatchdog();

@@ -27,6 +27,12 @@ struct SessionValues {
   Text mguid;
   // Set by a log-on; cleared once its FTP values were rewritten for the proxy.
   bool loggedOn = false;
+
+  // What began for one account must not go on in another.
+  bool IsSameAccount(const SessionValues& other) const {
+    return serverName == other.serverName && userName == other.userName &&
+           productNumber == other.productNumber;
+  }
 };
 
 // How an FTP proxy learns the server behind it.

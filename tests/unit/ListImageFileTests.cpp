@@ -50,6 +50,10 @@ TEST_F(ListImageUpload, Transcript) {
 TEST_F(ListImageUpload, Outcomes) {
   const auto nothing = [](UploadEvents&) {};
   const auto completeOnly = [](UploadEvents& events) { events.UploadComplete(); };
+  const auto otherUser = [&](UploadEvents& events) {
+    events.UploadComplete();
+    fake.apartment.session.userName = u"other";
+  };
   const auto neverComplete = [](UploadEvents& events) {
     events.UploadComplete();
     events.UploadProgress(100, 1536);
@@ -75,6 +79,7 @@ TEST_F(ListImageUpload, Outcomes) {
       {"refused", "CanUploadFile=1001", completeOnly, -2147220881, "FileURL=x", false, false, "9999 100,"},
       {"silent", "CanUploadFile=1001", nothing, 0, "FileURL=x", false, false, ""},
       {"goes on", "CanUploadFile=1001", neverComplete, 0, "FileURL=x", false, false, "9999 100,9999 100,"},
+      {"another user meanwhile", "CanUploadFile=1001", otherUser, 0, "FileURL=x", false, false, "9999 100,"},
       {"no address", "CanUploadFile=1001", completeOnly, 0, "FileURL=", false, true, "9999 100,"},
       {"not registered", "CanUploadFile=1001", completeOnly, 0, "fails", false, true, "9999 100,"},
   };
@@ -86,6 +91,7 @@ TEST_F(ListImageUpload, Outcomes) {
     uploader.script = test.script;
     uploader.error = test.error;
     EXPECT_EQ(control.UploadImage(u"C:\\new.jpg"), test.result);
+    fake.apartment.session.userName = u"u@x";
     EXPECT_EQ(Events(), test.events);
     const auto asks = [](const std::string& line) { return line.starts_with("ask FileUpload"); };
     EXPECT_EQ(std::ranges::count_if(log, asks), test.registered ? 1 : 0);
@@ -312,6 +318,8 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
          view.selected.assign(3, true);
        },
        "a.jpg,"},
+      {"logs another user on", [this](ctrlListImage&) { fake.apartment.session.userName = u"other"; },
+       "a.jpg,"},
       {"takes the client", [](ctrlListImage& list) { list.mobjFileupload.reset(); }, "a.jpg,"},
       {"closes", [](ctrlListImage& list) { list.Close(); }, "a.jpg,"},
       {"selects others",
@@ -341,6 +349,7 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
     EXPECT_EQ(deleted, test.deleted);
     EXPECT_EQ(log.back(), "view pointer");
     host.onEvent = nullptr;
+    fake.apartment.session.userName = u"u@x";
   }
 }
 

@@ -24,10 +24,36 @@ std::recursive_mutex classes;
 // windows go with the thread that made them, and take along what they hold.
 thread_local HWND parking = nullptr;
 
+// Ends a parked window, of the class whose name is the other parameter.
+constexpr UINT kEndParked = WM_APP;
+
+// Classes of windows outlive the library that registered them, with an address in it.
+void LeaveNothing(HINSTANCE module, const wchar_t* className) {
+  if (parking && !GetWindow(parking, GW_CHILD)) DestroyWindow(parking);
+  const std::lock_guard guard(classes);
+  UnregisterClassW(className, module);  // fails while there are windows of it
+}
+
+LRESULT CALLBACK ParkingProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR id,
+                             DWORD_PTR module) {
+  if (message == kEndParked) {
+    DestroyWindow(reinterpret_cast<HWND>(wParam));
+    LeaveNothing(reinterpret_cast<HINSTANCE>(module), reinterpret_cast<const wchar_t*>(lParam));
+    return 0;
+  }
+  if (message == WM_NCDESTROY) {
+    RemoveWindowSubclass(window, ParkingProc, id);
+    parking = nullptr;
+  }
+  return DefSubclassProc(window, message, wParam, lParam);
+}
+
 HWND ParkingWindow(HINSTANCE module) {
-  if (!IsWindow(parking))
+  if (!parking) {
     parking = CreateWindowExW(WS_EX_TOOLWINDOW, L"STATIC", L"", WS_POPUP, 0, 0, 0, 0, nullptr, nullptr,
                               module, nullptr);
+    SetWindowSubclass(parking, ParkingProc, kSubclass, reinterpret_cast<DWORD_PTR>(module));
+  }
   return parking;
 }
 
@@ -63,14 +89,7 @@ ControlWindow::~ControlWindow() {
   // The host ended the control inside one of its own messages. The windows are not done with that message
   // yet, so they go with the next one.
   Park();
-  PostMessageW(window_, WM_CLOSE, 0, 0);
-}
-
-// Classes of windows outlive the library that registered them, with an address in it.
-void ControlWindow::LeaveNothing(HINSTANCE module, const wchar_t* className) {
-  if (IsWindow(parking) && !GetWindow(parking, GW_CHILD)) DestroyWindow(parking);
-  const std::lock_guard guard(classes);
-  UnregisterClassW(className, module);  // fails while there are windows of it
+  PostMessageW(parking, kEndParked, reinterpret_cast<WPARAM>(window_), reinterpret_cast<LPARAM>(className_));
 }
 
 bool ControlWindow::AnyLeft() {
@@ -214,7 +233,8 @@ LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wPa
   }
   if (message == WM_NCDESTROY) --windows;
   ControlWindow* self = Of(window);
-  if (self && message == WM_NCDESTROY) {
+  if (self && message == WM_DESTROY) {
+    if (self->onEnd) self->onEnd();
     SetWindowLongPtrW(window, GWLP_USERDATA, 0);
     self->window_ = nullptr;
     self->made_ = false;

@@ -5,6 +5,7 @@
 
 #include "platform/windows/WindowsHeaders.h"
 
+#include <functional>
 #include <optional>
 #include <utility>
 
@@ -17,6 +18,9 @@ class ControlWindow {
  public:
   ControlWindow(const ControlWindow&) = delete;
   ControlWindow& operator=(const ControlWindow&) = delete;
+
+  // Runs when the window ends by another hand than this object's, while it still is one.
+  std::function<void()> onEnd;
 
   // The window of the whole control, made hidden and without a container on the first call; null on failure.
   HWND Window();
@@ -74,7 +78,6 @@ class ControlWindow {
   static LRESULT CALLBACK ChildProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR id,
                                     DWORD_PTR outer);
   static ControlWindow* Of(HWND outer);
-  static void LeaveNothing(HINSTANCE module, const wchar_t* className);
   template <typename Body>
   LRESULT Handle(HWND outer, Body&& body);
   LRESULT OnLook(UINT message, WPARAM wParam, LPARAM lParam) const;

@@ -40,9 +40,10 @@ STDMETHODIMP ConnectionPoint::Advise(IUnknown* sink, DWORD* cookie) {
   return Guarded([&]() -> HRESULT {
     // A host may offer its sink by the events' identifier or as a plain automation object.
     ComPtr<IUnknown> asked;
-    if (FAILED(sink->QueryInterface(interfaceId_, asked.ReceiveVoid())) &&
-        FAILED(sink->QueryInterface(IID_IDispatch, asked.ReceiveVoid())))
-      return CONNECT_E_CANNOTCONNECT;
+    HRESULT offered = sink->QueryInterface(interfaceId_, asked.ReceiveVoid());
+    if (FAILED(offered) && interfaceId_ != IID_IPropertyNotifySink)
+      offered = sink->QueryInterface(IID_IDispatch, asked.ReceiveVoid());
+    if (FAILED(offered)) return CONNECT_E_CANNOTCONNECT;
     connections_.push_back({++lastCookie_, std::move(asked)});
     *cookie = lastCookie_;
     return S_OK;
@@ -76,8 +77,8 @@ void RaiseEvent(const ConnectionPoint& events, DISPID id, std::span<VARIANT> arg
   std::vector<VARIANT> reversed(arguments.rbegin(), arguments.rend());
   DISPPARAMS parameters = {reversed.data(), nullptr, static_cast<UINT>(reversed.size()), 0};
   for (const ComPtr<IUnknown>& sink : events.Sinks()) {
-    ComPtr<IDispatch> dispatch;
-    if (FAILED(sink->QueryInterface(IID_IDispatch, dispatch.ReceiveVoid()))) continue;
+    // Not asked for IDispatch: an object that listens to several controls has one for each.
+    auto* const dispatch = static_cast<IDispatch*>(sink.Get());
     Variant ignored;
     dispatch->Invoke(id, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD, &parameters, &ignored.Get(), nullptr,
                      nullptr);
@@ -85,11 +86,8 @@ void RaiseEvent(const ConnectionPoint& events, DISPID id, std::span<VARIANT> arg
 }
 
 void NotifyChanged(const ConnectionPoint& listeners, DISPID property) {
-  for (const ComPtr<IUnknown>& sink : listeners.Sinks()) {
-    ComPtr<IPropertyNotifySink> listener;
-    if (SUCCEEDED(sink->QueryInterface(IID_IPropertyNotifySink, listener.ReceiveVoid())))
-      listener->OnChanged(property);
-  }
+  for (const ComPtr<IUnknown>& sink : listeners.Sinks())
+    static_cast<IPropertyNotifySink*>(sink.Get())->OnChanged(property);
 }
 
 }  // namespace tarnwick

@@ -17,13 +17,14 @@ namespace tarnwick {
 // One connection point. It belongs to its control and shares the control's life.
 class ConnectionPoint final : public IConnectionPoint {
  public:
-  // `container` is the control; `events` its dispinterface, or null for a point of another interface.
+  // `container` is the control. `interfaceId` names its events' dispinterface, or IPropertyNotifySink.
   ConnectionPoint(IConnectionPointContainer& container, REFIID interfaceId)
       : container_(container), interfaceId_(interfaceId) {}
   ConnectionPoint(const ConnectionPoint&) = delete;
   ConnectionPoint& operator=(const ConnectionPoint&) = delete;
 
-  // The sinks that listen now; a copy, because a sink may go while it is called.
+  // The sinks that listen now, each as the interface of the point; a copy, because a sink may go while it is
+  // called.
   std::vector<ComPtr<IUnknown>> Sinks() const;
 
   STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;

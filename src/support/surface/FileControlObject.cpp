@@ -25,7 +25,7 @@ FileControlObject<Interface>::FileControlObject(const ControlClass& itsClass)
 
 template <typename Interface>
 void FileControlObject<Interface>::StopDrops() {
-  if (dropTarget_) dropTarget_->Revoke();
+  if (const ComPtr<DropTarget> target = std::exchange(dropTarget_, {})) target->Revoke();
 }
 
 template <typename Interface>
@@ -323,6 +323,7 @@ STDMETHODIMP FileControlObject<Interface>::UploadedFileSetFocus(BSTR* szFileName
   const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     Rules().UploadedFileSetFocus(ViewOf(szFileName));
+    ole_.ViewChanged();
     return VARIANT{};
   });
 }
@@ -332,21 +333,31 @@ STDMETHODIMP FileControlObject<Interface>::UploadedFileSetFocus(BSTR* szFileName
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::UploadImage(BSTR szLocalPath, VARIANT_BOOL* result) {
   const ComPtr<IUnknown> alive = KeptAlive();
-  return AnsweredBoolean(result, [&] { return Rules().UploadImage(ViewOf(szLocalPath)); });
+  return AnsweredBoolean(result, [&] {
+    const bool uploaded = Rules().UploadImage(ViewOf(szLocalPath));
+    ole_.ViewChanged();
+    return uploaded;
+  });
 }
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::DeleteFile() {
   const ComPtr<IUnknown> alive = KeptAlive();
-  return Done([&] { Rules().DeleteFile(); });
+  return Done([&] {
+    Rules().DeleteFile();
+    ole_.ViewChanged();
+  });
 }
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::RenameFile(BSTR* strOldFileName, BSTR* strNewFileName,
                                                       VARIANT_BOOL* result) {
   const ComPtr<IUnknown> alive = KeptAlive();
-  return AnsweredBoolean(result,
-                         [&] { return Rules().RenameFile(ViewOf(strOldFileName), ViewOf(strNewFileName)); });
+  return AnsweredBoolean(result, [&] {
+    const bool renamed = Rules().RenameFile(ViewOf(strOldFileName), ViewOf(strNewFileName));
+    ole_.ViewChanged();
+    return renamed;
+  });
 }
 
 template <typename Interface>
@@ -398,13 +409,14 @@ STDMETHODIMP FileControlObject<Interface>::OLEDrag() {
 
 template <typename Interface>
 HWND FileControlObject<Interface>::Window() {
-  const HWND window = MakeWindow();
-  // A host that did not initialise OLE has a control without drops. A container may end the window and ask
-  // for another.
-  if (window && window != dropWindow_)
+  const HWND window = View().Window();
+  // A host that did not initialise OLE has a control without drops. A container may end the window, which OLE
+  // has to hear of, and ask for another.
+  if (window && !dropTarget_)
     Done([&] {
-      dropWindow_ = window;
       dropTarget_ = ComPtr<DropTarget>::Adopt(new DropTarget(window, Identity(), *this));
+      View().onEnd = [this] { StopDrops(); };
+      WindowMade(window);
       ApplyLook();
     });
   return window;
@@ -423,8 +435,8 @@ void FileControlObject<Interface>::ApplyLook() {
   if (ambient_.font && FAILED(ambient_.font->get_hFont(&font))) font = nullptr;
   // One colour of a container makes no legible pair with one of the system's.
   const bool colours = ambient_.hasForeColor && ambient_.hasBackColor;
-  SetLook(font, colours ? std::optional(ambient_.foreColor) : std::nullopt,
-          colours ? std::optional(ambient_.backColor) : std::nullopt);
+  View().SetLook(font, colours ? std::optional(ambient_.foreColor) : std::nullopt,
+                 colours ? std::optional(ambient_.backColor) : std::nullopt);
 }
 
 template <typename Interface>

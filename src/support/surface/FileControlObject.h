@@ -3,6 +3,7 @@
 #pragma once
 
 #include "controls/FileControl.h"
+#include "platform/windows/ControlWindow.h"
 #include "platform/windows/WindowsStreamSocket.h"
 #include "platform/windows/WindowsTimer.h"
 #include "support/surface/CFileUploadObject.h"
@@ -104,10 +105,9 @@ class FileControlObject : public DualObject<Interface>,
   void StopDrops();
 
   virtual FileControl& Rules() = 0;
-  // The control's window, made on the first call, without what a container gives it.
-  virtual HWND MakeWindow() = 0;
-  // Null and nullopt stand for the system's own font and colours.
-  virtual void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background) = 0;
+  virtual ControlWindow& View() = 0;
+  // The window is new, or another one than before.
+  virtual void WindowMade(HWND) {}
 
   // What rules are made with.
   ControlParts Parts() { return {apartment_.Get(), events_, uploader_, downloader_}; }
@@ -131,6 +131,7 @@ class FileControlObject : public DualObject<Interface>,
   // OleControlHooks
   const CLSID& ClassId() const override { return class_.id; }
   HWND Window() override;
+  void Park() override { View().Park(); }
   void AmbientChanged(const AmbientValues& values) override;
   void SiteGone() override { Rules().Close(); }
   std::span<const PersistedProperty> Properties() const override;
@@ -153,9 +154,8 @@ class FileControlObject : public DualObject<Interface>,
   WindowsStreamSocket socket_;
   WindowsTimer watchdog_;
   PictureDownloader downloader_;
+  // As long as there is a window that was asked for.
   ComPtr<DropTarget> dropTarget_;
-  // The window that it stands for.
-  HWND dropWindow_ = nullptr;
   AmbientValues ambient_;
   // What the host was last given for the rules' client, so that it gets the same object again.
   ComPtr<CFileUploadObject> clientObject_;

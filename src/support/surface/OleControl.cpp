@@ -77,7 +77,9 @@ void* OleControl::FindInterface(REFIID id) {
   if (id == IID_IOleWindow || id == IID_IOleInPlaceObject) return static_cast<IOleInPlaceObject*>(this);
   if (id == IID_IOleInPlaceActiveObject) return static_cast<IOleInPlaceActiveObject*>(this);
   if (id == IID_IViewObject || id == IID_IViewObject2) return static_cast<IViewObject2*>(this);
-  if (id == IID_IPersist || id == IID_IPersistStreamInit) return static_cast<IPersistStreamInit*>(this);
+  // Begins with all of IPersistStream.
+  if (id == IID_IPersist || id == IID_IPersistStream || id == IID_IPersistStreamInit)
+    return static_cast<IPersistStreamInit*>(this);
   if (id == IID_IPersistPropertyBag) return static_cast<IPersistPropertyBag*>(this);
   if (id == IID_IQuickActivate) return static_cast<IQuickActivate*>(this);
   if (id == IID_IConnectionPointContainer) return static_cast<IConnectionPointContainer*>(this);
@@ -349,9 +351,12 @@ HRESULT OleControl::ActivateInPlace() {
   if (FAILED(result)) return result;
   const HWND window = hooks_.Window();
   if (!window) return E_OUTOFMEMORY;
-  inPlaceSite_ = std::move(inPlaceSite);
+  inPlaceSite_ = inPlaceSite;
   inPlace_ = true;
-  inPlaceSite_->OnInPlaceActivate();
+  const HRESULT agreed = inPlaceSite->OnInPlaceActivate();
+  if (FAILED(agreed)) InPlaceDeactivate();
+  // The container's code may have closed the form.
+  if (!inPlace_) return FAILED(agreed) ? agreed : E_FAIL;
   SetParent(window, parent);
   Place(position, clip);
   return S_OK;
@@ -359,18 +364,29 @@ HRESULT OleControl::ActivateInPlace() {
 
 HRESULT OleControl::ActivateUi() {
   if (uiActive_) {
-    hooks_.GiveFocus();
+    TakeFocus();
     return S_OK;
   }
   uiActive_ = true;
-  inPlaceSite_->OnUIActivate();
-  hooks_.GiveFocus();
+  const ComPtr<IOleInPlaceSite> site = inPlaceSite_;
+  const HRESULT agreed = site->OnUIActivate();
+  if (FAILED(agreed)) uiActive_ = false;
+  // The container's code may have deactivated the control at once.
+  if (!uiActive_) return FAILED(agreed) ? agreed : E_FAIL;
+  TakeFocus();
   if (frame_) frame_->SetActiveObject(this, nullptr);
   if (document_) document_->SetActiveObject(this, nullptr);
   // The control has no tool bars of its own.
   if (frame_) frame_->SetBorderSpace(nullptr);
   if (document_) document_->SetBorderSpace(nullptr);
   return S_OK;
+}
+
+// A window inside that has the focus, such as the editor of a name, keeps it.
+void OleControl::TakeFocus() {
+  const HWND window = hooks_.Window();
+  const HWND focus = GetFocus();
+  if (focus != window && !IsChild(window, focus)) hooks_.GiveFocus();
 }
 
 void OleControl::Place(const RECT& position, const RECT& clip) {
@@ -441,7 +457,8 @@ HRESULT OleControl::OfferToSite(MSG& message) const {
   if (GetKeyState(VK_SHIFT) < 0) modifiers |= 1;
   if (GetKeyState(VK_CONTROL) < 0) modifiers |= 2;
   if (GetKeyState(VK_MENU) < 0) modifiers |= 4;
-  return site->TranslateAccelerator(&message, modifiers);
+  // Containers that have no use for keys say so in many ways; theirs expect this one.
+  return site->TranslateAccelerator(&message, modifiers) == S_OK ? S_OK : S_FALSE;
 }
 
 STDMETHODIMP OleControl::TranslateAccelerator(LPMSG message) {

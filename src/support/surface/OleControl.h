@@ -192,6 +192,7 @@ class OleControl final : public IOleObject,
   HRESULT Activate(bool withUi);
   HRESULT ActivateInPlace();
   HRESULT ActivateUi();
+  void TakeFocus();
   void Place(const RECT& position, const RECT& clip);
   void ReadAmbientValues();
   bool Ambient(DISPID property, Variant& value) const;

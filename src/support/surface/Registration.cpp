@@ -17,15 +17,17 @@ namespace {
 
 constexpr wchar_t kLibraryName[] = L"Tarnwick";
 constexpr wchar_t kVersion[] = L"1.1";
-// Below the type library's key: its file for programs of this kind, and for those of the other kind, of which
-// a 64-bit system runs both; and where those see the registry.
+// Below the type library's key, its file under its own locale and, for hosts that ask by theirs, under none.
+constexpr const wchar_t* kLocaleKeys[] = {L"\\1.1\\409\\", L"\\1.1\\0\\"};
+// Below those: for programs of this kind, and of the other kind, of which a 64-bit system runs both; and
+// where those see the registry.
 #ifdef _WIN64
-constexpr wchar_t kFileKey[] = L"\\1.1\\409\\win64";
-constexpr wchar_t kOtherFileKey[] = L"\\1.1\\409\\win32";
+constexpr wchar_t kFileKey[] = L"win64";
+constexpr wchar_t kOtherFileKey[] = L"win32";
 constexpr REGSAM kOtherView = KEY_WOW64_32KEY;
 #else
-constexpr wchar_t kFileKey[] = L"\\1.1\\409\\win32";
-constexpr wchar_t kOtherFileKey[] = L"\\1.1\\409\\win64";
+constexpr wchar_t kFileKey[] = L"win32";
+constexpr wchar_t kOtherFileKey[] = L"win64";
 constexpr REGSAM kOtherView = KEY_WOW64_64KEY;
 #endif
 
@@ -169,7 +171,7 @@ std::wstring KeyOf(const Interface& known) {
 void RegisterTypeLibrary(const Classes& classes, const std::wstring& path) {
   const std::wstring version = LibraryKey() + L"\\" + kVersion;
   classes.SetValue(version, nullptr, kLibraryName);
-  classes.SetValue(LibraryKey() + kFileKey, nullptr, path);
+  for (const wchar_t* locale : kLocaleKeys) classes.SetValue(LibraryKey() + locale + kFileKey, nullptr, path);
   classes.SetValue(version + L"\\FLAGS", nullptr, L"0");
   classes.SetValue(version + L"\\HELPDIR", nullptr, path.substr(0, path.rfind(L'\\')));
   // Programs of both kinds call one another.
@@ -185,9 +187,13 @@ void RegisterTypeLibrary(const Classes& classes, const std::wstring& path) {
 }
 
 bool UnregisterTypeLibrary(const Classes& classes) {
+  bool gone = true;
   // The file for the other kind of programs has the same interfaces.
-  if (classes.Has(LibraryKey() + kOtherFileKey)) return classes.Remove(LibraryKey() + kFileKey);
-  bool gone = classes.Remove(LibraryKey());
+  if (classes.Has(LibraryKey() + kLocaleKeys[0] + kOtherFileKey)) {
+    for (const wchar_t* locale : kLocaleKeys) gone &= classes.Remove(LibraryKey() + locale + kFileKey);
+    return gone;
+  }
+  gone &= classes.Remove(LibraryKey());
   for (const REGSAM view : {REGSAM{0}, kOtherView})
     for (const Interface& known : kInterfaces) gone &= classes.Remove(KeyOf(known), view);
   return gone;

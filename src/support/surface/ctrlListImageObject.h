@@ -26,13 +26,9 @@ class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, priv
 
   // FileControlObject
   FileControl& Rules() override { return *rules_; }
-  HWND MakeWindow() override { return view_.Window(); }
-  void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background) override {
-    view_.SetLook(font, text, background);
-  }
+  ControlWindow& View() override { return view_; }
 
   // OleControlHooks
-  void Park() override { view_.Park(); }
   void Draw(HDC dc, const RECT& bounds) override { view_.Draw(dc, bounds); }
   void GiveFocus() override { view_.Focus(); }
   bool MoveFocus(bool) override { return false; }

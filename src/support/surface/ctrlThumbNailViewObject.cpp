@@ -59,12 +59,6 @@ STDMETHODIMP ctrlThumbNailViewObject::Overlay(VARIANT*, VARIANT*, IPictureDisp**
   return S_OK;
 }
 
-HWND ctrlThumbNailViewObject::MakeWindow() {
-  const HWND window = page_.Window();
-  if (window) scrollHook_.Install(window);
-  return window;
-}
-
 // Each handler keeps the control alive: the host's code runs inside.
 void ctrlThumbNailViewObject::SlotPressed(int slot, bool rightButton) {
   const ComPtr<IUnknown> alive = KeptAlive();

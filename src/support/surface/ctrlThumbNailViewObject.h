@@ -28,13 +28,10 @@ class ctrlThumbNailViewObject final : public FileControlObject<_ctrlThumbNailVie
 
   // FileControlObject
   FileControl& Rules() override { return *rules_; }
-  HWND MakeWindow() override;
-  void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background) override {
-    page_.SetLook(font, text, background);
-  }
+  ControlWindow& View() override { return page_; }
+  void WindowMade(HWND window) override { scrollHook_.Install(window); }
 
   // OleControlHooks
-  void Park() override { page_.Park(); }
   void Draw(HDC dc, const RECT& bounds) override { page_.Draw(dc, bounds); }
   void GiveFocus() override { page_.Focus(); }
   bool MoveFocus(bool backward) override { return page_.MoveFocus(backward); }
