@@ -263,12 +263,14 @@ STDMETHODIMP ControlContainer::ContextSensitiveHelp(BOOL) {
 STDMETHODIMP ControlContainer::OnInPlaceActivate() {
   if (inPlace_) Violation("OnInPlaceActivate twice");
   inPlace_ = true;
-  return S_OK;
+  const HRESULT agreed = onActivate ? onActivate(false) : S_OK;
+  if (FAILED(agreed)) inPlace_ = false;
+  return agreed;
 }
 
 STDMETHODIMP ControlContainer::OnUIActivate() {
   if (!inPlace_) Violation("OnUIActivate before OnInPlaceActivate");
-  return S_OK;
+  return onActivate ? onActivate(true) : S_OK;
 }
 
 STDMETHODIMP ControlContainer::GetWindowContext(IOleInPlaceFrame** frame, IOleInPlaceUIWindow** document,

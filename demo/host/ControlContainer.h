@@ -61,6 +61,8 @@ class ControlContainer final : public IOleClientSite,
   // A key that the control passed on, with 1 for Shift, 2 for Control and 4 for Alt; true when the form took
   // it, else it is looked at as a dialog key.
   std::function<bool(const MSG& message, DWORD modifiers)> onKey;
+  // Runs when the control is activated in place and when it gets the keyboard; a failure refuses that.
+  std::function<HRESULT(bool ui)> onActivate;
   // Persisted properties that the control said to have changed.
   std::vector<DISPID> changed;
   // Calls that no container must get, in words.

@@ -78,7 +78,10 @@ ControlWindow::ControlWindow(HINSTANCE module, const wchar_t* className)
     : module_(module), className_(className), dpi_(SystemDpi()) {}
 
 ControlWindow::~ControlWindow() {
-  if (!window_) return;
+  if (!window_) {
+    if (registered_) LeaveNothing(module_, className_);
+    return;
+  }
   // No message reaches the object from here on.
   SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
   if (depth_ == 0) {
@@ -112,6 +115,7 @@ bool ControlWindow::MakeWindow() {
   {
     const std::lock_guard guard(classes);
     RegisterClassExW(&windowClass);  // fails when it is registered already
+    registered_ = true;
     window_ = CreateWindowExW(WS_EX_CONTROLPARENT, className_, L"", WS_CHILD | WS_CLIPCHILDREN, 0, 0, 0, 0,
                               ParkingWindow(module_), nullptr, module_, this);
   }

@@ -88,6 +88,8 @@ class ControlWindow {
   const HINSTANCE module_;
   const wchar_t* const className_;
   HWND window_ = nullptr;
+  // There was a window; its class may be registered since then.
+  bool registered_ = false;
   // All children are there.
   bool made_ = false;
   // Handlers of messages that run now, one inside the other.

@@ -20,8 +20,13 @@ constexpr int kListImageBitmap = 101;
 constexpr int kThumbNailViewBitmap = 102;
 
 template <typename Object>
-IUnknown* Make() {
+IUnknown* Make(IUnknown*) {
   return static_cast<IUnknown*>(static_cast<IDispatch*>(new Object));
+}
+
+template <typename Control>
+IUnknown* MakeControl(IUnknown* outer) {
+  return (new Control(outer))->Own();
 }
 
 const std::array kClasses = {
@@ -29,10 +34,10 @@ const std::array kClasses = {
                    Make<CFileUploadObject>},
     CreatableClass{CLSID_CBVAccount, L"CBVAccount", L"Tarnwick account details", 0, Make<CBVAccountObject>},
     CreatableClass{CLSID_ctrlListImage, L"ctrlListImage", L"Tarnwick list of the account's files",
-                   kListImageBitmap, Make<ctrlListImageObject>},
+                   kListImageBitmap, MakeControl<ctrlListImageObject>},
     CreatableClass{CLSID_ctrlThumbNailView, L"ctrlThumbNailView",
                    L"Tarnwick thumbnails of the account's pictures", kThumbNailViewBitmap,
-                   Make<ctrlThumbNailViewObject>},
+                   MakeControl<ctrlThumbNailViewObject>},
 };
 
 class ClassFactory final : public ComObject<IClassFactory> {
@@ -42,9 +47,10 @@ class ClassFactory final : public ComObject<IClassFactory> {
   STDMETHODIMP CreateInstance(IUnknown* outer, REFIID interfaceId, void** object) override {
     if (!object) return E_POINTER;
     *object = nullptr;
-    if (outer) return CLASS_E_NOAGGREGATION;
+    // Containers make a control and what they add to it one object.
+    if (outer && (!class_.IsControl() || interfaceId != IID_IUnknown)) return CLASS_E_NOAGGREGATION;
     return Guarded([&] {
-      const auto made = ComPtr<IUnknown>::Adopt(class_.make());
+      const auto made = ComPtr<IUnknown>::Adopt(class_.make(outer));
       return made->QueryInterface(interfaceId, object);
     });
   }

@@ -14,8 +14,10 @@ struct CreatableClass {
   const wchar_t* description;
   // Number of the picture for tool boxes; 0 when the class is no control.
   int toolboxBitmap;
-  // A new object with one reference; may throw.
-  IUnknown* (*make)();
+  // A new object with one reference, for a control as part of `outer` when that is not null; may throw.
+  IUnknown* (*make)(IUnknown* outer);
+
+  bool IsControl() const { return toolboxBitmap != 0; }
 };
 
 std::span<const CreatableClass> CreatableClasses();

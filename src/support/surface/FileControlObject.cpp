@@ -16,8 +16,9 @@ constexpr std::array kProperties = {PersistedProperty{L"OLEDropMode", kOleDropMo
 }  // namespace
 
 template <typename Interface>
-FileControlObject<Interface>::FileControlObject(const ControlClass& itsClass)
-    : class_(itsClass),
+FileControlObject<Interface>::FileControlObject(const ControlClass& itsClass, IUnknown* outer)
+    : outer_(outer),
+      class_(itsClass),
       ole_(*this, itsClass.events, itsClass.extent),
       events_(ole_),
       uploader_(apartment_.Get().platform),
@@ -30,17 +31,38 @@ void FileControlObject<Interface>::StopDrops() {
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::QueryInterface(REFIID interfaceId, void** object) {
-  return DualObject<Interface>::QueryInterface(interfaceId, object);
+  return outer_ ? outer_->QueryInterface(interfaceId, object)
+                : DualObject<Interface>::QueryInterface(interfaceId, object);
 }
 template <typename Interface>
 STDMETHODIMP_(ULONG)
 FileControlObject<Interface>::AddRef() {
-  return DualObject<Interface>::AddRef();
+  return outer_ ? outer_->AddRef() : DualObject<Interface>::AddRef();
 }
 template <typename Interface>
 STDMETHODIMP_(ULONG)
 FileControlObject<Interface>::Release() {
-  return DualObject<Interface>::Release();
+  return outer_ ? outer_->Release() : DualObject<Interface>::Release();
+}
+
+template <typename Interface>
+IUnknown* FileControlObject<Interface>::Own() {
+  return outer_ ? &part_ : &Identity();
+}
+
+template <typename Interface>
+STDMETHODIMP FileControlObject<Interface>::Part::QueryInterface(REFIID interfaceId, void** object) {
+  if (!object) return E_POINTER;
+  if (interfaceId == IID_IUnknown) {
+    *object = this;
+    AddRef();
+    return S_OK;
+  }
+  *object = object_.FindInterface(interfaceId);
+  if (!*object) return E_NOINTERFACE;
+  // What is handed out counts for the whole.
+  object_.AddRef();
+  return S_OK;
 }
 
 template <typename Interface>

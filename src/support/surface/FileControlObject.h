@@ -35,6 +35,9 @@ class FileControlObject : public DualObject<Interface>,
                           private OleControlHooks,
                           private DropUser {
  public:
+  // The unknown that counts this object alone; what `outer` holds when there is one. Not counted anew.
+  IUnknown* Own();
+
   STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;
   STDMETHODIMP_(ULONG) AddRef() override;
   STDMETHODIMP_(ULONG) Release() override;
@@ -98,7 +101,9 @@ class FileControlObject : public DualObject<Interface>,
   STDMETHODIMP RenameFile(BSTR* strOldFileName, BSTR* strNewFileName, VARIANT_BOOL* result) override;
 
  protected:
-  explicit FileControlObject(const ControlClass& itsClass);
+  // `outer` is the object that this one is a part of, and asks and counts in its place; it may be null, and
+  // lives longer.
+  FileControlObject(const ControlClass& itsClass, IUnknown* outer);
   ~FileControlObject() override = default;
   // To be called first of all when the object ends: its window goes before the target that is registered for
   // it.
@@ -123,9 +128,21 @@ class FileControlObject : public DualObject<Interface>,
   void RunDragOut();
 
   // OleControlHooks
-  IUnknown& Identity() override { return static_cast<Interface&>(*this); }
+  IUnknown& Identity() override { return outer_ ? *outer_ : static_cast<Interface&>(*this); }
 
  private:
+  // This object without the one that it is a part of.
+  class Part final : public IUnknown {
+   public:
+    explicit Part(FileControlObject& object) : object_(object) {}
+    STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;
+    STDMETHODIMP_(ULONG) AddRef() override { return object_.DualObject<Interface>::AddRef(); }
+    STDMETHODIMP_(ULONG) Release() override { return object_.DualObject<Interface>::Release(); }
+
+   private:
+    FileControlObject& object_;
+  };
+
   void* FindInterface(REFIID interfaceId) override;
 
   // OleControlHooks
@@ -146,6 +163,8 @@ class FileControlObject : public DualObject<Interface>,
   // Raises an automation error with a description.
   HRESULT Fail(const wchar_t* description, std::int32_t number) const;
 
+  IUnknown* const outer_;
+  Part part_{*this};
   const ControlClass class_;
   const ApartmentHold apartment_;
   OleControl ole_;

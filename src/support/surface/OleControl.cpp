@@ -354,9 +354,15 @@ HRESULT OleControl::ActivateInPlace() {
   inPlaceSite_ = inPlaceSite;
   inPlace_ = true;
   const HRESULT agreed = inPlaceSite->OnInPlaceActivate();
-  if (FAILED(agreed)) InPlaceDeactivate();
+  if (FAILED(agreed)) {
+    inPlace_ = false;
+    inPlaceSite_ = {};
+    frame_ = {};
+    document_ = {};
+    return agreed;
+  }
   // The container's code may have closed the form.
-  if (!inPlace_) return FAILED(agreed) ? agreed : E_FAIL;
+  if (!inPlace_) return E_FAIL;
   SetParent(window, parent);
   Place(position, clip);
   return S_OK;

@@ -150,7 +150,7 @@ void RegisterClass(const Classes& classes, const CreatableClass& known, const st
   classes.SetValue(names.classKey + L"\\TypeLib", nullptr, GuidText(LIBID_Tarnwick));
   classes.SetValue(names.classKey + L"\\Version", nullptr, kVersion);
   classes.SetValue(names.classKey + L"\\Programmable", nullptr, {});
-  if (known.toolboxBitmap != 0) RegisterControl(classes, names.classKey, path, known.toolboxBitmap);
+  if (known.IsControl()) RegisterControl(classes, names.classKey, path, known.toolboxBitmap);
   classes.SetValue(names.versioned, nullptr, known.description);
   classes.SetValue(names.versioned + L"\\CLSID", nullptr, classId);
   classes.SetValue(names.general, nullptr, known.description);

@@ -12,8 +12,8 @@ const ControlClass kClass = {CLSID_ctrlListImage, DIID___ctrlListImage, L"Tarnwi
 
 }  // namespace
 
-ctrlListImageObject::ctrlListImageObject()
-    : FileControlObject(kClass),
+ctrlListImageObject::ctrlListImageObject(IUnknown* outer)
+    : FileControlObject(kClass, outer),
       view_(module::Instance(), *this),
       rules_(std::make_unique<ctrlListImage>(Parts(), view_)) {}
 

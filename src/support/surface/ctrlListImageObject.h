@@ -11,7 +11,7 @@ namespace tarnwick {
 
 class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, private ListViewUser {
  public:
-  ctrlListImageObject();
+  explicit ctrlListImageObject(IUnknown* outer);
 
   STDMETHODIMP get_m_lDownloadedBytes(LONG* value) override;
   STDMETHODIMP put_m_lDownloadedBytes(LONG value) override;

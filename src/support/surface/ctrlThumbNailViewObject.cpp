@@ -10,8 +10,8 @@ const ControlClass kClass = {CLSID_ctrlThumbNailView, DIID___ctrlThumbNailView, 
 
 }  // namespace
 
-ctrlThumbNailViewObject::ctrlThumbNailViewObject()
-    : FileControlObject(kClass),
+ctrlThumbNailViewObject::ctrlThumbNailViewObject(IUnknown* outer)
+    : FileControlObject(kClass, outer),
       page_(module::Instance(), *this),
       scrollHook_(TheApartment().scrollHook),
       rules_(std::make_unique<ctrlThumbNailView>(Parts(), page_)) {}

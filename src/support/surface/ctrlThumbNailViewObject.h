@@ -13,7 +13,7 @@ namespace tarnwick {
 class ctrlThumbNailViewObject final : public FileControlObject<_ctrlThumbNailView>,
                                       private ThumbnailPageUser {
  public:
-  ctrlThumbNailViewObject();
+  explicit ctrlThumbNailViewObject(IUnknown* outer);
 
   STDMETHODIMP get_iImgNo(short* value) override;
   STDMETHODIMP put_iImgNo(short value) override;

@@ -390,6 +390,150 @@ TYPED_TEST(AnyControl, IsShownHiddenMovedAndDesigned) {
   EXPECT_FALSE(designed.container->IsUiActive());
 }
 
+TYPED_TEST(AnyControl, TakesTheContainersAnswerToItsActivation) {
+  for (const bool atUi : {false, true})
+    for (const bool closes : {false, true}) {
+      SCOPED_TRACE(testing::Message() << atUi << closes);
+      TypeParam form;
+      ShowWindow(form.frame, SW_SHOWNOACTIVATE);
+      form.container->onActivate = [&](bool ui) -> HRESULT {
+        if (ui != atUi) return S_OK;
+        if (!closes) return E_ACCESSDENIED;
+        form.container->Close();
+        return S_OK;
+      };
+      EXPECT_EQ(form.container->Do(OLEIVERB_UIACTIVATE), closes ? E_FAIL : E_ACCESSDENIED);
+      EXPECT_FALSE(form.container->IsUiActive());
+      EXPECT_EQ(form.Window() != nullptr, atUi && !closes);
+    }
+}
+
+// Listens to two controls, so that what it answers to depends on the interface that it is asked for.
+class TwoSinks final : public IUnknown {
+ public:
+  struct Sink final : IDispatch {
+    TwoSinks* owner = nullptr;
+    int calls = 0;
+    STDMETHODIMP QueryInterface(REFIID id, void** object) override {
+      return owner->QueryInterface(id, object);
+    }
+    STDMETHODIMP_(ULONG) AddRef() override { return 2; }
+    STDMETHODIMP_(ULONG) Release() override { return 1; }
+    STDMETHODIMP GetTypeInfoCount(UINT*) override { return E_NOTIMPL; }
+    STDMETHODIMP GetTypeInfo(UINT, LCID, ITypeInfo**) override { return E_NOTIMPL; }
+    STDMETHODIMP GetIDsOfNames(REFIID, LPOLESTR*, UINT, LCID, DISPID*) override { return E_NOTIMPL; }
+    STDMETHODIMP Invoke(DISPID, REFIID, LCID, WORD, DISPPARAMS*, VARIANT*, EXCEPINFO*, UINT*) override {
+      ++calls;
+      return S_OK;
+    }
+  };
+  explicit TwoSinks(REFIID eventsId) : events_(eventsId) { general.owner = events.owner = this; }
+  STDMETHODIMP QueryInterface(REFIID id, void** object) override {
+    *object = id == events_         ? &events
+              : id == IID_IDispatch ? &general
+              : id == IID_IUnknown  ? static_cast<IUnknown*>(this)
+                                    : nullptr;
+    return *object ? S_OK : E_NOINTERFACE;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return 2; }
+  STDMETHODIMP_(ULONG) Release() override { return 1; }
+  Sink events;
+  Sink general;
+
+ private:
+  const IID events_;
+};
+
+TYPED_TEST(AnyControl, TellsTheInterfaceThatASinkOffers) {
+  TypeParam form;
+  TwoSinks sink(TypeParam::EventsId());
+  ComPtr<IConnectionPointContainer> points;
+  ASSERT_EQ(form.control->QueryInterface(IID_IConnectionPointContainer, points.ReceiveVoid()), S_OK);
+  ComPtr<IConnectionPoint> point;
+  ASSERT_EQ(points->FindConnectionPoint(TypeParam::EventsId(), point.Receive()), S_OK);
+  DWORD cookie = 0;
+  ASSERT_EQ(point->Advise(&sink, &cookie), S_OK);
+  Bstr refused(L"#");
+  BSTR given = refused;
+  VARIANT_BOOL valid = VARIANT_TRUE;
+  form.control->IsFileNameValid(&given, &valid);
+  EXPECT_EQ(sink.events.calls, 1);
+  EXPECT_EQ(sink.general.calls, 0);
+  EXPECT_EQ(point->Unadvise(cookie), S_OK);
+  point = {};
+  ASSERT_EQ(points->FindConnectionPoint(IID_IPropertyNotifySink, point.Receive()), S_OK);
+  EXPECT_EQ(point->Advise(&sink, &cookie), CONNECT_E_CANNOTCONNECT);
+}
+
+// A container's addition to a control, and the control as a part of it.
+class Whole final : public IUnknown {
+ public:
+  explicit Whole(bool& ended) : ended_(ended) {}
+  HRESULT Make(REFCLSID classId) {
+    return CoCreateInstance(classId, this, CLSCTX_INPROC_SERVER, IID_IUnknown, part_.ReceiveVoid());
+  }
+  STDMETHODIMP QueryInterface(REFIID id, void** object) override {
+    if (id != IID_IUnknown) return part_->QueryInterface(id, object);
+    *object = this;
+    AddRef();
+    return S_OK;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
+  STDMETHODIMP_(ULONG) Release() override {
+    const ULONG left = --references_;
+    if (left == 0) {
+      // The part may still ask and count it while it ends.
+      references_ = 1000;
+      delete this;
+    }
+    return left;
+  }
+
+ private:
+  ~Whole() { ended_ = true; }
+
+  ULONG references_ = 1;
+  bool& ended_;
+  ComPtr<IUnknown> part_;
+};
+
+TYPED_TEST(AnyControl, CanBePartOfAnotherObject) {
+  CLSID classId = {};
+  ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
+  ComPtr<IUnknown> refused;
+  bool ended = false;
+  auto whole = ComPtr<Whole>::Adopt(new Whole(ended));
+  EXPECT_EQ(
+      CoCreateInstance(classId, whole.Get(), CLSCTX_INPROC_SERVER, IID_IDispatch, refused.ReceiveVoid()),
+      CLASS_E_NOAGGREGATION);
+  ASSERT_EQ(whole->Make(classId), S_OK);
+  ComPtr<IDispatch> control;
+  ComPtr<IUnknown> identity;
+  ASSERT_EQ(whole->QueryInterface(IID_IDispatch, control.ReceiveVoid()), S_OK);
+  ASSERT_EQ(control->QueryInterface(IID_IUnknown, identity.ReceiveVoid()), S_OK);
+  EXPECT_EQ(identity.Get(), static_cast<IUnknown*>(whole.Get()));
+  identity = {};
+
+  TypeParam form;
+  const auto container = ComPtr<ControlContainer>::Adopt(new ControlContainer(form.frame));
+  int events = 0;
+  container->onEvent = [&](DISPID, std::vector<VARIANT>&) { ++events; };
+  ASSERT_EQ(container->TakeUp(*whole.Get(), ControlContainer::WayIn::kSteps), S_OK);
+  whole = {};
+  ShowWindow(form.frame, SW_SHOWNOACTIVATE);
+  EXPECT_EQ(container->Do(OLEIVERB_UIACTIVATE), S_OK);
+  const HWND window = GetWindow(form.frame, GW_CHILD);
+  EXPECT_TRUE(IsWindowVisible(window));
+  Call(control.Get(), L"IsFileNameValid", {VariantOf(Bstr(L"#"))});
+  EXPECT_EQ(events, 1);
+  control = {};
+  EXPECT_FALSE(ended);
+  EXPECT_EQ(container->Close(), 0U);
+  EXPECT_TRUE(ended);
+  EXPECT_FALSE(IsWindow(window));
+  EXPECT_TRUE(container->violations.empty());
+}
+
 std::vector<HWND> StopsOf(const Form& form) {
   return {form.ListWindow()};
 }

@@ -63,9 +63,10 @@ class Lifetime : public testing::Test {
 struct Class {
   const char* name;
   const CLSID& id;
+  const wchar_t* windowClass = nullptr;
 };
-const Class kControls[] = {{"ctrlListImage", CLSID_ctrlListImage},
-                           {"ctrlThumbNailView", CLSID_ctrlThumbNailView}};
+const Class kControls[] = {{"ctrlListImage", CLSID_ctrlListImage, L"TarnwickListImage"},
+                           {"ctrlThumbNailView", CLSID_ctrlThumbNailView, L"TarnwickThumbNailView"}};
 
 TEST_F(Lifetime, ObjectsLeaveNothing) {
   const Class classes[] = {
@@ -85,8 +86,9 @@ TEST_F(Lifetime, ObjectsLeaveNothing) {
 }
 
 TEST_F(Lifetime, ControlsWithWindowsAndSinksLeaveNothing) {
-  const HWND form =
-      CreateWindowExW(0, L"STATIC", L"form", WS_POPUP, 0, 0, 400, 300, nullptr, nullptr, nullptr, nullptr);
+  // Who ends the control: the host, the host inside one of the control's events, or the form's window.
+  enum class End { kHost, kHostInEvent, kWindow };
+  HWND form = nullptr;
   for (const Class& known : kControls) {
     // What is created by its class comes from the test library then.
     ComPtr<IClassFactory> factory;
@@ -98,19 +100,37 @@ TEST_F(Lifetime, ControlsWithWindowsAndSinksLeaveNothing) {
         CoRegisterClassObject(known.id, factory.Get(), CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE, &cookie),
         S_OK);
     factory = {};
-    const auto show = [&] {
+    const auto show = [&](End end) {
+      if (!IsWindow(form))
+        form = CreateWindowExW(0, L"STATIC", L"form", WS_POPUP, 0, 0, 400, 300, nullptr, nullptr, nullptr,
+                               nullptr);
       auto container = ComPtr<demo::ControlContainer>::Adopt(new demo::ControlContainer(form));
       ASSERT_EQ(container->Create(known.id, demo::ControlContainer::WayIn::kSteps, nullptr), S_OK);
       container->SetBounds({0, 0, 300, 200});
       ASSERT_EQ(container->Do(OLEIVERB_SHOW), S_OK);
+      const HWND inside = GetWindow(GetWindow(form, GW_CHILD), GW_CHILD);
+      if (end == End::kHostInEvent) {
+        container->onEvent = [&](DISPID, std::vector<VARIANT>&) { container->Close(); };
+        SendMessageW(inside, WM_KEYDOWN, VK_RETURN, 0);
+        EXPECT_EQ(container->Control(), nullptr);
+      }
+      if (end == End::kWindow) DestroyWindow(form);
       EXPECT_EQ(container->Close(), 0U);
     };
-    for (int i = 0; i < 3; ++i) show();
-    const Held before = Count();
-    for (int i = 0; i < 500; ++i) show();
-    const Held after = Count();
-    EXPECT_EQ(after.allocations, before.allocations) << known.name;
-    EXPECT_EQ(after.objects, before.objects) << known.name;
+    for (const auto& [end, times] :
+         {std::pair(End::kHost, 500), {End::kHostInEvent, 20}, {End::kWindow, 20}}) {
+      SCOPED_TRACE(testing::Message() << known.name << " " << static_cast<int>(end));
+      // A form that is there at one count is there at the other.
+      for (int i = 0; i < 3; ++i) show(end);
+      const Held before = Count();
+      for (int i = 0; i < times; ++i) show(end);
+      const Held after = Count();
+      EXPECT_EQ(after.allocations, before.allocations);
+      EXPECT_EQ(after.objects, before.objects);
+      WNDCLASSEXW left = {};
+      left.cbSize = sizeof left;
+      EXPECT_FALSE(GetClassInfoExW(library_.Module(), known.windowClass, &left));
+    }
     CoRevokeClassObject(cookie);
 
     LeavesNothing("sinks", 1, [&] {

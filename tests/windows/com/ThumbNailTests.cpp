@@ -261,6 +261,8 @@ TEST(ThumbNailControl, UploadsRenamesInPlaceAndDeletes) {
     form.Press(VK_F2);
     EXPECT_EQ(form.events, Lines{L"8888 "});
     ASSERT_TRUE(IsWindowVisible(form.Editor()));
+    // The form may activate the control once more.
+    EXPECT_EQ(form.container->Do(OLEIVERB_UIACTIVATE), S_OK);
     EXPECT_EQ(GetFocus(), form.Editor());
     const std::wstring before = form.Selected();
     EXPECT_EQ(TextOf(form.Editor()), before);
