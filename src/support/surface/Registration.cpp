@@ -63,20 +63,16 @@ std::wstring GuidText(const GUID& guid) {
 }
 
 // The classes of all users or of the current one. A view says for which kind of programs; 0 is this one's.
+// Keys are named from the root on: below an open key some versions of the system know no views.
 class Classes {
  public:
-  explicit Classes(Scope scope) {
-    HKEY key = nullptr;
-    Check(RegCreateKeyExW(scope == Scope::kUser ? HKEY_CURRENT_USER : HKEY_LOCAL_MACHINE,
-                          L"Software\\Classes", 0, nullptr, 0, KEY_ALL_ACCESS, nullptr, &key, nullptr));
-    root_ = KeyOwner(key);
-  }
+  explicit Classes(Scope scope) : root_(scope == Scope::kUser ? HKEY_CURRENT_USER : HKEY_LOCAL_MACHINE) {}
 
   // Sets a value of a key, which is made when it is not there; null names the key's own value.
   void SetValue(const std::wstring& path, const wchar_t* name, const std::wstring& value,
                 REGSAM view = 0) const {
     HKEY key = nullptr;
-    Check(RegCreateKeyExW(root_.Get(), path.c_str(), 0, nullptr, 0, KEY_SET_VALUE | view, nullptr, &key,
+    Check(RegCreateKeyExW(root_, Full(path).c_str(), 0, nullptr, 0, KEY_SET_VALUE | view, nullptr, &key,
                           nullptr));
     const KeyOwner owner(key);
     Check(RegSetValueExW(key, name, 0, REG_SZ, reinterpret_cast<const BYTE*>(value.c_str()),
@@ -92,7 +88,7 @@ class Classes {
     const KeyOwner key = Open(path, KEY_ALL_ACCESS | view);
     if (!key) return !Has(path, view);
     return RegDeleteTreeW(key.Get(), nullptr) == ERROR_SUCCESS &&
-           RegDeleteKeyExW(root_.Get(), path.c_str(), view, 0) == ERROR_SUCCESS;
+           RegDeleteKeyExW(root_, Full(path).c_str(), view, 0) == ERROR_SUCCESS;
   }
 
   // Removes a key that has neither keys nor values below it.
@@ -104,17 +100,19 @@ class Classes {
         RegQueryInfoKeyW(key.Get(), nullptr, nullptr, nullptr, &keys, nullptr, nullptr, &values, nullptr,
                          nullptr, nullptr, nullptr) == ERROR_SUCCESS &&
         keys == 0 && values == 0)
-      RegDeleteKeyExW(root_.Get(), path.c_str(), view, 0);
+      RegDeleteKeyExW(root_, Full(path).c_str(), view, 0);
   }
 
  private:
+  static std::wstring Full(const std::wstring& path) { return L"Software\\Classes\\" + path; }
+
   KeyOwner Open(const std::wstring& path, REGSAM access) const {
     HKEY key = nullptr;
-    RegOpenKeyExW(root_.Get(), path.c_str(), 0, access, &key);
+    RegOpenKeyExW(root_, Full(path).c_str(), 0, access, &key);
     return KeyOwner(key);
   }
 
-  KeyOwner root_;
+  const HKEY root_;
 };
 
 struct Names {

@@ -326,6 +326,22 @@ TYPED_TEST(AnyControl, MayBeReleasedInAnEventOfItsWait) {
 }
 
 // A container that shows a picture of the control only, as a form in design does, or a report.
+// Counts how often a container that draws the control itself is to draw it anew.
+struct ViewSink final : IAdviseSink {
+  int changes = 0;
+  STDMETHODIMP QueryInterface(REFIID id, void** object) override {
+    *object = id == IID_IUnknown || id == IID_IAdviseSink ? this : nullptr;
+    return *object ? S_OK : E_NOINTERFACE;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return 2; }
+  STDMETHODIMP_(ULONG) Release() override { return 1; }
+  STDMETHODIMP_(void) OnDataChange(FORMATETC*, STGMEDIUM*) override {}
+  STDMETHODIMP_(void) OnViewChange(DWORD, LONG) override { ++changes; }
+  STDMETHODIMP_(void) OnRename(IMoniker*) override {}
+  STDMETHODIMP_(void) OnSave() override {}
+  STDMETHODIMP_(void) OnClose() override {}
+};
+
 TYPED_TEST(AnyControl, DrawsItselfWithoutAWindowOfTheContainer) {
   CLSID classId = {};
   ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
@@ -351,6 +367,25 @@ TYPED_TEST(AnyControl, DrawsItselfWithoutAWindowOfTheContainer) {
   DeleteObject(bitmap);
   DeleteDC(dc);
   ReleaseDC(nullptr, screen);
+
+  // What changes the look is told.
+  TypeParam form;
+  form.LogOn(TheServer().name);
+  ViewSink sink;
+  view = {};
+  ASSERT_EQ(form.control->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
+  EXPECT_EQ(view->SetAdvise(DVASPECT_CONTENT, 0, &sink), S_OK);
+  ASSERT_TRUE(form.Init(L"*"));
+  EXPECT_EQ(std::exchange(sink.changes, 0), 1);
+  form.Select(L"coffee.jpg");
+  EXPECT_EQ(std::exchange(sink.changes, 0), 1);
+  Bstr name(L"coffee.jpg");
+  BSTR given = name;
+  VARIANT_BOOL done = VARIANT_FALSE;
+  form.control->RenameFile(&given, &given, &done);
+  EXPECT_EQ(std::exchange(sink.changes, 0), 1);
+  EXPECT_EQ(view->SetAdvise(DVASPECT_CONTENT, 0, nullptr), S_OK);
+  view = {};
 }
 
 TYPED_TEST(AnyControl, IsShownHiddenMovedAndDesigned) {

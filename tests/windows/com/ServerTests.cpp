@@ -96,6 +96,56 @@ TEST(Server, TypeLibraryIsRegisteredForEveryLocale) {
   }
 }
 
+TEST(Server, UnregisteringLeavesWhatTheOtherKindOfProgramsNeeds) {
+  if (sizeof(void*) != 8) GTEST_SKIP() << "a 32-bit system has no other kind of programs";
+  const Library library;
+  const auto install = library.Export<HRESULT(STDAPICALLTYPE*)()>("DllRegisterServer");
+  const auto remove = library.Export<HRESULT(STDAPICALLTYPE*)()>("DllUnregisterServer");
+  ASSERT_TRUE(install && remove);
+  const auto key = [](const wchar_t* folder, const GUID& id) {
+    wchar_t text[39] = L"";
+    StringFromGUID2(id, text, 39);
+    return L"Software\\Classes\\" + std::wstring(folder) + L"\\" + text;
+  };
+  const auto has = [](const std::wstring& path, REGSAM view = 0) {
+    HKEY found = nullptr;
+    if (RegOpenKeyExW(HKEY_LOCAL_MACHINE, path.c_str(), 0, KEY_QUERY_VALUE | view, &found) != ERROR_SUCCESS)
+      return false;
+    RegCloseKey(found);
+    return true;
+  };
+  const std::wstring typeLibrary = key(L"TypeLib", LIBID_Tarnwick);
+  const std::wstring client = key(L"CLSID", CLSID_CFileUpload);
+  const std::wstring name = L"Software\\Classes\\Tarnwick.";
+  // As a 32-bit library would have registered one of the classes.
+  const std::pair<std::wstring, REGSAM> others[] = {{typeLibrary + L"\\1.1\\409\\win32", 0},
+                                                    {client, KEY_WOW64_32KEY}};
+  for (const auto& [path, view] : others) {
+    HKEY made = nullptr;
+    ASSERT_EQ(RegCreateKeyExW(HKEY_LOCAL_MACHINE, path.c_str(), 0, nullptr, 0, KEY_SET_VALUE | view, nullptr,
+                              &made, nullptr),
+              ERROR_SUCCESS);
+    RegCloseKey(made);
+  }
+  EXPECT_TRUE(has(client) && has(typeLibrary + L"\\1.1\\0\\win64"));
+  EXPECT_EQ(remove(), S_OK);
+  for (const auto& [path, view] : others) EXPECT_TRUE(has(path, view));
+  for (const REGSAM view : {0, KEY_WOW64_32KEY}) {
+    EXPECT_TRUE(has(key(L"Interface", __uuidof(_CFileUpload)), view));
+  }
+  EXPECT_TRUE(has(name + L"CFileUpload\\CLSID") && has(name + L"CFileUpload.1"));
+  EXPECT_FALSE(has(client) || has(name + L"CBVAccount"));
+  for (const wchar_t* locale : {L"\\1.1\\409\\win64", L"\\1.1\\0\\win64"})
+    EXPECT_FALSE(has(typeLibrary + locale));
+
+  for (const auto& [path, view] : others) RegDeleteKeyExW(HKEY_LOCAL_MACHINE, path.c_str(), view, 0);
+  EXPECT_EQ(install(), S_OK);
+  EXPECT_EQ(remove(), S_OK);
+  EXPECT_FALSE(has(typeLibrary) || has(name + L"CFileUpload") ||
+               has(key(L"Interface", __uuidof(_CFileUpload)), KEY_WOW64_32KEY));
+  EXPECT_EQ(install(), S_OK);
+}
+
 TEST(Server, NullPointersAreRefused) {
   const ComPtr<_CFileUpload> client = NewClient();
   ASSERT_TRUE(client);
