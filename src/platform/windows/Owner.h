@@ -37,6 +37,11 @@ class Owner {
 
   explicit operator bool() const { return handle_ != Kind::None(); }
   Handle Get() const { return handle_; }
+  // Gives up what it holds without closing it.
+  Handle Detach() {
+    if (*this) --ownedObjects;
+    return std::exchange(handle_, Kind::None());
+  }
 
  private:
   void Swap(Owner& other) noexcept { std::swap(handle_, other.handle_); }

@@ -80,6 +80,8 @@ void* OleControl::FindInterface(REFIID id) {
   // Begins with all of IPersistStream.
   if (id == IID_IPersist || id == IID_IPersistStream || id == IID_IPersistStreamInit)
     return static_cast<IPersistStreamInit*>(this);
+  if (id == IID_IPersistStorage) return static_cast<IPersistStorage*>(&embedding_);
+  if (id == IID_IDataObject) return static_cast<IDataObject*>(&embedding_);
   if (id == IID_IPersistPropertyBag) return static_cast<IPersistPropertyBag*>(this);
   if (id == IID_IQuickActivate) return static_cast<IQuickActivate*>(this);
   if (id == IID_IConnectionPointContainer) return static_cast<IConnectionPointContainer*>(this);
@@ -99,6 +101,7 @@ void OleControl::PropertyChanged(DISPID property) {
 }
 
 void OleControl::ViewChanged() {
+  embedding_.ViewChanged();
   const ComPtr<IAdviseSink> sink = viewSink_;
   if (sink && (viewAspects_ & DVASPECT_CONTENT)) {
     if (viewFlags_ & ADVF_ONLYONCE) viewSink_ = {};

@@ -12,6 +12,7 @@
 
 #include "support/surface/ComPtr.h"
 #include "support/surface/ConnectionPoints.h"
+#include "support/surface/Embedding.h"
 
 namespace tarnwick {
 
@@ -204,6 +205,7 @@ class OleControl final : public IOleObject,
   OleControlHooks& hooks_;
   ConnectionPoint events_;
   ConnectionPoint propertyListeners_;
+  Embedding embedding_{*this};
   const IID eventInterface_;
 
   ComPtr<IOleClientSite> site_;

@@ -1,4 +1,5 @@
 // The controls in a full container of our own, in the system's, and in none.
+#include <set>
 #include <thread>
 
 #include "Form.h"
@@ -329,13 +330,14 @@ TYPED_TEST(AnyControl, MayBeReleasedInAnEventOfItsWait) {
 // Counts how often a container that draws the control itself is to draw it anew.
 struct ViewSink final : IAdviseSink {
   int changes = 0;
+  int dataChanges = 0;
   STDMETHODIMP QueryInterface(REFIID id, void** object) override {
     *object = id == IID_IUnknown || id == IID_IAdviseSink ? this : nullptr;
     return *object ? S_OK : E_NOINTERFACE;
   }
   STDMETHODIMP_(ULONG) AddRef() override { return 2; }
   STDMETHODIMP_(ULONG) Release() override { return 1; }
-  STDMETHODIMP_(void) OnDataChange(FORMATETC*, STGMEDIUM*) override {}
+  STDMETHODIMP_(void) OnDataChange(FORMATETC*, STGMEDIUM*) override { ++dataChanges; }
   STDMETHODIMP_(void) OnViewChange(DWORD, LONG) override { ++changes; }
   STDMETHODIMP_(void) OnRename(IMoniker*) override {}
   STDMETHODIMP_(void) OnSave() override {}
@@ -567,6 +569,74 @@ TYPED_TEST(AnyControl, CanBePartOfAnotherObject) {
   EXPECT_TRUE(ended);
   EXPECT_FALSE(IsWindow(window));
   EXPECT_TRUE(container->violations.empty());
+}
+
+// With what the system offers for documents.
+TYPED_TEST(AnyControl, CanBeKeptInADocument) {
+  CLSID classId = {};
+  ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
+  ComPtr<IStorage> storage;
+  constexpr DWORD kMode = STGM_CREATE | STGM_READWRITE | STGM_SHARE_EXCLUSIVE | STGM_DELETEONRELEASE;
+  ASSERT_EQ(StgCreateDocfile(nullptr, kMode, 0, storage.Receive()), S_OK);
+  ComPtr<IPersistStorage> object;
+  ASSERT_EQ(OleCreate(classId, IID_IPersistStorage, OLERENDER_NONE, nullptr, nullptr, storage.Get(),
+                      object.ReceiveVoid()),
+            S_OK);
+  typename TypeParam::Control control;
+  ASSERT_EQ(object->QueryInterface(TypeParam::InterfaceId(), control.ReceiveVoid()), S_OK);
+  control->put_OLEDropMode(2);
+  EXPECT_EQ(object->IsDirty(), S_OK);
+  EXPECT_EQ(OleSave(object.Get(), storage.Get(), TRUE), S_OK);
+  EXPECT_EQ(object->SaveCompleted(nullptr), S_OK);
+  EXPECT_EQ(object->IsDirty(), S_FALSE);
+  control = {};
+  object = {};
+
+  ComPtr<IDataObject> data;
+  ASSERT_EQ(OleLoad(storage.Get(), IID_IDataObject, nullptr, data.ReceiveVoid()), S_OK);
+  ASSERT_EQ(data->QueryInterface(TypeParam::InterfaceId(), control.ReceiveVoid()), S_OK);
+  short mode = 0;
+  control->get_OLEDropMode(&mode);
+  EXPECT_EQ(mode, 2);
+
+  const ComPtr<_CFileUpload> client = LoggedOnClient();
+  Bstr filter(L"gif");
+  BSTR given = filter;
+  VARIANT_BOOL done = VARIANT_FALSE;
+  ASSERT_EQ(control->Init(&given, &done), S_OK);
+  // What it looks like, as data.
+  ComPtr<IEnumFORMATETC> formats;
+  ASSERT_EQ(data->EnumFormatEtc(DATADIR_GET, formats.Receive()), S_OK);
+  int count = 0;
+  for (FORMATETC format; formats->Next(1, &format, nullptr) == S_OK; ++count) {
+    STGMEDIUM medium = {};
+    ASSERT_EQ(data->GetData(&format, &medium), S_OK);
+    const Pixels played = Drawn(300, 200, [&](HDC dc) {
+      const RECT all = {0, 0, 300, 200};
+      if (medium.tymed == TYMED_ENHMF) {
+        PlayEnhMetaFile(dc, medium.hEnhMetaFile, &all);
+        return;
+      }
+      const auto* const picture = static_cast<const METAFILEPICT*>(GlobalLock(medium.hMetaFilePict));
+      SetMapMode(dc, picture->mm);
+      SetViewportExtEx(dc, 300, 200, nullptr);
+      PlayMetaFile(dc, picture->hMF);
+      GlobalUnlock(medium.hMetaFilePict);
+    });
+    EXPECT_GT(std::set(played.begin(), played.end()).size(), 5U) << format.cfFormat;
+    ReleaseStgMedium(&medium);
+  }
+  EXPECT_EQ(count, 2);
+  FORMATETC text = {CF_TEXT, nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
+  EXPECT_EQ(data->QueryGetData(&text), DV_E_FORMATETC);
+
+  ViewSink sink;
+  DWORD cookie = 0;
+  FORMATETC any = {CF_ENHMETAFILE, nullptr, DVASPECT_CONTENT, -1, TYMED_ENHMF};
+  EXPECT_EQ(data->DAdvise(&any, 0, &sink, &cookie), S_OK);
+  control->ChangeFileFilter(Bstr(L"gif"));
+  EXPECT_EQ(sink.dataChanges, 1);
+  EXPECT_EQ(data->DUnadvise(cookie), S_OK);
 }
 
 std::vector<HWND> StopsOf(const Form& form) {
