@@ -237,10 +237,12 @@ demo_tour() {
   while kill -0 "$host" 2>/dev/null; do
     shown=$(sed -n 's/\r//; s/^== //p' "$log" 2>/dev/null | tail -n 1) || true
     if [[ -n $shown && ! -e $shots/$shown.png ]]; then
-      import -window root "$folder/unfinished.png"
-      mv "$folder/unfinished.png" "$shots/$shown.png"
+      import -window root "$folder/unfinished.png" || true
+      mv "$folder/unfinished.png" "$shots/$shown.png" || true
     fi
     sleep 0.1
   done
   wait "$host"
+  # The host does not wait for ever.
+  for shown in $(sed -n 's/\r//; s/^== //p' "$log"); do [[ -s $shots/$shown.png ]]; done
 }

@@ -168,6 +168,7 @@ bool FileControl::SendFile(const Text& path) {
     }
   }
   Yield();
+  if (!uploadFinished_) Fail(ftp_error::kNotTaken, u"The file was not uploaded.");
   return uploadFinished_;
 }
 
@@ -367,6 +368,8 @@ void FileControl::BeginLocalCopy(const Text& path) {
 }
 
 void FileControl::FileBytes(std::string_view bytes) {
+  // However slowly, the upload goes on.
+  downloader_.RestartWatchdog();
   if (!copyWriter_) return;
   // A full disk here is no reason to lose the upload.
   const bool written = ResultAsItStood(false, [&](bool& done) {
@@ -391,14 +394,16 @@ void FileControl::FinishLocalCopy(const Text& path, const Text& url) {
 }
 
 void FileControl::MoveLocalCopy(const Text& from, const Text& to) {
+  // The file system takes both for one.
+  if (EqualsIgnoringCase(from, to)) return;
   FileSystem& files = apartment_.platform.files;
   // What is there under the new name is another picture's.
   if (from.empty() || !FileExists(files, from)) {
-    if (to != from) RemoveLocalCopy(to);
+    RemoveLocalCopy(to);
     return;
   }
-  if (!to.empty() && to != from) CopyLocalFile(files, from, to);
-  if (to != from) RemoveLocalCopy(from);
+  if (!to.empty()) CopyLocalFile(files, from, to);
+  RemoveLocalCopy(from);
 }
 
 void FileControl::RemoveLocalCopy(const Text& copy) {
@@ -420,8 +425,8 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
     if (inFolder) target += u"\\" + name;
     local = target;
 
-    Text url;
     const FileList& all = apartment_.allFiles;
+    Text url;
     for (std::size_t i = 1; i <= all.Count() && url.empty(); ++i)
       if (all.At(i)->FilePath.find(selected->FilePath) != Text::npos) url = all.At(i)->FilePath;
     if (url.empty()) return;

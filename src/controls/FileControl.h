@@ -205,6 +205,10 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Adds the account's files to the list of all files; false, with that list empty, when the service did not
   // tell them all or there is no client.
   bool ListAccount();
+  // What is shown from here on is the account of now.
+  void ShowsAccount() { shownSession_ = apartment_.session; }
+  // Whether another user has been logged on since: what is shown must not be changed in his account.
+  bool ShowsOtherAccount() const { return !apartment_.session.IsSameAccount(shownSession_); }
   // Fetches `url` into the user's folder, and to `explicitTarget` first unless that is empty. Waits, pumping,
   // for its end or until `stop` says so; whether `expected` is there then.
   bool Download(const Text& url, const Text& explicitTarget, const Text& expected,
@@ -272,6 +276,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool downloadFinished_ = false;
   bool renameInProgress_ = false;
   bool closed_ = false;
+  // Whose files are shown.
+  SessionValues shownSession_;
   int hourglasses_ = 0;
 };
 

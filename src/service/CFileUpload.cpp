@@ -119,6 +119,8 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
                                    0, u"UserAuthenticationStatus", u"FALSE");
     if (LowerCase(status) != u"true") return;
     session.loggedOn = true;
+    // The folder is the previous user's until a control prepares this one's.
+    if (user != previousUser) apartment_.UserFolderPath.clear();
     SetFtpLogon(apartment_.ftp, session);
     LookUpFtpProxy();
     result = true;

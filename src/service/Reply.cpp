@@ -8,6 +8,9 @@
 namespace tarnwick {
 namespace {
 
+// The service knows a few dozen; each name costs much more memory than its bytes.
+constexpr std::size_t kMostVariables = 1000;
+
 int HexDigit(char digit) {
   if (digit >= '0' && digit <= '9') return digit - '0';
   if (digit >= 'A' && digit <= 'F') return digit - 'A' + 10;
@@ -73,6 +76,7 @@ Reply Reply::FromBody(std::string_view body) {
       const std::optional<TextView> variable = unescaper.Unescape(name);
       if (!variable) return {};
       values = &reply.variables_[*variable];
+      if (reply.variables_.size() > kMostVariables) return {};
       lastName = name;
     }
     if (equals == std::string_view::npos) continue;

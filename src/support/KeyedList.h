@@ -36,6 +36,12 @@ class KeyedList {
   // Throws 9 when `position` is not 1 to Count().
   const Item& At(std::size_t position) const { return EntryAt(position).item; }
 
+  // The item with that key; null when there is none.
+  const Item* Find(TextView key) const {
+    const Entry* found = key.empty() ? nullptr : keys_.Find(key);
+    return found ? &found->item : nullptr;
+  }
+
   // Position of the item with that key, 0 when there is none.
   std::size_t PositionOf(TextView key) const {
     const Entry* found = key.empty() ? nullptr : keys_.Find(key);

@@ -20,6 +20,8 @@ struct FakeThumbnailPage : ThumbnailPage {
     bool selected = false;
   };
   Transcript& log;
+  // Whether pictures can be read.
+  bool decodes = true;
   std::array<Slot, kSlotCount> slots;
   bool grid = false;
   std::string message;
@@ -57,10 +59,12 @@ struct FakeThumbnailPage : ThumbnailPage {
     At(slot).caption = Utf8FromText(caption);
     log.push_back("caption " + std::to_string(slot) + " " + At(slot).caption);
   }
-  void SetPicture(int slot, TextView path, const PicturePlace& place) override {
+  bool SetPicture(int slot, TextView path, const PicturePlace& place) override {
+    log.push_back("picture " + std::to_string(slot));
+    if (!decodes) return false;
     At(slot).picture = Utf8FromText(path);
     At(slot).place = place;
-    log.push_back("picture " + std::to_string(slot));
+    return true;
   }
   void SetSelected(int slot, bool selected) override { At(slot).selected = selected; }
   void SetScrollRange(int itsMax) override { max = itsMax; }

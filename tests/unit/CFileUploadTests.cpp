@@ -57,6 +57,8 @@ TEST_F(CFileUploadTest, ServerName) {
 
 TEST_F(CFileUploadTest, EveryFalseLogonRestoresTheUser) {
   ASSERT_TRUE(Logon(u"first"));
+  fake.apartment.UserFolderPath = u"C:\\first";
+  ASSERT_TRUE(Logon(u"first"));
   for (const char* body :
        {"UserAuthenticationStatus=yes", "UserAuthenticationStatus", "", "ErrorOccured=1"}) {
     Answer(body);
@@ -69,6 +71,9 @@ TEST_F(CFileUploadTest, EveryFalseLogonRestoresTheUser) {
   }
   EXPECT_FALSE(client.LogonAs(u"no number", u"second", u"other", u"{N}"));
   EXPECT_EQ(fake.apartment.session.userName, u"first");
+  EXPECT_EQ(fake.apartment.UserFolderPath, u"C:\\first");
+  ASSERT_TRUE(Logon(u"second"));
+  EXPECT_EQ(fake.apartment.UserFolderPath, u"") << "the pictures of the first user are not the second one's";
 }
 
 TEST_F(CFileUploadTest, LogonRenewsTheListing) {

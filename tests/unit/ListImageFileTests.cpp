@@ -27,7 +27,7 @@ TEST_F(ListImageUpload, Transcript) {
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
   ExpectLog({"view hourglass", kAskCan, "watchdog starts", kUploadCall,
              // Initializing, connecting.
-             "yield", "yield", "state 0",
+             "watchdog starts", "yield", "yield", "state 0",
              // Started, half, complete; the server works between the last two.
              "yield", "state 2", "state 9", "9999 0", "uploaded 0", "watchdog starts", "yield", "9999 50",
              "uploaded 768", "yield", "watchdog starts", "yield", "yield", "9999 100", "uploaded 768",
@@ -306,6 +306,20 @@ TEST_F(ListImageTest, DeleteOutcomes) {
   EXPECT_EQ(log.back(), "view pointer");
 }
 
+TEST_F(ListImageTest, LeavesTheFilesOfAnotherUserAlone) {
+  List({{"a.jpg", "1"}});
+  view.Select(0, true);
+  control.bRenameEnabled = true;
+  log.clear();
+  fake.apartment.session.userName = u"other";
+  control.DeleteFile();
+  EXPECT_FALSE(control.OnBeforeLabelEdit());
+  EXPECT_FALSE(control.OnAfterLabelEdit(0, u"b.jpg"));
+  ExpectLog({"view hourglass", "view pointer"});
+  fake.apartment.session.userName = u"u@x";
+  EXPECT_TRUE(control.OnAfterLabelEdit(0, u"b.jpg"));
+}
+
 TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
   const struct {
     const char* name;
@@ -367,6 +381,12 @@ TEST_F(ListImageTest, RenameTranscript) {
   EXPECT_EQ(control.GetSelectedFilesHttpPath(), u"http://h/u/c d.jpg");
   EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/c d.jpg"), 2U);
   EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/b.jpg"), 0U);
+
+  // The file system takes both names for one file, which stays.
+  const Text copy = fake.apartment.UserFolderPath + u"\\a.jpg";
+  fake.files.files[copy] = {1, 0};
+  EXPECT_TRUE(control.RenameFile(u"a.jpg", u"A.jpg"));
+  EXPECT_TRUE(fake.files.files.contains(copy));
 }
 
 TEST_F(ListImageTest, RenameOutcomes) {

@@ -28,6 +28,10 @@ TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
   EXPECT_EQ(reply.GetValueByVariableName(u"a"), nullptr);
   for (const char* broken : {"A=%", "A=%4", "A=%zz", "A=%FF", "A=%C0%80", "A=%ED%A0%80", "ErrorOccured=1"})
     EXPECT_EQ(Reply::FromBody(broken).ErrorOccured(), 1) << broken;
+  std::string names;
+  for (int i = 0; i <= 1000; ++i) names += "N" + std::to_string(i) + "&";
+  EXPECT_EQ(Reply::FromBody(names).ErrorOccured(), 1);
+  EXPECT_EQ(Reply::FromBody(names.substr(3)).ErrorOccured(), 0);
 }
 
 TEST(HttpAddress, SplitsAndRefuses) {

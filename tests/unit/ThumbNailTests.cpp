@@ -246,6 +246,15 @@ TEST_F(ThumbNailTest, LeavesAnEmptySquareForWhatIsNoPicture) {
   EXPECT_EQ(page.Look(), "a.gif*! b.gif! nul.gif! ") << "the last name is not safe as a local one";
   EXPECT_EQ(Events(), "");
   EXPECT_FALSE(HasCopy("a.gif")) << "an error page is not kept for a picture";
+
+  // Nor is a part of one, which its length tells from a picture of a kind that cannot be read.
+  List("c.gif d.gif");
+  page.decodes = false;
+  fake.apartment.allFiles.At(1)->FileSize = static_cast<double>(fake.files.files[CopyOf("c.gif")].length + 1);
+  fake.apartment.allFiles.At(2)->FileSize = static_cast<double>(fake.files.files[CopyOf("d.gif")].length);
+  control.ChangeFileFilter(u"*");
+  EXPECT_FALSE(HasCopy("c.gif"));
+  EXPECT_TRUE(HasCopy("d.gif"));
 }
 
 TEST_F(ThumbNailTest, PagingReplacesTheFill) {
@@ -468,6 +477,14 @@ TEST_F(ThumbNailTest, DeletesTheSelectedPicture) {
   EXPECT_EQ(Shown() + Records(), "1.gif,2.gif,3.gif,4.gif,1.gif,2.gif,3.gif,4.gif,");
   EXPECT_FALSE(HasCopy("5.gif"));
   EXPECT_FALSE(page.scrolls);
+
+  log.clear();
+  fake.apartment.session.userName = u"other";
+  control.DeleteFile();
+  Text name = u"z.gif";
+  control.ValidateFileName(name);
+  EXPECT_EQ(Events(), "1002 ,1033 ,") << "the pictures are another user's";
+  fake.apartment.session.userName = u"u@x";
 
   log.clear();
   replies["DeleteFileRequest"] = "DeleteStatus=FALSE";

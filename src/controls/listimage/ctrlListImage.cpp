@@ -105,6 +105,7 @@ void ctrlListImage::Fill(const std::function<bool(const CUpload&)>& shows) {
   for (std::size_t i = 1; i <= all.Count(); ++i)
     if (const auto& record = all.At(i); shows(*record)) items.push_back({record});
   items_ = std::move(items);
+  ShowsAccount();
   ++filling_;
   view_.SetItemCount(items_.size());
 }
@@ -204,12 +205,12 @@ void ctrlListImage::OnMouseButton() {
 }
 
 bool ctrlListImage::OnBeforeLabelEdit() const {
-  return bRenameEnabled && !RenameRuns() && !IsClosed();
+  return bRenameEnabled && !RenameRuns() && !IsClosed() && !ShowsOtherAccount();
 }
 
 bool ctrlListImage::OnAfterLabelEdit(std::size_t index, TextView newText) {
   return ResultAsItStood(false, [&](bool& renamed) {
-    if (!bRenameEnabled || index >= items_.size()) return;
+    if (!bRenameEnabled || index >= items_.size() || ShowsOtherAccount()) return;
     const Text oldName = items_[index].record->FileName;
     Text newName(newText);
     // An emptied or untouched label means that the user changed his mind.

@@ -37,7 +37,7 @@ void ctrlListImage::DeleteFile() {
     // In an event of a delete there is nothing more to delete: what is selected is under way.
     if (deleteRuns_) return;
     const Hourglass pointer(*this);
-    if (items_.empty() || !mobjFileupload) return;
+    if (items_.empty() || !mobjFileupload || ShowsOtherAccount()) return;
     if (!CFileUpload::CanDeleteFile()) return Raise(event::kNotAllowed);
     deleteRuns_ = true;
     ResultAsItStood(0, [&](int&) { DeleteSelected(); });

@@ -108,6 +108,7 @@ void ctrlThumbNailView::Show(const Text& filter) {
   const FileList& all = apartment_.allFiles;
   FileList& shown = apartment_.shownFiles;
   shown.Clear();
+  ShowsAccount();
   apartment_.shownFilter = filter;
   for (std::size_t i = 1; i <= all.Count(); ++i) {
     const std::shared_ptr<CUpload>& record = all.At(i);
@@ -216,10 +217,11 @@ bool ctrlThumbNailView::Fetch(int slot, const CUpload& record, const Text& copy)
 
 void ctrlThumbNailView::ShowPicture(int slot, const Text& copy, double fileSize) {
   header_.ReadImageInfo(copy);
-  if (header_.ImageType() != kImageUnknown)
-    return page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width()));
-  // A file of another kind, or what a server sent in place of the picture; then the next page with it asks
-  // again.
+  if (header_.ImageType() != kImageUnknown &&
+      page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width())))
+    return;
+  // A file of another kind, or what came in place of the picture or of a part of it; then the next page with
+  // it asks again.
   FileSystem& files = apartment_.platform.files;
   if (static_cast<double>(files.Length(copy)) != fileSize) files.Remove(copy);
 }

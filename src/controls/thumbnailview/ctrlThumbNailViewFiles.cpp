@@ -111,7 +111,7 @@ void ctrlThumbNailView::DeleteFile() {
     if (!client) return;
     if (!CFileUpload::CanDeleteFile()) return Raise(event::kNotAllowed);
     const std::shared_ptr<CUpload> record = SelectedRecord();
-    if (!record) return Raise(event::kNotSelected);
+    if (!record || ShowsOtherAccount()) return Raise(event::kNotSelected);
     deleteRuns_ = true;
     const bool deleted = ResultAsItStood(false, [&](bool& gone) {
       gone = DeleteOnServer(*client, *record);
@@ -172,7 +172,7 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
     NewString = Text(Trim(NewString));
     if (BeginsUnfit(NewString)) return keepName(event::kNameUnfit);
     // Nothing is selected, so there is nothing to rename.
-    if (oldName.empty()) return Raise(event::kRenameFailed);
+    if (oldName.empty() || ShowsOtherAccount()) return Raise(event::kRenameFailed);
     CheckFileExtension(NewString, ExtensionOf(oldName));
     // The caption may show what was typed, such as the name without its extension.
     if (NewString == oldName) return keepName(event::kRenamed);

@@ -138,6 +138,12 @@ void ControlWindow::Watch(HWND window) {
   SetWindowSubclass(window, ChildProc, kSubclass, reinterpret_cast<DWORD_PTR>(window_));
 }
 
+std::optional<SIZE> ControlWindow::SizeOnOtherScreen() const {
+  RECT client = {};
+  if (dpi_ == SystemDpi() || !GetClientRect(window_, &client)) return std::nullopt;
+  return SIZE{client.right, client.bottom};
+}
+
 HFONT ControlWindow::Font() const {
   if (font_) return font_;
   return ownFont_ ? ownFont_.Get() : static_cast<HFONT>(GetStockObject(DEFAULT_GUI_FONT));

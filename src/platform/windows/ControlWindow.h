@@ -26,6 +26,8 @@ class ControlWindow {
   HWND Window();
   // Takes the window out of its container and hides it; what it shows stays.
   void Park();
+  // Size in pixels, when the window's screen has other dots per inch than the system; else nullopt.
+  std::optional<SIZE> SizeOnOtherScreen() const;
   // Whether windows of controls are left in the process. One may outlive its control by a message.
   static bool AnyLeft();
   // Null for the system's own font, nullopt for the system's own colour. The font stays the caller's.

@@ -253,16 +253,18 @@ void WindowsThumbnailPage::ApplyCaption(int slot) {
   InvalidateRect(changed.window, nullptr, FALSE);
 }
 
-void WindowsThumbnailPage::SetPicture(int slot, TextView path, const PicturePlace& place) {
+bool WindowsThumbnailPage::SetPicture(int slot, TextView path, const PicturePlace& place) {
   Slot& changed = At(slot);
   changed.path = WideFromText(path);
   changed.twips = place;
   changed.picture = {};
   LoadPictureOf(changed);
-  if (!changed.window) return;
-  // At once: the next picture may take its time.
-  InvalidateRect(changed.window, nullptr, FALSE);
-  UpdateWindow(changed.window);
+  if (changed.window) {
+    // At once: the next picture may take its time.
+    InvalidateRect(changed.window, nullptr, FALSE);
+    UpdateWindow(changed.window);
+  }
+  return static_cast<bool>(changed.picture);
 }
 
 // A picture that is no longer there to be loaded again stays as it was loaded.

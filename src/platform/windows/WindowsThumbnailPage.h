@@ -38,7 +38,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void ShowSlot(int slot, bool shown) override;
   void ClearSlot(int slot) override;
   void SetCaption(int slot, TextView caption) override;
-  void SetPicture(int slot, TextView path, const PicturePlace& place) override;
+  bool SetPicture(int slot, TextView path, const PicturePlace& place) override;
   void SetSelected(int slot, bool selected) override;
   void SetScrollRange(int max) override;
   void EnableScroll(bool enabled) override;

@@ -127,7 +127,7 @@ HRESULT CollectionObject::Call(DISPID member, WORD flags, const DISPPARAMS& argu
       break;
     case kItem:
       if (!takes(1, 1) || !first) return DISP_E_BADPARAMCOUNT;
-      value = Variant(items_.At(PositionOf(*first)).Get());
+      value = Variant(ItemAt(*first).Get());
       break;
     case kRemove: {
       if (!takes(1, 1) || !first) return DISP_E_BADPARAMCOUNT;
@@ -162,6 +162,15 @@ void CollectionObject::Add(const DISPPARAMS& arguments) {
                                : after ? PositionOf(*after) + 1
                                        : items_.Count() + 1;
   items_.Insert(position, Variant(*item), key ? TextFromVariant(*key) : Text());
+}
+
+// By its key without a walk.
+const Variant& CollectionObject::ItemAt(const VARIANT& index) const {
+  const Variant plain(index);
+  if (V_VT(&plain.Get()) != VT_BSTR) return items_.At(PositionOf(plain.Get()));
+  const Variant* found = items_.Find(ViewOf(V_BSTR(&plain.Get())));
+  if (!found) throw RuntimeError(error::kInvalidCall);
+  return *found;
 }
 
 std::size_t CollectionObject::PositionOf(const VARIANT& index) const {

@@ -27,6 +27,7 @@ class CollectionObject final : public ComObject<IDispatch> {
   // Members by identifier; they throw run-time errors, which Invoke hands to the host.
   HRESULT Call(DISPID member, WORD flags, const DISPPARAMS& arguments, VARIANT* result);
   void Add(const DISPPARAMS& arguments);
+  const Variant& ItemAt(const VARIANT& index) const;
   // Position that an index argument means. Throws 5 for an unknown key, 9 for a position out of range.
   std::size_t PositionOf(const VARIANT& index) const;
 

@@ -185,6 +185,10 @@ STDMETHODIMP Embedding::EnumFormatEtc(DWORD direction, IEnumFORMATETC** enumerat
 }
 
 STDMETHODIMP Embedding::DAdvise(FORMATETC* format, DWORD flags, IAdviseSink* sink, DWORD* cookie) {
+  if (!format || !sink || !cookie) return E_POINTER;
+  // 0 stands for all of them.
+  const HRESULT known = format->cfFormat == 0 ? S_OK : QueryGetData(format);
+  if (known != S_OK) return known;
   if (!listeners_) {
     const HRESULT made = CreateDataAdviseHolder(listeners_.Receive());
     if (FAILED(made)) return made;

@@ -149,6 +149,7 @@ class FileControlObject : public DualObject<Interface>,
   const CLSID& ClassId() const override { return class_.id; }
   HWND Window() override;
   void Park() override { View().Park(); }
+  std::optional<SIZE> SizeOnOtherScreen() override { return View().SizeOnOtherScreen(); }
   void AmbientChanged(const AmbientValues& values) override;
   void SiteGone() override { Rules().Close(); }
   std::span<const PersistedProperty> Properties() const override;

@@ -101,6 +101,7 @@ void OleControl::PropertyChanged(DISPID property) {
 }
 
 void OleControl::ViewChanged() {
+  const ComPtr<IUnknown> alive(&hooks_.Identity());
   embedding_.ViewChanged();
   const ComPtr<IAdviseSink> sink = viewSink_;
   if (sink && (viewAspects_ & DVASPECT_CONTENT)) {
@@ -342,6 +343,8 @@ HRESULT OleControl::ActivateInPlace() {
   if (FAILED(asked)) return asked;
   if (inPlaceSite->CanInPlaceActivate() != S_OK) return E_FAIL;
 
+  ComPtr<IOleInPlaceFrame> frame;
+  ComPtr<IOleInPlaceUIWindow> document;
   HWND parent = nullptr;
   RECT position = {};
   RECT clip = {};
@@ -349,12 +352,13 @@ HRESULT OleControl::ActivateInPlace() {
   frameInfo.cb = sizeof frameInfo;
   HRESULT result = inPlaceSite->GetWindow(&parent);
   if (SUCCEEDED(result))
-    result =
-        inPlaceSite->GetWindowContext(frame_.Receive(), document_.Receive(), &position, &clip, &frameInfo);
+    result = inPlaceSite->GetWindowContext(frame.Receive(), document.Receive(), &position, &clip, &frameInfo);
   if (FAILED(result)) return result;
   const HWND window = hooks_.Window();
   if (!window) return E_OUTOFMEMORY;
   inPlaceSite_ = inPlaceSite;
+  frame_ = std::move(frame);
+  document_ = std::move(document);
   inPlace_ = true;
   const HRESULT agreed = inPlaceSite->OnInPlaceActivate();
   if (FAILED(agreed)) {
@@ -383,6 +387,8 @@ HRESULT OleControl::ActivateUi() {
   // The container's code may have deactivated the control at once.
   if (!uiActive_) return FAILED(agreed) ? agreed : E_FAIL;
   TakeFocus();
+  // So may the code of what had the focus.
+  if (!uiActive_) return E_FAIL;
   if (frame_) frame_->SetActiveObject(this, nullptr);
   if (document_) document_->SetActiveObject(this, nullptr);
   // The control has no tool bars of its own.
@@ -430,6 +436,9 @@ STDMETHODIMP OleControl::InPlaceDeactivate() {
   inPlace_ = false;
   // The window keeps what it shows, away from the container.
   hooks_.Park();
+  TellFocus(false);
+  // From here on the container draws what is shown now.
+  ViewChanged();
   frame_ = {};
   document_ = {};
   const ComPtr<IOleInPlaceSite> site = std::move(inPlaceSite_);
@@ -507,7 +516,7 @@ STDMETHODIMP OleControl::Draw(DWORD aspect, LONG, void*, DVTARGETDEVICE*, HDC, H
   if (!bounds || !dc) return E_INVALIDARG;
   if (!IsContent(aspect)) return DV_E_DVASPECT;
   // Drawn in pixels whatever the target counts in: the picture is laid out as it looks on the screen.
-  const SIZE size = ScreenScale().Pixels(extent_);
+  const SIZE size = hooks_.SizeOnOtherScreen().value_or(ScreenScale().Pixels(extent_));
   POINT corners[2] = {{bounds->left, bounds->top}, {bounds->right, bounds->bottom}};
   LPtoDP(dc, corners, 2);
   const int saved = SaveDC(dc);

@@ -7,6 +7,7 @@
 #include <ole2.h>
 #include <olectl.h>
 
+#include <optional>
 #include <span>
 #include <string>
 
@@ -53,6 +54,9 @@ class OleControlHooks {
   virtual HWND Window() = 0;
   // Takes the window out of its container and hides it.
   virtual void Park() = 0;
+  // Size of the window in its own pixels, when these are not as large as the system's; they are the ones that
+  // Draw counts in.
+  virtual std::optional<SIZE> SizeOnOtherScreen() = 0;
   // Draws the control as it looks without a window, into `bounds` in pixels of `dc`.
   virtual void Draw(HDC dc, const RECT& bounds) = 0;
   // The container's values have changed, or the control came into another container.

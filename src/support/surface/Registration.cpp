@@ -222,10 +222,10 @@ HRESULT Unregister(Scope scope) {
       if (classes.Has(names.classKey, kOtherView)) continue;
       for (const std::wstring& key : {names.general, names.versioned}) gone &= classes.Remove(key);
     }
-    // A user who has no other class of his own had none of these before.
+    // A user who has no other class of his own had none of these before. Of all users they are the system's.
     for (const REGSAM view : {REGSAM{0}, kOtherView})
       for (const wchar_t* key : {L"CLSID", L"Interface", L"TypeLib", L"Wow6432Node"})
-        classes.RemoveIfEmpty(key, view);
+        if (scope == Scope::kUser) classes.RemoveIfEmpty(key, view);
     return gone ? S_OK : SELFREG_E_CLASS;
   });
 }

@@ -31,6 +31,7 @@ STDMETHODIMP ctrlThumbNailViewObject::SetLabelText(BSTR* szString, VARIANT* resu
   const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     rules_->SetLabelText(ViewOf(szString));
+    Ole().ViewChanged();
     return VARIANT{};
   });
 }
@@ -41,6 +42,7 @@ STDMETHODIMP ctrlThumbNailViewObject::ValidateFileName(BSTR* NewString, VARIANT*
     Text name(ViewOf(NewString));
     rules_->ValidateFileName(name);
     AssignChanged(NewString, name);
+    Ole().ViewChanged();
     return VARIANT{};
   });
 }

@@ -326,7 +326,6 @@ TYPED_TEST(AnyControl, MayBeReleasedInAnEventOfItsWait) {
   DeleteFileW(L"rose.jpg");
 }
 
-// A container that shows a picture of the control only, as a form in design does, or a report.
 // Counts how often a container that draws the control itself is to draw it anew.
 struct ViewSink final : IAdviseSink {
   int changes = 0;
@@ -344,6 +343,7 @@ struct ViewSink final : IAdviseSink {
   STDMETHODIMP_(void) OnClose() override {}
 };
 
+// A container that shows a picture of the control only, as a form in design does, or a report.
 TYPED_TEST(AnyControl, DrawsItselfWithoutAWindowOfTheContainer) {
   CLSID classId = {};
   ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
