@@ -105,6 +105,13 @@ TEST_F(ListImageUpload, Outcomes) {
   }
 }
 
+TEST_F(ListImageUpload, NeedsNoListingToBeTakenBack) {
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  log.clear();
+  control.DeleteFile();
+  EXPECT_EQ(Events().substr(0, 6), "1001 ,");
+}
+
 TEST_F(ListImageUpload, ReplacesAFile) {
   List({{"old.jpg", "1"}, {"NEW.jpg", "1"}, {"z.jpg", "1"}});
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));

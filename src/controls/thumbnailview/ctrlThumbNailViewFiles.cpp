@@ -92,6 +92,7 @@ void ctrlThumbNailView::RaiseSelection() {
 
 void ctrlThumbNailView::ShowUploaded(const std::shared_ptr<CUpload>& record) {
   FileList& shown = apartment_.shownFiles;
+  if (shown.IsEmpty()) ShowsAccount();
   keepSelection_ = true;
   std::size_t position = Find(shown, [&](const CUpload& file) { return &file == record.get(); });
   if (position != 0) {
