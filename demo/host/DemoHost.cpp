@@ -5,6 +5,7 @@
 #include <commdlg.h>
 
 #include "platform/windows/CommonControls.h"
+#include "platform/windows/SystemDpi.h"
 
 namespace tarnwick::demo {
 namespace {
@@ -111,9 +112,7 @@ LRESULT CALLBACK DemoHost::FrameProc(HWND window, UINT message, WPARAM wParam, L
 // --- Windows and controls ---
 
 bool DemoHost::MakeWindows() {
-  const HDC screen = GetDC(nullptr);
-  dpi_ = GetDeviceCaps(screen, LOGPIXELSX);
-  ReleaseDC(nullptr, screen);
+  dpi_ = SystemDpi();
   const INITCOMMONCONTROLSEX classes = {sizeof classes, ICC_PROGRESS_CLASS | ICC_BAR_CLASSES};
   InitCommonControlsEx(&classes);
   const HINSTANCE module = GetModuleHandleW(nullptr);

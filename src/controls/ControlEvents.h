@@ -23,8 +23,8 @@ inline constexpr std::int16_t kOwnDrop = 1021;
 inline constexpr std::int16_t kClickBegins = 1022;
 inline constexpr std::int16_t kFileDrop = 1023;  // description: a file's path; empty after the last one
 inline constexpr std::int16_t kClickEnds = 1024;
-inline constexpr std::int16_t kRenamed =
-    1031;  // description: the new name, empty from the thumbnails' editor
+// Description: the new name; empty from the thumbnails' editor.
+inline constexpr std::int16_t kRenamed = 1031;
 inline constexpr std::int16_t kNameTaken = 1032;
 inline constexpr std::int16_t kRenameFailed = 1033;
 inline constexpr std::int16_t kNameRefused = 1034;

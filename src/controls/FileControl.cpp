@@ -133,11 +133,11 @@ bool FileControl::UploadImage(TextView szLocalPath) {
     Text url;
     {
       const RunningTransfer running(*this);
-      const SessionValues session = apartment_.session;
+      const AccountKey account = apartment_.session.Account();
       // What is on the server is registered, whatever the host made of the control meanwhile, but not with
       // another user.
       if (SendFile(path)) {
-        if (apartment_.session.IsSameAccount(session)) url = client->SaveUploadFile(path);
+        if (apartment_.session.Account() == account) url = client->SaveUploadFile(path);
         if (url.empty()) Fail(ftp_error::kNotTaken, u"The file was not registered.");
       }
       downloader_.StopWatchdog();
@@ -168,7 +168,9 @@ bool FileControl::SendFile(const Text& path) {
     }
   }
   Yield();
-  if (!uploadFinished_) Fail(ftp_error::kNotTaken, u"The file was not uploaded.");
+  // The watchdog may have told why.
+  if (!uploadFinished_ && m_LastError == ftp_error::kSuccess)
+    Fail(ftp_error::kNotTaken, u"The file was not uploaded.");
   return uploadFinished_;
 }
 
@@ -425,8 +427,8 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
     if (inFolder) target += u"\\" + name;
     local = target;
 
-    const FileList& all = apartment_.allFiles;
     Text url;
+    const FileList& all = apartment_.allFiles;
     for (std::size_t i = 1; i <= all.Count() && url.empty(); ++i)
       if (all.At(i)->FilePath.find(selected->FilePath) != Text::npos) url = all.At(i)->FilePath;
     if (url.empty()) return;

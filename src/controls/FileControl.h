@@ -206,9 +206,9 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // tell them all or there is no client.
   bool ListAccount();
   // What is shown from here on is the account of now.
-  void ShowsAccount() { shownSession_ = apartment_.session; }
+  void ShowsAccount() { shownAccount_ = apartment_.session.Account(); }
   // Whether another user has been logged on since: what is shown must not be changed in his account.
-  bool ShowsOtherAccount() const { return !apartment_.session.IsSameAccount(shownSession_); }
+  bool ShowsOtherAccount() const { return apartment_.session.Account() != shownAccount_; }
   // Fetches `url` into the user's folder, and to `explicitTarget` first unless that is empty. Waits, pumping,
   // for its end or until `stop` says so; whether `expected` is there then.
   bool Download(const Text& url, const Text& explicitTarget, const Text& expected,
@@ -277,7 +277,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool renameInProgress_ = false;
   bool closed_ = false;
   // Whose files are shown.
-  SessionValues shownSession_;
+  AccountKey shownAccount_;
   int hourglasses_ = 0;
 };
 

@@ -17,6 +17,14 @@ namespace tarnwick {
 
 using FileList = KeyedList<std::shared_ptr<CUpload>>;
 
+// One user's account at one server. What began for one account must not go on in another.
+struct AccountKey {
+  Text serverName;
+  Text userName;
+  std::int32_t productNumber = 0;
+  bool operator==(const AccountKey&) const = default;
+};
+
 // Who is connected to what; set by `ConnectToServer` and `LogonAs`.
 struct SessionValues {
   // "host" or "host:port".
@@ -28,11 +36,7 @@ struct SessionValues {
   // Set by a log-on; cleared once its FTP values were rewritten for the proxy.
   bool loggedOn = false;
 
-  // What began for one account must not go on in another.
-  bool IsSameAccount(const SessionValues& other) const {
-    return serverName == other.serverName && userName == other.userName &&
-           productNumber == other.productNumber;
-  }
+  AccountKey Account() const { return {serverName, userName, productNumber}; }
 };
 
 // How an FTP proxy learns the server behind it.

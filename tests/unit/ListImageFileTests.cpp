@@ -103,6 +103,10 @@ TEST_F(ListImageUpload, Outcomes) {
     EXPECT_EQ(log.back(), "view pointer");
     EXPECT_FALSE(control.m_bTransferInProgress);
   }
+  // What the watchdog tells is the reason, not that the file did not arrive.
+  uploader.script = [this](UploadEvents&) { downloader.events->Failed(ftp_error::kTimeout, u"", false); };
+  EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(control.m_LastError, ftp_error::kTimeout);
 }
 
 TEST_F(ListImageUpload, NeedsNoListingToBeTakenBack) {

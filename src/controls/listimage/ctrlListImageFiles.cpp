@@ -60,7 +60,7 @@ void ctrlListImage::DeleteFile() {
 
 void ctrlListImage::DeleteSelected() {
   const std::uint32_t filling = filling_;
-  const SessionValues session = apartment_.session;
+  const AccountKey account = apartment_.session.Account();
   // Where the last record was. The next one follows, so that many deletes stay one walk through the records.
   std::size_t position = 1;
   // What the user selects between two files is not meant.
@@ -69,7 +69,7 @@ void ctrlListImage::DeleteSelected() {
   for (std::size_t i = 0; i < chosen.size(); ++i) {
     // The host may fill the list anew, take the client away or log another user on in any event; the rest
     // then stays.
-    if (filling != filling_ || IsClosed() || !apartment_.session.IsSameAccount(session)) return;
+    if (filling != filling_ || IsClosed() || apartment_.session.Account() != account) return;
     if (!chosen[i]) {
       Raise(event::kNotSelected);
       continue;

@@ -4,6 +4,7 @@
 #include <mutex>
 
 #include "platform/windows/CommonControls.h"
+#include "platform/windows/SystemDpi.h"
 
 namespace tarnwick {
 namespace {
@@ -55,13 +56,6 @@ HWND ParkingWindow(HINSTANCE module) {
     SetWindowSubclass(parking, ParkingProc, kSubclass, reinterpret_cast<DWORD_PTR>(module));
   }
   return parking;
-}
-
-int SystemDpi() {
-  const HDC screen = GetDC(nullptr);
-  const int dpi = GetDeviceCaps(screen, LOGPIXELSX);
-  ReleaseDC(nullptr, screen);
-  return dpi;
 }
 
 // Before Windows 10 all screens have the system's.

@@ -99,7 +99,7 @@ class ControlWindow {
   bool hourglass_ = false;
   int dpi_;
   HFONT font_ = nullptr;
-  // The system's font for a screen of other dots per inch than the system's; empty on such a screen.
+  // The system's font for a screen of other dots per inch than the system's, else empty.
   FontOwner ownFont_;
   std::optional<COLORREF> textColor_;
   std::optional<COLORREF> backColor_;

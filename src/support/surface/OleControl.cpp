@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "platform/windows/SystemDpi.h"
 #include "support/surface/ComEnumerator.h"
 #include "support/surface/Guard.h"
 #include "support/surface/Module.h"
@@ -12,24 +13,6 @@ namespace {
 
 constexpr int kHimetricPerInch = 2540;
 constexpr std::uint32_t kStreamVersion = 1;
-
-// Pixels of the screen and HIMETRIC, in x direction and y direction.
-class ScreenScale {
- public:
-  ScreenScale() {
-    const HDC screen = GetDC(nullptr);
-    x_ = GetDeviceCaps(screen, LOGPIXELSX);
-    y_ = GetDeviceCaps(screen, LOGPIXELSY);
-    ReleaseDC(nullptr, screen);
-  }
-  SIZE Pixels(const SIZEL& himetric) const {
-    return {MulDiv(himetric.cx, x_, kHimetricPerInch), MulDiv(himetric.cy, y_, kHimetricPerInch)};
-  }
-
- private:
-  int x_ = 96;
-  int y_ = 96;
-};
 
 bool IsContent(DWORD aspect) {
   return aspect == DVASPECT_CONTENT;
@@ -516,7 +499,9 @@ STDMETHODIMP OleControl::Draw(DWORD aspect, LONG, void*, DVTARGETDEVICE*, HDC, H
   if (!bounds || !dc) return E_INVALIDARG;
   if (!IsContent(aspect)) return DV_E_DVASPECT;
   // Drawn in pixels whatever the target counts in: the picture is laid out as it looks on the screen.
-  const SIZE size = hooks_.SizeOnOtherScreen().value_or(ScreenScale().Pixels(extent_));
+  const int dpi = SystemDpi();
+  const SIZE size = hooks_.SizeOnOtherScreen().value_or(
+      SIZE{MulDiv(extent_.cx, dpi, kHimetricPerInch), MulDiv(extent_.cy, dpi, kHimetricPerInch)});
   POINT corners[2] = {{bounds->left, bounds->top}, {bounds->right, bounds->bottom}};
   LPtoDP(dc, corners, 2);
   const int saved = SaveDC(dc);

@@ -3,6 +3,7 @@
 #include <thread>
 
 #include "Form.h"
+#include "platform/windows/SystemDpi.h"
 
 namespace tarnwick::test {
 namespace {
@@ -688,9 +689,7 @@ int MeasureOf(const ThumbForm& form) {
 TYPED_TEST(AnyControl, FollowsTheScreenOfItsWindow) {
   const auto set = reinterpret_cast<HANDLE(WINAPI*)(HANDLE)>(reinterpret_cast<void*>(
       GetProcAddress(GetModuleHandleW(L"user32.dll"), "SetThreadDpiAwarenessContext")));
-  const HDC screen = GetDC(nullptr);
-  const int dpi = GetDeviceCaps(screen, LOGPIXELSX);
-  ReleaseDC(nullptr, screen);
+  const int dpi = SystemDpi();
   if (!set || dpi == 96) GTEST_SKIP() << "needs a finer screen";
   constexpr int kSize = 400;
   const auto kUnaware = reinterpret_cast<HANDLE>(-1);

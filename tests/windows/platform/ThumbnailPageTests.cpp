@@ -11,6 +11,7 @@
 #include <vector>
 
 #include "platform/windows/AnsiText.h"
+#include "platform/windows/SystemDpi.h"
 #include "platform/windows/WindowsScrollHook.h"
 #include "platform/windows/WindowsThumbnailPage.h"
 
@@ -165,18 +166,12 @@ class ThumbnailPageTest : public testing::Test {
     page_->Focus();
   }
   void Place(HWND window) {
-    const RECT size = layout::Pixels(layout::kPage, Dpi());
+    const RECT size = layout::Pixels(layout::kPage, SystemDpi());
     SetParent(window, top_);
     MoveWindow(window, 0, 0, size.right, size.bottom, TRUE);
     ShowWindow(window, SW_SHOW);
   }
 
-  static int Dpi() {
-    const HDC screen = GetDC(nullptr);
-    const int dpi = GetDeviceCaps(screen, LOGPIXELSX);
-    ReleaseDC(nullptr, screen);
-    return dpi;
-  }
   HWND Child(const wchar_t* className) const {
     return FindWindowExW(page_->Window(), nullptr, className, nullptr);
   }
@@ -270,8 +265,8 @@ TEST_F(ThumbnailPageTest, WindowsStandAsLaidOutAndHaveNames) {
   expectFit(Grid());
   for (int slot = 1; slot <= kSlotCount; ++slot)
     EXPECT_TRUE(Same(PlaceOf(Slot(slot)),
-                     layout::Pixels(layout::kFrames[static_cast<std::size_t>(slot) - 1], Dpi())));
-  EXPECT_TRUE(Same(PlaceOf(ScrollBar()), layout::Pixels(layout::kScrollBar, Dpi())));
+                     layout::Pixels(layout::kFrames[static_cast<std::size_t>(slot) - 1], SystemDpi())));
+  EXPECT_TRUE(Same(PlaceOf(ScrollBar()), layout::Pixels(layout::kScrollBar, SystemDpi())));
 
   page_->SetCaption(2, u"Tom && J\u00E9r\u014Dme.gif");
   EXPECT_EQ(NameOf(Slot(2)), L"Tom && J\u00E9r\u014Dme.gif");
@@ -285,7 +280,7 @@ TEST_F(ThumbnailPageTest, WindowsStandAsLaidOutAndHaveNames) {
   EXPECT_FALSE(NameOf(label).empty());
   EXPECT_FALSE(IsWindowVisible(label));
   const RECT frame = PlaceOf(Slot(4));
-  RECT caption = layout::Pixels(layout::kCaption, Dpi());
+  RECT caption = layout::Pixels(layout::kCaption, SystemDpi());
   OffsetRect(&caption, frame.left, frame.top);
   EXPECT_TRUE(Inside(PlaceOf(Editor()), caption));
 
@@ -302,15 +297,16 @@ TEST_F(ThumbnailPageTest, WindowsStandAsLaidOutAndHaveNames) {
 }
 
 TEST_F(ThumbnailPageTest, DrawsPicturesSelectionAndCaptions) {
-  const RECT size = layout::Pixels(layout::kPage, Dpi());
+  const RECT size = layout::Pixels(layout::kPage, SystemDpi());
   const HDC screen = GetDC(nullptr);
   const HDC dc = CreateCompatibleDC(screen);
   const BitmapOwner bitmap(CreateCompatibleBitmap(screen, size.right, size.bottom));
   ReleaseDC(nullptr, screen);
   const HGDIOBJ old = SelectObject(dc, bitmap.Get());
   const auto pixel = [&](int slot, double x, double y) {
-    const RECT frame = layout::Pixels(layout::kFrames[static_cast<std::size_t>(slot) - 1], Dpi());
-    return GetPixel(dc, frame.left + layout::Pixels(x, Dpi()), frame.top + layout::Pixels(y, Dpi()));
+    const RECT frame = layout::Pixels(layout::kFrames[static_cast<std::size_t>(slot) - 1], SystemDpi());
+    return GetPixel(dc, frame.left + layout::Pixels(x, SystemDpi()),
+                    frame.top + layout::Pixels(y, SystemDpi()));
   };
   const COLORREF window = GetSysColor(COLOR_WINDOW);
   const COLORREF highlight = GetSysColor(COLOR_HIGHLIGHT);
