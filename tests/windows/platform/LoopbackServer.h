@@ -4,6 +4,7 @@
 
 #include <winsock2.h>
 // Before any <windows.h>, whose own sockets are older.
+#include <algorithm>
 #include <atomic>
 #include <chrono>
 #include <cstdint>
@@ -59,14 +60,17 @@ class LoopbackServer {
   }
 
  private:
-  // True when there is something to accept or to read within `ms`.
-  static bool Ready(SOCKET socket, long ms) {
+  enum class For { kRead, kWrite };
+
+  // True when there is something to accept or to read, or room to write, within `ms`.
+  static bool Ready(SOCKET socket, long ms, For what = For::kRead) {
     fd_set set;
     FD_ZERO(&set);
     set.fd_count = 1;
     set.fd_array[0] = socket;
     timeval limit{ms / 1000, ms % 1000 * 1000};
-    return select(0, &set, nullptr, nullptr, &limit) > 0;
+    return select(0, what == For::kRead ? &set : nullptr, what == For::kWrite ? &set : nullptr, nullptr,
+                  &limit) > 0;
   }
 
   static bool Whole(const std::string& request) {
@@ -97,10 +101,14 @@ class LoopbackServer {
   }
 
   void Play(SOCKET peer, const Answer& answer) {
-    for (std::string_view rest = answer.bytes; !rest.empty();) {
+    // A send that blocks is not always woken when the client goes: Wine forgets it now and then.
+    unsigned long on = 1;
+    ioctlsocket(peer, FIONBIO, &on);
+    for (std::string_view rest = answer.bytes; !rest.empty() && !done_;) {
+      if (!Ready(peer, 100, For::kWrite)) continue;
       const int sent = send(peer, rest.data(), static_cast<int>(rest.size()), 0);
-      if (sent <= 0) break;
-      rest.remove_prefix(static_cast<std::size_t>(sent));
+      if (sent <= 0 && WSAGetLastError() != WSAEWOULDBLOCK) break;
+      rest.remove_prefix(static_cast<std::size_t>(std::max(sent, 0)));
     }
     if (answer.end == End::kReset) {
       const linger now{1, 0};
