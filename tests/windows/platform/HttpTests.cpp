@@ -15,7 +15,7 @@ constexpr std::size_t kBound = 20;
 std::optional<HttpAnswer> PostTo(std::uint16_t port, std::string target = "/",
                                  std::string_view body = "a=1") {
   // Short time-outs, so that the silent cases end soon.
-  WindowsHttpTransport http(1500, 400);
+  WindowsHttpTransport http(5000, 1000);
   HttpPost post;
   post.host = u"127.0.0.1";
   post.port = port;

@@ -214,8 +214,8 @@ struct Source : BodySource {
   }
 };
 
-std::optional<HttpAnswer> Stream(std::uint16_t port, Source& source, std::uint32_t silenceMs = 400) {
-  WindowsHttpTransport http(1500, silenceMs);
+std::optional<HttpAnswer> Stream(std::uint16_t port, Source& source, std::uint32_t silenceMs = 5000) {
+  WindowsHttpTransport http(5000, silenceMs);
   HttpPost post;
   post.host = u"127.0.0.1";
   post.port = port;
@@ -261,7 +261,7 @@ TEST(PostStream, HandlesMessagesWhileThePeerIsSlow) {
   timer.Start(20);
   const DWORD begin = GetTickCount();
   // What has left is still on its way to a slow reader, so that the answer takes its time.
-  EXPECT_TRUE(Stream(server.Port(), source, 3000));
+  EXPECT_TRUE(Stream(server.Port(), source));
   const DWORD took = GetTickCount() - begin;
   EXPECT_GE(took, 300U);
   EXPECT_GT(ticks, 3);
@@ -284,7 +284,7 @@ TEST(PostStream, FailsWithinItsTimeOut) {
     LoopbackServer server({row.answer});
     Source source(kLarge);
     const DWORD begin = GetTickCount();
-    EXPECT_FALSE(Stream(server.Port(), source));
+    EXPECT_FALSE(Stream(server.Port(), source, 1000));
     EXPECT_LT(GetTickCount() - begin, kHangs);
     EXPECT_EQ(ownedObjects, 0);
   }
@@ -305,7 +305,7 @@ TEST(PostStream, EndsWithItsSourceAndWithAQuitMessage) {
   timer.SetHandler([] { PostQuitMessage(7); });
   timer.Start(150);
   const int owned = ownedObjects;
-  EXPECT_FALSE(Stream(server.Port(), source, 5000));
+  EXPECT_FALSE(Stream(server.Port(), source));
   EXPECT_LT(source.position, kLarge);
   MSG message{};
   ASSERT_TRUE(PeekMessageW(&message, nullptr, WM_QUIT, WM_QUIT, PM_REMOVE));
