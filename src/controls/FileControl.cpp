@@ -162,16 +162,19 @@ bool FileControl::SendFile(const Text& path) {
   } catch (const RuntimeError& failure) {
     const std::int32_t number = failure.Number();
     if (number != acceptor::kNothingChanged && number != kInvalidProperty) {
-      Fail(number == acceptor::kUnspecified ? ftp_error::kConnectionLost : ftp_error::kNotTaken,
-           u"The file was not uploaded (" + TextFromNumber(number) + u").");
+      FailUpload(number == acceptor::kUnspecified ? ftp_error::kConnectionLost : ftp_error::kNotTaken,
+                 u"The file was not uploaded (" + TextFromNumber(number) + u").");
       return false;
     }
   }
   Yield();
-  // The watchdog may have told why.
-  if (!uploadFinished_ && m_LastError == ftp_error::kSuccess)
-    Fail(ftp_error::kNotTaken, u"The file was not uploaded.");
+  if (!uploadFinished_) FailUpload(ftp_error::kNotTaken, u"The file was not uploaded.");
   return uploadFinished_;
+}
+
+void FileControl::FailUpload(std::int32_t ftpError, TextView description) {
+  // The watchdog has told why.
+  if (m_LastError != ftp_error::kTimeout) Fail(ftpError, description);
 }
 
 void FileControl::Connecting() {

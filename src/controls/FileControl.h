@@ -253,6 +253,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   void TellState(ConnectionState state);
 
   bool SendFile(const Text& path);
+  void FailUpload(std::int32_t ftpError, TextView description);
   void BeginLocalCopy(const Text& path);
   // Makes the file at `path` the local copy of `url`.
   void FinishLocalCopy(const Text& path, const Text& url);

@@ -1,4 +1,5 @@
 // Upload, delete, rename and download: everything that happens, in its order.
+#include "transfer/AcceptorPages.h"
 #include "unit/ListImageFixture.h"
 
 namespace tarnwick {
@@ -103,10 +104,19 @@ TEST_F(ListImageUpload, Outcomes) {
     EXPECT_EQ(log.back(), "view pointer");
     EXPECT_FALSE(control.m_bTransferInProgress);
   }
-  // What the watchdog tells is the reason, not that the file did not arrive.
-  uploader.script = [this](UploadEvents&) { downloader.events->Failed(ftp_error::kTimeout, u"", false); };
+  // What the watchdog tells is the reason, however the upload ends then.
+  for (const bool throws : {false, true}) {
+    uploader.script = [&](UploadEvents&) {
+      downloader.events->Failed(ftp_error::kTimeout, u"", false);
+      if (throws) throw RuntimeError(acceptor::kUnspecified);
+    };
+    EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
+    EXPECT_EQ(control.m_LastError, ftp_error::kTimeout);
+  }
+  // A second transfer that was refused meanwhile is not.
+  uploader.script = [&](UploadEvents&) { control.UploadImage(u"C:\\other.jpg"); };
   EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
-  EXPECT_EQ(control.m_LastError, ftp_error::kTimeout);
+  EXPECT_EQ(control.m_LastError, ftp_error::kNotTaken);
 }
 
 TEST_F(ListImageUpload, NeedsNoListingToBeTakenBack) {

@@ -525,6 +525,15 @@ TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
   EXPECT_EQ(fake.apartment.shownFiles.Count(), 6U);
 }
 
+TEST_F(ThumbNailTest, NeedsNoListingToTakeBackAnUpload) {
+  uploader.script = Upload;
+  fake.files.files[u"C:\\new.jpg"] = {kGif.size(), 0, kGif};
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  log.clear();
+  control.DeleteFile();
+  EXPECT_EQ(Events(), "1001 ,");
+}
+
 TEST_F(ThumbNailTest, Drops) {
   struct Data : DragData {
   } data;

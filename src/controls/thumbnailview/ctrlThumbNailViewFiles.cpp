@@ -92,12 +92,12 @@ void ctrlThumbNailView::RaiseSelection() {
 
 void ctrlThumbNailView::ShowUploaded(const std::shared_ptr<CUpload>& record) {
   FileList& shown = apartment_.shownFiles;
-  if (shown.IsEmpty()) ShowsAccount();
   keepSelection_ = true;
   std::size_t position = Find(shown, [&](const CUpload& file) { return &file == record.get(); });
   if (position != 0) {
     SetAddress(shown, position, record->FilePath);
   } else if (Passes(record->FileName)) {
+    if (shown.IsEmpty()) ShowsAccount();
     shown.Add(record, record->FilePath);
     position = shown.Count();
   }
