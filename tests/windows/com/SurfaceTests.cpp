@@ -154,7 +154,7 @@ std::string SignatureOf(ITypeInfo& type, const FUNCDESC& function) {
   return text.str();
 }
 
-// The numbers that members of the list have and the thumbnails do not.
+// Numbers that no member of the thumbnails has.
 const std::set<MEMBERID> kNoThumbNailMembers = {9, 20, 27, 33, 39};
 
 // The members in the order of the interface; a property that can be read and set is one line.
@@ -350,19 +350,24 @@ TEST(Surface, IsInTheReference) {
     owner.resize(std::min(owner.size(), owner.find(' ')));
     const std::string section = SectionOf(reference, kind == "enumeration" ? "Enumerations" : owner);
     EXPECT_NE(section, "") << heading;
+    if (kind == "enumeration") {
+      EXPECT_NE(section.find("`" + owner + "`"), std::string::npos) << heading;
+    }
     std::istringstream lines(part.substr(heading.size() + 1));
     for (std::string line; std::getline(lines, line);) {
       if (kind == "enumeration") {
         const std::size_t equals = line.find(" = ");
         const std::string entry = "`" + line.substr(0, equals) + "` " + line.substr(equals + 3);
-        EXPECT_NE(section.find(entry), std::string::npos) << entry << " of " << heading;
+        EXPECT_TRUE(section.find(entry + ",") != std::string::npos ||
+                    section.find(entry + "\n") != std::string::npos)
+            << entry << " of " << heading;
         continue;
       }
-      std::string name = kind == "events" ? line.substr(line.find(' ') + 1) : line;
-      name.resize(std::min(name.size(), name.find_first_of("(:")));
-      EXPECT_TRUE(section.find("`" + name + "`") != std::string::npos ||
-                  section.find("`" + name + "(") != std::string::npos)
-          << name << " of " << heading;
+      // A method has its entry with its parameters; elsewhere it may just be mentioned.
+      const std::string member = kind == "events" ? line.substr(line.find(' ') + 1) : line;
+      const std::size_t end = std::min(member.size(), member.find_first_of("(:"));
+      const std::string entry = "`" + member.substr(0, end) + (member[end] == '(' ? "(" : "`");
+      EXPECT_NE(section.find(entry), std::string::npos) << entry << " of " << heading;
     }
   }
 }
