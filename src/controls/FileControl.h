@@ -242,6 +242,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   void FileBytes(std::string_view bytes) override;
   void UploadProgress(std::int32_t percent, std::int32_t bytes) override;
   void UploadComplete() override;
+  bool IsWanted() const override { return true; }
   void RaiseUploadProgress(std::int32_t percent);
   void Resolving() override { TellState(ConnectionState::kResolvingHost); }
   void Connected() override { TellState(ConnectionState::kConnected); }

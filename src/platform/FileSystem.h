@@ -60,6 +60,10 @@ class FileSystem {
   // Sets the attribute bits; 0 makes the file normal. Throws 75 on failure.
   virtual void SetAttributes(TextView path, std::uint32_t attributes) = 0;
 
+  // Whether both paths name one file that is there, however they are spelled: letter case, short names and
+  // links do not count.
+  virtual bool SameFile(TextView first, TextView second) = 0;
+
   // Copies over an existing destination, whole or not at all. Throws 53 or 75.
   virtual void Copy(TextView source, TextView destination) = 0;
 

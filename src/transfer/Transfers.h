@@ -20,6 +20,9 @@ class UploadEvents {
   virtual void FileBytes(std::string_view bytes) = 0;
   virtual void UploadProgress(std::int32_t percent, std::int32_t bytes) = 0;
   virtual void UploadComplete() = 0;
+  // Whether the upload is to go on. One that is not wanted any more before its last byte has left puts no
+  // file on the server.
+  virtual bool IsWanted() const = 0;
 };
 
 // The three operations throw a RuntimeError with the component's number.

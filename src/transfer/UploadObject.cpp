@@ -63,6 +63,8 @@ class UploadBody : public BodySource {
     return filled;
   }
 
+  bool IsWanted() const override { return events_.IsWanted(); }
+
   void Sent(std::uint64_t sent) override {
     // Of the file alone: the fields around it are no progress that a user would see.
     const std::uint64_t ofFile = std::min(sent - std::min<std::uint64_t>(sent, head_.size()), length_);

@@ -137,6 +137,15 @@ struct FakeFiles : FileSystem {
     At(path).attributes = attributes;
     attributesSet.push_back(attributes);
   }
+  // Another spelling of a path; the files themselves are kept under one.
+  std::map<Text, Text> spellings;
+  Text Spelled(TextView path) const {
+    const auto known = spellings.find(Text(path));
+    return known == spellings.end() ? Text(path) : known->second;
+  }
+  bool SameFile(TextView first, TextView second) override {
+    return files.contains(Spelled(first)) && Spelled(first) == Spelled(second);
+  }
   void Copy(TextView source, TextView destination) override { files[Text(destination)] = At(source); }
   struct Reader : FileReader {
     explicit Reader(std::string itsBytes) : bytes(std::move(itsBytes)) {}

@@ -173,6 +173,7 @@ TEST(FileNameGuard, AcceptsAndRefuses) {
 }
 
 struct Uploads : UploadEvents {
+  bool IsWanted() const override { return true; }
   std::string log;
   std::string file;
   void ActionComplete() override { log += "complete;"; }

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <array>
+#include <optional>
 #include <string>
 #include <utility>
 
@@ -35,6 +36,17 @@ WIN32_FILE_ATTRIBUTE_DATA FileData(TextView path) {
       (data.dwFileAttributes & FILE_ATTRIBUTE_DIRECTORY) != 0)
     throw RuntimeError(error::kFileNotFound);
   return data;
+}
+
+// Volume and number of a file; nullopt when there is none.
+std::optional<std::array<DWORD, 3>> IdentityOf(TextView path) {
+  // Without a right to its contents: others may hold it as they like.
+  const FileOwner file(CreateFileW(WidePath(path, error::kFileNotFound).c_str(), FILE_READ_ATTRIBUTES,
+                                   FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
+                                   OPEN_EXISTING, 0, nullptr));
+  BY_HANDLE_FILE_INFORMATION data = {};
+  if (!file || !GetFileInformationByHandle(file.Get(), &data)) return std::nullopt;
+  return std::array{data.dwVolumeSerialNumber, data.nFileIndexHigh, data.nFileIndexLow};
 }
 
 class WindowsFileReader : public FileReader {
@@ -105,6 +117,11 @@ void WindowsFileSystem::SetAttributes(TextView path, std::uint32_t attributes) {
   const DWORD bits = attributes & kSettable;
   if (!SetFileAttributesW(widePath.c_str(), bits != 0 ? bits : FILE_ATTRIBUTE_NORMAL))
     throw RuntimeError(error::kPathAccess);
+}
+
+bool WindowsFileSystem::SameFile(TextView first, TextView second) {
+  const auto one = IdentityOf(first);
+  return one && one == IdentityOf(second);
 }
 
 void WindowsFileSystem::Copy(TextView source, TextView destination) {

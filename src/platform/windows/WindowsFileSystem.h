@@ -10,6 +10,7 @@ class WindowsFileSystem : public FileSystem {
   Text ModifiedText(TextView path) override;
   std::uint32_t Attributes(TextView path) override;
   void SetAttributes(TextView path, std::uint32_t attributes) override;
+  bool SameFile(TextView first, TextView second) override;
   void Copy(TextView source, TextView destination) override;
   std::unique_ptr<FileReader> Open(TextView path) override;
   std::size_t ReadBeginning(TextView path, std::span<char> room) override;

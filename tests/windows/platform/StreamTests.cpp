@@ -188,6 +188,7 @@ TEST(WindowsStreamSocket, WaitsForASilentPeerAtNoCost) {
 // --- Streamed posts ---
 
 struct Source : BodySource {
+  bool IsWanted() const override { return true; }
   explicit Source(std::uint64_t itsLength) : length(itsLength) {}
   std::uint64_t length;
   std::uint64_t position = 0;
