@@ -24,17 +24,18 @@ struct Actions : DownloadActions {
   void CloseSocket() override {}
   void RestartWatchdog() override {}
   void StopWatchdog() override {}
-  void WriteFile(TextView target, TextView, std::string_view bytes) override {
+  bool WriteFile(TextView target, TextView, std::string_view bytes) override {
     written = true;
     path = target;
     body = bytes;
+    return true;
   }
   void Received(std::int32_t bytes) override {
     if (bytes < 0) std::abort();
   }
   void HeaderFound(std::string_view, std::int32_t) override {}
-  void Finished() override { ++ends; }
-  void Failed(bool) override { ++ends; }
+  void Finished(bool) override { ++ends; }
+  void Failed(DownloadFailure, bool) override { ++ends; }
 };
 
 }  // namespace

@@ -19,14 +19,39 @@ constexpr TextView kRefusedCharacters = u"\\/:*?\"<>|#%";
 
 }  // namespace
 
+FileControl::Operation::Operation(FileControl& control)
+    : control_(control), outer_(std::exchange(control.operation_, this)) {
+  Succeed();
+}
+
+FileControl::Operation::~Operation() {
+  control_.operation_ = outer_;
+  control_.m_LastError = ftpError_;
+  control_.m_strLastErrorDesc = std::move(description_);
+}
+
+void FileControl::Operation::Fail(std::int32_t ftpError, TextView description) {
+  ftpError_ = ftpError;
+  description_ = description;
+  // A host may look in the next event.
+  control_.m_LastError = ftpError;
+  control_.m_strLastErrorDesc = description;
+}
+
 FileControl::RunningTransfer::RunningTransfer(FileControl& control)
-    : control_(control), nested_(control.transferRuns_) {
-  control_.transferRuns_ = control_.m_bTransferInProgress = true;
-  control_.Fail(ftp_error::kSuccess, u"");
+    : control_(control),
+      nested_(std::exchange(control.transferRuns_, true)),
+      transfer_(std::exchange(control.transfer_, control.operation_)),
+      closings_(std::exchange(control.closingsBefore_, control.closings_)),
+      aborts_(std::exchange(control.abortsBefore_, control.apartment_.aborts)) {
+  control_.m_bTransferInProgress = true;
 }
 
 FileControl::RunningTransfer::~RunningTransfer() {
   control_.transferRuns_ = control_.m_bTransferInProgress = nested_;
+  control_.transfer_ = transfer_;
+  control_.closingsBefore_ = closings_;
+  control_.abortsBefore_ = aborts_;
 }
 
 FileControl::Hourglass::Hourglass(FileControl& control) : control_(control) {
@@ -41,6 +66,7 @@ FileControl::FileControl(const ControlParts& parts, ControlView& view, TransferE
     : mobjFileupload(std::make_shared<CFileUpload>(parts.apartment)),
       apartment_(parts.apartment),
       events_(parts.events),
+      copies_(parts.apartment),
       controlView_(view),
       uploader_(parts.uploader),
       downloader_(parts.downloader),
@@ -54,8 +80,7 @@ FileControl::~FileControl() {
 
 void FileControl::Close() {
   closed_ = true;
-  // A wait must end even when the control is opened again before it looks. It clears the flag.
-  if (downloadRuns_) gbConnectionFailed = true;
+  EndTransfer();
   downloader_.SetEvents(nullptr);
   downloader_.Cancel();
 }
@@ -66,25 +91,49 @@ void FileControl::Open() {
 }
 
 void FileControl::Fail(std::int32_t ftpError, TextView description) {
-  m_LastError = ftpError;
-  m_strLastErrorDesc = description;
+  if (operation_) operation_->Fail(ftpError, description);
 }
 
-bool FileControl::RefusesTransfer() {
-  if (transferRuns_) Fail(ftp_error::kTransferInProgress, u"A transfer is in progress.");
-  return transferRuns_ || closed_;
+bool FileControl::MayTransfer() {
+  if (transferRuns_) {
+    Fail(ftp_error::kTransferInProgress, u"A transfer is in progress.");
+  } else if (closed_) {
+    Fail(ftp_error::kAborted, u"The control was closed.");
+  }
+  return !transferRuns_ && !closed_;
+}
+
+std::shared_ptr<CFileUpload> FileControl::Client() {
+  if (!mobjFileupload) Fail(ftp_error::kNoClient, u"The control has no service client.");
+  return mobjFileupload;
+}
+
+bool FileControl::MayChangeShown() {
+  if (ShowsOtherAccount()) Fail(ftp_error::kNotLoggedOn, u"The files are those of another user.");
+  return !ShowsOtherAccount();
+}
+
+void FileControl::FailStopped() {
+  if (IsAborted()) {
+    Fail(ftp_error::kAborted, u"The transfer was stopped.");
+  } else {
+    Fail(ftp_error::kAborted, u"The control was closed.");
+  }
 }
 
 // --- Listing ---
 
 bool FileControl::ListAccount() {
+  const std::shared_ptr<CFileUpload> client = Client();
+  if (!client) return false;
   FileList& all = apartment_.allFiles;
-  const std::shared_ptr<CFileUpload> client = mobjFileupload;
-  const bool listed = client && client->ListFilesForUser([&](const std::shared_ptr<CUpload>& record,
-                                                             TextView key) { all.Add(record, key); });
+  if (client->ListFilesForUser(
+          [&](const std::shared_ptr<CUpload>& record, TextView key) { all.Add(record, key); }))
+    return true;
   // Half a listing would pass for the account.
-  if (!listed) all.Clear();
-  return listed;
+  apartment_.ForgetListing();
+  Fail(ftp_error::kNotTaken, u"The service did not list the files.");
+  return false;
 }
 
 // --- Selection ---
@@ -122,61 +171,145 @@ void FileControl::GetFileDetails(TextView FileName,
 
 bool FileControl::UploadImage(TextView szLocalPath) {
   return ResultAsItStood(false, [&](bool& uploaded) {
-    if (RefusesTransfer()) return;
+    Operation operation(*this);
+    if (!MayTransfer()) return;
     const Text path(szLocalPath);
     const Hourglass pointer(*this);
-    const std::shared_ptr<CFileUpload> client = mobjFileupload;
+    const std::shared_ptr<CFileUpload> client = Client();
     if (!client) return;
     const std::int32_t answer = client->CanUploadFile();
-    if (answer == status::kNegative) return Raise(event::kUploadRefused);
-    if (answer == status::kFailure) return Raise(event::kNotAllowed);
-    Text url;
-    {
-      const RunningTransfer running(*this);
-      const AccountKey account = apartment_.session.Account();
-      // What is on the server is registered, whatever the host made of the control meanwhile, but not with
-      // another user.
-      if (SendFile(path)) {
-        if (apartment_.session.Account() == account) url = client->SaveUploadFile(path);
-        if (url.empty()) Fail(ftp_error::kNotTaken, u"The file was not registered.");
-      }
-      downloader_.StopWatchdog();
+    if (answer == status::kNegative) {
+      Fail(ftp_error::kFull, u"The account is full.");
+      return Raise(event::kUploadRefused);
     }
+    if (answer == status::kFailure) {
+      Fail(ftp_error::kNotAllowed, u"The account takes no files, or the service could not be asked.");
+      return Raise(event::kNotAllowed);
+    }
+    const Text url = SendAndRegister(*client, path);
     TransferEnded();
-    if (url.empty()) return copyWriter_.reset();
+    if (url.empty()) return;
+    // Whatever the watchdog told meanwhile.
+    operation.Succeed();
     ShowUploaded(RecordUploaded(path, url));
     uploaded = true;
     RaiseCurrentItem();
   });
 }
 
-bool FileControl::SendFile(const Text& path) {
+Text FileControl::SendAndRegister(CFileUpload& client, const Text& path) {
+  const RunningTransfer running(*this);
+  const AccountKey account = apartment_.session.Account();
+  uploadTimedOut_ = false;
+  Text url;
+  // What is on the server is registered, whatever the host made of the control meanwhile, but not with another user.
+  if (SendFile(client, path)) {
+    if (apartment_.session.Account() == account) {
+      url = client.SaveUploadFile(path);
+      if (url.empty()) copies_.LoseUpload(path);
+    }
+    if (url.empty()) {
+      copies_.AbandonUpload();
+      Fail(ftp_error::kNotTaken, u"The file was sent, but not registered.");
+    }
+  }
+  downloader_.StopWatchdog();
+  // Or the next download would not begin.
+  if (uploadTimedOut_) gbConnectionFailed = false;
+  return url;
+}
+
+bool FileControl::SendFile(CFileUpload& client, const Text& path) {
   const SessionValues& session = apartment_.session;
   uploadFinished_ = false;
   m_lUploadedBytes = 0;
   downloader_.RestartWatchdog();
-  BeginLocalCopy(path);
+  copies_.BeginUpload(path);
   try {
     uploader_.UploadFile(path, UsersBaseUrl(session.serverName), AcceptorPath(u"UploadAcceptor.asp"), 0,
                          Text(session.userName), Text(session.password), kProductGuid, *this);
   } catch (const RuntimeError& failure) {
     const std::int32_t number = failure.Number();
     if (number != acceptor::kNothingChanged && number != kInvalidProperty) {
-      FailUpload(number == acceptor::kUnspecified ? ftp_error::kConnectionLost : ftp_error::kNotTaken,
-                 u"The file was not uploaded (" + TextFromNumber(number) + u").");
+      FailUpload(client, path, number);
       return false;
     }
   }
   Yield();
-  if (!uploadFinished_) FailUpload(ftp_error::kNotTaken, u"The file was not uploaded.");
-  return uploadFinished_;
+  if (uploadFinished_) return true;
+  copies_.LoseUpload(path);
+  if (!uploadTimedOut_) Fail(ftp_error::kNotTaken, u"The server did not say that it has the file.");
+  return false;
 }
 
-void FileControl::FailUpload(std::int32_t ftpError, TextView description) {
+void FileControl::FailUpload(CFileUpload& client, const Text& path, std::int32_t number) {
+  const bool lost = number == acceptor::kUnspecified;
+  if (lost && IsStopped()) {
+    copies_.AbandonUpload();
+    return FailStopped();
+  }
+  // Whether the file is there is not known when the answer was lost.
+  if (lost) {
+    copies_.LoseUpload(path);
+  } else {
+    copies_.AbandonUpload();
+  }
   // The watchdog has told why.
-  if (m_LastError != ftp_error::kTimeout) Fail(ftpError, description);
+  if (uploadTimedOut_) return;
+  if (number == error::kFileNotFound)
+    return FailWith(ftp_error::kUnavailable,
+                    FolderExists(apartment_.platform.files, path) ? u"This is a folder, not a file."
+                                                                  : u"The file was not found.",
+                    number);
+  if (number == error::kPathAccess)
+    return FailWith(ftp_error::kUnavailable, u"The file could not be read.", number);
+  if (number == acceptor::kNameRefused && IsTooLarge(client, path))
+    return FailWith(ftp_error::kFull, u"The account is full.", number);
+  FailPage(FileNameFromPath(path), number);
 }
 
+void FileControl::FailWith(std::int32_t ftpError, TextView words, std::int32_t number) {
+  Fail(ftpError, Text(words) + u" (" + TextFromNumber(number) + u")");
+}
+
+void FileControl::FailPage(TextView name, std::int32_t number) {
+  switch (number) {
+    case acceptor::kUnspecified:
+      return FailWith(ftp_error::kConnectionLost,
+                      u"The connection was lost, or the server gave no usable answer.", number);
+    case acceptor::kRefused:
+      return FailWith(ftp_error::kNotLoggedOn, u"The server refused the user name or the password.", number);
+    case acceptor::kFolderState:
+      return FailWith(ftp_error::kUnavailable, u"The account has no folder on the server.", number);
+    case acceptor::kNotThere:
+      return FailWith(ftp_error::kUnavailable, u"The file was not found.", number);
+    case acceptor::kNameRefused:
+      if (name.find_first_of(kRefusedCharacters) == TextView::npos && PositionOf(name) != 0)
+        return FailWith(ftp_error::kNameNotAllowed, u"The account has a file of that name.", number);
+      return FailWith(ftp_error::kNameNotAllowed, u"The file's name is not allowed.", number);
+    default:
+      return FailWith(ftp_error::kNotTaken, u"The server refused.", number);
+  }
+}
+
+bool FileControl::IsTooLarge(CFileUpload& client, const Text& path) const {
+  return ResultAsItStood(false, [&](bool& large) {
+    const TextView name = FileNameFromPath(path);
+    const std::size_t position = PositionOf(name);
+    const CUpload* same = position != 0 ? apartment_.allFiles.At(position).get() : nullptr;
+    // A name that differs in letter case is refused before its size is looked at.
+    if (same && same->FileName != name) return;
+    const SessionValues& session = apartment_.session;
+    const Text product = TextFromNumber(session.productNumber);
+    const auto used = client.GetTotalUsedQuota(product, session.userName);
+    const double size = static_cast<double>(apartment_.platform.files.Length(path));
+    // The file takes the place of its old bytes.
+    large = used && *used + size - (same ? same->FileSize : 0) >
+                        client.GetMaxQuota(product, session.userName);
+  });
+}
+
+// An upload that was stopped tells nothing more, also in the middle of what belongs together.
 void FileControl::Connecting() {
   Yield();
   TellState(ConnectionState::kResolvingHost);
@@ -184,8 +317,8 @@ void FileControl::Connecting() {
 
 void FileControl::UploadStarted() {
   Yield();
-  TellState(ConnectionState::kConnected);
-  TellState(ConnectionState::kTransferStarting);
+  if (IsWanted()) TellState(ConnectionState::kConnected);
+  if (IsWanted()) TellState(ConnectionState::kTransferStarting);
   RaiseUploadProgress(0);
   uploadFinished_ = false;
   downloader_.RestartWatchdog();
@@ -200,17 +333,25 @@ void FileControl::UploadProgress(std::int32_t percent, std::int32_t bytes) {
   downloader_.RestartWatchdog();
 }
 
+void FileControl::RaiseUploadProgress(std::int32_t percent) {
+  if (IsWanted()) Raise(event::kProgress, TextFromNumber(percent));
+  if (IsWanted() && tellsTransfers_) events_.UploadProgress(m_lUploadedBytes);
+}
+
+void FileControl::FileBytes(std::string_view bytes) {
+  // However slowly, the upload goes on.
+  downloader_.RestartWatchdog();
+  copies_.Write(bytes);
+}
+
 void FileControl::UploadComplete() {
   Yield();
-  RaiseUploadProgress(100);
+  // The server has the file: it is too late to stop.
+  Raise(event::kProgress, u"100");
+  if (tellsTransfers_) events_.UploadProgress(m_lUploadedBytes);
   uploadFinished_ = true;
   downloader_.StopWatchdog();
   TellState(ConnectionState::kTransferCompleted);
-}
-
-void FileControl::RaiseUploadProgress(std::int32_t percent) {
-  Raise(event::kProgress, TextFromNumber(percent));
-  if (tellsTransfers_) events_.UploadProgress(m_lUploadedBytes);
 }
 
 void FileControl::TellState(ConnectionState state) {
@@ -225,7 +366,7 @@ std::shared_ptr<CUpload> FileControl::RecordUploaded(const Text& path, const Tex
   record->FilePath = url;
   record->FileSize = GetLocalFileSize(files, path);
   record->FileDate = GetLocalFileDate(files, path);
-  FinishLocalCopy(path, url);
+  copies_.FinishUpload(path, url);
   // An upload that replaced a file takes over its record.
   std::size_t position = PositionOf(record->FileName);
   if (position == 0) position = all.PositionOf(url);
@@ -244,7 +385,7 @@ std::shared_ptr<CUpload> FileControl::RecordUploaded(const Text& path, const Tex
 bool FileControl::DeleteOnServer(CFileUpload& client, const CUpload& file) {
   const SessionValues& session = apartment_.session;
   const Text name = file.FileName;
-  const Text copy = LocalCopyOf(file.FilePath);
+  const Text url = file.FilePath;
   // What the page says does not matter; the service decides.
   ResultAsItStood(0, [&](int&) {
     uploader_.DeleteFile(UsersBaseUrl(session.serverName), name, AcceptorPath(u"DeleteAcceptor.asp"),
@@ -254,7 +395,7 @@ bool FileControl::DeleteOnServer(CFileUpload& client, const CUpload& file) {
     Fail(ftp_error::kNotTaken, u"The file was not deleted.");
     return false;
   }
-  RemoveLocalCopy(copy);
+  copies_.Remove(url);
   return true;
 }
 
@@ -262,6 +403,7 @@ bool FileControl::DeleteOnServer(CFileUpload& client, const CUpload& file) {
 
 bool FileControl::RenameFile(TextView strOldFileName, TextView strNewFileName) {
   return ResultAsItStood(false, [&](bool& renamed) {
+    const Operation operation(*this);
     const Text oldName(strOldFileName);
     const Text newName(Trim(strNewFileName));
     const Hourglass pointer(*this);
@@ -279,39 +421,49 @@ bool FileControl::RenameFile(TextView strOldFileName, TextView strNewFileName) {
 bool FileControl::Rename(const Text& oldName, const Text& newName) {
   if (!RenameOnServer(oldName, newName)) return false;
   apartment_.listingIsCurrent = false;
-  ResultAsItStood(0, [&](int&) { ShowRenamed(RecordRenamed(oldName, newName), oldName, newName); });
+  ResultAsItStood(0, [&](int&) {
+    const auto [record, oldUrl] = RecordRenamed(oldName, newName);
+    ShowRenamed(record, oldUrl, oldName, newName);
+  });
   return true;
 }
 
 bool FileControl::RenameOnServer(const Text& oldName, const Text& newName) {
-  return ResultAsItStood(false, [&](bool& renamed) {
-    // Bytes that are renamed without the service's knowledge would be lost to the user.
-    const std::shared_ptr<CFileUpload> client = mobjFileupload;
-    if (!client) return;
-    const SessionValues& session = apartment_.session;
+  // Bytes that are renamed without the service's knowledge would be lost to the user.
+  const std::shared_ptr<CFileUpload> client = Client();
+  if (!client) return false;
+  const SessionValues& session = apartment_.session;
+  try {
     uploader_.RenameFile(UsersBaseUrl(session.serverName), oldName, newName,
                          AcceptorPath(u"RenameAcceptor.asp"), session.userName, session.password,
                          kProductGuid);
-    renamed = client->RenameFile(TextFromNumber(session.productNumber), session.userName, oldName, newName) ==
-              status::kSuccess;
-  });
+  } catch (const RuntimeError& failure) {
+    FailPage(newName, failure.Number());
+    return false;
+  }
+  if (client->RenameFile(TextFromNumber(session.productNumber), session.userName, oldName, newName) ==
+      status::kSuccess)
+    return true;
+  Fail(ftp_error::kNotTaken, u"The service did not rename the file.");
+  return false;
 }
 
-std::shared_ptr<CUpload> FileControl::RecordRenamed(const Text& oldName, const Text& newName) {
+std::pair<std::shared_ptr<CUpload>, Text> FileControl::RecordRenamed(const Text& oldName,
+                                                                     const Text& newName) {
   FileList& all = apartment_.allFiles;
   for (std::size_t i = 1; i <= all.Count(); ++i) {
     std::shared_ptr<CUpload> record = all.At(i);
     if (record->FileName != oldName) continue;
-    const Text oldCopy = LocalCopyOf(record->FilePath);
+    const Text oldUrl = record->FilePath;
     FileList& shown = apartment_.shownFiles;
-    const std::size_t shownAt = shown.PositionOf(record->FilePath);
+    const std::size_t shownAt = shown.PositionOf(oldUrl);
     GiveName(*record, newName);
     SetAddress(all, i, record->FilePath);
     if (shownAt != 0 && shown.At(shownAt) == record) SetAddress(shown, shownAt, record->FilePath);
-    MoveLocalCopy(oldCopy, LocalCopyOf(record->FilePath));
-    return record;
+    copies_.Move(oldUrl, record->FilePath);
+    return {record, oldUrl};
   }
-  return nullptr;
+  return {};
 }
 
 void FileControl::GiveName(CUpload& record, const Text& newName) {
@@ -332,6 +484,13 @@ bool FileControl::IsFileNameValid(TextView szFileName) {
     valid = szFileName.find_first_of(kRefusedCharacters) == TextView::npos;
     if (!valid) Raise(event::kNameRefused);
   });
+}
+
+bool FileControl::IsEditedNameValid(TextView name) {
+  Operation operation(*this);
+  if (name.find_first_of(kRefusedCharacters) != TextView::npos)
+    operation.Fail(ftp_error::kNameNotAllowed, u"The file's name is not allowed.");
+  return IsFileNameValid(name);
 }
 
 bool FileControl::CheckFileExtension(Text& szNewString, TextView szOriExt) {
@@ -356,92 +515,42 @@ bool FileControl::EnableRename(bool bEnableRename) {
   return bEnableRename;
 }
 
-// --- Local copies ---
-
-Text FileControl::LocalCopyOf(TextView url) const {
-  // The name comes from the server; it must not lead out of the folder.
-  const TextView name = FileNameFromUrl(url);
-  if (apartment_.UserFolderPath.empty() || !IsSafeFileName(name)) return {};
-  return apartment_.UserFolderPath + u"\\" + Text(name);
-}
-
-void FileControl::BeginLocalCopy(const Text& path) {
-  copyPath_ = LocalCopyOf(FileNameFromPath(path));
-  copyWriter_ = ResultAsItStood(std::unique_ptr<FileWriter>(), [&](std::unique_ptr<FileWriter>& writer) {
-    if (!copyPath_.empty() && copyPath_ != path) writer = apartment_.platform.files.Create(copyPath_);
-  });
-}
-
-void FileControl::FileBytes(std::string_view bytes) {
-  // However slowly, the upload goes on.
-  downloader_.RestartWatchdog();
-  if (!copyWriter_) return;
-  // A full disk here is no reason to lose the upload.
-  const bool written = ResultAsItStood(false, [&](bool& done) {
-    copyWriter_->Write(bytes);
-    done = true;
-  });
-  if (!written) copyWriter_.reset();
-}
-
-void FileControl::FinishLocalCopy(const Text& path, const Text& url) {
-  const std::unique_ptr<FileWriter> writer = std::move(copyWriter_);
-  const Text copy = LocalCopyOf(url);
-  if (copy.empty() || copy == path) return;
-  // The copy of the picture that was there before must not be shown for the new one, whatever comes now. Some
-  // file systems write a file out before it may replace another, too, which takes as long as the upload.
-  RemoveLocalCopy(copy);
-  const bool finished = writer && copy == copyPath_ && ResultAsItStood(false, [&](bool& done) {
-                          writer->Commit();
-                          done = true;
-                        });
-  if (!finished) CopyLocalFile(apartment_.platform.files, path, copy);
-}
-
-void FileControl::MoveLocalCopy(const Text& from, const Text& to) {
-  // The file system takes both for one.
-  if (EqualsIgnoringCase(from, to)) return;
-  FileSystem& files = apartment_.platform.files;
-  // What is there under the new name is another picture's.
-  if (from.empty() || !FileExists(files, from)) {
-    RemoveLocalCopy(to);
-    return;
-  }
-  if (!to.empty()) CopyLocalFile(files, from, to);
-  RemoveLocalCopy(from);
-}
-
-void FileControl::RemoveLocalCopy(const Text& copy) {
-  if (!copy.empty()) ResultAsItStood(0, [&](int&) { apartment_.platform.files.Remove(copy); });
-}
-
 // --- Download ---
+
+Text FileControl::AddressToFetch(const Text& key) const {
+  const FileList& all = apartment_.allFiles;
+  if (all.Find(key)) return key;
+  for (std::size_t i = 1; i <= all.Count(); ++i)
+    if (all.At(i)->FilePath.find(key) != Text::npos) return all.At(i)->FilePath;
+  return {};
+}
 
 Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
   return ResultAsItStood(Text(), [&](Text& local) {
-    if (RefusesTransfer() || !mobjFileupload || !CFileUpload::CanDownLoadFile()) return;
+    const Operation operation(*this);
+    if (!MayTransfer() || !Client() || !CFileUpload::CanDownLoadFile()) return;
     const std::shared_ptr<CUpload> selected = SelectedRecord();
-    if (!selected) return;
+    if (!selected) return Fail(ftp_error::kUnavailable, u"No file is selected.");
     const Text name = selected->FileName;
     Text target(szLocalFilePath);
     if (target.ends_with(u'\\')) target.pop_back();
     // For a file whose name is a number the path is the file itself, not its folder; hosts rely on it.
     const bool inFolder = !IsNumeric(name);
+    const Text folder = inFolder ? target : target.substr(0, target.size() - FileNameFromPath(target).size());
     if (inFolder) target += u"\\" + name;
     local = target;
 
-    Text url;
-    const FileList& all = apartment_.allFiles;
-    for (std::size_t i = 1; i <= all.Count() && url.empty(); ++i)
-      if (all.At(i)->FilePath.find(selected->FilePath) != Text::npos) url = all.At(i)->FilePath;
-    if (url.empty()) return;
+    const Text url = AddressToFetch(selected->FilePath);
+    if (url.empty()) return Fail(ftp_error::kUnavailable, u"The file is not in the listing any more.");
     // The name comes from the server; it must not lead out of the folder.
     if (inFolder && !IsSafeFileName(name)) {
       Fail(ftp_error::kAborted, u"The file's name is not safe.");
       return Raise(event::kDownloadFailed);
     }
+    if (std::exchange(gbConnectionFailed, false))
+      return Fail(ftp_error::kAborted, u"gbConnectionFailed was set.");
     // What is there would pass for the download: somebody has it open, or it is not to be changed.
-    const bool free = ResultAsItStood(false, [&](bool& done) {
+    const bool free = !downloader_.CanStart(url) || ResultAsItStood(false, [&](bool& done) {
       FileSystem& files = apartment_.platform.files;
       if (FileExists(files, target)) files.Remove(target);
       done = true;
@@ -451,6 +560,9 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
       return Raise(event::kDownloadFailed);
     }
     if (Download(url, target, target, [] { return false; })) Yield();
+    if (downloadFinished_ && !downloadWritten_ && !folder.empty() &&
+        !FolderExists(apartment_.platform.files, folder))
+      Fail(ftp_error::kAborted, u"The local folder was not found.");
     TransferEnded();
   });
 }
@@ -459,20 +571,25 @@ bool FileControl::Download(const Text& url, const Text& explicitTarget, const Te
                            const std::function<bool()>& stop) {
   const RunningTransfer running(*this);
   m_lDownloadedBytes = 0;
-  downloadFinished_ = false;
+  downloadFinished_ = downloadWritten_ = downloadFailed_ = false;
   downloadRuns_ = true;
   downloader_.Start(url, explicitTarget);
-  while (!gbConnectionFailed && !downloadFinished_ && !closed_ && !stop()) downloader_.Wait();
+  while (!gbConnectionFailed && !downloadFinished_ && !IsStopped() && !stop()) downloader_.Wait();
   downloadRuns_ = false;
-  gbConnectionFailed = false;
+  const bool told = std::exchange(gbConnectionFailed, false);
   // The host may have set the flag; then the transfer would go on behind the back of the next one.
   if (!downloadFinished_) downloader_.Cancel();
   // Or it would run out later, on whatever comes next.
   downloader_.StopWatchdog();
-  if (!downloadFinished_) return false;
-  // The writer tells of no failure; whether it wrote is seen here, and nothing else will come.
-  if (FileExists(apartment_.platform.files, expected)) return true;
-  Fail(ftp_error::kAborted, u"The file could not be written.");
+  // Whether it was written is seen once more here: nothing else will come.
+  if (downloadFinished_ && downloadWritten_ && FileExists(apartment_.platform.files, expected)) return true;
+  if (downloadFinished_) {
+    Fail(ftp_error::kAborted, u"The local file could not be written.");
+  } else if (IsStopped()) {
+    FailStopped();
+  } else if (told && !downloadFailed_) {
+    Fail(ftp_error::kAborted, u"gbConnectionFailed was set.");
+  }
   return false;
 }
 
@@ -487,14 +604,21 @@ void FileControl::Received(std::int32_t bytes) {
   if (tellsTransfers_) events_.DownloadProgress(bytes);
 }
 
-void FileControl::Finished() {
+void FileControl::Finished(bool written) {
   downloadFinished_ = true;
+  downloadWritten_ = written;
   TellState(ConnectionState::kTransferCompleted);
 }
 
 void FileControl::Failed(std::int32_t ftpError, TextView description, bool told) {
   gbConnectionFailed = true;
-  Fail(ftpError, description);
+  if (downloadRuns_) {
+    downloadFailed_ = true;
+  } else if (transferRuns_) {
+    uploadTimedOut_ = true;
+  }
+  // Another operation may run inside.
+  if (transfer_) transfer_->Fail(ftpError, description);
   if (told) Raise(event::kDownloadFailed);
 }
 
@@ -503,7 +627,7 @@ void FileControl::Failed(std::int32_t ftpError, TextView description, bool told)
 FileControl::DragContent FileControl::ContentOfDrag() const {
   return ResultAsItStood(DragContent(), [&](DragContent& content) {
     content.address = SelectedKey();
-    Text copy = LocalCopyOf(content.address);
+    Text copy = copies_.PathOf(content.address);
     if (!copy.empty() && FileExists(apartment_.platform.files, copy)) content.localFile = std::move(copy);
   });
 }

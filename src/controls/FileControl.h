@@ -12,11 +12,12 @@
 #include <memory>
 #include <optional>
 #include <string_view>
+#include <utility>
 #include <vector>
 
 #include "controls/ControlEvents.h"
 #include "controls/ControlView.h"
-#include "platform/FileSystem.h"
+#include "controls/LocalCopies.h"
 #include "service/CFileUpload.h"
 #include "support/Apartment.h"
 #include "support/Text.h"
@@ -24,12 +25,18 @@
 
 namespace tarnwick {
 
-// FtpErrors that the controls set.
+// FtpErrors that the controls set; the downloader has more of them.
 namespace ftp_error {
+inline constexpr std::int32_t kNoClient = 24;
 inline constexpr std::int32_t kSuccess = 32;
 inline constexpr std::int32_t kConnectionLost = 43;
 inline constexpr std::int32_t kNotTaken = 44;
 inline constexpr std::int32_t kAborted = 45;
+inline constexpr std::int32_t kNotLoggedOn = 52;
+inline constexpr std::int32_t kNotAllowed = 53;   // by the account
+inline constexpr std::int32_t kUnavailable = 54;  // the file, here or there
+inline constexpr std::int32_t kFull = 56;
+inline constexpr std::int32_t kNameNotAllowed = 57;
 inline constexpr std::int32_t kTimeout = 58;
 inline constexpr std::int32_t kTransferInProgress = 59;
 }  // namespace ftp_error
@@ -58,7 +65,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
 
   // The service client; may be null.
   std::shared_ptr<CFileUpload> mobjFileupload;
-  // An FtpErrors value and its text, of the transfer that ran last or was refused, or of a failed delete.
+  // An FtpErrors value and its text, of the operation that ended last: an upload, a download, a delete, a rename, a
+  // listing, or the fetching of a page's pictures. Inside an operation it tells how that stands.
   std::int32_t m_LastError = 0;
   Text m_strLastErrorDesc;
   // A transfer runs. What a host writes here does not stop it.
@@ -66,7 +74,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Bytes of the transfer that runs or ran last.
   std::int32_t m_lDownloadedBytes = 0;
   std::int32_t m_lUploadedBytes = 0;
-  // Ends the wait of a download; the end of the wait clears it.
+  // Ends the wait of a download, or keeps the next one from beginning; either clears it. An upload that is silent
+  // for too long sets it until its own end.
   bool gbConnectionFailed = false;
   bool bRenameEnabled = false;
   // The control stores these for the host and does nothing with them.
@@ -128,8 +137,10 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool EnableRename(bool bEnableRename);
   void OLEDrag() { controlView_.StartDrag(); }
 
-  // Ends a running download at its next pass, as if the connection had failed, and lets no transfer start
-  // until Open; an upload goes on. For a control that its container closes while an operation runs.
+  // Ends the transfer that runs, at once where it waits: a download leaves no file, an upload whose last byte has not
+  // left puts none on the server.
+  void EndTransfer() { ++closings_; }
+  // The same, and no transfer starts until Open. For a control that its container lets go of while one runs.
   void Close();
   // The control is in a container (again).
   void Open();
@@ -166,7 +177,9 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Has a service client of its own from the start.
   FileControl(const ControlParts& parts, ControlView& view, TransferEvents transferEvents);
 
-  // Marks a transfer as running, and shows the hourglass, as long as they live.
+  // An operation keeps its outcome, which m_LastError tells when it ends, whatever ran inside it. The other two mark
+  // a transfer as running, and show the hourglass, as long as they live.
+  class Operation;
   class RunningTransfer;
   class Hourglass;
 
@@ -177,9 +190,9 @@ class FileControl : private UploadEvents, private DownloadEvents {
   virtual bool ShowsFile(TextView name) const = 0;
   // The record is new in the list of all files, or, when an upload replaced a file, has new values.
   virtual void ShowUploaded(const std::shared_ptr<CUpload>& record) = 0;
-  // The file has another name now, also in the list of all files, where `record` is it (null when it is not
-  // there).
-  virtual void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldName,
+  // The file has another name now, also in the list of all files, where `record` is it and `oldUrl` was its address
+  // (null and empty when it is not there).
+  virtual void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl, const Text& oldName,
                            const Text& newName) = 0;
   // A drop without files, or of the control's own drag (`own`).
   virtual void DroppedNoFiles(bool own) = 0;
@@ -199,9 +212,18 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool IsClosed() const { return closed_; }
 
   bool TransferRuns() const { return transferRuns_; }
-  // Whether a transfer must not start now; tells the host why.
-  bool RefusesTransfer();
+  // Whether the transfer that runs was told to stop.
+  bool IsStopped() const { return IsAborted() || closings_ != closingsBefore_; }
+  // Whether AbortFileTransfer(True) was called since the transfer began.
+  bool IsAborted() const { return apartment_.aborts != abortsBefore_; }
+  // Notes the outcome of the operation that runs, for m_LastError.
   void Fail(std::int32_t ftpError, TextView description);
+  // Whether a transfer may start now; else the reason is noted.
+  bool MayTransfer();
+  // The client; null, with the reason noted, when there is none.
+  std::shared_ptr<CFileUpload> Client();
+  // Whether what is shown may be changed; else, when another user has been logged on since, the reason is noted.
+  bool MayChangeShown();
   // Adds the account's files to the list of all files; false, with that list empty, when the service did not
   // tell them all or there is no client.
   bool ListAccount();
@@ -210,17 +232,17 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Whether another user has been logged on since: what is shown must not be changed in his account.
   bool ShowsOtherAccount() const { return apartment_.session.Account() != shownAccount_; }
   // Fetches `url` into the user's folder, and to `explicitTarget` first unless that is empty. Waits, pumping,
-  // for its end or until `stop` says so; whether `expected` is there then.
+  // for its end or until `stop` says so. Whether the file is at `expected` then; else the reason is noted, unless `stop`
+  // was it.
   bool Download(const Text& url, const Text& explicitTarget, const Text& expected,
                 const std::function<bool()>& stop);
   // Deletes a file by its page and the service, and its local copy. Whether the service took it out.
   bool DeleteOnServer(CFileUpload& client, const CUpload& file);
+  // What IsFileNameValid says of a name that the user typed; a refusal is the outcome of the rename.
+  bool IsEditedNameValid(TextView name);
   // Renames a file on the server and wherever it is known here, without an event.
   bool Rename(const Text& oldName, const Text& newName);
   bool RenameRuns() const { return renameInProgress_; }
-  // Where the file's copy in the user's folder is or would be; empty when there cannot be one.
-  Text LocalCopyOf(TextView url) const;
-
   // Position of the record of that name in the list of all files, in any letter case; 0 when there is none.
   std::size_t PositionOf(TextView name) const;
   // Gives a record another name, and its address that name at the end.
@@ -231,6 +253,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
 
   Apartment& apartment_;
   ControlEvents& events_;
+  LocalCopies copies_;
 
  private:
   // What the transfer components tell while they work.
@@ -242,45 +265,81 @@ class FileControl : private UploadEvents, private DownloadEvents {
   void FileBytes(std::string_view bytes) override;
   void UploadProgress(std::int32_t percent, std::int32_t bytes) override;
   void UploadComplete() override;
-  bool IsWanted() const override { return true; }
+  bool IsWanted() const override { return !IsStopped(); }
   void RaiseUploadProgress(std::int32_t percent);
   void Resolving() override { TellState(ConnectionState::kResolvingHost); }
   void Connected() override { TellState(ConnectionState::kConnected); }
   void TransferStarting() override { TellState(ConnectionState::kTransferStarting); }
   void HeaderFound(TextView statusLine, std::int32_t bytes) override;
   void Received(std::int32_t bytes) override;
-  void Finished() override;
+  void Finished(bool written) override;
   void Failed(std::int32_t ftpError, TextView description, bool told) override;
   void TellState(ConnectionState state);
 
-  bool SendFile(const Text& path);
-  void FailUpload(std::int32_t ftpError, TextView description);
-  void BeginLocalCopy(const Text& path);
-  // Makes the file at `path` the local copy of `url`.
-  void FinishLocalCopy(const Text& path, const Text& url);
+  // Sends and registers the file; its address, empty on failure.
+  Text SendAndRegister(CFileUpload& client, const Text& path);
+  bool SendFile(CFileUpload& client, const Text& path);
+  // Note why: the upload component failed with that number; so did a page, which was asked to give a file that name; in
+  // these words, with the number behind them.
+  void FailUpload(CFileUpload& client, const Text& path, std::int32_t number);
+  void FailPage(TextView name, std::int32_t number);
+  void FailWith(std::int32_t ftpError, TextView words, std::int32_t number);
+  // Whether the account has no room for the file. Asks the service.
+  bool IsTooLarge(CFileUpload& client, const Text& path) const;
+  // Notes why a transfer that was told to stop has no result.
+  void FailStopped();
   std::shared_ptr<CUpload> RecordUploaded(const Text& path, const Text& url);
   bool RenameOnServer(const Text& oldName, const Text& newName);
-  std::shared_ptr<CUpload> RecordRenamed(const Text& oldName, const Text& newName);
-  void MoveLocalCopy(const Text& from, const Text& to);
-  void RemoveLocalCopy(const Text& copy);
+  // The record and the address that it had.
+  std::pair<std::shared_ptr<CUpload>, Text> RecordRenamed(const Text& oldName, const Text& newName);
+  // Address of the record to fetch for the selected one; empty when it is not listed any more.
+  Text AddressToFetch(const Text& key) const;
 
   ControlView& controlView_;
   Uploader& uploader_;
   Downloader& downloader_;
   const bool tellsTransfers_;
 
-  // The local copy of the file that is uploaded, written while that is read; null when there is none.
-  std::unique_ptr<FileWriter> copyWriter_;
-  Text copyPath_;
+  // The operation that runs innermost, and the one whose transfer runs; null when there is none.
+  Operation* operation_ = nullptr;
+  Operation* transfer_ = nullptr;
   bool transferRuns_ = false;
   bool uploadFinished_ = false;
+  // The watchdog ran out in the upload that runs.
+  bool uploadTimedOut_ = false;
   bool downloadRuns_ = false;
+  // Of the download that runs: it is over, its file is there, its failure was told.
   bool downloadFinished_ = false;
+  bool downloadWritten_ = false;
+  bool downloadFailed_ = false;
   bool renameInProgress_ = false;
   bool closed_ = false;
+  // How often the container ended transfers; that, and the apartment's aborts, when the one that runs began.
+  std::uint32_t closings_ = 0;
+  std::uint32_t closingsBefore_ = 0;
+  std::uint32_t abortsBefore_ = 0;
   // Whose files are shown.
   AccountKey shownAccount_;
   int hourglasses_ = 0;
+};
+
+class FileControl::Operation {
+ public:
+  // A success until it fails.
+  explicit Operation(FileControl& control);
+  ~Operation();
+  Operation(const Operation&) = delete;
+  Operation& operator=(const Operation&) = delete;
+
+  void Fail(std::int32_t ftpError, TextView description);
+  void Succeed() { Fail(ftp_error::kSuccess, {}); }
+
+ private:
+  FileControl& control_;
+  // What runs around it; null when nothing does.
+  Operation* const outer_;
+  std::int32_t ftpError_ = ftp_error::kSuccess;
+  Text description_;
 };
 
 class FileControl::RunningTransfer {
@@ -292,8 +351,11 @@ class FileControl::RunningTransfer {
 
  private:
   FileControl& control_;
-  // One runs around this one, such as the filling of a page around its downloads.
+  // What was so before: one may run around this one, such as the filling of a page around its downloads.
   const bool nested_;
+  Operation* const transfer_;
+  const std::uint32_t closings_;
+  const std::uint32_t aborts_;
 };
 
 class FileControl::Hourglass {

@@ -106,11 +106,6 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
     session.userName = user;
     session.password = password;
     session.productNumber = NumberFromText(ProductID);
-    apartment_.allFiles.Clear();
-    // What was listed is gone, so neither control may take it for the user's files.
-    apartment_.listingIsCurrent = false;
-    apartment_.listLoaded = false;
-
     const Text status = AskForText(u"ValidationRequest", u"UserValidate",
                                    {{u"UserName", Encipher(user)},
                                     {u"Password", Encipher(password)},
@@ -119,6 +114,8 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
                                    0, u"UserAuthenticationStatus", u"FALSE");
     if (LowerCase(status) != u"true") return;
     session.loggedOn = true;
+    // What was listed may be another user's.
+    apartment_.ForgetListing();
     // The folder is the previous user's until a control prepares this one's.
     if (user != previousUser) apartment_.UserFolderPath.clear();
     SetFtpLogon(apartment_.ftp, session);

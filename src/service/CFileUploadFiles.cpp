@@ -7,15 +7,20 @@
 namespace tarnwick {
 namespace {
 
-// Makes a file a normal one as long as the object lives.
+// Makes a file a normal one as long as the object lives. Where that is not allowed, as on a medium that cannot be
+// written, the file stays as it is.
 class NormalAttributes {
  public:
   NormalAttributes(FileSystem& files, TextView path)
       : files_(files), path_(path), saved_(files.Attributes(path)) {
-    if (saved_ != 0) files_.SetAttributes(path_, 0);
+    if (saved_ == 0) return;
+    cleared_ = ResultAsItStood(false, [&](bool& cleared) {
+      files_.SetAttributes(path_, 0);
+      cleared = true;
+    });
   }
   ~NormalAttributes() {
-    if (saved_ == 0) return;
+    if (!cleared_) return;
     ResultAsItStood(0, [&](int&) { files_.SetAttributes(path_, saved_); });
   }
   NormalAttributes(const NormalAttributes&) = delete;
@@ -25,6 +30,7 @@ class NormalAttributes {
   FileSystem& files_;
   const Text path_;
   const std::uint32_t saved_;
+  bool cleared_ = false;
 };
 
 TextView ElementAt(const std::vector<TextView>& values, std::size_t index) {
@@ -149,6 +155,11 @@ bool CFileUpload::FileExists(TextView szNewFileName) const {
   for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i)
     if (apartment_.allFiles.At(i)->FileName == szNewFileName) return true;
   return false;
+}
+
+void CFileUpload::AbortFileTransfer(bool bAbortStatus) {
+  apartment_.abortTransfer = bAbortStatus;
+  if (bAbortStatus) ++apartment_.aborts;
 }
 
 Text CFileUpload::DownloadFile(TextView szServerFileName, TextView szLocalFileName) {

@@ -3,7 +3,9 @@
 #pragma once
 
 #include <cstdint>
+#include <map>
 #include <memory>
+#include <set>
 
 #include "platform/Internet.h"
 #include "platform/Platform.h"
@@ -17,11 +19,11 @@ namespace tarnwick {
 
 using FileList = KeyedList<std::shared_ptr<CUpload>>;
 
-// One user's account at one server. What began for one account must not go on in another.
+// One user's account at one server. What began for one account must not go on in another. The product number does
+// not count: a refused log-on changes it, and the user stays the same.
 struct AccountKey {
   Text serverName;
   Text userName;
-  std::int32_t productNumber = 0;
   bool operator==(const AccountKey&) const = default;
 };
 
@@ -36,7 +38,7 @@ struct SessionValues {
   // Set by a log-on; cleared once its FTP values were rewritten for the proxy.
   bool loggedOn = false;
 
-  AccountKey Account() const { return {serverName, userName, productNumber}; }
+  AccountKey Account() const { return {serverName, userName}; }
 };
 
 // How an FTP proxy learns the server behind it.
@@ -85,8 +87,28 @@ struct Apartment {
   Text shownFilter = u"*";
   bool listingIsCurrent = false;
   bool listLoaded = false;
+  // Empties the list of all files. Nobody may take what comes into it afterwards, such as one uploaded file, for the
+  // whole account, so both flags go in the same step.
+  void ForgetListing() {
+    allFiles.Clear();
+    listingIsCurrent = listLoaded = false;
+    copiesAskedAgain.clear();
+  }
+
+  // How often a local copy was made, moved or removed for an upload, a rename or a delete, by its path in lower case.
+  // Bytes that were asked for before such a change are not the file's any more.
+  std::map<Text, std::uint32_t> copyChanges;
+  std::uint32_t ChangesOfCopy(TextView path) const {
+    const auto changes = copyChanges.find(LowerCase(path));
+    return changes == copyChanges.end() ? 0 : changes->second;
+  }
+  void CopyChanged(TextView path) { ++copyChanges[LowerCase(path)]; }
+  // Addresses of the files whose copies were fetched again since the listing, because of their length.
+  std::set<Text> copiesAskedAgain;
 
   bool abortTransfer = false;
+  // How often transfers were told to stop. One that sees another number than at its beginning ends.
+  std::uint32_t aborts = 0;
   // A drag that began in one of the controls is under way.
   bool dragIsOurs = false;
 

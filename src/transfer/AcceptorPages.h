@@ -18,6 +18,7 @@ inline constexpr TextView kProductGuid = u"4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E"
 namespace acceptor {
 inline constexpr std::int32_t kNothingChanged = -2147220891;  // the same bytes were there already
 inline constexpr std::int32_t kNameRefused = -2147220881;     // name refused or taken, or quota exceeded
+inline constexpr std::int32_t kNotThere = -2147220880;        // the file to delete or rename
 inline constexpr std::int32_t kRefused = -2147220878;         // user name, password or product identifier
 inline constexpr std::int32_t kFolderState = -2147220840;  // to delete: not there; to create: there already
 inline constexpr std::int32_t kUnspecified = -2147467259;  // no usable answer

@@ -17,27 +17,53 @@ constexpr std::size_t kMostOfArrival = std::size_t{4} << 20;
 // Bytes of a file that are compared at a time.
 constexpr std::size_t kCompared = std::size_t{256} << 10;
 
-// FtpErrors.
-constexpr std::int32_t kHostNotFound = 9;
-constexpr std::int32_t kConnectionReset = 7;
-constexpr std::int32_t kConnectionRefused = 6;
-constexpr std::int32_t kConnectAborted = 5;
-constexpr std::int32_t kTimeout = 58;
-// Winsock's numbers of the same conditions.
+// Winsock's numbers.
 constexpr std::int32_t kWinsockReset = 10054;
 constexpr std::int32_t kWinsockRefused = 10061;
 constexpr std::int32_t kWinsockHostNotFound = 11001;
 
-std::int32_t FtpErrorOf(std::int32_t winsockError) {
-  switch (winsockError) {
+// An FtpErrors value and its text.
+struct Reason {
+  std::int32_t ftpError;
+  TextView text;
+};
+
+Reason ReasonOf(DownloadFailure failure, std::int32_t socketError) {
+  constexpr std::int32_t kConnectAborted = 5;
+  constexpr std::int32_t kConnectionRefused = 6;
+  constexpr std::int32_t kConnectionReset = 7;
+  constexpr std::int32_t kHostNotFound = 9;
+  constexpr std::int32_t kAborted = 45;
+  constexpr std::int32_t kTimeout = 58;
+  switch (failure) {
+    case DownloadFailure::kAddress:
+      return {kAborted, u"The file's address is not safe."};
+    case DownloadFailure::kFolder:
+      return {kAborted, u"There is no folder for local copies."};
+    case DownloadFailure::kProxy:
+      return {kAborted, u"The proxy setting names no port."};
+    case DownloadFailure::kEmpty:
+      return {kConnectAborted, u"The server closed the connection without an answer."};
+    case DownloadFailure::kCut:
+      return {kConnectAborted, u"The server closed the connection in the middle of its answer."};
+    case DownloadFailure::kTooLong:
+      return {kAborted, u"The file is too large."};
+    case DownloadFailure::kMemory:
+      return {kAborted, u"There is not enough memory for the file."};
+    case DownloadFailure::kSilence:
+      return {kTimeout, u"The server was silent for too long."};
+    case DownloadFailure::kConnection:
+      break;
+  }
+  switch (socketError) {
     case kWinsockReset:
-      return kConnectionReset;
+      return {kConnectionReset, u"The server reset the connection."};
     case kWinsockRefused:
-      return kConnectionRefused;
+      return {kConnectionRefused, u"The server refused the connection."};
     case kWinsockHostNotFound:
-      return kHostNotFound;
+      return {kHostNotFound, u"The server's name was not found."};
     default:
-      return kConnectAborted;
+      return {kConnectAborted, u"The connection failed."};
   }
 }
 
@@ -61,11 +87,10 @@ PictureDownloader::PictureDownloader(Apartment& apartment, StreamSocket& socket,
     : apartment_(apartment), socket_(socket), watchdog_(watchdog), machine_(*this) {
   socket_.SetEvents(this);
   watchdog_.SetHandler([this] {
-    ftpError_ = kTimeout;
     if (machine_.IsRunning()) return machine_.OnWatchdog();
     // Of an upload: it fails the transfer all the same.
     watchdog_.Stop();
-    Failed(false);
+    Failed(DownloadFailure::kSilence, false);
   });
 }
 
@@ -75,8 +100,16 @@ PictureDownloader::~PictureDownloader() {
   socket_.Close();
 }
 
+bool PictureDownloader::CanStart(TextView url) const {
+  DownloadPlan plan;
+  return !url.empty() && !MakeDownloadPlan(url, apartment_.UserFolderPath, apartment_.proxy.ProxyHost,
+                                           apartment_.proxy.ProxyPort, plan);
+}
+
 void PictureDownloader::Start(TextView url, TextView explicitTarget) {
-  ftpError_ = kConnectAborted;
+  socketError_ = 0;
+  copy_ = apartment_.UserFolderPath + u"\\" + Text(FileNameFromUrl(url));
+  changes_ = apartment_.ChangesOfCopy(copy_);
   machine_.StartDownload(url, apartment_.UserFolderPath, explicitTarget, apartment_.proxy.ProxyHost,
                          apartment_.proxy.ProxyPort);
 }
@@ -85,7 +118,13 @@ void PictureDownloader::Wait() {
   // A quit message ends the program: nothing is waited for any more.
   if (apartment_.platform.pump.Wait()) return;
   machine_.Cancel();
-  Failed(false);
+  Failed(DownloadFailure::kConnection, false);
+}
+
+bool PictureDownloader::GivesUp() {
+  if (!events_ || events_->IsWanted()) return false;
+  machine_.Cancel();
+  return true;
 }
 
 void PictureDownloader::Connect(TextView host, std::uint16_t port) {
@@ -96,29 +135,40 @@ void PictureDownloader::Connect(TextView host, std::uint16_t port) {
 }
 
 void PictureDownloader::OnConnected() {
-  if (!machine_.IsRunning()) return;
+  if (!machine_.IsRunning() || GivesUp()) return;
   if (events_) events_->Connected();
   machine_.OnConnected();
   if (events_ && machine_.IsRunning()) events_->TransferStarting();
 }
 
 void PictureDownloader::OnReadable() {
+  if (GivesUp()) return;
   const std::span<char> room = machine_.Room(kMostOfArrival);
   if (!room.empty()) machine_.OnArrived(socket_.Read(room));
 }
 
+void PictureDownloader::OnClosedByPeer() {
+  if (!GivesUp()) machine_.OnClosedByPeer();
+}
+
 void PictureDownloader::OnSocketError(std::int32_t number) {
-  ftpError_ = FtpErrorOf(number);
+  socketError_ = number;
   machine_.OnSocketError();
 }
 
-void PictureDownloader::WriteFile(TextView path, TextView explicitPath, std::string_view bytes) {
-  ResultAsItStood(0, [&](int&) {
+bool PictureDownloader::WriteFile(TextView path, TextView explicitPath, std::string_view bytes) {
+  return ResultAsItStood(false, [&](bool& written) {
     FileSystem& files = apartment_.platform.files;
-    if (!explicitPath.empty()) files.Write(explicitPath, bytes);
+    if (!explicitPath.empty()) {
+      files.Write(explicitPath, bytes);
+      written = true;
+    }
+    // An upload, a rename or a delete has come before these bytes, which are not the file's any more.
+    if (apartment_.ChangesOfCopy(copy_) != changes_) return;
     // Not copied from the other one: the bytes are here. Most often the picture has been shown before, and
     // the user's folder has it.
     if (explicitPath != path && !Holds(files, path, bytes)) files.Write(path, bytes);
+    written = true;
   });
 }
 
@@ -130,12 +180,13 @@ void PictureDownloader::HeaderFound(std::string_view statusLine, std::int32_t by
   if (events_) events_->HeaderFound(TextFromLatin1(statusLine), bytes);
 }
 
-void PictureDownloader::Finished() {
-  if (events_) events_->Finished();
+void PictureDownloader::Finished(bool written) {
+  if (events_) events_->Finished(written);
 }
 
-void PictureDownloader::Failed(bool told) {
-  if (events_) events_->Failed(ftpError_, ftpError_ == kTimeout ? u"Timed out" : u"Connection failed", told);
+void PictureDownloader::Failed(DownloadFailure failure, bool told) {
+  const Reason reason = ReasonOf(failure, socketError_);
+  if (events_) events_->Failed(reason.ftpError, reason.text, told);
 }
 
 }  // namespace tarnwick

@@ -18,6 +18,7 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   PictureDownloader& operator=(const PictureDownloader&) = delete;
 
   void SetEvents(DownloadEvents* events) override { events_ = events; }
+  bool CanStart(TextView url) const override;
   void Start(TextView url, TextView explicitTarget) override;
   void Cancel() override { machine_.Cancel(); }
   void RestartWatchdog() override { watchdog_.Start(kWatchdogMs); }
@@ -25,21 +26,24 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   void Wait() override;
 
  private:
+  // Cancels a download that is not wanted any more; whether it did.
+  bool GivesUp();
+
   // DownloadActions
   void Connect(TextView host, std::uint16_t port) override;
   void Send(std::string_view bytes) override { socket_.Send(bytes); }
   void CloseSocket() override { socket_.Close(); }
-  void WriteFile(TextView path, TextView explicitPath, std::string_view bytes) override;
+  bool WriteFile(TextView path, TextView explicitPath, std::string_view bytes) override;
   void Received(std::int32_t bytes) override;
   void HeaderFound(std::string_view statusLine, std::int32_t bytes) override;
-  void Finished() override;
-  void Failed(bool told) override;
+  void Finished(bool written) override;
+  void Failed(DownloadFailure failure, bool told) override;
 
   // SocketEvents
   void OnResolved() override {}
   void OnConnected() override;
   void OnReadable() override;
-  void OnClosedByPeer() override { machine_.OnClosedByPeer(); }
+  void OnClosedByPeer() override;
   void OnSent() override { machine_.OnSent(); }
   void OnSocketError(std::int32_t number) override;
 
@@ -48,7 +52,11 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   Timer& watchdog_;
   SocketDownloader machine_;
   DownloadEvents* events_ = nullptr;
-  std::int32_t ftpError_ = 0;
+  // Winsock's number of the last failure of the socket.
+  std::int32_t socketError_ = 0;
+  // The local copy that is fetched, and how often it had changed before: see Apartment::copyChanges.
+  Text copy_;
+  std::uint32_t changes_ = 0;
 };
 
 }  // namespace tarnwick

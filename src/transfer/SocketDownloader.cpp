@@ -33,6 +33,28 @@ std::int32_t NumberOf(std::string_view line) {
 
 }  // namespace
 
+std::optional<DownloadFailure> MakeDownloadPlan(TextView url, TextView folder, TextView proxyHost, TextView proxyPort,
+                                                DownloadPlan& plan) {
+  const TextView fileName = FileNameFromUrl(url);
+  const TextView rest = url.starts_with(kScheme) ? url.substr(kScheme.size()) : url;
+  const auto address = SplitHttpAddress(rest);
+  if (!address || address->path.empty() || !IsSafeFileName(fileName)) return DownloadFailure::kAddress;
+  if (folder.empty()) return DownloadFailure::kFolder;
+  plan.host = address->host;
+  plan.port = address->port;
+  // With the port, where there is one.
+  plan.hostLine = rest.substr(0, rest.find(u'/'));
+  plan.requestTarget = address->path;
+  plan.file = Text(folder) + u"\\" + Text(fileName);
+  if (proxyHost.empty()) return std::nullopt;
+  const auto proxy = SplitHttpAddress(Text(proxyHost) + u":" + Text(proxyPort));
+  if (!proxy || !proxy->path.empty()) return DownloadFailure::kProxy;
+  plan.host = plan.hostLine = proxy->host;
+  plan.port = proxy->port;
+  plan.requestTarget = Text(kScheme) + Text(rest);
+  return std::nullopt;
+}
+
 void SocketDownloader::StartDownload(TextView url, TextView folder, TextView explicitTarget,
                                      TextView proxyHost, TextView proxyPort) {
   if (url.empty()) return;
@@ -43,26 +65,9 @@ void SocketDownloader::StartDownload(TextView url, TextView folder, TextView exp
   headerFound_ = false;
   running_ = true;
   actions_.RestartWatchdog();
-
-  const TextView fileName = FileNameFromUrl(url);
-  const TextView rest = url.starts_with(kScheme) ? url.substr(kScheme.size()) : url;
-  const auto address = SplitHttpAddress(rest);
-  if (!address || address->path.empty() || folder.empty() || !IsSafeFileName(fileName)) return Fail(true);
-  std::uint16_t port = address->port;
-  remoteHost_ = address->host;
-  remotePath_ = address->path;
-  // With the port, where there is one.
-  hostLine_ = rest.substr(0, rest.find(u'/'));
-  if (!proxyHost.empty()) {
-    const auto proxy = SplitHttpAddress(Text(proxyHost) + u":" + Text(proxyPort));
-    if (!proxy || !proxy->path.empty()) return Fail(true);
-    remoteHost_ = hostLine_ = proxy->host;
-    port = proxy->port;
-    remotePath_ = Text(kScheme) + Text(rest);
-  }
-  target_ = Text(folder) + u"\\" + Text(fileName);
   explicitTarget_ = explicitTarget;
-  actions_.Connect(remoteHost_, port);
+  if (const auto failure = MakeDownloadPlan(url, folder, proxyHost, proxyPort, plan_)) return Fail(*failure, true);
+  actions_.Connect(plan_.host, plan_.port);
 }
 
 void SocketDownloader::Cancel() {
@@ -75,7 +80,7 @@ void SocketDownloader::Cancel() {
 
 void SocketDownloader::OnConnected() {
   if (!running_) return;
-  actions_.Send("GET " + TargetBytes(remotePath_) + " HTTP/1.1\r\nHost: " + Utf8FromText(hostLine_) +
+  actions_.Send("GET " + TargetBytes(plan_.requestTarget) + " HTTP/1.1\r\nHost: " + Utf8FromText(plan_.hostLine) +
                 "\r\nConnection: close\r\nAccept: */*\r\n"
                 "User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n\r\n");
 }
@@ -86,7 +91,7 @@ std::span<char> SocketDownloader::Room(std::size_t most) {
     return reply_.Room(most);
   } catch (const std::bad_alloc&) {
     // A file with a hole in it is worse than none.
-    Fail(true);
+    Fail(DownloadFailure::kMemory, true);
     return {};
   }
 }
@@ -94,7 +99,7 @@ std::span<char> SocketDownloader::Room(std::size_t most) {
 void SocketDownloader::OnArrived(std::size_t count) {
   if (!running_ || count == 0) return;
   reply_.Add(count);
-  if (reply_.Size() > kMostReplyBytes) return Fail(true);
+  if (reply_.Size() > kMostReplyBytes) return Fail(DownloadFailure::kTooLong, true);
   actions_.Received(BodyBytes());
   // The host may have ended or replaced the download in its event.
   if (!running_) return;
@@ -135,15 +140,16 @@ void SocketDownloader::OnClosedByPeer() {
   if (!running_) return;
   // A host that pumps messages in the event of an arrival gets the close before the arrival was searched.
   const auto statusLine = FindHeader();
-  if (!headerFound_) return Fail(reply_.Size() == 0);
+  if (!headerFound_)
+    return reply_.Size() == 0 ? Fail(DownloadFailure::kEmpty, true) : Fail(DownloadFailure::kCut, false);
   const std::int32_t bytes = BodyBytes();
   const ReplyBuffer reply = std::exchange(reply_, {});
   running_ = false;
   actions_.CloseSocket();
   actions_.StopWatchdog();
-  actions_.WriteFile(target_, explicitTarget_, reply.Bytes().substr(bodyStart_));
+  const bool written = actions_.WriteFile(plan_.file, explicitTarget_, reply.Bytes().substr(bodyStart_));
   if (statusLine) actions_.HeaderFound(*statusLine, bytes);
-  actions_.Finished();
+  actions_.Finished(written);
 }
 
 void SocketDownloader::OnSent() {
@@ -151,7 +157,7 @@ void SocketDownloader::OnSent() {
 }
 
 void SocketDownloader::OnSocketError() {
-  if (running_) Fail(true);
+  if (running_) Fail(DownloadFailure::kConnection, true);
 }
 
 void SocketDownloader::OnWatchdog() {
@@ -160,15 +166,15 @@ void SocketDownloader::OnWatchdog() {
   running_ = false;
   reply_ = {};
   actions_.StopWatchdog();
-  actions_.Failed(false);
+  actions_.Failed(DownloadFailure::kSilence, false);
 }
 
-void SocketDownloader::Fail(bool told) {
+void SocketDownloader::Fail(DownloadFailure failure, bool told) {
   running_ = false;
   reply_ = {};
   actions_.CloseSocket();
   actions_.StopWatchdog();
-  actions_.Failed(told);
+  actions_.Failed(failure, told);
 }
 
 }  // namespace tarnwick

@@ -29,6 +29,19 @@ inline constexpr std::size_t kMostReplyBytes = std::size_t{256} << 20;
 // Longest silence of a transfer.
 inline constexpr std::uint32_t kWatchdogMs = 40'000;
 
+// Why there is no file.
+enum class DownloadFailure {
+  kAddress,     // the address, or the name in it, could do harm
+  kFolder,      // there is no folder for it
+  kProxy,       // the proxy setting names no port
+  kConnection,  // the socket failed
+  kEmpty,       // closed without a byte
+  kCut,         // closed in the header
+  kTooLong,
+  kMemory,
+  kSilence,
+};
+
 // What the downloader wants to be done. The last four are events: in them a host may start or end a download,
 // and more of what happens may be told. Nothing may be told to it from inside the others.
 class DownloadActions {
@@ -39,26 +52,39 @@ class DownloadActions {
   virtual void CloseSocket() = 0;
   virtual void RestartWatchdog() = 0;
   virtual void StopWatchdog() = 0;
-  // Writes the bytes to `explicitPath`, unless that is empty, and to `path`, over what is there. Failures are
-  // ignored: who waits for the file sees that it is not there.
-  virtual void WriteFile(TextView path, TextView explicitPath, std::string_view bytes) = 0;
+  // Writes the bytes to `explicitPath`, unless that is empty, and to `path`, over what is there. Whether the first of
+  // them is there now.
+  virtual bool WriteFile(TextView path, TextView explicitPath, std::string_view bytes) = 0;
 
   virtual void Received(std::int32_t bytes) = 0;
   // The header is whole: its first line, and the bytes behind it that have arrived.
   virtual void HeaderFound(std::string_view statusLine, std::int32_t bytes) = 0;
-  virtual void Finished() = 0;
+  virtual void Finished(bool written) = 0;
   // The download is over without a file. `told`: hosts hear of it.
-  virtual void Failed(bool told) = 0;
+  virtual void Failed(DownloadFailure failure, bool told) = 0;
 };
+
+// Where a file is fetched from and goes to.
+struct DownloadPlan {
+  Text host;
+  std::uint16_t port = 80;
+  Text hostLine;
+  Text requestTarget;
+  Text file;
+};
+
+// The plan for fetching `url` ("http://host[:port]/path", or without the scheme) into `folder` under the last part of
+// the address, through the proxy unless its host is empty. Returns what stands against it: an address or name that
+// could do harm, a folder that is empty, a proxy without a usable port.
+std::optional<DownloadFailure> MakeDownloadPlan(TextView url, TextView folder, TextView proxyHost, TextView proxyPort,
+                                                DownloadPlan& plan);
 
 class SocketDownloader {
  public:
   explicit SocketDownloader(DownloadActions& actions) : actions_(actions) {}
 
-  // Begins to fetch `url` ("http://host[:port]/path", or without the scheme), through the proxy unless its
-  // host is empty. The file goes to `folder` under the last part of the address, and first to
-  // `explicitTarget` unless that is empty. An address or name that could do harm, a folder that is empty, or
-  // a proxy without a usable port fails at once. An empty address does nothing.
+  // Begins to fetch a file as MakeDownloadPlan says, and fails at once where that fails. The file goes to
+  // `explicitTarget` first unless that is empty. An empty address does nothing.
   void StartDownload(TextView url, TextView folder, TextView explicitTarget, TextView proxyHost,
                      TextView proxyPort);
 
@@ -81,16 +107,13 @@ class SocketDownloader {
   std::int32_t ContentLength() const { return contentLength_; }
 
  private:
-  void Fail(bool told);
+  void Fail(DownloadFailure failure, bool told);
   // The status line when the header, which was not known before, is whole.
   std::optional<std::string> FindHeader();
   std::int32_t BodyBytes() const { return static_cast<std::int32_t>(reply_.Size() - bodyStart_); }
 
   DownloadActions& actions_;
-  Text remoteHost_;
-  Text hostLine_;
-  Text remotePath_;
-  Text target_;
+  DownloadPlan plan_;
   Text explicitTarget_;
   // Everything that has arrived.
   ReplyBuffer reply_;

@@ -141,6 +141,7 @@ void UploadObject::UploadFile(TextView localPath, TextView usersBaseUrl, TextVie
   post.contentType = contentType;
   events.Initializing();
   events.Connecting();
+  if (!events.IsWanted()) throw RuntimeError(acceptor::kUnspecified);
   const auto answer = platform_.http.PostStream(post, body, kMostAcceptorAnswerBytes);
   events.ServerProcess();
   const std::int32_t number = ErrorNumberOf(answer);

@@ -81,6 +81,8 @@ struct FakeThumbnailPage : ThumbnailPage {
     log.emplace_back("editor hides");
   }
   Text EditorText() const override { return edited; }
+  bool hasFocus = true;
+  bool HasFocus() const override { return hasFocus; }
   void Focus() override {}
   void SetHourglass(bool) override {}
   void StartDrag() override { log.emplace_back("page drag"); }

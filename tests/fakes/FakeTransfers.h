@@ -67,6 +67,8 @@ struct FakeDownloader : Downloader {
     next(*this);
   }
   void SetEvents(DownloadEvents* sink) override { events = sink; }
+  bool canStart = true;
+  bool CanStart(TextView) const override { return canStart; }
   void Start(TextView itsUrl, TextView explicitTarget) override {
     url = itsUrl;
     target = explicitTarget;

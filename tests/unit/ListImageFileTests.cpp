@@ -162,7 +162,9 @@ TEST_F(ListImageUpload, LocalCopyHasTheBytesThatWereSent) {
   } kCases[] = {
       {"sent", "FileURL=http://h/u/new.jpg", 0, 99, copy, "file, sent"},
       {"not taken", "FileURL=http://h/u/new.jpg", -2147220881, 99, copy, "old"},
-      {"not registered", "FileURL=", 0, 99, copy, "old"},
+      // The server has other bytes than the old copy by now.
+      {"not registered", "FileURL=", 0, 99, copy, ""},
+      {"no answer", "FileURL=http://h/u/new.jpg", acceptor::kUnspecified, 99, copy, ""},
       // The upload goes on; the file is copied as it is then.
       {"disk full for a while", "FileURL=http://h/u/new.jpg", 0, 5, copy, "later"},
       {"another name", "FileURL=http://h/u/x.jpg", 0, 99, fake.apartment.UserFolderPath + u"\\x.jpg",
@@ -207,8 +209,10 @@ TEST_F(ListImageUpload, HostActsWhileItRuns) {
     SCOPED_TRACE(event);
     List({{"a.jpg", "1"}});
     bool second = true;
+    std::int32_t secondError = 0;
     OnEvent(event, [&] {
       if (control.m_bTransferInProgress) second = control.UploadImage(u"C:\\new.jpg");
+      secondError = control.m_LastError;
       control.ChangeFileFilter(u"gif");
       control.mobjFileupload.reset();
     });
@@ -216,8 +220,9 @@ TEST_F(ListImageUpload, HostActsWhileItRuns) {
     EXPECT_EQ(Records(), "a.jpg,new.jpg,");
     if (std::string_view(event) != "1015 http://h/u/new.jpg") {
       EXPECT_FALSE(second);
-      EXPECT_EQ(control.m_LastError, ftp_error::kTransferInProgress);
+      EXPECT_EQ(secondError, ftp_error::kTransferInProgress);
     }
+    EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
     host.onEvent = nullptr;
     control.mobjFileupload = std::make_shared<CFileUpload>(fake.apartment);
   }
@@ -465,7 +470,7 @@ class ListImageDownload : public ListImageTest {
         [](FakeDownloader& d) { d.events->Received(5); },
         [](FakeDownloader& d) {
           d.files.files[d.target] = {5, 0};
-          d.events->Finished();
+          d.events->Finished(true);
         },
     };
   }
@@ -520,22 +525,29 @@ TEST_F(ListImageDownload, FindsTargetAndAddress) {
     EXPECT_EQ(std::ranges::count(log, start), test.fetched ? 1 : 0);
     EXPECT_EQ(Events().starts_with("5555"), !test.fetched);
   }
-  // The first record whose address holds the item's; none: nothing starts.
+  // The record of that very address, else the first whose address holds the item's; none: nothing starts.
   List({{"a.jpg.gif", "1"}, {"a.jpg", "1"}}, u"jpg");
   view.Select(0, true);
-  Succeed();
-  control.DownLoadFileFromServer(u"C:\\To");
-  EXPECT_EQ(log.front(), "download http://h/u/a.jpg.gif to C:\\To\\a.jpg");
-  log.clear();
-  fake.apartment.allFiles.Clear();
+  for (const char* address : {"a.jpg", "a.jpg.gif"}) {
+    Succeed();
+    control.DownLoadFileFromServer(u"C:\\To");
+    EXPECT_EQ(log.front(), "download http://h/u/" + std::string(address) + " to C:\\To\\a.jpg");
+    log.clear();
+    fake.apartment.allFiles.Remove(fake.apartment.allFiles.Count());
+  }
+  // Nothing can be attempted: the older file stays, and the reason is told.
+  fake.files.files[u"C:\\To\\a.jpg"] = {3, 0, "old"};
   EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To\\"), u"C:\\To\\a.jpg");
-  // Nothing selected, no client: nothing to return.
+  EXPECT_EQ(control.m_LastError, ftp_error::kUnavailable);
   view.Select(0, false);
   EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"");
+  EXPECT_EQ(control.m_LastError, ftp_error::kUnavailable);
   view.Select(0, true);
   control.mobjFileupload.reset();
   EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"");
+  EXPECT_EQ(control.m_LastError, ftp_error::kNoClient);
   ExpectLog({});
+  EXPECT_TRUE(fake.files.files.contains(u"C:\\To\\a.jpg"));
 }
 
 TEST_F(ListImageDownload, Failures) {
@@ -545,7 +557,7 @@ TEST_F(ListImageDownload, Failures) {
     log.clear();
     EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
     EXPECT_FALSE(control.gbConnectionFailed || control.m_bTransferInProgress);
-    EXPECT_EQ(log.back(), "watchdog stops");
+    EXPECT_EQ(std::ranges::count(log, "watchdog stops"), 1);
     return Events();
   };
   downloader.waits = {[](FakeDownloader& d) { d.events->Failed(6, u"refused", true); }};
@@ -556,9 +568,14 @@ TEST_F(ListImageDownload, Failures) {
   EXPECT_EQ(download(), "");
   EXPECT_EQ(control.m_LastError, ftp_error::kTimeout);
   // The writer failed.
-  downloader.waits = {[](FakeDownloader& d) { d.events->Finished(); }};
-  EXPECT_EQ(download(), "");
-  EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+  for (const TextView folder : {u"C:\\Else", u"C:\\To"}) {
+    fake.files.folders = {Text(folder)};
+    downloader.waits = {[](FakeDownloader& d) { d.events->Finished(false); }};
+    EXPECT_EQ(download(), "");
+    EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+    EXPECT_EQ(control.m_strLastErrorDesc, folder == u"C:\\To" ? u"The local file could not be written."
+                                                              : u"The local folder was not found.");
+  }
   // What is there already stays and is not taken for the download.
   constexpr std::uint32_t kReadOnly = 1;
   fake.files.files[u"C:\\To\\a.jpg"] = {3, kReadOnly, "old"};
@@ -568,14 +585,40 @@ TEST_F(ListImageDownload, Failures) {
   EXPECT_EQ(Events(), "5555 ,");
   EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
   EXPECT_EQ(fake.files.files[u"C:\\To\\a.jpg"].bytes, "old");
-  fake.files.files.erase(u"C:\\To\\a.jpg");
-  // The host gives up, before or meanwhile.
+  // The host gives up before: nothing is attempted, nor is it when the address is none.
+  fake.files.files[u"C:\\To\\a.jpg"].attributes = 0;
   control.gbConnectionFailed = true;
-  EXPECT_EQ(download(), "");
-  downloader.waits = {[&](FakeDownloader&) { control.gbConnectionFailed = true; }};
-  EXPECT_EQ(download(), "");
-  EXPECT_TRUE(downloader.waits.empty());
-  EXPECT_EQ(std::ranges::count(log, "cancel"), 1);
+  log.clear();
+  EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
+  ExpectLog({});
+  EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+  EXPECT_FALSE(control.gbConnectionFailed);
+  downloader.canStart = false;
+  downloader.waits = {[](FakeDownloader& d) { d.events->Failed(45, u"no address", true); }};
+  EXPECT_EQ(download(), "5555 ,");
+  EXPECT_EQ(fake.files.files[u"C:\\To\\a.jpg"].bytes, "old");
+  downloader.canStart = true;
+  // Or meanwhile, which is the only reason then.
+  const struct {
+    std::function<void()> stops;
+    TextView reason;
+  } kStops[] = {
+      {[&] { control.gbConnectionFailed = true; }, u"gbConnectionFailed was set."},
+      {[&] { control.mobjFileupload->AbortFileTransfer(true); }, u"The transfer was stopped."},
+      {[&] { control.EndTransfer(); }, u"The control was closed."},
+  };
+  for (const auto& test : kStops) {
+    downloader.waits = {[&](FakeDownloader&) { test.stops(); }};
+    EXPECT_EQ(download(), "");
+    EXPECT_TRUE(downloader.waits.empty());
+    EXPECT_EQ(std::ranges::count(log, "cancel"), 1);
+    EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+    EXPECT_EQ(control.m_strLastErrorDesc, test.reason);
+  }
+  // The next one is not meant.
+  Succeed();
+  EXPECT_EQ(download().substr(0, 5), "9999 ");
+  EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
 }
 
 TEST_F(ListImageDownload, OneTransferAtATime) {

@@ -30,7 +30,7 @@ class ThumbNailTest : public ControlTest {
     const Text all = *TextFromUtf8(names);
     for (const TextView name : Split(all, u' ')) {
       if (name.empty()) continue;
-      account.push_back({Utf8FromText(name), "1"});
+      account.push_back({Utf8FromText(name), std::to_string(kGif.size())});
       fake.files.files[CopyOf(account.back().name)] = {kGif.size(), 0, kGif};
     }
     fake.apartment.listLoaded = false;
@@ -60,7 +60,7 @@ class ThumbNailTest : public ControlTest {
     from.events->Received(11);
     fake.files.files[u"C:\\Temp\\bv\\u@x\\" + from.url.substr(from.url.rfind(u'/') + 1)] = {kGif.size(), 0,
                                                                                             kGif};
-    from.events->Finished();
+    from.events->Finished(true);
   }
   std::function<void(FakeDownloader&)> Arrival() {
     return [this](FakeDownloader& from) { Arrives(from); };

@@ -29,7 +29,9 @@ struct Host : DownloadEvents {
     Tell("reply " + Utf8FromText(line) + " " + std::to_string(bytes));
   }
   void Received(std::int32_t bytes) override { Tell("received " + std::to_string(bytes)); }
-  void Finished() override { Tell("finished"); }
+  void Finished(bool written) override { Tell(written ? "finished" : "finished without a file"); }
+  bool IsWanted() const override { return wanted; }
+  bool wanted = true;
   void Failed(std::int32_t ftpError, TextView, bool told) override {
     Tell("failed " + std::to_string(ftpError) + (told ? " told" : ""));
   }
@@ -170,7 +172,7 @@ TEST_F(DriverTest, WatchdogQuitAndEnd) {
 TEST_F(DriverTest, NothingIsWrittenWithoutAUserFolder) {
   fake.apartment.UserFolderPath.clear();
   Start();
-  EXPECT_EQ(log, (Transcript{"close", "failed 5 told"}));
+  EXPECT_EQ(log, (Transcript{"close", "failed 45 told"}));
 }
 
 }  // namespace

@@ -23,16 +23,17 @@ struct Actions : DownloadActions {
   void CloseSocket() override { log += "close;"; }
   void RestartWatchdog() override { log += "w+;"; }
   void StopWatchdog() override { log += "w-;"; }
-  void WriteFile(TextView path, TextView explicitPath, std::string_view bytes) override {
+  bool WriteFile(TextView path, TextView explicitPath, std::string_view bytes) override {
     log += "write " + Utf8FromText(path) + " " + Utf8FromText(explicitPath) + ";";
     body = bytes;
+    return true;
   }
   void Received(std::int32_t bytes) override { log += std::to_string(bytes) + ";"; }
   void HeaderFound(std::string_view line, std::int32_t bytes) override {
     log += "reply " + std::string(line) + " " + std::to_string(bytes) + ";";
   }
-  void Finished() override { log += "finished;"; }
-  void Failed(bool told) override { log += told ? "failed told;" : "failed;"; }
+  void Finished(bool) override { log += "finished;"; }
+  void Failed(DownloadFailure, bool told) override { log += told ? "failed told;" : "failed;"; }
 };
 
 struct DownloaderTest : testing::Test {

@@ -46,13 +46,11 @@ ctrlListImage::~ctrlListImage() {
 
 bool ctrlListImage::Init(TextView szFileFilter) {
   Text filter(szFileFilter);
+  const Operation operation(*this);
   // Until the listing is there, the thumbnails have none either.
   const bool loaded = apartment_.listLoaded;
-  if (!apartment_.listingIsCurrent) {
-    apartment_.allFiles.Clear();
-    apartment_.listLoaded = false;
-  }
-  if (!mobjFileupload) throw RuntimeError(init_error::kNoClient);
+  if (!apartment_.listingIsCurrent) apartment_.ForgetListing();
+  if (!Client()) throw RuntimeError(init_error::kNoClient);
   PrepareUserFolder(apartment_);
   if (!ListAccount()) throw RuntimeError(init_error::kListingFailed);
   apartment_.listLoaded = loaded;
@@ -215,7 +213,7 @@ bool ctrlListImage::OnAfterLabelEdit(std::size_t index, TextView newText) {
     Text newName(newText);
     // An emptied or untouched label means that the user changed his mind.
     if (Trim(newName).empty() || newName == oldName) return;
-    if (!IsFileNameValid(newName)) return;
+    if (!IsEditedNameValid(newName)) return;
     CheckFileExtension(newName, ExtensionOf(oldName));
     if (Trim(newName) != oldName) renamed = RenameFile(oldName, newName);
   });

@@ -81,7 +81,8 @@ class ctrlListImage final : public FileControl {
   std::shared_ptr<CUpload> SelectedRecord() const override;
   bool ShowsFile(TextView name) const override;
   void ShowUploaded(const std::shared_ptr<CUpload>& record) override;
-  void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldName, const Text& newName) override;
+  void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl, const Text& oldName,
+                   const Text& newName) override;
   void DroppedNoFiles(bool own) override;
 
   std::optional<std::size_t> Selected() const { return NextSelected(0); }

@@ -37,9 +37,14 @@ void ctrlListImage::DeleteFile() {
   ResultAsItStood(0, [&](int&) {
     // In an event of a delete there is nothing more to delete: what is selected is under way.
     if (deleteRuns_) return;
+    const Operation operation(*this);
     const Hourglass pointer(*this);
-    if (items_.empty() || !mobjFileupload || ShowsOtherAccount()) return;
-    if (!CFileUpload::CanDeleteFile()) return Raise(event::kNotAllowed);
+    if (!Selected()) Fail(ftp_error::kUnavailable, u"No file is selected.");
+    if (items_.empty() || !Client() || !MayChangeShown()) return;
+    if (!CFileUpload::CanDeleteFile()) {
+      Fail(ftp_error::kNotAllowed, u"The account may not delete files.");
+      return Raise(event::kNotAllowed);
+    }
     deleteRuns_ = true;
     ResultAsItStood(0, [&](int&) { DeleteSelected(); });
     deleteRuns_ = false;
@@ -49,8 +54,9 @@ void ctrlListImage::DeleteFile() {
     try {
       Init(currentFilter_);
     } catch (const RuntimeError&) {
-      // The files are gone; that the rest could not be listed again is no failure of the delete.
-      ShowListOrLabel();
+      // The account is not empty; what it holds is not known.
+      view_.ShowList(true);
+      Fail(ftp_error::kNotTaken, u"The files were deleted, but the rest could not be listed.");
     }
     if (items_.empty()) return;
     SelectAlone(0);
@@ -61,6 +67,7 @@ void ctrlListImage::DeleteFile() {
 void ctrlListImage::DeleteSelected() {
   const std::uint32_t filling = filling_;
   const AccountKey account = apartment_.session.Account();
+  const std::uint32_t aborts = apartment_.aborts;
   // Where the last record was. The next one follows, so that many deletes stay one walk through the records.
   std::size_t position = 1;
   // What the user selects between two files is not meant.
@@ -70,6 +77,7 @@ void ctrlListImage::DeleteSelected() {
     // The host may fill the list anew, take the client away or log another user on in any event; the rest
     // then stays.
     if (filling != filling_ || IsClosed() || apartment_.session.Account() != account) return;
+    if (apartment_.aborts != aborts) return Fail(ftp_error::kAborted, u"The delete was stopped.");
     if (!chosen[i]) {
       Raise(event::kNotSelected);
       continue;
@@ -101,7 +109,7 @@ std::size_t ctrlListImage::RemoveRecord(TextView name, std::size_t from) {
 
 // --- Rename ---
 
-void ctrlListImage::ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldName,
+void ctrlListImage::ShowRenamed(const std::shared_ptr<CUpload>& record, const Text&, const Text& oldName,
                                 const Text& newName) {
   reselect_ = true;
   // Record and item are one object as a rule, but the item of an older listing has a record of its own.

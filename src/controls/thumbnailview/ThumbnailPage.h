@@ -51,6 +51,9 @@ class ThumbnailPage : public ControlView {
   virtual void ShowEditor(int slot, TextView name) = 0;
   virtual void HideEditor() = 0;
   virtual Text EditorText() const = 0;
+
+  // Whether the keyboard focus is in the window of the control or below it.
+  virtual bool HasFocus() const = 0;
 };
 
 }  // namespace tarnwick

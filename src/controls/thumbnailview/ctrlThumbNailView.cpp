@@ -61,9 +61,8 @@ ctrlThumbNailView::ctrlThumbNailView(const ControlParts& parts, ThumbnailPage& p
 }
 
 ctrlThumbNailView::~ctrlThumbNailView() {
-  apartment_.allFiles.Clear();
+  apartment_.ForgetListing();
   apartment_.shownFiles.Clear();
-  apartment_.listLoaded = false;
 }
 
 // --- Listing ---
@@ -71,9 +70,7 @@ ctrlThumbNailView::~ctrlThumbNailView() {
 bool ctrlThumbNailView::Init(TextView szFileFilter) {
   return ResultAsItStood(false, [&](bool& done) {
     const Text filter(szFileFilter);
-    // Set before the page pumps messages: what forgets the listing meanwhile is not to be undone.
-    if (!apartment_.listLoaded) apartment_.listLoaded = List();
-    done = apartment_.listLoaded;
+    done = List();
     ResultAsItStood(0, [&](int&) {
       Text link;
       for (const std::uint16_t id : kLinkStrings)
@@ -81,13 +78,21 @@ bool ctrlThumbNailView::Init(TextView szFileFilter) {
       page_.SetEmptyTexts(GetResourceString(apartment_, kNoImagesString), link);
     });
     Show(filter);
+    FocusGrid();
   });
 }
 
 bool ctrlThumbNailView::List() {
-  apartment_.allFiles.Clear();
+  const Operation operation(*this);
+  if (apartment_.listLoaded) return true;
+  const bool current = apartment_.listingIsCurrent;
+  apartment_.ForgetListing();
   PrepareUserFolder(apartment_);
-  return ListAccount();
+  if (!ListAccount()) return false;
+  // Set before the page pumps messages: what forgets the listing meanwhile is not to be undone.
+  apartment_.listLoaded = true;
+  apartment_.listingIsCurrent = current;
+  return true;
 }
 
 void ctrlThumbNailView::ChangeFileFilter(TextView szFileFilter) {
@@ -115,6 +120,10 @@ void ctrlThumbNailView::Show(const Text& filter) {
     if (!Passes(record->FileName)) continue;
     // A second file of the same address is not shown.
     ResultAsItStood(0, [&](int&) { shown.Add(record, record->FilePath); });
+  }
+  if (shown.PositionOf(selectedPath_) == 0) {
+    selectedPath_.clear();
+    keepSelection_ = false;
   }
   // The bar stands at 0 from here on, unless the user pages on while the page is being filled.
   SetScrollRange();
@@ -154,7 +163,7 @@ void ctrlThumbNailView::ShowPage(int first) {
 }
 
 void ctrlThumbNailView::FillPage(int first) {
-  firstIndex_ = first;
+  firstIndex_ = pageFirst_ = first;
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     page_.ClearSlot(slot);
     PathOf(slot).clear();
@@ -167,11 +176,11 @@ void ctrlThumbNailView::FillPage(int first) {
     iImgNo = 0;
     return;
   }
-  if (scrolledBack_) {
-    // The page that was there must not shine through while this one is fetched.
+  // The page that was there must not shine through while this one is fetched.
+  if (scrolledBack_)
     for (int slot = 1; slot <= kSlotCount; ++slot) page_.ShowSlot(slot, false);
-    UpdateSelection();
-  }
+  // What looks selected meanwhile is on this page.
+  UpdateSelection();
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     // The list may change in any event of the fill.
     const int position = first + slot;
@@ -187,14 +196,21 @@ void ctrlThumbNailView::FillPage(int first) {
 }
 
 bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
-  const Text copy = LocalCopyOf(record.FilePath);
   FileSystem& files = apartment_.platform.files;
-  if (!copy.empty() && !FileExists(files, copy) && !Fetch(slot, record, copy)) return false;
+  Text copy = copies_.PathOf(record.FilePath);
+  // Once more when the file was changed in the account meanwhile; not when it was deleted.
+  for (int tries = 0; tries < 2 && copies_.IsDue(record); ++tries) {
+    const std::uint32_t changes = apartment_.ChangesOfCopy(copy);
+    if (!Fetch(slot, record, copy)) return false;
+    if (apartment_.ChangesOfCopy(copy) == changes || !apartment_.allFiles.Find(record.FilePath)) break;
+    copy = copies_.PathOf(record.FilePath);
+  }
   page_.SetCaption(slot, FormatLabelText(record.FileName));
   PathOf(slot) = record.FilePath;
-  // A picture that cannot be read leaves the caption and an empty square.
-  if (!copy.empty() && FileExists(files, copy))
-    ResultAsItStood(0, [&](int&) { ShowPicture(slot, copy, record.FileSize); });
+  // A picture that cannot be read leaves the caption and an empty square. It may be a file of another kind, or what came
+  // in place of the picture or of a part of it, for which the next page with it asks again.
+  if (!copy.empty() && FileExists(files, copy) && !ShowPicture(slot, copy))
+    copies_.RemoveUnless(copy, record.FileSize);
   page_.ShowSlot(slot, true);
   return true;
 }
@@ -210,20 +226,19 @@ bool ctrlThumbNailView::Fetch(int slot, const CUpload& record, const Text& copy)
     Raise(event::kBusy, u"1");
     if (IsReplaced()) return false;
   }
+  // A stop is meant for the whole page.
+  if (IsStopped()) return true;
   page_.SetCaption(slot, u"Downloading " + ReplaceAll(record.FileName, u"&", u"&&"));
   Download(Text(record.FilePath), {}, copy, [this] { return IsReplaced(); });
   return !IsReplaced();
 }
 
-void ctrlThumbNailView::ShowPicture(int slot, const Text& copy, double fileSize) {
-  header_.ReadImageInfo(copy);
-  if (header_.ImageType() != kImageUnknown &&
-      page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width())))
-    return;
-  // A file of another kind, or what came in place of the picture or of a part of it; then the next page with
-  // it asks again.
-  FileSystem& files = apartment_.platform.files;
-  if (static_cast<double>(files.Length(copy)) != fileSize) files.Remove(copy);
+bool ctrlThumbNailView::ShowPicture(int slot, const Text& copy) {
+  return ResultAsItStood(false, [&](bool& shown) {
+    header_.ReadImageInfo(copy);
+    shown = header_.ImageType() != kImageUnknown &&
+            page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width()));
+  });
 }
 
 void ctrlThumbNailView::TransferEnded() {

@@ -66,7 +66,8 @@ class ctrlThumbNailView final : public FileControl {
   std::shared_ptr<CUpload> SelectedRecord() const override;
   bool ShowsFile(TextView name) const override;
   void ShowUploaded(const std::shared_ptr<CUpload>& record) override;
-  void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldName, const Text& newName) override;
+  void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl, const Text& oldName,
+                   const Text& newName) override;
   void TransferEnded() override;
   void DroppedNoFiles(bool own) override;
   bool StopsDrop() override;
@@ -85,16 +86,19 @@ class ctrlThumbNailView final : public FileControl {
   // False when the page is not wanted any more.
   bool FillSlot(int slot, const CUpload& record);
   bool Fetch(int slot, const CUpload& record, const Text& copy);
-  // `fileSize` is what the listing says.
-  void ShowPicture(int slot, const Text& copy, double fileSize);
+  bool ShowPicture(int slot, const Text& copy);
   bool IsReplaced() const { return nextPage_.has_value() || IsClosed(); }
   void UpdateSelection();
+  // Gives the grid the focus, unless a name is edited in it.
+  void FocusGrid();
   // Shows the page with the item at that position, counted from 1, and selects it.
   void ShowItem(std::size_t position);
   // Shows the page that begins at `first`, or the last one, and selects an item, its first one without one.
   void ShowFrom(int first, std::optional<std::size_t> position);
 
   Text& PathOf(int slot) { return paths_[static_cast<std::size_t>(slot - 1)]; }
+  // Address of the picture that a slot shows or waits for; empty when there is none.
+  Text AddressIn(int slot);
   // 0 when the picture is not on the page.
   int SlotOf(TextView path) const;
   void RaiseSelection();
@@ -109,6 +113,8 @@ class ctrlThumbNailView final : public FileControl {
   // Address of the selected picture.
   Text selectedPath_;
   int firstIndex_ = 0;
+  // Of the page that is shown or being filled; firstIndex_ is 0 already while the thumb is dragged to the top.
+  int pageFirst_ = 0;
   int selectionFirstIndex_ = 0;
   int previousScroll_ = 0;
   bool scrolledBack_ = false;
@@ -120,8 +126,13 @@ class ctrlThumbNailView final : public FileControl {
   std::optional<int> nextPage_;
   // A page could not fetch its pictures because of a transfer of the host's.
   bool fillIsOwed_ = false;
-  // From the first download of a page to the end of its filling.
-  std::optional<RunningTransfer> busy_;
+  // From the first download of a page to the end of its filling; its outcome is that of the downloads.
+  struct Fetching {
+    explicit Fetching(FileControl& control) : operation(control), transfer(control) {}
+    Operation operation;
+    RunningTransfer transfer;
+  };
+  std::optional<Fetching> busy_;
 
   bool deleteRuns_ = false;
   // The name that the editor started from; empty while it is hidden.

@@ -54,8 +54,21 @@ void ctrlThumbNailView::UpdateSelection() {
     if (selected == 0 && !shown.IsEmpty()) selected = 1;
     for (int slot = 1; slot <= kSlotCount; ++slot) page_.SetSelected(slot, slot == selected);
     iImgNo = static_cast<std::int16_t>(selected);
-    if (!apartment_.allFiles.IsEmpty()) page_.Focus();
+    // A page that is filled takes the focus from nobody.
+    if (page_.HasFocus()) FocusGrid();
   });
+}
+
+void ctrlThumbNailView::FocusGrid() {
+  if (!apartment_.allFiles.IsEmpty() && editedName_.empty()) page_.Focus();
+}
+
+Text ctrlThumbNailView::AddressIn(int slot) {
+  Text& path = PathOf(slot);
+  const auto position = static_cast<std::size_t>(pageFirst_ + slot);
+  if (path.empty() && position <= apartment_.shownFiles.Count())
+    path = apartment_.shownFiles.At(position)->FilePath;
+  return path;
 }
 
 int ctrlThumbNailView::SlotOf(TextView path) const {
@@ -92,7 +105,6 @@ void ctrlThumbNailView::RaiseSelection() {
 
 void ctrlThumbNailView::ShowUploaded(const std::shared_ptr<CUpload>& record) {
   FileList& shown = apartment_.shownFiles;
-  keepSelection_ = true;
   std::size_t position = Find(shown, [&](const CUpload& file) { return &file == record.get(); });
   if (position != 0) {
     SetAddress(shown, position, record->FilePath);
@@ -101,18 +113,25 @@ void ctrlThumbNailView::ShowUploaded(const std::shared_ptr<CUpload>& record) {
     shown.Add(record, record->FilePath);
     position = shown.Count();
   }
-  if (position != 0) ShowItem(position);
+  if (position == 0) return;
+  keepSelection_ = true;
+  ShowItem(position);
 }
 
 void ctrlThumbNailView::DeleteFile() {
   ResultAsItStood(0, [&](int&) {
     if (deleteRuns_) return;
+    const Operation operation(*this);
     const Hourglass pointer(*this);
-    const std::shared_ptr<CFileUpload> client = mobjFileupload;
+    const std::shared_ptr<CFileUpload> client = Client();
     if (!client) return;
-    if (!CFileUpload::CanDeleteFile()) return Raise(event::kNotAllowed);
+    if (!CFileUpload::CanDeleteFile()) {
+      Fail(ftp_error::kNotAllowed, u"The account may not delete files.");
+      return Raise(event::kNotAllowed);
+    }
     const std::shared_ptr<CUpload> record = SelectedRecord();
-    if (!record || ShowsOtherAccount()) return Raise(event::kNotSelected);
+    if (!record) Fail(ftp_error::kUnavailable, u"No file is selected.");
+    if (!record || !MayChangeShown()) return Raise(event::kNotSelected);
     deleteRuns_ = true;
     const bool deleted = ResultAsItStood(false, [&](bool& gone) {
       gone = DeleteOnServer(*client, *record);
@@ -134,20 +153,22 @@ void ctrlThumbNailView::DeleteFile() {
   });
 }
 
-void ctrlThumbNailView::ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldName,
-                                    const Text& newName) {
+void ctrlThumbNailView::ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl,
+                                    const Text& oldName, const Text& newName) {
   FileList& shown = apartment_.shownFiles;
   const std::size_t position =
       Find(shown, [&](const CUpload& file) { return &file == record.get() || file.FileName == oldName; });
   if (position == 0) return;
   const std::shared_ptr<CUpload> renamed = shown.At(position);
+  // A record of an older listing is not in the list of all files.
+  const Text before = renamed == record ? oldUrl : renamed->FilePath;
   if (renamed != record) {
     GiveName(*renamed, newName);
     SetAddress(shown, position, renamed->FilePath);
   }
-  if (FileNameFromUrl(selectedPath_) == oldName) selectedPath_ = renamed->FilePath;
+  if (selectedPath_ == before) selectedPath_ = renamed->FilePath;
   for (int slot = 1; slot <= kSlotCount; ++slot) {
-    if (FileNameFromUrl(PathOf(slot)) != oldName) continue;
+    if (PathOf(slot) != before) continue;
     PathOf(slot) = renamed->FilePath;
     page_.SetCaption(slot, FormatLabelText(newName));
   }
@@ -166,20 +187,26 @@ void ctrlThumbNailView::ValidateFileName(Text& NewString) {
 
 void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
   ResultAsItStood(0, [&](int&) {
+    const Operation operation(*this);
     const auto keepName = [&](std::int16_t code) {
       SetLabelText(oldName);
       Raise(code);
     };
     NewString = Text(Trim(NewString));
-    if (BeginsUnfit(NewString)) return keepName(event::kNameUnfit);
-    // Nothing is selected, so there is nothing to rename.
-    if (oldName.empty() || ShowsOtherAccount()) return Raise(event::kRenameFailed);
+    if (BeginsUnfit(NewString)) {
+      Fail(ftp_error::kNameNotAllowed, u"The file's name is not allowed.");
+      return keepName(event::kNameUnfit);
+    }
+    if (oldName.empty()) Fail(ftp_error::kUnavailable, u"No file is selected.");
+    if (oldName.empty() || !MayChangeShown()) return Raise(event::kRenameFailed);
     CheckFileExtension(NewString, ExtensionOf(oldName));
     // The caption may show what was typed, such as the name without its extension.
     if (NewString == oldName) return keepName(event::kRenamed);
     if (Find(apartment_.shownFiles,
-             [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), NewString); }) != 0)
+             [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), NewString); }) != 0) {
+      Fail(ftp_error::kNameNotAllowed, u"The account has a file of that name.");
       return keepName(event::kNameTaken);
+    }
     const Hourglass pointer(*this);
     if (!Rename(oldName, NewString)) return keepName(event::kRenameFailed);
     Raise(event::kRenamed);
@@ -189,10 +216,13 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
 // --- What the user does ---
 
 void ctrlThumbNailView::OnSlotPressed(int slot, bool rightButton) {
+  const Text pressed = AddressIn(slot);
+  if (pressed.empty()) return OnBackgroundPressed(rightButton);
   keepSelection_ = false;
   selectionFirstIndex_ = firstIndex_;
-  selectedPath_ = PathOf(slot);
+  selectedPath_ = pressed;
   UpdateSelection();
+  FocusGrid();
   RaiseSelection();
   if (rightButton) Raise(event::kContextMenu, Text(selectedPath_));
 }
@@ -238,7 +268,7 @@ void ctrlThumbNailView::OnEditorEntered() {
   Text name = page_.EditorText();
   // Hiding the editor takes the focus from it, which would end the editing.
   const Text oldName = std::exchange(editedName_, Text());
-  const bool valid = IsFileNameValid(name);
+  const bool valid = IsEditedNameValid(name);
   SetLabelText(valid ? name : oldName);
   page_.HideEditor();
   page_.Focus();
