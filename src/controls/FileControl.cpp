@@ -202,7 +202,8 @@ Text FileControl::SendAndRegister(CFileUpload& client, const Text& path) {
   const AccountKey account = apartment_.session.Account();
   uploadTimedOut_ = false;
   Text url;
-  // What is on the server is registered, whatever the host made of the control meanwhile, but not with another user.
+  // What is on the server is registered, whatever the host made of the control meanwhile, but not with
+  // another user.
   if (SendFile(client, path)) {
     if (apartment_.session.Account() == account) {
       url = client.SaveUploadFile(path);
@@ -304,8 +305,8 @@ bool FileControl::IsTooLarge(CFileUpload& client, const Text& path) const {
     const auto used = client.GetTotalUsedQuota(product, session.userName);
     const double size = static_cast<double>(apartment_.platform.files.Length(path));
     // The file takes the place of its old bytes.
-    large = used && *used + size - (same ? same->FileSize : 0) >
-                        client.GetMaxQuota(product, session.userName);
+    large =
+        used && *used + size - (same ? same->FileSize : 0) > client.GetMaxQuota(product, session.userName);
   });
 }
 

@@ -65,8 +65,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
 
   // The service client; may be null.
   std::shared_ptr<CFileUpload> mobjFileupload;
-  // An FtpErrors value and its text, of the operation that ended last: an upload, a download, a delete, a rename, a
-  // listing, or the fetching of a page's pictures. Inside an operation it tells how that stands.
+  // An FtpErrors value and its text, of the operation that ended last: an upload, a download, a delete, a
+  // rename, a listing, or the fetching of a page's pictures. Inside an operation it tells how that stands.
   std::int32_t m_LastError = 0;
   Text m_strLastErrorDesc;
   // A transfer runs. What a host writes here does not stop it.
@@ -74,8 +74,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Bytes of the transfer that runs or ran last.
   std::int32_t m_lDownloadedBytes = 0;
   std::int32_t m_lUploadedBytes = 0;
-  // Ends the wait of a download, or keeps the next one from beginning; either clears it. An upload that is silent
-  // for too long sets it until its own end.
+  // Ends the wait of a download, or keeps the next one from beginning; either clears it. An upload that is
+  // silent for too long sets it until its own end.
   bool gbConnectionFailed = false;
   bool bRenameEnabled = false;
   // The control stores these for the host and does nothing with them.
@@ -137,8 +137,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool EnableRename(bool bEnableRename);
   void OLEDrag() { controlView_.StartDrag(); }
 
-  // Ends the transfer that runs, at once where it waits: a download leaves no file, an upload whose last byte has not
-  // left puts none on the server.
+  // Ends the transfer that runs, at once where it waits: a download leaves no file, an upload whose last byte
+  // has not left puts none on the server.
   void EndTransfer() { ++closings_; }
   // The same, and no transfer starts until Open. For a control that its container lets go of while one runs.
   void Close();
@@ -177,8 +177,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Has a service client of its own from the start.
   FileControl(const ControlParts& parts, ControlView& view, TransferEvents transferEvents);
 
-  // An operation keeps its outcome, which m_LastError tells when it ends, whatever ran inside it. The other two mark
-  // a transfer as running, and show the hourglass, as long as they live.
+  // An operation keeps its outcome, which m_LastError tells when it ends, whatever ran inside it. The other
+  // two mark a transfer as running, and show the hourglass, as long as they live.
   class Operation;
   class RunningTransfer;
   class Hourglass;
@@ -190,8 +190,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   virtual bool ShowsFile(TextView name) const = 0;
   // The record is new in the list of all files, or, when an upload replaced a file, has new values.
   virtual void ShowUploaded(const std::shared_ptr<CUpload>& record) = 0;
-  // The file has another name now, also in the list of all files, where `record` is it and `oldUrl` was its address
-  // (null and empty when it is not there).
+  // The file has another name now, also in the list of all files, where `record` is it and `oldUrl` was its
+  // address (null and empty when it is not there).
   virtual void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl, const Text& oldName,
                            const Text& newName) = 0;
   // A drop without files, or of the control's own drag (`own`).
@@ -222,7 +222,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool MayTransfer();
   // The client; null, with the reason noted, when there is none.
   std::shared_ptr<CFileUpload> Client();
-  // Whether what is shown may be changed; else, when another user has been logged on since, the reason is noted.
+  // Whether what is shown may be changed; else, when another user has been logged on since, the reason is
+  // noted.
   bool MayChangeShown();
   // Adds the account's files to the list of all files; false, with that list empty, when the service did not
   // tell them all or there is no client.
@@ -232,8 +233,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Whether another user has been logged on since: what is shown must not be changed in his account.
   bool ShowsOtherAccount() const { return apartment_.session.Account() != shownAccount_; }
   // Fetches `url` into the user's folder, and to `explicitTarget` first unless that is empty. Waits, pumping,
-  // for its end or until `stop` says so. Whether the file is at `expected` then; else the reason is noted, unless `stop`
-  // was it.
+  // for its end or until `stop` says so. Whether the file is at `expected` then; else the reason is noted,
+  // unless `stop` was it.
   bool Download(const Text& url, const Text& explicitTarget, const Text& expected,
                 const std::function<bool()>& stop);
   // Deletes a file by its page and the service, and its local copy. Whether the service took it out.
@@ -279,8 +280,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Sends and registers the file; its address, empty on failure.
   Text SendAndRegister(CFileUpload& client, const Text& path);
   bool SendFile(CFileUpload& client, const Text& path);
-  // Note why: the upload component failed with that number; so did a page, which was asked to give a file that name; in
-  // these words, with the number behind them.
+  // Note why: the upload component failed with that number; so did a page, which was asked to give a file
+  // that name; in these words, with the number behind them.
   void FailUpload(CFileUpload& client, const Text& path, std::int32_t number);
   void FailPage(TextView name, std::int32_t number);
   void FailWith(std::int32_t ftpError, TextView words, std::int32_t number);

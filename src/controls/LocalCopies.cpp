@@ -72,8 +72,8 @@ void LocalCopies::FinishUpload(const Text& path, const Text& url) {
     // Also under another spelling of its name: what the user sent is never removed.
     if (files.SameFile(copy, path)) return;
     const bool finished = writer && copy == writerPath_ && ResultAsItStood(false, [&](bool& done) {
-                            // Some file systems write a file out before it may replace another, which takes as long as
-                            // the upload.
+                            // Some file systems write a file out before it may replace another, which takes
+                            // as long as the upload.
                             RemoveFile(copy);
                             writer->Commit();
                             done = true;

@@ -1,5 +1,5 @@
-// The copies of the account's files in the user's folder: what was shown, fetched or uploaded. All controls of an
-// apartment use the same ones.
+// The copies of the account's files in the user's folder: what was shown, fetched or uploaded. All controls
+// of an apartment use the same ones.
 //
 // Nothing throws: a copy is a convenience, and what cannot be kept is fetched again.
 #pragma once
@@ -23,8 +23,8 @@ class LocalCopies {
   // Where the copy of the file at `url` is or would be; empty when there cannot be one.
   Text PathOf(TextView url) const;
 
-  // Whether the file is to be fetched: there is no copy, or one of another length than the listing tells, for which
-  // this is true once in each listing.
+  // Whether the file is to be fetched: there is no copy, or one of another length than the listing tells, for
+  // which this is true once in each listing.
   bool IsDue(const CUpload& file);
 
   // Takes out what came in place of a file, which its length tells.

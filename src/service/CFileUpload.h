@@ -55,8 +55,8 @@ class CFileUpload {
   // Sets the apartment's server name ("host" or "host:port") and asks whether the service is there.
   bool ConnectToServer(TextView szServer);
 
-  // Logs the user on and forgets the previous listing. Whenever the result is false, the previous user name and
-  // password stand again and the listing stays; the MGUID and the product number keep their new values.
+  // Logs the user on and forgets the previous listing. Whenever the result is false, the previous user name
+  // and password stand again and the listing stays; the MGUID and the product number keep their new values.
   bool LogonAs(TextView ProductID, TextView Username, TextView Password, TextView MGUID);
 
   // Opens the FTP connection (no service request but for the folder's path) and goes to the user's folder.
@@ -89,8 +89,8 @@ class CFileUpload {
   static bool GetFileDetails() { return false; }
 
   // Register the file `szFilePath`, whose bytes went to the server through its acceptor page, and return its
-  // web address. The file's attributes are cleared meanwhile, where that is allowed, and stand again afterwards. UploadFile takes the
-  // name after the last "/", SaveUploadFile the one after the last "\".
+  // web address. The file's attributes are cleared meanwhile, where that is allowed, and stand again
+  // afterwards. UploadFile takes the name after the last "/", SaveUploadFile the one after the last "\".
   Text UploadFile(TextView szFilePath);
   Text SaveUploadFile(TextView szFilePath);
 

@@ -7,8 +7,8 @@
 namespace tarnwick {
 namespace {
 
-// Makes a file a normal one as long as the object lives. Where that is not allowed, as on a medium that cannot be
-// written, the file stays as it is.
+// Makes a file a normal one as long as the object lives. Where that is not allowed, as on a medium that
+// cannot be written, the file stays as it is.
 class NormalAttributes {
  public:
   NormalAttributes(FileSystem& files, TextView path)

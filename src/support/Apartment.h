@@ -19,8 +19,8 @@ namespace tarnwick {
 
 using FileList = KeyedList<std::shared_ptr<CUpload>>;
 
-// One user's account at one server. What began for one account must not go on in another. The product number does
-// not count: a refused log-on changes it, and the user stays the same.
+// One user's account at one server. What began for one account must not go on in another. The product number
+// does not count: a refused log-on changes it, and the user stays the same.
 struct AccountKey {
   Text serverName;
   Text userName;
@@ -87,16 +87,16 @@ struct Apartment {
   Text shownFilter = u"*";
   bool listingIsCurrent = false;
   bool listLoaded = false;
-  // Empties the list of all files. Nobody may take what comes into it afterwards, such as one uploaded file, for the
-  // whole account, so both flags go in the same step.
+  // Empties the list of all files. Nobody may take what comes into it afterwards, such as one uploaded file,
+  // for the whole account, so both flags go in the same step.
   void ForgetListing() {
     allFiles.Clear();
     listingIsCurrent = listLoaded = false;
     copiesAskedAgain.clear();
   }
 
-  // How often a local copy was made, moved or removed for an upload, a rename or a delete, by its path in lower case.
-  // Bytes that were asked for before such a change are not the file's any more.
+  // How often a local copy was made, moved or removed for an upload, a rename or a delete, by its path in
+  // lower case. Bytes that were asked for before such a change are not the file's any more.
   std::map<Text, std::uint32_t> copyChanges;
   std::uint32_t ChangesOfCopy(TextView path) const {
     const auto changes = copyChanges.find(LowerCase(path));

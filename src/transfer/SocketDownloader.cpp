@@ -33,8 +33,8 @@ std::int32_t NumberOf(std::string_view line) {
 
 }  // namespace
 
-std::optional<DownloadFailure> MakeDownloadPlan(TextView url, TextView folder, TextView proxyHost, TextView proxyPort,
-                                                DownloadPlan& plan) {
+std::optional<DownloadFailure> MakeDownloadPlan(TextView url, TextView folder, TextView proxyHost,
+                                                TextView proxyPort, DownloadPlan& plan) {
   const TextView fileName = FileNameFromUrl(url);
   const TextView rest = url.starts_with(kScheme) ? url.substr(kScheme.size()) : url;
   const auto address = SplitHttpAddress(rest);
@@ -66,7 +66,8 @@ void SocketDownloader::StartDownload(TextView url, TextView folder, TextView exp
   running_ = true;
   actions_.RestartWatchdog();
   explicitTarget_ = explicitTarget;
-  if (const auto failure = MakeDownloadPlan(url, folder, proxyHost, proxyPort, plan_)) return Fail(*failure, true);
+  if (const auto failure = MakeDownloadPlan(url, folder, proxyHost, proxyPort, plan_))
+    return Fail(*failure, true);
   actions_.Connect(plan_.host, plan_.port);
 }
 
@@ -80,7 +81,8 @@ void SocketDownloader::Cancel() {
 
 void SocketDownloader::OnConnected() {
   if (!running_) return;
-  actions_.Send("GET " + TargetBytes(plan_.requestTarget) + " HTTP/1.1\r\nHost: " + Utf8FromText(plan_.hostLine) +
+  actions_.Send("GET " + TargetBytes(plan_.requestTarget) +
+                " HTTP/1.1\r\nHost: " + Utf8FromText(plan_.hostLine) +
                 "\r\nConnection: close\r\nAccept: */*\r\n"
                 "User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n\r\n");
 }

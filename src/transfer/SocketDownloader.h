@@ -52,8 +52,8 @@ class DownloadActions {
   virtual void CloseSocket() = 0;
   virtual void RestartWatchdog() = 0;
   virtual void StopWatchdog() = 0;
-  // Writes the bytes to `explicitPath`, unless that is empty, and to `path`, over what is there. Whether the first of
-  // them is there now.
+  // Writes the bytes to `explicitPath`, unless that is empty, and to `path`, over what is there. Whether the
+  // first of them is there now.
   virtual bool WriteFile(TextView path, TextView explicitPath, std::string_view bytes) = 0;
 
   virtual void Received(std::int32_t bytes) = 0;
@@ -73,11 +73,11 @@ struct DownloadPlan {
   Text file;
 };
 
-// The plan for fetching `url` ("http://host[:port]/path", or without the scheme) into `folder` under the last part of
-// the address, through the proxy unless its host is empty. Returns what stands against it: an address or name that
-// could do harm, a folder that is empty, a proxy without a usable port.
-std::optional<DownloadFailure> MakeDownloadPlan(TextView url, TextView folder, TextView proxyHost, TextView proxyPort,
-                                                DownloadPlan& plan);
+// The plan for fetching `url` ("http://host[:port]/path", or without the scheme) into `folder` under the last
+// part of the address, through the proxy unless its host is empty. Returns what stands against it: an address
+// or name that could do harm, a folder that is empty, a proxy without a usable port.
+std::optional<DownloadFailure> MakeDownloadPlan(TextView url, TextView folder, TextView proxyHost,
+                                                TextView proxyPort, DownloadPlan& plan);
 
 class SocketDownloader {
  public:

@@ -47,12 +47,13 @@ class DownloadEvents {
   virtual void HeaderFound(TextView statusLine, std::int32_t bytes) = 0;
   // Bytes so far.
   virtual void Received(std::int32_t bytes) = 0;
-  // Closed by the peer, and the file writer has run. `written`: the explicit target is there, or, without one, the file
-  // in the user's folder.
+  // Closed by the peer, and the file writer has run. `written`: the explicit target is there, or, without
+  // one, the file in the user's folder.
   virtual void Finished(bool written) = 0;
   // 5555 is due when `told`; a watchdog that ran out says nothing.
   virtual void Failed(std::int32_t ftpError, TextView description, bool told) = 0;
-  // Whether the download is to go on. One that is not wanted any more is cancelled before it does anything else.
+  // Whether the download is to go on. One that is not wanted any more is cancelled before it does anything
+  // else.
   virtual bool IsWanted() const = 0;
 };
 

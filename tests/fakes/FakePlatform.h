@@ -45,12 +45,15 @@ struct FakeHttp : HttpTransport {
     answers.pop_front();
     return answer;
   }
-  // Takes the whole body at once and is answered like any post.
+  // Takes the whole body at once, but for its last byte, and is answered like any post.
   std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source,
                                        std::size_t maxBodyBytes) override {
     source.Sent(0);
+    if (!source.IsWanted()) return std::nullopt;
     std::string body(static_cast<std::size_t>(source.Length()), '\0');
     body.resize(source.Read(body));
+    source.Sent(body.size() - 1);
+    if (!source.IsWanted()) return std::nullopt;
     source.Sent(body.size());
     HttpPost whole = post;
     whole.body = body;
@@ -119,6 +122,8 @@ struct FakeFiles : FileSystem {
   std::map<Text, std::int32_t> readErrors;
   // Room on the disk for each written file.
   std::size_t mostWritten = SIZE_MAX;
+  // Whether attributes can be changed.
+  bool writable = true;
   std::vector<std::uint32_t> attributesSet;
   Text temp = u"C:\\Temp\\";
 
@@ -134,6 +139,7 @@ struct FakeFiles : FileSystem {
   }
   std::uint32_t Attributes(TextView path) override { return At(path).attributes; }
   void SetAttributes(TextView path, std::uint32_t attributes) override {
+    if (!writable) throw RuntimeError(error::kPathAccess);
     At(path).attributes = attributes;
     attributesSet.push_back(attributes);
   }

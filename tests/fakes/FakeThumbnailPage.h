@@ -83,7 +83,9 @@ struct FakeThumbnailPage : ThumbnailPage {
   Text EditorText() const override { return edited; }
   bool hasFocus = true;
   bool HasFocus() const override { return hasFocus; }
-  void Focus() override {}
+  // How often it was given the focus.
+  int focused = 0;
+  void Focus() override { ++focused; }
   void SetHourglass(bool) override {}
   void StartDrag() override { log.emplace_back("page drag"); }
 };

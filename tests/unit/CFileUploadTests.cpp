@@ -92,6 +92,10 @@ TEST_F(CFileUploadTest, LogonRenewsTheListing) {
   EXPECT_TRUE(client.ListFilesForUser(sink));
   EXPECT_EQ(Requests(), "ValidationRequest ListFilesRequest");
 
+  Answer("UserAuthenticationStatus=FALSE");
+  EXPECT_FALSE(client.LogonAs(u"9", u"second", u"other", u"{N}"));
+  EXPECT_TRUE(client.ListIsCurrent() && fake.apartment.listLoaded)
+      << "what is shown is still the first user's";
   ASSERT_TRUE(Logon(u"second"));
   EXPECT_TRUE(client.IsAccountEmpty());
   EXPECT_FALSE(fake.apartment.listingIsCurrent);
@@ -124,6 +128,13 @@ TEST_F(CFileUploadTest, RegistrationRestoresAttributesOnEveryWayOut) {
   EXPECT_EQ(record.FileSize, 12);
   EXPECT_EQ(client.SaveUploadFile(u"C:\\missing.jpg"), u"");
   EXPECT_EQ(fake.http.sent.size(), 3U);
+  // On a medium that cannot be written the file is registered as it is, and nothing is restored.
+  fake.http.onPost = [&](const FakeHttp::Sent&) { fake.files.writable = true; };
+  fake.files.writable = false;
+  fake.files.attributesSet.clear();
+  Answer("FileURL=u");
+  EXPECT_EQ(client.SaveUploadFile(u"C:\\a.jpg"), u"u");
+  EXPECT_TRUE(fake.files.attributesSet.empty());
 }
 
 // --- Accounts ---

@@ -104,19 +104,139 @@ TEST_F(ListImageUpload, Outcomes) {
     EXPECT_EQ(log.back(), "view pointer");
     EXPECT_FALSE(control.m_bTransferInProgress);
   }
-  // What the watchdog tells is the reason, however the upload ends then.
+}
+
+// An upload as the component makes it, which ends when it is not wanted any more before the last byte.
+void StoppableUpload(UploadEvents& events) {
+  const auto goOn = [&] {
+    if (!events.IsWanted()) throw RuntimeError(acceptor::kUnspecified);
+  };
+  events.Connecting();
+  goOn();
+  events.UploadStarted();
+  goOn();
+  events.UploadProgress(50, 768);
+  goOn();
+  events.UploadComplete();
+}
+
+TEST_F(ListImageUpload, IsStoppedInAnyEventBeforeItsEnd) {
+  uploader.script = StoppableUpload;
+  const std::function<void()> kStops[] = {[&] { control.mobjFileupload->AbortFileTransfer(true); },
+                                          [&] { control.EndTransfer(); }};
+  for (const auto& stop : kStops) {
+    for (const char* event :
+         {"state 0", "state 2", "state 9", "9999 0", "uploaded 0", "9999 50", "uploaded 768"}) {
+      SCOPED_TRACE(event);
+      List({});
+      OnEvent(event, stop);
+      EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
+      EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+      EXPECT_EQ(Names() + Records(), "");
+      // The event is the last one.
+      const auto after = std::ranges::find(log, event) + 1;
+      EXPECT_EQ(std::count_if(after, log.end(),
+                              [](const std::string& line) {
+                                return line.starts_with("state") || line.starts_with("9999") ||
+                                       line.starts_with("uploaded") || line.starts_with("1015");
+                              }),
+                0);
+    }
+    for (const char* event : {"9999 100", "state 10"}) {
+      List({});
+      OnEvent(event, stop);
+      EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg")) << "the server has the file";
+      EXPECT_EQ(Names() + Records(), "new.jpg,new.jpg,");
+      EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
+    }
+  }
+  // A stop is meant for what runs, and a flag that is stored without one ends nothing.
+  List({});
+  OnEvent("9999 50", [&] { control.mobjFileupload->AbortFileTransfer(false); });
+  control.mobjFileupload->AbortFileTransfer(true);
+  EXPECT_TRUE(fake.apartment.abortTransfer);
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+}
+
+TEST_F(ListImageUpload, TellsWhyItFailed) {
+  List({{"NEW.jpg", "100"}});
+  fake.files.files[u"C:\\a.jpg"] = {50, 0};
+  fake.files.folders.emplace_back(u"C:\\folder");
+  replies["GetTotalUsedQuota"] = "UsedQuota=900";
+  const auto fails = [&](TextView path, std::int32_t error) {
+    uploader.error = error;
+    // The double reads the file before it fails.
+    if (error != 53) fake.files.files.try_emplace(Text(path));
+    EXPECT_FALSE(control.UploadImage(path));
+    return std::to_string(control.m_LastError) + " " + Utf8FromText(control.m_strLastErrorDesc);
+  };
+  const struct {
+    TextView path;
+    std::int32_t error;
+    const char* quota;
+    const char* reason;
+  } kCases[] = {
+      {u"C:\\folder", 53, "", "54 This is a folder, not a file. (53)"},
+      {u"C:\\missing.jpg", 53, "", "54 The file was not found. (53)"},
+      {u"C:\\locked.jpg", 75, "", "54 The file could not be read. (75)"},
+      {u"C:\\new.jpg", -2147220881, "1000", "57 The account has a file of that name. (-2147220881)"},
+      {u"C:\\a#.jpg", -2147220881, "1000", "57 The file's name is not allowed. (-2147220881)"},
+      {u"C:\\a.jpg", -2147220881, "949", "56 The account is full. (-2147220881)"},
+      {u"C:\\a.jpg", -2147220881, "950", "57 The file's name is not allowed. (-2147220881)"},
+      {u"C:\\NEW.jpg", -2147220881, "800", "57 The account has a file of that name. (-2147220881)"},
+      {u"C:\\a.jpg", -2147220878, "", "52 The server refused the user name or the password. (-2147220878)"},
+      {u"C:\\a.jpg", -2147220840, "", "54 The account has no folder on the server. (-2147220840)"},
+      {u"C:\\a.jpg", -2147467259, "",
+       "43 The connection was lost, or the server gave no usable answer. (-2147467259)"},
+      {u"C:\\a.jpg", 7, "", "44 The server refused. (7)"},
+  };
+  uploader.script = nullptr;
+  for (const auto& test : kCases) {
+    replies["GetMaxQuota"] = std::string("MaxUserQuota=") + test.quota;
+    EXPECT_EQ(fails(test.path, test.error), test.reason);
+  }
+  uploader.error = 0;
+  for (const auto& [answer, error] : {std::pair{"1002", 56}, {"1004", 53}}) {
+    replies["CanUploadFile"] = std::string("CanUploadFile=") + answer;
+    // The host may look in the event.
+    host.onEvent = [&, error = error](const std::string&) { EXPECT_EQ(control.m_LastError, error); };
+    EXPECT_FALSE(control.UploadImage(u"C:\\a.jpg"));
+    EXPECT_EQ(control.m_LastError, error);
+  }
+  host.onEvent = nullptr;
+  control.mobjFileupload.reset();
+  EXPECT_FALSE(control.UploadImage(u"C:\\a.jpg"));
+  EXPECT_EQ(control.m_LastError, ftp_error::kNoClient);
+  control.Close();
+  EXPECT_FALSE(control.UploadImage(u"C:\\a.jpg"));
+  EXPECT_EQ(control.m_strLastErrorDesc, u"The control was closed.");
+}
+
+TEST_F(ListImageUpload, WatchdogOfAnUploadEndsWithIt) {
+  const auto silence = [this] { downloader.events->Failed(ftp_error::kTimeout, u"silent", false); };
+  // What it tells is the reason, however the upload fails then.
   for (const bool throws : {false, true}) {
+    List({});
     uploader.script = [&](UploadEvents&) {
-      downloader.events->Failed(ftp_error::kTimeout, u"", false);
+      silence();
+      EXPECT_TRUE(control.gbConnectionFailed);
       if (throws) throw RuntimeError(acceptor::kUnspecified);
     };
     EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
     EXPECT_EQ(control.m_LastError, ftp_error::kTimeout);
+    EXPECT_FALSE(control.gbConnectionFailed) << "the next download is another matter";
   }
-  // A second transfer that was refused meanwhile is not.
-  uploader.script = [&](UploadEvents&) { control.UploadImage(u"C:\\other.jpg"); };
-  EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
-  EXPECT_EQ(control.m_LastError, ftp_error::kNotTaken);
+  // Not of one that succeeds after all, nor does what the host sets go with it.
+  uploader.script = [&](UploadEvents& events) {
+    silence();
+    Upload(events);
+  };
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
+  uploader.script = Upload;
+  control.gbConnectionFailed = true;
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_TRUE(control.gbConnectionFailed);
 }
 
 TEST_F(ListImageUpload, NeedsNoListingToBeTakenBack) {
@@ -181,10 +301,20 @@ TEST_F(ListImageUpload, LocalCopyHasTheBytesThatWereSent) {
     control.UploadImage(u"C:\\new.jpg");
     EXPECT_EQ(fake.files.files[test.copy].bytes, test.bytes);
   }
-  // A file that is already where its copy would be stays the one it is.
+  // A file that is already where its copy would be stays the one it is, however its name is spelled.
   uploader.error = 0;
-  EXPECT_TRUE(control.UploadImage(copy));
-  EXPECT_EQ(fake.files.files[copy].bytes, "old");
+  const Text other = u"C:\\TEMP~1\\NEW.jpg";
+  replies["FileUploadRequest"] = "FileURL=http://h/u/new.jpg";
+  fake.files.spellings[other] = copy;
+  for (const Text& path : {copy, other}) {
+    fake.files.files[copy] = {3, 0, "old"};
+    fake.files.files[other] = {3, 0, "old"};
+    for (const char* address : {"FileURL=http://h/u/new.jpg", "FileURL="}) {
+      replies["FileUploadRequest"] = address;
+      control.UploadImage(path);
+      EXPECT_EQ(fake.files.files[copy].bytes, "old");
+    }
+  }
 }
 
 TEST_F(ListImageUpload, FilterHidesWhatItWouldHide) {
@@ -320,7 +450,7 @@ TEST_F(ListImageTest, DeleteOutcomes) {
     EXPECT_EQ(std::exchange(control.m_LastError, 0), ftp_error::kNotTaken);
   }
 
-  // A listing that fails afterwards is told by the list alone.
+  // A listing that fails afterwards leaves a list without items, which is not shown as an empty account.
   replies["DeleteFileRequest"] = "DeleteStatus=TRUE";
   List({{"a.jpg", "1"}, {"b.jpg", "1"}});
   view.Select(0, true);
@@ -328,6 +458,8 @@ TEST_F(ListImageTest, DeleteOutcomes) {
   control.DeleteFile();
   EXPECT_EQ(Events(), "1001 ,1015 http://h/u/a.jpg,1002 ,");
   EXPECT_EQ(Names(), "");
+  EXPECT_TRUE(view.listShown);
+  EXPECT_EQ(control.m_LastError, ftp_error::kNotTaken);
   EXPECT_FALSE(fake.apartment.listingIsCurrent);
   EXPECT_EQ(log.back(), "view pointer");
 }
@@ -362,6 +494,7 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
        "a.jpg,"},
       {"takes the client", [](ctrlListImage& list) { list.mobjFileupload.reset(); }, "a.jpg,"},
       {"closes", [](ctrlListImage& list) { list.Close(); }, "a.jpg,"},
+      {"stops", [](ctrlListImage& list) { list.mobjFileupload->AbortFileTransfer(true); }, "a.jpg,"},
       {"selects others",
        [this](ctrlListImage&) {
          view.selected = {true, false, false};

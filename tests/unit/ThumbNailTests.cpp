@@ -5,6 +5,7 @@
 
 #include "fakes/FakeThumbnailPage.h"
 #include "support/RuntimeError.h"
+#include "transfer/AcceptorPages.h"
 #include "unit/ControlFixture.h"
 
 namespace tarnwick {
@@ -153,7 +154,10 @@ TEST_F(ThumbNailTest, FiltersByTheEndOfTheName) {
 
 TEST_F(ThumbNailTest, ListsAgainAfterAFailure) {
   listingFails = true;
+  fake.apartment.listingIsCurrent = true;
   EXPECT_FALSE(control.Init(u"*"));
+  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_EQ(control.m_LastError, ftp_error::kNotTaken);
   EXPECT_EQ(page.Look(), "No pictures./Click here for it");
   listingFails = false;
   // Two files of one address: the half that was listed does not pass for the account.
@@ -170,12 +174,13 @@ TEST_F(ThumbNailTest, ListsAgainAfterAFailure) {
 
 TEST_F(ThumbNailTest, EndEmptiesTheListsOfAll) {
   ListNumbers(2);
+  fake.apartment.listingIsCurrent = true;
   {
     FakeThumbnailPage other(log);
     ctrlThumbNailView second(parts, other);
   }
   EXPECT_EQ(Records() + Shown(), "");
-  EXPECT_FALSE(fake.apartment.listLoaded);
+  EXPECT_FALSE(fake.apartment.listLoaded || fake.apartment.listingIsCurrent);
 }
 
 // --- Places and captions ---
@@ -239,22 +244,48 @@ TEST_F(ThumbNailTest, FetchesWhatIsMissing) {
 }
 
 TEST_F(ThumbNailTest, LeavesAnEmptySquareForWhatIsNoPicture) {
-  List("a.gif b.gif nul.gif");
-  fake.files.files[CopyOf("a.gif")].bytes = "<html>404</html>";
+  List("b.gif nul.gif");
   fake.files.files[CopyOf("b.gif")].bytes.replace(6, 4, 4, '\0');
   control.ChangeFileFilter(u"*");
-  EXPECT_EQ(page.Look(), "a.gif*! b.gif! nul.gif! ") << "the last name is not safe as a local one";
+  EXPECT_EQ(page.Look(), "b.gif*! nul.gif! ") << "the last name is not safe as a local one";
   EXPECT_EQ(Events(), "");
-  EXPECT_FALSE(HasCopy("a.gif")) << "an error page is not kept for a picture";
+  EXPECT_TRUE(HasCopy("b.gif")) << "its length is right: it is a file of another kind";
 
-  // Nor is a part of one, which its length tells from a picture of a kind that cannot be read.
-  List("c.gif d.gif");
-  page.decodes = false;
-  fake.apartment.allFiles.At(1)->FileSize = static_cast<double>(fake.files.files[CopyOf("c.gif")].length + 1);
-  fake.apartment.allFiles.At(2)->FileSize = static_cast<double>(fake.files.files[CopyOf("d.gif")].length);
-  control.ChangeFileFilter(u"*");
-  EXPECT_FALSE(HasCopy("c.gif"));
-  EXPECT_TRUE(HasCopy("d.gif"));
+  // What came in place of a picture, or of a part of it, is not kept: the next page with it asks again.
+  const std::string wrong[] = {"<html>404</html>", "\x89PNG", "GIF8"};
+  for (const std::string& part : wrong) {
+    List("a.gif");
+    fake.files.files.erase(CopyOf("a.gif"));
+    for (int i = 0; i < 2; ++i) {
+      downloader.waits = {[&](FakeDownloader& from) {
+        fake.files.files[CopyOf("a.gif")] = {part.size(), 0, part};
+        from.events->Finished(true);
+      }};
+      control.ChangeFileFilter(u"*");
+      EXPECT_TRUE(downloader.waits.empty());
+      EXPECT_EQ(page.Look(), "a.gif*! ");
+      EXPECT_FALSE(HasCopy("a.gif"));
+    }
+  }
+}
+
+TEST_F(ThumbNailTest, FetchesACopyOfAnotherLengthOnceInAListing) {
+  List("a.gif b.gif");
+  const auto isAsked = [this] {
+    log.clear();
+    downloader.waits = {[](FakeDownloader& from) { from.events->Failed(7, u"refused", true); }};
+    control.ChangeFileFilter(u"*");
+    return downloader.waits.empty();
+  };
+  const auto otherLength = [this] { fake.files.files[CopyOf("a.gif")] = {kGif.size() + 1, 0, kGif + "x"}; };
+  EXPECT_FALSE(isAsked());
+  otherLength();
+  EXPECT_TRUE(isAsked());
+  EXPECT_EQ(page.Look(), "a.gif* b.gif ") << "what cannot be fetched is shown as it is";
+  EXPECT_FALSE(isAsked());
+  List("a.gif b.gif");
+  otherLength();
+  EXPECT_TRUE(isAsked());
 }
 
 TEST_F(ThumbNailTest, PagingReplacesTheFill) {
@@ -333,7 +364,96 @@ TEST_F(ThumbNailTest, ClosingEndsTheWaitAndOpeningAllowsAnother) {
   EXPECT_EQ(page.Look(), "1.gif* 2.gif ");
 }
 
+TEST_F(ThumbNailTest, AStopEndsTheFetchingOfThePage) {
+  ListNumbers(4);
+  for (const char* name : {"1.gif", "2.gif", "3.gif"}) fake.files.files.erase(CopyOf(name));
+  downloader.waits = {Arrival(),
+                      [this](FakeDownloader&) { control.mobjFileupload->AbortFileTransfer(true); }};
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(page.Look(), "1.gif* 2.gif! 3.gif! 4.gif ");
+  EXPECT_EQ(Events(), "1234 1,9999 11,1234 -1,");
+  EXPECT_EQ(control.m_strLastErrorDesc, u"The transfer was stopped.");
+  downloader.waits = {Arrival(), Arrival()};
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
+  EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
+}
+
 // --- What the user does ---
+
+TEST_F(ThumbNailTest, APressTakesThePictureThatItsSlotWaitsFor) {
+  ListNumbers(9);
+  for (int i = 5; i <= 8; ++i) fake.files.files.erase(CopyOf(std::to_string(i) + ".gif"));
+  downloader.waits = {[this](FakeDownloader& from) {
+                        // While nothing is chosen, what looks selected is the first of this page.
+                        EXPECT_EQ(Selected(), AddressOf("5.gif"));
+                        EXPECT_TRUE(page.At(1).selected);
+                        // The thumb stands at the top for a moment.
+                        control.OnScrollDragged(0);
+                        control.OnSlotPressed(3, true);
+                        EXPECT_TRUE(page.At(3).selected);
+                        control.DeleteFile();
+                        Arrives(from);
+                      },
+                      Arrival(), Arrival(), Arrival()};
+  Scroll(4);
+  const std::string at = AddressOf("7.gif");
+  EXPECT_TRUE(Events().starts_with("1234 1,1022 ,1015 " + at + ",1016 " + at + ",1001 ,")) << Events();
+  EXPECT_EQ(Records(), "1.gif,2.gif,3.gif,4.gif,5.gif,6.gif,8.gif,9.gif,");
+}
+
+TEST_F(ThumbNailTest, SelectionIsOfTheListAndOfThePage) {
+  // A new list without the selected picture.
+  ListNumbers(4);
+  control.OnSlotPressed(2, false);
+  account.erase(account.begin() + 1);
+  fake.apartment.listLoaded = false;
+  EXPECT_TRUE(control.Init(u"*"));
+  EXPECT_EQ(Selected(), AddressOf("1.gif"));
+  EXPECT_EQ(page.Look(), "1.gif* 3.gif 4.gif ");
+  // A rename of another picture.
+  control.OnSlotPressed(2, false);
+  EXPECT_TRUE(control.RenameFile(u"4.gif", u"x.gif"));
+  EXPECT_EQ(page.Look(), "1.gif 3.gif* x.gif ");
+  EXPECT_EQ(Selected(), AddressOf("3.gif"));
+  // An upload that the filter hides is no reason to keep the selection while pages change.
+  ListNumbers(9);
+  control.ChangeFileFilter(u"gif");
+  uploader.script = Upload;
+  fake.files.files[u"C:\\new.jpg"] = {1, 0, "x"};
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  Scroll(4);
+  EXPECT_EQ(Selected(), AddressOf("5.gif"));
+}
+
+TEST_F(ThumbNailTest, AFillLeavesFocusAndEditorAlone) {
+  ListNumbers(5);
+  const auto focused = [this](const std::function<void()>& action) {
+    page.focused = 0;
+    action();
+    return page.focused > 0;
+  };
+  const auto filter = [this] { control.ChangeFileFilter(u"*"); };
+  EXPECT_TRUE(focused(filter));
+  page.hasFocus = false;
+  EXPECT_FALSE(focused(filter));
+  EXPECT_TRUE(focused([this] { control.Init(u"*"); }));
+  EXPECT_TRUE(focused([this] { control.OnSlotPressed(2, false); }));
+  page.hasFocus = true;
+  control.EnableRename(true);
+  fake.files.files.erase(CopyOf("2.gif"));
+  downloader.waits = {[this](FakeDownloader& from) {
+    control.OnKeyDown(113);
+    Arrives(from);
+  }};
+  EXPECT_FALSE(focused([&] {
+    page.hasFocus = false;
+    filter();
+    page.hasFocus = true;
+    control.OnScrollChanged(0);
+  })) << "which would end the editing";
+  EXPECT_EQ(page.editor, 1);
+}
 
 TEST_F(ThumbNailTest, KeysAndButtons) {
   ListNumbers(4);
@@ -451,17 +571,26 @@ TEST_F(ThumbNailTest, NamesThatAreRefusedOrTaken) {
     for (const std::string& line : log) EXPECT_EQ(line.find("page rename"), std::string::npos);
   }
   EXPECT_EQ(Validate("console.gif"), "1031 ,") << "begins like a device, but is none";
-  uploader.error = -2147220881;
-  EXPECT_EQ(Validate("x.gif"), "1033 ,");
+  for (const auto& [number, error] : {std::pair{-2147220881, ftp_error::kNameNotAllowed},
+                                      {-2147220880, ftp_error::kUnavailable},
+                                      {acceptor::kUnspecified, ftp_error::kConnectionLost}}) {
+    uploader.error = number;
+    EXPECT_EQ(Validate("x.gif"), "1033 ,");
+    EXPECT_EQ(control.m_LastError, error);
+  }
   EXPECT_EQ(page.Look(), "console.gif* 2.gif 3.gif ");
   uploader.error = 0;
+  EXPECT_EQ(Validate("3.gif"), "1032 ,");
+  EXPECT_EQ(control.m_strLastErrorDesc, u"The account has a file of that name.");
   replies["RenameFileRequest"] = "lRenameFileStatus=1033";
   EXPECT_EQ(Validate("x.gif"), "1033 ,");
+  EXPECT_EQ(control.m_LastError, ftp_error::kNotTaken);
   replies["RenameFileRequest"] = "lRenameFileStatus=1001";
   log.clear();
   EXPECT_TRUE(control.RenameFile(u"2.gif", u" y.gif "));
   EXPECT_EQ(Events(), "1031 y.gif,");
   EXPECT_EQ(page.Look(), "console.gif* y.gif 3.gif ");
+  EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
 }
 
 // --- Operations ---
@@ -484,6 +613,7 @@ TEST_F(ThumbNailTest, DeletesTheSelectedPicture) {
   Text name = u"z.gif";
   control.ValidateFileName(name);
   EXPECT_EQ(Events(), "1002 ,1033 ,") << "the pictures are another user's";
+  EXPECT_EQ(control.m_LastError, ftp_error::kNotLoggedOn);
   fake.apartment.session.userName = u"u@x";
 
   log.clear();

@@ -128,6 +128,38 @@ TEST_F(DriverTest, TakesWhatIsToldInsideAnEvent) {
   }
 }
 
+TEST_F(DriverTest, EndsBeforeItDoesAnythingUnwanted) {
+  const std::function<void()> steps[] = {
+      [&] { socket.events->OnConnected(); },
+      [&] { socket.Arrives("HTTP/1.1 200 OK\r\n\r\nabc"); },
+      [&] { socket.events->OnClosedByPeer(); },
+  };
+  for (std::size_t last = 0; last < std::size(steps); ++last) {
+    host.wanted = true;
+    Start();
+    for (std::size_t i = 0; i < last; ++i) steps[i]();
+    host.wanted = false;
+    log.clear();
+    for (std::size_t i = last; i < std::size(steps); ++i) steps[i]();
+    EXPECT_EQ(log, Transcript{"close"}) << last;
+    EXPECT_EQ(Saved(kTarget), "none");
+  }
+}
+
+TEST_F(DriverTest, AChangeInTheAccountOvertakesTheCopy) {
+  for (const TextView target : {kTarget, TextView()}) {
+    fake.files.files[u"C:\\t\\a.jpg"] = {3, 0, "new"};
+    Start(target);
+    socket.events->OnConnected();
+    socket.Arrives("A\r\n\r\nold");
+    fake.apartment.CopyChanged(u"C:\\T\\A.jpg");
+    socket.events->OnClosedByPeer();
+    EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "new");
+    EXPECT_EQ(log.back(), target.empty() ? "finished without a file" : "finished");
+    EXPECT_EQ(Saved(kTarget), "old") << "what was asked for is delivered";
+  }
+}
+
 TEST_F(DriverTest, AnEventMayReplaceTheDownload) {
   host.in = "received";
   host.does = [&] { downloader->Start(u"http://h/b.jpg", u""); };
@@ -169,8 +201,20 @@ TEST_F(DriverTest, WatchdogQuitAndEnd) {
   EXPECT_EQ(watchdog.runs, 0U);
 }
 
+TEST_F(DriverTest, TellsWhetherTheFileIsThere) {
+  fake.files.mostWritten = 2;
+  Start();
+  socket.events->OnConnected();
+  socket.Arrives("A\r\n\r\nabc");
+  socket.events->OnClosedByPeer();
+  EXPECT_EQ(log.back(), "finished without a file");
+}
+
 TEST_F(DriverTest, NothingIsWrittenWithoutAUserFolder) {
+  EXPECT_TRUE(downloader->CanStart(kUrl));
+  EXPECT_FALSE(downloader->CanStart(u"") || downloader->CanStart(u"http://h/.."));
   fake.apartment.UserFolderPath.clear();
+  EXPECT_FALSE(downloader->CanStart(kUrl));
   Start();
   EXPECT_EQ(log, (Transcript{"close", "failed 45 told"}));
 }

@@ -174,7 +174,9 @@ TEST(FileNameGuard, AcceptsAndRefuses) {
 }
 
 struct Uploads : UploadEvents {
-  bool IsWanted() const override { return true; }
+  // The event that tells this is the last one that is wanted.
+  std::string stop = "nothing";
+  bool IsWanted() const override { return !log.ends_with(stop); }
   std::string log;
   std::string file;
   void ActionComplete() override { log += "complete;"; }
@@ -238,6 +240,30 @@ TEST(UploadObject, SendsTheFileAndTellsItsProgress) {
   }
   fake.files.files.clear();
   EXPECT_EQ(upload("ErrorNumber=0"), "53 ");
+}
+
+TEST(UploadObject, EndsWhenItIsNotWanted) {
+  const std::string all = "initializing;connecting;started;0 0;100 3;server;upload complete;complete;";
+  for (const char* stop : {"connecting;", "0 0;", "100 3;", "server;"}) {
+    SCOPED_TRACE(stop);
+    FakePlatform fake;
+    fake.files.files[u"a"] = {3, 0, "abc"};
+    fake.http.answers.push_back(HttpAnswer{200, "ErrorNumber=0"});
+    Uploads events;
+    events.stop = stop;
+    const auto upload = [&] {
+      UploadObject(fake.apartment.platform)
+          .UploadFile(u"a", u"http://h/users/", u"/p", 0, u"u", u"p", u"g", events);
+    };
+    if (std::string_view(stop) == "server;") {
+      upload();
+      EXPECT_EQ(events.log, all) << "the server has the file";
+      continue;
+    }
+    EXPECT_THROW(upload(), RuntimeError);
+    EXPECT_TRUE(fake.http.sent.empty());
+    EXPECT_EQ(events.log.find("upload complete"), std::string::npos);
+  }
 }
 
 // A transport that takes the body in pieces of one size.

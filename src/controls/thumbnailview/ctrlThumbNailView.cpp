@@ -207,8 +207,8 @@ bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
   }
   page_.SetCaption(slot, FormatLabelText(record.FileName));
   PathOf(slot) = record.FilePath;
-  // A picture that cannot be read leaves the caption and an empty square. It may be a file of another kind, or what came
-  // in place of the picture or of a part of it, for which the next page with it asks again.
+  // A picture that cannot be read leaves the caption and an empty square. It may be a file of another kind,
+  // or what came in place of the picture or of a part of it, for which the next page with it asks again.
   if (!copy.empty() && FileExists(files, copy) && !ShowPicture(slot, copy))
     copies_.RemoveUnless(copy, record.FileSize);
   page_.ShowSlot(slot, true);

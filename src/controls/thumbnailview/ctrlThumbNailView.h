@@ -113,7 +113,8 @@ class ctrlThumbNailView final : public FileControl {
   // Address of the selected picture.
   Text selectedPath_;
   int firstIndex_ = 0;
-  // Of the page that is shown or being filled; firstIndex_ is 0 already while the thumb is dragged to the top.
+  // Of the page that is shown or being filled; firstIndex_ is 0 already while the thumb is dragged to the
+  // top.
   int pageFirst_ = 0;
   int selectionFirstIndex_ = 0;
   int previousScroll_ = 0;
