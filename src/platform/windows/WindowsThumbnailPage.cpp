@@ -165,6 +165,12 @@ void WindowsThumbnailPage::Focus() {
   if (!tellingFocus_ && Window() && IsWindowVisible(Outer())) SetFocus(FirstStop());
 }
 
+bool WindowsThumbnailPage::HasFocus() const {
+  const HWND outer = Outer();
+  const HWND focus = GetFocus();
+  return outer && (focus == outer || IsChild(outer, focus));
+}
+
 bool WindowsThumbnailPage::MoveFocus(bool backward) {
   std::array stops = {gridWindow_, scrollWindow_, linkWindow_, switchWindow_};
   if (backward) std::reverse(stops.begin(), stops.end());

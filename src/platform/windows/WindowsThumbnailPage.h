@@ -47,6 +47,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void ShowEditor(int slot, TextView name) override;
   void HideEditor() override;
   Text EditorText() const override;
+  bool HasFocus() const override;
   void Focus() override;
   void SetHourglass(bool hourglass) override { ShowHourglass(hourglass); }
   void StartDrag() override { user_.DragBegins(); }
