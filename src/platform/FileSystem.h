@@ -87,6 +87,10 @@ class FileSystem {
   // Throws 53 when there is no such file, 75 when it cannot be removed.
   virtual void Remove(TextView path) = 0;
 
+  // Removes what writes that were cut off left in the folder. What a running process writes stays, and so
+  // does what cannot be removed.
+  virtual void RemoveLeftovers(TextView folder) noexcept = 0;
+
   // Whether a name matches `pattern` (wildcards in the last part): files that are neither hidden nor system
   // files, and with `folders` folders too.
   virtual bool Exists(TextView pattern, bool folders) = 0;

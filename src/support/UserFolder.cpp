@@ -1,5 +1,6 @@
 #include "support/UserFolder.h"
 
+#include "platform/FileSystem.h"
 #include "support/Apartment.h"
 #include "support/PathHelpers.h"
 #include "support/ProxySettings.h"
@@ -31,6 +32,7 @@ void PrepareUserFolder(Apartment& apartment) noexcept {
     EnsureFolder(files, path);
     path += u"\\" + UserFolderName(apartment.session.userName);
     EnsureFolder(files, path);
+    files.RemoveLeftovers(path);
     // The proxy comes before the assignment: without readable proxy settings there is no user folder.
     apartment.proxy.ProxyHost = GetProxySettings(apartment);
     apartment.UserFolderPath = path;

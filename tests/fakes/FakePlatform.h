@@ -188,6 +188,7 @@ struct FakeFiles : FileSystem {
     if ((At(path).attributes & kReadOnly) != 0) throw RuntimeError(error::kPathAccess);
     files.erase(Text(path));
   }
+  void RemoveLeftovers(TextView) noexcept override {}
   bool Exists(TextView pattern, bool withFolders) override {
     return files.contains(Text(pattern)) || (withFolders && std::ranges::count(folders, pattern) > 0);
   }

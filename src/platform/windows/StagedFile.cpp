@@ -3,21 +3,83 @@
 #include <algorithm>
 #include <array>
 #include <atomic>
+#include <cwchar>
+#include <mutex>
+#include <set>
 #include <vector>
 
 namespace tarnwick {
 namespace {
 
+struct ProcessKind {
+  using Handle = HANDLE;
+  static Handle None() { return nullptr; }
+  static void Close(Handle handle) { CloseHandle(handle); }
+};
+using ProcessOwner = Owner<ProcessKind>;
+
+std::wstring NameOf(DWORD process, DWORD tick, DWORD number) {
+  std::array<wchar_t, 40> name{};
+  wsprintfW(name.data(), L"twk%lx-%lx-%lx.tmp", process, tick, number);
+  return name.data();
+}
+
 // No other file of this process, and of no other one that runs now, has it.
 std::wstring UniqueName() {
   static std::atomic<DWORD> files{0};
-  std::array<wchar_t, 32> name{};
-  wsprintfW(name.data(), L"twk%lx-%lx-%lx.tmp", GetCurrentProcessId(), GetTickCount(), ++files);
-  return name.data();
+  return NameOf(GetCurrentProcessId(), GetTickCount(), ++files);
+}
+
+// The process that gave a file its name; 0 for a name of another form.
+DWORD WriterOf(const wchar_t* name) {
+  DWORD process = 0;
+  DWORD tick = 0;
+  DWORD number = 0;
+  const bool fits = std::swscanf(name, L"twk%lx-%lx-%lx", &process, &tick, &number) == 3;
+  return fits && NameOf(process, tick, number) == name ? process : 0;
+}
+
+// Whether the process runs and was there when the file was made: a later one may have the number again.
+bool Lives(DWORD process, const FILETIME& fileMade) {
+  const ProcessOwner owner(OpenProcess(PROCESS_QUERY_LIMITED_INFORMATION, FALSE, process));
+  if (!owner) return GetLastError() == ERROR_ACCESS_DENIED;
+  DWORD code = 0;
+  if (GetExitCodeProcess(owner.Get(), &code) && code != STILL_ACTIVE) return false;
+  FILETIME started{};
+  FILETIME other{};
+  return !GetProcessTimes(owner.Get(), &started, &other, &other, &other) ||
+         CompareFileTime(&started, &fileMade) <= 0;
 }
 
 FileOwner Opened(const std::wstring& path, DWORD access, DWORD disposition) {
   return FileOwner(CreateFileW(path.c_str(), access, 0, nullptr, disposition, 0, nullptr));
+}
+
+// Whether the file goes when `file`, its only handle, is closed, be it by the end of the process.
+bool SetGoesWhenClosed(HANDLE file, bool goes) {
+  FILE_DISPOSITION_INFO info{goes};
+  return SetFileInformationByHandle(file, FileDispositionInfo, &info, sizeof info);
+}
+
+void RemoveFile(const std::wstring& path) {
+  // A copy of a read-only file is read-only too, and could not be deleted.
+  SetFileAttributesW(path.c_str(), FILE_ATTRIBUTE_NORMAL);
+  DeleteFileW(path.c_str());
+}
+
+// Once for each folder: what others leave there meanwhile is for a later process.
+void RemoveLeftoversOnce(const std::wstring& folder) {
+  static std::mutex lock;
+  static std::set<std::wstring> folders;
+  // The current folder may be another one next time.
+  const wchar_t* const named = folder.empty() ? L"." : folder.c_str();
+  std::wstring full(GetFullPathNameW(named, 0, nullptr, nullptr), L'\0');
+  full.resize(GetFullPathNameW(named, static_cast<DWORD>(full.size()), full.data(), nullptr));
+  const bool isNew = [&] {
+    const std::lock_guard guard(lock);
+    return folders.insert(full).second;
+  }();
+  if (isNew) StagedFile::RemoveLeftovers(folder);
 }
 
 // Without a look-up of the old name, which takes longer than writing a small file.
@@ -34,17 +96,33 @@ bool Rename(HANDLE file, const std::wstring& name) {
 
 StagedFile::StagedFile(const std::wstring& target) : target_(target) {
   // A target without a folder is in the current one; "C:name" keeps its drive.
-  path_ = target.substr(0, target.find_last_of(L"\\/:") + 1) + UniqueName();
+  const std::wstring folder = target.substr(0, target.find_last_of(L"\\/:") + 1);
+  RemoveLeftoversOnce(folder);
+  path_ = folder + UniqueName();
   file_ = Opened(path_, GENERIC_WRITE | DELETE, CREATE_NEW);
-  if (!file_) path_.clear();
+  if (file_)
+    goesWhenClosed_ = SetGoesWhenClosed(file_.Get(), true);
+  else
+    path_.clear();
 }
 
 StagedFile::~StagedFile() {
-  Close();
-  if (path_.empty()) return;
-  // A copy of a read-only file is read-only too, and could not be deleted.
-  SetFileAttributesW(path_.c_str(), FILE_ATTRIBUTE_NORMAL);
-  DeleteFileW(path_.c_str());
+  file_ = {};
+  if (!path_.empty() && !goesWhenClosed_) RemoveFile(path_);
+}
+
+void StagedFile::RemoveLeftovers(const std::wstring& folder) {
+  WIN32_FIND_DATAW found{};
+  const FindOwner search(FindFirstFileW((folder + L"twk*.tmp").c_str(), &found));
+  if (!search) return;
+  do {
+    if ((found.dwFileAttributes & (FILE_ATTRIBUTE_DIRECTORY | FILE_ATTRIBUTE_REPARSE_POINT)) != 0) continue;
+    const DWORD writer = WriterOf(found.cFileName);
+    if (writer == 0 || Lives(writer, found.ftCreationTime)) continue;
+    const std::wstring path = folder + found.cFileName;
+    // On a share the writer may run on another machine; but it holds the file.
+    if (Opened(path, DELETE, OPEN_EXISTING)) RemoveFile(path);
+  } while (FindNextFileW(search.Get(), &found));
 }
 
 bool StagedFile::Write(std::string_view bytes) {
@@ -57,13 +135,18 @@ bool StagedFile::Write(std::string_view bytes) {
   return true;
 }
 
+bool StagedFile::Keep() {
+  if (goesWhenClosed_ && SetGoesWhenClosed(file_.Get(), false)) goesWhenClosed_ = false;
+  return !goesWhenClosed_;
+}
+
 bool StagedFile::Commit() {
   if (path_.empty()) return false;
   const DWORD attributes = GetFileAttributesW(target_.c_str());
   // Not left to the rename, which some versions of the system let through.
   if (attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_READONLY) != 0) return false;
   if (!file_) file_ = Opened(path_, DELETE, OPEN_EXISTING);
-  if (!file_ || !Rename(file_.Get(), target_)) return false;
+  if (!file_ || !Keep() || !Rename(file_.Get(), target_)) return false;
   path_.clear();
   return true;
 }

@@ -1,4 +1,4 @@
-// A new file beside its target, which becomes the target whole or goes away.
+// A new file beside its target, which becomes the target whole or goes away, also when the process is ended.
 #pragma once
 
 #include <string>
@@ -10,7 +10,8 @@ namespace tarnwick {
 
 class StagedFile {
  public:
-  // Creates an empty file of a name of its own in the folder of `target`.
+  // Creates an empty file of a name of its own in the folder of `target`. The first in a folder removes the
+  // leftovers there.
   explicit StagedFile(const std::wstring& target);
   ~StagedFile();
   StagedFile(const StagedFile&) = delete;
@@ -22,17 +23,28 @@ class StagedFile {
   // False when not all of the bytes could be written.
   bool Write(std::string_view bytes);
 
-  // For a call that writes to the file by its name.
-  void Close() { file_ = {}; }
+  // For a call that writes to the file by its name. If the process is ended meanwhile, the file is left over.
+  void Close() {
+    Keep();
+    file_ = {};
+    goesWhenClosed_ = false;
+  }
 
   // Renames the file to the target, over a file of that name unless it is read-only. On failure what was
   // there stays.
   bool Commit();
 
+  // Removes what ended processes left in the folder, which is named with its last separator.
+  static void RemoveLeftovers(const std::wstring& folder);
+
  private:
+  // The file stays when it is closed.
+  bool Keep();
+
   const std::wstring target_;
   std::wstring path_;
   FileOwner file_;
+  bool goesWhenClosed_ = false;
 };
 
 }  // namespace tarnwick

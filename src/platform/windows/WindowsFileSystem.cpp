@@ -162,6 +162,11 @@ void WindowsFileSystem::Remove(TextView path) {
     throw RuntimeError(NothingThere(GetLastError()) ? error::kFileNotFound : error::kPathAccess);
 }
 
+void WindowsFileSystem::RemoveLeftovers(TextView folder) noexcept {
+  ResultAsItStood(0,
+                  [&](int&) { StagedFile::RemoveLeftovers(WidePath(folder, error::kPathNotFound) + L"\\"); });
+}
+
 bool WindowsFileSystem::Exists(TextView pattern, bool folders) {
   if (pattern.empty() || pattern.find(u'\0') != TextView::npos) return false;
   std::wstring widePattern = WideFromText(pattern);

@@ -16,6 +16,7 @@ class WindowsFileSystem : public FileSystem {
   std::size_t ReadBeginning(TextView path, std::span<char> room) override;
   std::unique_ptr<FileWriter> Create(TextView path) override;
   void Remove(TextView path) override;
+  void RemoveLeftovers(TextView folder) noexcept override;
   bool Exists(TextView pattern, bool folders) override;
   void MakeFolder(TextView path) override;
   Text TempPath() override;

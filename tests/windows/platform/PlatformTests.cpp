@@ -243,6 +243,78 @@ TEST_F(FilesTest, CopiesWholeOrNotAtAll) {
   EXPECT_EQ(Each(false), 6U) << "a file in between was left over";
 }
 
+// The process that the next test ends in the middle of a write.
+TEST(UnfinishedWrite, DISABLED_WaitsForItsEnd) {
+  WindowsFileSystem files;
+  const Text path = TextFromWide(_wgetenv(L"TARNWICK_UNFINISHED"));
+  const std::unique_ptr<FileWriter> file = files.Create(path);
+  file->Write("half");
+  files.Write(path + u".begun", "");
+  Sleep(INFINITE);
+}
+
+TEST_F(FilesTest, RemovesWhatEndedProcessesLeft) {
+  SetEnvironmentVariableW(L"TARNWICK_UNFINISHED", WideFromText(In(u"a.jpg")).c_str());
+  std::wstring command = GetCommandLineW();
+  command += L" --gtest_also_run_disabled_tests --gtest_filter=UnfinishedWrite.*";
+  STARTUPINFOW startup{};
+  startup.cb = sizeof startup;
+  PROCESS_INFORMATION writer{};
+  ASSERT_TRUE(CreateProcessW(nullptr, command.data(), nullptr, nullptr, FALSE, 0, nullptr, nullptr, &startup,
+                             &writer));
+  for (int i = 0; i < 500 && !files_.Exists(In(u"a.jpg.begun"), false); ++i) Sleep(20);
+  files_.RemoveLeftovers(folder_);
+  EXPECT_EQ(Each(false), 2U) << "what is being written stays";
+  TerminateProcess(writer.hProcess, 1);
+  WaitForSingleObject(writer.hProcess, INFINITE);
+  EXPECT_EQ(Each(false), 1U) << "the system removes it";
+
+  const auto beginning = [](DWORD process) {
+    wchar_t name[16];
+    wsprintfW(name, L"twk%lx", process);
+    return TextFromWide(name);
+  };
+  const Text own = beginning(GetCurrentProcessId());
+  const Text ended = beginning(writer.dwProcessId);
+  const Text held = ended + u"-1-2.tmp";
+  const Text folder = ended + u"-2-1.tmp";
+  const Text inner = folder + u"\\" + ended + u"-1-1.tmp";
+  const struct {
+    Text name;
+    bool isOld, stays;
+  } kFiles[] = {{own + u"-1-1.tmp", false, true},
+                {own + u"-1-2.tmp", true, false},  // of an earlier process with the same number
+                {ended + u"-1-1.tmp", false, false},
+                {held, false, true},
+                {ended + u"-01-1.tmp", false, true},
+                {ended + u"-1-1.tmp.tmp", false, true},
+                {ended + u"-1.tmp", false, true},
+                {u"TWK" + ended.substr(3) + u"-1-3.tmp", false, true},
+                {inner, false, true}};
+  files_.MakeFolder(In(folder));
+  const FILETIME old{0, 0x01C00000};
+  for (const auto& file : kFiles) {
+    Write(file.name, "half");
+    const FileOwner handle(CreateFileW(WideFromText(In(file.name)).c_str(), GENERIC_WRITE, 0, nullptr,
+                                       OPEN_EXISTING, 0, nullptr));
+    if (file.isOld) SetFileTime(handle.Get(), &old, nullptr, &old);
+  }
+  files_.SetAttributes(In(ended + u"-1-1.tmp"), attribute::kReadOnly);
+  {
+    const std::unique_ptr<FileReader> reader = files_.Open(In(held));
+    files_.RemoveLeftovers(folder_);
+  }
+  for (const auto& file : kFiles)
+    EXPECT_EQ(files_.Exists(In(file.name), false), file.stays) << Utf8FromText(file.name);
+
+  files_.Write(In(folder + u"\\a.jpg"), "whole");
+  files_.Remove(In(folder + u"\\a.jpg"));
+  EXPECT_FALSE(files_.Exists(In(inner), false)) << "the first write in a folder removes them, too";
+  DeleteFileW(WideFromText(In(inner)).c_str());
+  for (const HANDLE handle : {writer.hThread, writer.hProcess}) CloseHandle(handle);
+  EXPECT_EQ(ownedObjects, 0);
+}
+
 TEST_F(FilesTest, ReadsABeginningAndCreatesWhatIsMissing) {
   Write(u"a.jpg", "12345");
   char room[3];
