@@ -13,28 +13,27 @@ namespace {
 // Of one name in a folder, in bytes.
 constexpr std::size_t kLongestName = 255;
 
+// What clients cannot have in the name of a file or folder, and what has a meaning of its own in an address.
+constexpr TextView kReserved = u"\\/:*?\"<>|#%";
+
 bool IsControl(char16_t unit) {
   return unit < 0x20 || (unit >= 0x7F && unit <= 0x9F);
-}
-
-// Whether `name` cannot be the name of a file or folder, or holds a control character or one of `forbidden`.
-bool IsUnusable(std::string_view name, TextView forbidden) {
-  const auto text = TextFromUtf8(name);
-  if (!text || name.empty() || name.size() > kLongestName || name == "." || name == "..") return true;
-  for (const char16_t unit : *text)
-    if (IsControl(unit) || forbidden.find(unit) != TextView::npos) return true;
-  return false;
 }
 
 }  // namespace
 
 bool IsRefusedFileName(std::string_view name) {
-  return IsUnusable(name, u"\\/:*?\"<>|#%");
+  const auto text = TextFromUtf8(name);
+  if (!text || name.empty() || name.size() > kLongestName || name == "." || name == "..") return true;
+  for (const char16_t unit : *text)
+    if (IsControl(unit) || kReserved.find(unit) != TextView::npos) return true;
+  return false;
 }
 
 bool IsRefusedUserName(std::string_view name) {
-  // A name without a single character of the cipher could never log on.
-  return IsUnusable(name, u"\\/ ") || Strip(name).empty();
+  // The name becomes a folder's and a part of addresses. One without a single character of the cipher could
+  // never log on.
+  return IsRefusedFileName(name) || name.find(' ') != std::string_view::npos || Strip(name).empty();
 }
 
 std::string FoldCase(std::string_view name) {

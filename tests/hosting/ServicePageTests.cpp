@@ -168,18 +168,20 @@ TEST_F(ServicePageTest, AccountsAreAddedUpToTheLimitAndRemovedWithTheirFiles) {
     return Client().Ask("AddUser", {{"UserName", user}, {"ProductID", "1"}, {"MGUID", "{0}"}});
   };
   const auto addCode = [&](const char* user) { return Utf8FromText(add(user).First(u"AddUser")); };
-  const char* user = "new.one@b.c";
+  const char* user = "New_1.$-@b.c";  // of every kind of character that hosts are told to take
+  const char* folder = "New_1.$-@b-c";
   const Reply added = add(user);
   ASSERT_EQ(added.First(u"AddUser"), u"1001");
-  EXPECT_EQ(added.First(u"UserFolder"), u"new.one@b-c");
+  EXPECT_EQ(Utf8FromText(added.First(u"UserFolder")), folder);
   EXPECT_FALSE(added.First(u"BasePath").empty());
   const std::string password = Utf8FromText(added.First(u"Password"));
   EXPECT_TRUE(std::regex_match(password, std::regex("[A-Za-z0-9]{8,}")));
   EXPECT_EQ(Client().AskFor("MGUID", "GetMGUIDForUser", {{"ProductID", "1"}, {"UserName", user}}),
             Utf8FromText(added.First(u"MGUID")));
 
-  for (const char* taken : {user, "new.one@b-c", "new.one!@b.c"}) EXPECT_EQ(addCode(taken), "1003") << taken;
-  for (const char* refused : {"", ".", "..", "a b", "a/b", "a\\b", "a\tb", "\xC3\xA4\xC3\xB6"})
+  for (const char* taken : {user, folder, "New_1.$-!@b.c"}) EXPECT_EQ(addCode(taken), "1003") << taken;
+  for (const char* refused : {"", ".", "..", "a b", "a/b", "a\\b", "a\tb", "\xC3\xA4\xC3\xB6", "a#b", "a%b",
+                              "a?b", "a*b", "a:b", "a\"b", "a<b", "a>b", "a|b"})
     EXPECT_EQ(addCode(refused), "1004") << refused;
   EXPECT_EQ(addCode("third@b.c"), "1001");
   EXPECT_EQ(addCode("fourth@b.c"), "1011");
@@ -187,27 +189,35 @@ TEST_F(ServicePageTest, AccountsAreAddedUpToTheLimitAndRemovedWithTheirFiles) {
   // Without a folder: an empty listing, and file pages that say so.
   EXPECT_TRUE(Client().CheckedListing(user).empty());
   EXPECT_EQ(Client().Upload("a.jpg", "1", user, password), kFolderState);
-  const auto folderPage = [&](const char* page, const char* folder, const char* action,
+  const auto folderPage = [&](const char* page, const char* name, const char* action,
                               const std::string& key) {
-    return Client().Form(page, {{"Folder", folder}, {"Action", action}}, user, key);
+    return Client().Form(page, {{"Folder", name}, {"Action", action}}, user, key);
   };
-  EXPECT_EQ(folderPage("DeleteFolderAcceptor.asp", "new.one@b-c", "6", password), kFolderState);
+  EXPECT_EQ(folderPage("DeleteFolderAcceptor.asp", folder, "6", password), kFolderState);
   EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", kFolder, "5", password), kRefused);
-  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", "new.one@b-c", "5", "wrong"), kRefused);
-  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", "new.one@b-c", "5", password), kStored);
-  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", "new.one@b-c", "5", password), kFolderState);
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", folder, "5", "wrong"), kRefused);
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", folder, "5", password), kStored);
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", folder, "5", password), kFolderState);
+  EXPECT_EQ(Client().AskFor(
+                "UserAuthenticationStatus", "UserValidate",
+                {{"UserName", Enciphered(user)}, {"Password", Enciphered(password)}, {"ProductID", "1"}}),
+            "TRUE");
   EXPECT_EQ(Client().Upload("a.jpg", "1", user, password), kStored);
-  EXPECT_EQ(Client().CheckedListing(user).size(), 1U);
-  EXPECT_EQ(folderPage("DeleteFolderAcceptor.asp", "new.one@b-c", "6", password), kStored);
+  EXPECT_EQ(Client().Form("RenameAcceptor.asp", {{"OldFileName", "a.jpg"}, {"NewFileName", "b.jpg"}}, user,
+                          password),
+            kStored);
+  EXPECT_EQ(Client().CheckedListing(user), (std::map<std::string, std::string>{{"b.jpg", "1"}}));
+  EXPECT_EQ(Client().Form("DeleteAcceptor.asp", {{"FileName", "b.jpg"}}, user, password), kStored);
+  EXPECT_EQ(folderPage("DeleteFolderAcceptor.asp", folder, "6", password), kStored);
   EXPECT_TRUE(Client().CheckedListing(user).empty());
-  EXPECT_FALSE(std::filesystem::exists(Data() / "users" / "new.one@b-c"));
+  EXPECT_FALSE(std::filesystem::exists(Data() / "users" / folder));
 
-  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", "new.one@b-c", "5", password), kStored);
+  EXPECT_EQ(folderPage("CreateFolderAcceptor.asp", folder, "5", password), kStored);
   EXPECT_EQ(Client().Upload("b.jpg", "1", user, password), kStored);
   EXPECT_EQ(Client().AskFor("DeleteUser", "DeleteUser",
                             {{"UserName", user}, {"ProductID", "1"}, {"Password", password}}),
             "1001");
-  EXPECT_FALSE(std::filesystem::exists(Data() / "users" / "new.one@b-c"));
+  EXPECT_FALSE(std::filesystem::exists(Data() / "users" / folder));
   EXPECT_EQ(Client().AskFor("ValidUser", "ValidUserID", {{"UserName", user}, {"ProductID", "1"}}), "FALSE");
   EXPECT_EQ(addCode(user), "1001");
 }

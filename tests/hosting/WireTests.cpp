@@ -264,7 +264,7 @@ TEST(OptionsTest, BadOptionsAreToldApartFromGoodOnes) {
         Arguments{"--data", "d", "--port", "x"}, Arguments{"--data", "d", "--prot", "1"},
         Arguments{"--data", "d", "file"}, Arguments{"--data", "d", "--seed-user", "u"},
         Arguments{"--data", "d", "--seed-password", "p"},
-        Arguments{"--data", "d", "--seed-user", "a b", "--seed-password", "p"},
+        Arguments{"--data", "d", "--seed-user", "a#b", "--seed-password", "p"},
         Arguments{"--data", "d", "--seed-user", "u", "--seed-password", "!"},
         Arguments{"--data", "d", "--seed-user", "u", "--seed-password", "p", "--seed-pictures", "/nowhere"}})
     EXPECT_THROW(ParseOptions(bad), OptionError) << bad.size();
