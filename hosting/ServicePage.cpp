@@ -86,6 +86,12 @@ struct Call {
   }
 };
 
+// Every other action needs the number of the host's product.
+bool NeedsNoProduct(std::string_view action) {
+  return action == "EstablishConnection" || action == "GetCurrentDateTimeFromServer" ||
+         action == "HasUserExpired" || action == "PremiumAccountSize";
+}
+
 FormBody UserValidate(const Call& call) {
   const std::string user = call.note.user = call.Deciphered(u"UserName");
   const std::string password = call.Deciphered(u"Password");
@@ -294,7 +300,11 @@ FormBody ServicePage::Answer(const std::string& action, const Reply& form, const
   note.action = found ? action : "unknown";
   note.result = found ? "ok" : "error";
   try {
-    if (found) return found(Call{store_, options_, form, hostName, note});
+    if (found) {
+      const Call call{store_, options_, form, hostName, note};
+      if (!NeedsNoProduct(action)) call.Value(u"ProductID");
+      return found(call);
+    }
   } catch (const UnknownUser&) {
     note.result = "unknown-user";
   } catch (const RuntimeError&) {

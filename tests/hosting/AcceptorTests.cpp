@@ -103,6 +103,7 @@ TEST_F(AcceptorTest, MalformedRequestsAreRefusedAndChangeNothing) {
   EXPECT_EQ(form("DeleteAcceptor.asp", "UsersBaseUrl=u&FileName=%zz&User=u&Password=p&ProductID=x"), 400);
   EXPECT_EQ(form("DeleteAcceptor.asp", "UsersBaseUrl=u&FileName=%FF&User=u&Password=p&ProductID=x"), 400);
   EXPECT_EQ(form("RenameAcceptor.asp", "UsersBaseUrl=u&OldFileName=a&User=u&Password=p&ProductID=x"), 400);
+  EXPECT_EQ(form("DeleteAcceptor.asp", "UsersBaseUrl=u&FileName=a&User=u&Password=p"), 400);
   EXPECT_EQ(
       form("CreateFolderAcceptor.asp", "UsersBaseUrl=u&Folder=f&Action=6&User=u&Password=p&ProductID=x"),
       400);
