@@ -1,6 +1,7 @@
 #include "hosting/AcceptorRoutes.h"
 
 #include <array>
+#include <exception>
 #include <memory>
 #include <string>
 #include <vector>
@@ -66,7 +67,7 @@ class Upload {
       if (!TextFromUtf8(field)) return false;
     account_ = Admit(store_, fields_[kUser], fields_[kPassword], fields_[kProduct], note_);
     if (account_)
-      bytes_ = store_.BeginUpload();
+      Keep([&] { bytes_ = store_.BeginUpload(); });
     else
       refusal_ = acceptor::kRefused;
     return true;
@@ -78,30 +79,44 @@ class Upload {
       fields_.back().append(bytes);
       return fields_.back().size() <= kLongestField;
     }
-    // What is refused anyway is read to its end, since clients send all before they listen, but not kept.
-    if (refusal_ != 0) return true;
+    // What is refused or failed anyway is read to its end, since clients send all before they listen, but not
+    // kept.
+    if (refusal_ != 0 || failure_) return true;
     if (bytes.size() > quota_ - bytes_->Size()) {
       refusal_ = kNameRefused;
       bytes_.reset();
       return true;
     }
-    bytes_->Append(bytes);
+    Keep([&] { bytes_->Append(bytes); });
     return true;
   }
 
-  // After the last byte.
+  // After the last byte. Throws what failed on the way.
   ErrorNumber Finish() {
     if (fields_.size() <= kFile) return std::nullopt;
+    if (failure_) std::rethrow_exception(failure_);
     if (refusal_ != 0) return refusal_;
     return NumberOf(store_.FinishUpload(*account_, fields_[kFile], quota_, *bytes_));
   }
 
  private:
+  // Runs a step that writes to the disk.
+  template <typename Step>
+  void Keep(Step step) {
+    try {
+      step();
+    } catch (const std::exception&) {
+      failure_ = std::current_exception();
+      bytes_.reset();
+    }
+  }
+
   Store& store_;
   std::uint64_t quota_;
   LogNote& note_;
   std::vector<std::string> fields_;  // the last one is the name of the file
   std::int32_t refusal_ = 0;
+  std::exception_ptr failure_;
   std::optional<Account> account_;
   std::unique_ptr<TemporaryFile> bytes_;
 };

@@ -7,6 +7,10 @@
 namespace tarnwick::hosting {
 namespace {
 
+// Milliseconds that a change waits for another program's lock. No program but the server needs one, and all
+// clients wait meanwhile.
+constexpr int kBusyPatience = 500;
+
 [[noreturn]] void Fail(sqlite3* connection) {
   throw std::runtime_error(std::string("database: ") + sqlite3_errmsg(connection));
 }
@@ -22,7 +26,7 @@ Database::Database(const std::filesystem::path& path) {
   const int status = sqlite3_open(path.c_str(), &connection);
   connection_.reset(connection);  // a failed opening makes a connection too, for its message
   if (status != SQLITE_OK) Fail(connection);
-  sqlite3_busy_timeout(connection, 5000);
+  sqlite3_busy_timeout(connection, kBusyPatience);
   Run("PRAGMA journal_mode=WAL; PRAGMA synchronous=FULL; PRAGMA foreign_keys=ON");
 }
 

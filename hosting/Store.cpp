@@ -124,6 +124,12 @@ bool IsTaken(const std::vector<StoredFile>& files, std::string_view name, std::s
   });
 }
 
+// Removes as much of a folder as it can.
+void Discard(const fs::path& folder) {
+  std::error_code ignored;
+  fs::remove_all(folder, ignored);
+}
+
 bool IsFile(const fs::path& path) {
   return fs::is_regular_file(fs::symlink_status(path));
 }
@@ -204,8 +210,17 @@ void Store::RemoveAccount(const Account& account) {
   const std::lock_guard lock(mutex_);
   if (!IsThere(account)) return;  // and its folder may be another one's by now
   // The folder goes first: it would outlive a kill in between without an owner and keep its name taken.
-  if (fs::exists(FolderPath(account))) RemoveFolder(account);
-  Execute(*database_, "DELETE FROM accounts WHERE id = ?", account.id);
+  const fs::path away = fs::exists(FolderPath(account)) ? MoveAway(account) : fs::path();
+  try {
+    Execute(*database_, "DELETE FROM accounts WHERE id = ?", account.id);
+  } catch (...) {
+    if (!away.empty()) {
+      fs::rename(away, FolderPath(account));
+      SyncFolder(users_);
+    }
+    throw;
+  }
+  Discard(away);
 }
 
 void Store::SetPassword(const Account& account, std::string_view password) {
@@ -244,7 +259,7 @@ Change Store::CreateFolder(const Account& account) {
 Change Store::DeleteFolder(const Account& account) {
   const std::lock_guard lock(mutex_);
   const Change obstacle = Obstacle(account, {});
-  if (obstacle == Change::kDone) RemoveFolder(account);
+  if (obstacle == Change::kDone) Discard(MoveAway(account));
   return obstacle;
 }
 
@@ -335,13 +350,11 @@ Change Store::Obstacle(const Account& account, std::initializer_list<std::string
   return std::any_of(names.begin(), names.end(), IsRefusedFileName) ? Change::kNameRefused : Change::kDone;
 }
 
-void Store::RemoveFolder(const Account& account) {
-  // Out of sight in one step. What is left in the work folder goes when the store is opened.
-  const fs::path away = NewWorkPath();
+fs::path Store::MoveAway(const Account& account) {
+  fs::path away = NewWorkPath();
   fs::rename(FolderPath(account), away);
   SyncFolder(users_);
-  std::error_code ignored;
-  fs::remove_all(away, ignored);
+  return away;
 }
 
 }  // namespace tarnwick::hosting

@@ -110,7 +110,9 @@ class Store {
   bool IsAccountTaken(const Account& account);
   // What forbids a change of these files; kDone: nothing.
   Change Obstacle(const Account& account, std::initializer_list<std::string_view> names);
-  void RemoveFolder(const Account& account);
+  // Takes the folder out of sight in one step; returns where it is. What is left in the work folder goes when
+  // the store is opened.
+  std::filesystem::path MoveAway(const Account& account);
 
   std::filesystem::path data_;
   std::filesystem::path users_;

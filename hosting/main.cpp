@@ -30,6 +30,9 @@ int Serve(const hosting::Options& options) {
   sigaddset(&ends, SIGTERM);
   pthread_sigmask(SIG_BLOCK, &ends, nullptr);
 
+  // A limit on the size of files is a full disk, not the end.
+  signal(SIGXFSZ, SIG_IGN);
+
   hosting::Server server(options, PrintLine);
   PrintLine("listening on " + options.host + ":" + std::to_string(server.Listen()));
   server.Start();

@@ -1,11 +1,32 @@
+#include <signal.h>
+#include <sys/resource.h>
+
 #include <thread>
 
 #include "HostingFixture.h"
+#include "hosting/Database.h"
 
 namespace tarnwick::hosting {
 namespace {
 
 using Files = std::map<std::string, std::string>;
+
+// No file may grow beyond so many bytes.
+class FileSizeLimit {
+ public:
+  explicit FileSizeLimit(rlim_t bytes) {
+    signal(SIGXFSZ, SIG_IGN);
+    getrlimit(RLIMIT_FSIZE, &before_);
+    const rlimit limit{bytes, before_.rlim_max};
+    setrlimit(RLIMIT_FSIZE, &limit);
+  }
+  FileSizeLimit(const FileSizeLimit&) = delete;
+  FileSizeLimit& operator=(const FileSizeLimit&) = delete;
+  ~FileSizeLimit() { setrlimit(RLIMIT_FSIZE, &before_); }
+
+ private:
+  rlimit before_{};
+};
 
 class AcceptorTest : public HostingTest {
  protected:
@@ -117,6 +138,32 @@ TEST_F(AcceptorTest, MalformedRequestsAreRefusedAndChangeNothing) {
   EXPECT_TRUE(Client().CheckedListing().empty());
   EXPECT_EQ(PostUpload(good), 200);
   EXPECT_EQ(Client().CheckedListing(), (Files{{"a.jpg", "1"}}));
+}
+
+TEST_F(AcceptorTest, WhatCannotBeStoredIsNotAcknowledgedAndChangesNothing) {
+  const Fields account = {{"UserName", kUser}, {"ProductID", "1"}, {"Password", kPassword}};
+  ASSERT_EQ(Client().Upload("a.jpg", "old"), kStored);
+  {
+    // A disk without room. The larger upload fails while it arrives, and is longer than what a server that
+    // closes takes.
+    const FileSizeLimit limit(1);
+    for (const std::size_t size : {std::size_t{10}, std::size_t{20} << 20}) {
+      EXPECT_EQ(Client().Upload("a.jpg", std::string(size, 'x')), kNoNumber) << size;
+      EXPECT_FALSE(Client().IsLost()) << size;
+    }
+    EXPECT_EQ(Client().AskFor("AddUser", "AddUser", {{"UserName", "x@y"}, {"ProductID", "1"}, {"MGUID", ""}}),
+              "(error)");
+    EXPECT_EQ(Client().AskFor("DeleteUser", "DeleteUser", account), "(error)");
+  }
+  Database other(Data() / "hosting.sqlite");
+  other.Run("BEGIN IMMEDIATE");
+  EXPECT_EQ(Client().Delete("a.jpg"), kNoNumber);
+  EXPECT_FALSE(Client().IsLost());
+  EXPECT_EQ(Client().AskFor("DeleteUser", "DeleteUser", account), "(error)");
+  EXPECT_EQ(Client().CheckedListing(), (Files{{"a.jpg", "old"}}));
+  EXPECT_TRUE(std::filesystem::is_empty(Data() / "work"));
+  other.Run("ROLLBACK");
+  EXPECT_EQ(Client().Delete("a.jpg"), kStored);
 }
 
 TEST_F(AcceptorTest, UploadsAtTheSameTimeStayWholeAndWithinTheQuota) {
