@@ -22,6 +22,7 @@ constexpr std::size_t kBlock = 64 * 1024;
 constexpr std::uint64_t kLongestHead = 64 * 1024;
 constexpr int kPatience = 30'000;  // milliseconds without a byte
 constexpr int kForEver = -1;
+constexpr std::uint64_t kLateCloseDelay = 20;  // milliseconds
 
 // How long a closed connection waits for its client to have read the answer, and how much it still takes from
 // it: closing with unread bytes would reset the connection and lose the answer.
@@ -46,6 +47,11 @@ void ReplaceLength(std::string& head, std::uint64_t length) {
   head.replace(digits, head.find("\r\n", digits) - digits, std::to_string(length));
 }
 
+void RemoveHeader(std::string& head, std::string_view name) {
+  if (const std::size_t at = head.find(name); at != std::string::npos)
+    head.erase(at, head.find("\r\n", at + name.size()) - at);
+}
+
 }  // namespace
 
 Connection::Connection(int socket, int stopEvent) : socket_(socket), stopEvent_(stopEvent) {
@@ -59,6 +65,8 @@ Connection::~Connection() {
     const linger hard{1, 0};
     setsockopt(socket_, SOL_SOCKET, SO_LINGER, &hard, sizeof hard);
   } else if (end_ != End::kLost) {
+    if (const Fault* late = Shown(Kind::kLateClose))
+      Wait(POLLRDHUP, static_cast<int>(late->amount.value_or(kLateCloseDelay)));
     shutdown(socket_, SHUT_WR);
     const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(kLingerPatience);
     std::uint64_t taken = 0;
@@ -74,12 +82,12 @@ Connection::~Connection() {
 }
 
 bool Connection::AwaitRequest(int milliseconds) {
+  if (IsOver() || Shown(Kind::kLateClose)) return false;
   faults_.clear();
   isHeadRead_ = isHeadSent_ = false;
   readBytes_ = sentBytes_ = 0;
   status_ = 0;
   bodyLimit_.reset();
-  if (IsOver()) return false;
   return position_ < buffer_.size() || (Wait(POLLIN, milliseconds) && Fill());
 }
 
@@ -165,6 +173,8 @@ bool Connection::SendHead(std::string_view head) {
   }
   std::string sent(head);
   if (const Fault* lie = Shown(Kind::kLength)) ReplaceLength(sent, *lie->amount);
+  if (Shown(Kind::kLateClose))
+    for (const std::string_view name : {"\r\nConnection: ", "\r\nKeep-Alive: "}) RemoveHeader(sent, name);
   return Send(sent) && SendBody({});
 }
 

@@ -31,6 +31,7 @@ constexpr KindWord kKinds[] = {
     {"huge", Kind::kHuge, Argument::kMayBe},
     {"empty", Kind::kEmpty, Argument::kNone},
     {"length", Kind::kLength, Argument::kMust},
+    {"late-close", Kind::kLateClose, Argument::kMayBe},
 };
 
 // Enough for a week in milliseconds and for every size that a client should refuse.
@@ -39,7 +40,7 @@ constexpr std::uint64_t kMostDelay = 604'800'000;
 
 bool IsInRange(Kind kind, std::uint64_t amount) {
   if (kind == Kind::kStatus) return amount >= 200 && amount <= 599;
-  if (kind == Kind::kDrip) return amount <= kMostDelay;
+  if (kind == Kind::kDrip || kind == Kind::kLateClose) return amount <= kMostDelay;
   if (kind == Kind::kStall) return amount <= kMostDelay / 1000;
   return amount <= kMostAmount;
 }

@@ -27,6 +27,7 @@ struct Fault {
     kHuge,          // a body of `amount` bytes, or of more than 64 MiB
     kEmpty,         // 200 without a body
     kLength,        // `amount` as the announced length
+    kLateClose,     // whole, without a word about the connection, which is closed `amount` ms later, or 20
   };
 
   std::string where;  // action word, page name, the start of a path with its "/", or "*"

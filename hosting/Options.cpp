@@ -115,6 +115,8 @@ KIND is one of
   huge[:BYTES]      a body of more than 64 MiB, or of BYTES
   empty             200 and no body
   length:N          N as the announced length of the body
+  late-close[:MS]   a whole answer that says nothing about the connection, which serves no other request and is
+                    closed 20, or MS, milliseconds later
 )";
 }
 

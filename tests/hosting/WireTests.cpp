@@ -210,6 +210,17 @@ TEST_F(WireTest, FaultsSpoilTheAnswerOfTheirActionOnly) {
   Fault({"HardLimit=garbage"});
   EXPECT_EQ(ask(), "(error)");
   EXPECT_FALSE(Client().IsLost());
+  // The answer does not tell that the connection serves no second request.
+  for (const std::string& first : {request, Post("/bv/bin/BVServicePage.asp", body)}) {
+    Fault({"HardLimit=late-close:200"});
+    const auto start = Clock::now();
+    const RawAnswer answer = RawExchange(Port(), first + request);
+    EXPECT_EQ(answer.Body(), good);
+    EXPECT_FALSE(answer.isReset);
+    EXPECT_EQ(answer.bytes.find("Connection:"), std::string::npos) << answer.bytes;
+    EXPECT_EQ(answer.bytes.find("Keep-Alive:"), std::string::npos) << answer.bytes;
+    EXPECT_GE(Clock::now() - start, std::chrono::milliseconds(190));
+  }
   Fault({"HardLimit=huge"});
   EXPECT_GT(RawExchange(Port(), request).Body().size(), std::size_t{64} << 20);
 }
