@@ -16,6 +16,7 @@
 namespace tarnwick::hosting {
 namespace {
 
+using Clock = std::chrono::steady_clock;
 using Kind = Fault::Kind;
 
 constexpr std::size_t kBlock = 64 * 1024;
@@ -68,11 +69,10 @@ Connection::~Connection() {
     if (const Fault* late = Shown(Kind::kLateClose))
       Wait(POLLRDHUP, static_cast<int>(late->amount.value_or(kLateCloseDelay)));
     shutdown(socket_, SHUT_WR);
-    const auto deadline = std::chrono::steady_clock::now() + std::chrono::milliseconds(kLingerPatience);
+    const auto deadline = Clock::now() + std::chrono::milliseconds(kLingerPatience);
     std::uint64_t taken = 0;
     buffer_.resize(kBlock);
-    while (taken < kLingerBytes && std::chrono::steady_clock::now() < deadline &&
-           Wait(POLLIN, kLingerPatience)) {
+    while (taken < kLingerBytes && Clock::now() < deadline && Wait(POLLIN, kLingerPatience)) {
       const ssize_t got = recv(socket_, buffer_.data(), buffer_.size(), MSG_DONTWAIT);
       if (got <= 0) break;
       taken += static_cast<std::uint64_t>(got);
@@ -88,7 +88,9 @@ bool Connection::AwaitRequest(int milliseconds) {
   readBytes_ = sentBytes_ = 0;
   status_ = 0;
   bodyLimit_.reset();
-  return position_ < buffer_.size() || (Wait(POLLIN, milliseconds) && Fill());
+  const bool hasBegun = position_ < buffer_.size() || (Wait(POLLIN, milliseconds) && Fill());
+  headDeadline_ = Clock::now() + std::chrono::milliseconds(milliseconds);
+  return hasBegun;
 }
 
 void Connection::Show(const std::vector<Fault>& faults) {
@@ -99,7 +101,7 @@ void Connection::Show(const std::vector<Fault>& faults) {
 
 ssize_t Connection::read(char* bytes, size_t size) {
   if (IsOver()) return -1;
-  if (position_ == buffer_.size() && !(Wait(POLLIN, kPatience) && Fill())) return IsOver() ? -1 : 0;
+  if (position_ == buffer_.size() && !(AwaitBytes() && Fill())) return IsOver() ? -1 : 0;
   const std::size_t got = std::min(size, buffer_.size() - position_);
   std::memcpy(bytes, buffer_.data() + position_, got);
   position_ += got;
@@ -139,6 +141,16 @@ bool Connection::Wait(short events, int milliseconds) {
     return false;
   }
   return ready > 0;
+}
+
+// A body may take as long as it arrives. A head may not: a client that sends one byte of it now and then
+// would keep the connection for hours.
+bool Connection::AwaitBytes() {
+  if (isHeadRead_) return Wait(POLLIN, kPatience);
+  const auto left = std::chrono::ceil<std::chrono::milliseconds>(headDeadline_ - Clock::now()).count();
+  if (left > 0 && Wait(POLLIN, static_cast<int>(left))) return true;
+  if (!IsOver()) end_ = End::kClosed;
+  return false;
 }
 
 bool Connection::Fill() {

@@ -6,6 +6,7 @@
 
 #include <httplib.h>
 
+#include <chrono>
 #include <cstdint>
 #include <optional>
 #include <string>
@@ -25,9 +26,10 @@ class Connection : public httplib::Stream {
   ~Connection() override;
 
   // Waits for the first byte of the next request. False when the client has gone or nothing came for so long.
+  // From then on the head of the request has that time once more to come whole.
   bool AwaitRequest(int milliseconds);
 
-  // Tells that the head of the request is read; until then its size is bounded.
+  // Tells that the head of the request is read; until then its size and time are bounded.
   void EndHead() { isHeadRead_ = true; }
 
   // Adds faults to show until the next request. One that refuses or resets at once ends the connection.
@@ -55,6 +57,7 @@ class Connection : public httplib::Stream {
   enum class End { kOpen, kClosed, kReset, kLost };
 
   bool Wait(short events, int milliseconds);
+  bool AwaitBytes();
   bool Fill();
   bool SendHead(std::string_view head);
   bool SendBody(std::string_view body);
@@ -71,6 +74,7 @@ class Connection : public httplib::Stream {
   // Of the current request.
   std::vector<Fault> faults_;
   bool isHeadRead_ = false;
+  std::chrono::steady_clock::time_point headDeadline_;
   bool isHeadSent_ = false;
   std::uint64_t readBytes_ = 0;
   std::uint64_t sentBytes_ = 0;

@@ -1,6 +1,7 @@
 #include "hosting/Server.h"
 
 #include <sys/eventfd.h>
+#include <sys/socket.h>
 #include <unistd.h>
 
 #include <algorithm>
@@ -8,6 +9,7 @@
 #include <charconv>
 #include <chrono>
 #include <exception>
+#include <semaphore>
 #include <stdexcept>
 #include <utility>
 
@@ -48,14 +50,33 @@ struct Exchange {
 
 namespace {
 
-constexpr std::size_t kThreads = 32;
+// Each connection has a thread, which costs little while it waits: a client that sends a byte now and then
+// keeps one and no more. With a file for each this stays well below the 1024 descriptors of a process.
+constexpr std::ptrdiff_t kMostConnections = 256;
 constexpr std::size_t kRequestsPerConnection = 10'000;  // only told
-constexpr int kIdlePatience = 10;  // seconds that a connection may stay open between two requests
+constexpr int kIdlePatience = 10;  // seconds that a request may take to begin, and once more for its head
 
 constexpr std::uint64_t kMostFormBytes = std::uint64_t{1} << 20;
 constexpr std::uint64_t kMostUploadBytes = std::uint64_t{1} << 30;
 
 constexpr const char* kOnlyRoute = "/";
+
+// Takes no connection more than there are threads: those that wait in the system's queue use no descriptors.
+class Threads : public httplib::ThreadPool {
+ public:
+  Threads() : ThreadPool(kMostConnections) {}
+
+  void enqueue(std::function<void()> connection) override {
+    free_.acquire();
+    ThreadPool::enqueue([this, connection = std::move(connection)] {
+      connection();
+      free_.release();
+    });
+  }
+
+ private:
+  std::counting_semaphore<kMostConnections> free_{kMostConnections};
+};
 
 // The request that this thread serves. The library's handlers get only its request and answer.
 thread_local Exchange* current = nullptr;
@@ -133,7 +154,7 @@ Server::Server(hosting::Options options, Log log)
                           options_.seedPictures))
     throw std::runtime_error("the name or folder of --seed-user is taken");
 
-  new_task_queue = [] { return new httplib::ThreadPool(kThreads); };
+  new_task_queue = [] { return new Threads; };
   set_keep_alive_timeout(kIdlePatience);
   set_keep_alive_max_count(kRequestsPerConnection);
   // The library's own choice lets two servers share a port, and each gets some of the requests.
@@ -178,6 +199,8 @@ int Server::Listen() {
     port = -1;
   if (port <= 0)
     throw std::runtime_error("cannot listen on " + options_.host + ":" + std::to_string(options_.port));
+  // The library lets 5 clients queue; the next one would try again after a second.
+  ::listen(svr_sock_, SOMAXCONN);
   return port;
 }
 

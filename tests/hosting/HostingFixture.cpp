@@ -55,29 +55,32 @@ std::string RawAnswer::Body() const {
   return end == std::string::npos ? "(no body)" : bytes.substr(end + 4);
 }
 
-RawAnswer RawExchange(int port, std::string_view request, int patienceMs) {
-  RawAnswer answer;
-  const int socket = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+FileHandle Connected(int port, int patienceMs) {
+  FileHandle socket(::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0));
   const timeval patience{patienceMs / 1000, (patienceMs % 1000) * 1000};
-  setsockopt(socket, SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
-  setsockopt(socket, SOL_SOCKET, SO_SNDTIMEO, &patience, sizeof patience);
+  setsockopt(socket.Get(), SOL_SOCKET, SO_RCVTIMEO, &patience, sizeof patience);
+  setsockopt(socket.Get(), SOL_SOCKET, SO_SNDTIMEO, &patience, sizeof patience);
   sockaddr_in address{};
   address.sin_family = AF_INET;
   address.sin_port = htons(static_cast<std::uint16_t>(port));
   address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-  if (connect(socket, reinterpret_cast<const sockaddr*>(&address), sizeof address) == 0) {
-    while (!request.empty()) {
-      const ssize_t sent = send(socket, request.data(), request.size(), MSG_NOSIGNAL);
-      if (sent <= 0) break;
-      request.remove_prefix(static_cast<std::size_t>(sent));
-    }
-    std::array<char, 65536> block;
-    ssize_t got = 0;
-    while ((got = recv(socket, block.data(), block.size(), 0)) > 0)
-      answer.bytes.append(block.data(), static_cast<std::size_t>(got));
-    answer.isReset = got < 0 && errno == ECONNRESET;
+  if (connect(socket.Get(), reinterpret_cast<const sockaddr*>(&address), sizeof address) != 0) return {};
+  return socket;
+}
+
+RawAnswer RawExchange(int port, std::string_view request, int patienceMs) {
+  RawAnswer answer;
+  const FileHandle socket = Connected(port, patienceMs);
+  while (!request.empty()) {
+    const ssize_t sent = send(socket.Get(), request.data(), request.size(), MSG_NOSIGNAL);
+    if (sent <= 0) break;
+    request.remove_prefix(static_cast<std::size_t>(sent));
   }
-  close(socket);
+  std::array<char, 65536> block;
+  ssize_t got = 0;
+  while ((got = recv(socket.Get(), block.data(), block.size(), 0)) > 0)
+    answer.bytes.append(block.data(), static_cast<std::size_t>(got));
+  answer.isReset = got < 0 && errno == ECONNRESET;
   return answer;
 }
 

@@ -13,6 +13,7 @@
 #include <utility>
 #include <vector>
 
+#include "hosting/Files.h"
 #include "hosting/Options.h"
 #include "hosting/Server.h"
 #include "service/Reply.h"
@@ -58,6 +59,9 @@ struct RawAnswer {
   int Status() const;
   std::string Body() const;
 };
+
+// A connection to the server, with the longest wait for a byte.
+FileHandle Connected(int port, int patienceMs = 5000);
 
 // Sends the bytes and reads to the end; `patience` is the longest wait for a byte.
 RawAnswer RawExchange(int port, std::string_view request, int patienceMs = 5000);

@@ -1,7 +1,12 @@
 // What only plain sockets show: targets, heads, connections that stay open, and answers that are spoilt.
+#include <sys/eventfd.h>
+#include <sys/socket.h>
+
 #include <chrono>
+#include <thread>
 
 #include "HostingFixture.h"
+#include "hosting/Connection.h"
 
 namespace tarnwick::hosting {
 namespace {
@@ -256,6 +261,39 @@ TEST_F(WireTest, StalledAndIdleConnectionsHoldUpNeitherClientsNorTheEnd) {
   End();
   waiting.join();
   EXPECT_LT(Clock::now() - start, std::chrono::seconds(3));
+}
+
+TEST_F(WireTest, ClientsThatAreSilentOrTrickleShutNobodyOut) {
+  std::vector<FileHandle> slow;
+  for (int i = 0; i < 100; ++i) {
+    slow.push_back(Connected(Port()));
+    if (i % 2 == 0) send(slow.back().Get(), "POST ", 5, MSG_NOSIGNAL);
+  }
+  EXPECT_EQ(Client().AskFor("HardLimit", "HardLimit", {{"ProductID", "1"}}), "1000");
+}
+
+TEST(ConnectionTest, AHeadHasItsTimeAndABodyTakesAsLongAsItArrives) {
+  for (const bool isHeadRead : {false, true}) {
+    int ends[2];
+    ASSERT_EQ(socketpair(AF_UNIX, SOCK_STREAM | SOCK_CLOEXEC, 0, ends), 0);
+    const FileHandle client(ends[1]);
+    const FileHandle stop(eventfd(0, EFD_CLOEXEC));
+    Connection connection(ends[0], stop.Get());
+    std::thread trickle([&] {
+      for (int i = 0; i < 30; ++i) {
+        send(client.Get(), "x", 1, MSG_NOSIGNAL);
+        std::this_thread::sleep_for(std::chrono::milliseconds(20));
+      }
+      shutdown(client.Get(), SHUT_WR);
+    });
+    EXPECT_TRUE(connection.AwaitRequest(200));
+    if (isHeadRead) connection.EndHead();
+    int got = 0;
+    for (char byte; connection.read(&byte, 1) > 0;) ++got;
+    EXPECT_EQ(got == 30, isHeadRead) << got;
+    EXPECT_EQ(connection.IsOver(), !isHeadRead);
+    trickle.join();
+  }
 }
 
 TEST(OptionsTest, BadOptionsAreToldApartFromGoodOnes) {
