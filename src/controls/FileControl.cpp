@@ -26,6 +26,9 @@ FileControl::Operation::Operation(FileControl& control)
 
 FileControl::Operation::~Operation() {
   control_.operation_ = outer_;
+  // What nobody foresaw, such as a lack of memory.
+  if (ftpError_ == ftp_error::kSuccess && std::uncaught_exceptions() > exceptions_)
+    ftpError_ = ftp_error::kAborted;
   control_.m_LastError = ftpError_;
   control_.m_strLastErrorDesc = std::move(description_);
 }
@@ -244,17 +247,13 @@ bool FileControl::SendFile(CFileUpload& client, const Text& path) {
 }
 
 void FileControl::FailUpload(CFileUpload& client, const Text& path, std::int32_t number) {
-  const bool lost = number == acceptor::kUnspecified;
-  if (lost && IsStopped()) {
-    copies_.AbandonUpload();
-    return FailStopped();
-  }
   // Whether the file is there is not known when the answer was lost.
-  if (lost) {
+  if (number == acceptor::kUnspecified) {
     copies_.LoseUpload(path);
   } else {
     copies_.AbandonUpload();
   }
+  if (number == error::kInterrupted) return FailStopped();
   // The watchdog has told why.
   if (uploadTimedOut_) return;
   if (number == error::kFileNotFound)
@@ -304,9 +303,9 @@ bool FileControl::IsTooLarge(CFileUpload& client, const Text& path) const {
     const Text product = TextFromNumber(session.productNumber);
     const auto used = client.GetTotalUsedQuota(product, session.userName);
     const double size = static_cast<double>(apartment_.platform.files.Length(path));
-    // The file takes the place of its old bytes.
-    large =
-        used && *used + size - (same ? same->FileSize : 0) > client.GetMaxQuota(product, session.userName);
+    const double most = client.GetMaxQuota(product, session.userName);
+    // The file takes the place of its old bytes. Nobody knows when the service does not tell.
+    large = used && most > 0 && *used + size - (same ? same->FileSize : 0) > most;
   });
 }
 

@@ -8,6 +8,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <exception>
 #include <functional>
 #include <memory>
 #include <optional>
@@ -339,6 +340,7 @@ class FileControl::Operation {
   FileControl& control_;
   // What runs around it; null when nothing does.
   Operation* const outer_;
+  const int exceptions_ = std::uncaught_exceptions();
   std::int32_t ftpError_ = ftp_error::kSuccess;
   Text description_;
 };

@@ -15,6 +15,7 @@ inline constexpr std::int32_t kOverflow = 6;
 inline constexpr std::int32_t kSubscriptOutOfRange = 9;
 inline constexpr std::int32_t kDivisionByZero = 11;
 inline constexpr std::int32_t kTypeMismatch = 13;
+inline constexpr std::int32_t kInterrupted = 18;
 inline constexpr std::int32_t kFileNotFound = 53;
 inline constexpr std::int32_t kFileAlreadyExists = 58;
 inline constexpr std::int32_t kPathAccess = 75;

@@ -63,7 +63,12 @@ class UploadBody : public BodySource {
     return filled;
   }
 
-  bool IsWanted() const override { return events_.IsWanted(); }
+  bool IsWanted() const override {
+    if (!events_.IsWanted()) wasUnwanted_ = true;
+    return !wasUnwanted_;
+  }
+  // Whether the transport was told to stop, which it is only while it can.
+  bool WasUnwanted() const { return wasUnwanted_; }
 
   void Sent(std::uint64_t sent) override {
     // Of the file alone: the fields around it are no progress that a user would see.
@@ -119,6 +124,7 @@ class UploadBody : public BodySource {
   std::uint64_t position_ = 0;
   std::int32_t percent_ = -1;
   bool started_ = false;
+  mutable bool wasUnwanted_ = false;
 };
 
 }  // namespace
@@ -141,8 +147,9 @@ void UploadObject::UploadFile(TextView localPath, TextView usersBaseUrl, TextVie
   post.contentType = contentType;
   events.Initializing();
   events.Connecting();
-  if (!events.IsWanted()) throw RuntimeError(acceptor::kUnspecified);
+  if (!events.IsWanted()) throw RuntimeError(error::kInterrupted);
   const auto answer = platform_.http.PostStream(post, body, kMostAcceptorAnswerBytes);
+  if (body.WasUnwanted()) throw RuntimeError(error::kInterrupted);
   events.ServerProcess();
   const std::int32_t number = ErrorNumberOf(answer);
   if (number == 0 || number == acceptor::kNothingChanged) events.UploadComplete();

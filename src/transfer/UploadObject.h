@@ -12,8 +12,9 @@ class UploadObject : public Uploader {
   explicit UploadObject(const Platform& platform) : platform_(platform) {}
 
   // Streams the file, whatever its size up to 4 GiB, and pumps messages meanwhile. Throws 53 when there is no
-  // such file, 75 when it cannot be read or changes its length meanwhile, the page's error number, or
-  // acceptor::kUnspecified when there is no usable answer or the upload was not wanted any more.
+  // such file, 75 when it cannot be read or changes its length meanwhile, 18 when it was not wanted any more
+  // before its last byte had left, the page's error number, or acceptor::kUnspecified when there is no usable
+  // answer.
   void UploadFile(TextView localPath, TextView usersBaseUrl, TextView acceptorPath, std::int32_t flag,
                   TextView user, TextView password, TextView productGuid, UploadEvents& events) override;
 

@@ -109,7 +109,7 @@ TEST_F(ListImageUpload, Outcomes) {
 // An upload as the component makes it, which ends when it is not wanted any more before the last byte.
 void StoppableUpload(UploadEvents& events) {
   const auto goOn = [&] {
-    if (!events.IsWanted()) throw RuntimeError(acceptor::kUnspecified);
+    if (!events.IsWanted()) throw RuntimeError(error::kInterrupted);
   };
   events.Connecting();
   goOn();
@@ -170,6 +170,10 @@ TEST_F(ListImageUpload, TellsWhyItFailed) {
     EXPECT_FALSE(control.UploadImage(path));
     return std::to_string(control.m_LastError) + " " + Utf8FromText(control.m_strLastErrorDesc);
   };
+  // An answer that is lost after a stop came too late is no stop.
+  const auto late = [&](UploadEvents&) { control.mobjFileupload->AbortFileTransfer(true); };
+  uploader.script = late;
+  EXPECT_EQ(fails(u"C:\\a.jpg", acceptor::kUnspecified).substr(0, 3), "43 ");
   const struct {
     TextView path;
     std::int32_t error;
@@ -182,6 +186,7 @@ TEST_F(ListImageUpload, TellsWhyItFailed) {
       {u"C:\\new.jpg", -2147220881, "1000", "57 The account has a file of that name. (-2147220881)"},
       {u"C:\\a#.jpg", -2147220881, "1000", "57 The file's name is not allowed. (-2147220881)"},
       {u"C:\\a.jpg", -2147220881, "949", "56 The account is full. (-2147220881)"},
+      {u"C:\\a.jpg", -2147220881, "0", "57 The file's name is not allowed. (-2147220881)"},
       {u"C:\\a.jpg", -2147220881, "950", "57 The file's name is not allowed. (-2147220881)"},
       {u"C:\\NEW.jpg", -2147220881, "800", "57 The account has a file of that name. (-2147220881)"},
       {u"C:\\a.jpg", -2147220878, "", "52 The server refused the user name or the password. (-2147220878)"},
