@@ -5,7 +5,6 @@
 #include <winhttp.h>
 
 #include <algorithm>
-#include <array>
 #include <atomic>
 #include <charconv>
 #include <limits>
@@ -348,12 +347,17 @@ bool Request::SendBody() {
 }
 
 std::optional<std::wstring> Request::Header(DWORD which) const {
-  std::array<wchar_t, 64> value{};
-  DWORD size = sizeof value;
-  if (!WinHttpQueryHeaders(request_.Get(), which, WINHTTP_HEADER_NAME_BY_INDEX, value.data(), &size,
-                           WINHTTP_NO_HEADER_INDEX))
-    return std::nullopt;
-  return std::wstring(value.data());
+  std::wstring value;
+  DWORD size = 0;
+  const auto query = [&](wchar_t* room) {
+    return WinHttpQueryHeaders(request_.Get(), which, WINHTTP_HEADER_NAME_BY_INDEX, room, &size,
+                               WINHTTP_NO_HEADER_INDEX);
+  };
+  if (query(nullptr) || GetLastError() != ERROR_INSUFFICIENT_BUFFER) return std::nullopt;
+  value.resize(size / sizeof(wchar_t));
+  if (!query(value.data())) return std::nullopt;
+  value.resize(size / sizeof(wchar_t));
+  return value;
 }
 
 // The announced length of the body, if there is one.
@@ -396,10 +400,11 @@ bool Request::ReadBody(std::size_t maxBytes) {
     if (exchange_->count == 0) break;
     used += exchange_->count;
   }
-  // The chunk that is the last one ends the answer before the connection ends. Not every version of the
-  // system tells an answer without it from a whole one.
+  // The chunk that is the last one ends the answer before the connection ends, and an empty line its head.
+  // Not every version of the system tells an answer without it from a whole one.
   const bool cut = exchange_->ended && Header(WINHTTP_QUERY_TRANSFER_ENCODING);
   if (announced || cut || used > maxBytes) return false;
+  if (used == 0 && !Header(WINHTTP_QUERY_RAW_HEADERS_CRLF).value_or(L"").ends_with(L"\r\n\r\n")) return false;
   body.resize(used);
   return true;
 }

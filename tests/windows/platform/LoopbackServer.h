@@ -114,10 +114,16 @@ class LoopbackServer {
       const linger now{1, 0};
       setsockopt(peer, SOL_SOCKET, SO_LINGER, reinterpret_cast<const char*>(&now), sizeof now);
     } else if (answer.end == End::kSilence) {
-      // Until the client gives up: it ends the connection, or its test is done. Reading what of its request
-      // was not read would be no silence.
+      // Until the client gives up: it ends the connection, or its test is done. What of its request was not
+      // read is read only then, before which it would be no silence.
       const bool reads = answer.reads == std::numeric_limits<std::size_t>::max();
       for (int i = 0; i < 500 && !done_ && !(reads && Ready(peer, 0)); ++i) Sleep(10);
+      char buffer[32 * 1024];
+      while (!reads && Ready(peer, 500)) {
+        const int received = recv(peer, buffer, sizeof buffer, 0);
+        if (received <= 0) break;
+        requests_.back().append(buffer, static_cast<std::size_t>(received));
+      }
     }
   }
 

@@ -188,7 +188,6 @@ TEST(WindowsStreamSocket, WaitsForASilentPeerAtNoCost) {
 // --- Streamed posts ---
 
 struct Source : BodySource {
-  bool IsWanted() const override { return true; }
   explicit Source(std::uint64_t itsLength) : length(itsLength) {}
   std::uint64_t length;
   std::uint64_t position = 0;
@@ -196,6 +195,9 @@ struct Source : BodySource {
   std::uint64_t failsAt = std::numeric_limits<std::uint64_t>::max();
   std::size_t largestRoom = 0;
   std::vector<std::uint64_t> told;
+  // From when so many bytes have left, it is not wanted.
+  std::uint64_t wantedTo = std::numeric_limits<std::uint64_t>::max();
+  bool wanted = true;
   DWORD thread = GetCurrentThreadId();
 
   std::uint64_t Length() const override { return length; }
@@ -212,7 +214,9 @@ struct Source : BodySource {
   void Sent(std::uint64_t sent) override {
     EXPECT_EQ(GetCurrentThreadId(), thread);
     told.push_back(sent);
+    if (sent >= wantedTo) wanted = false;
   }
+  bool IsWanted() const override { return wanted; }
 };
 
 std::optional<HttpAnswer> Stream(std::uint16_t port, Source& source, std::uint32_t silenceMs = 5000) {
@@ -312,6 +316,72 @@ TEST(PostStream, EndsWithItsSourceAndWithAQuitMessage) {
   ASSERT_TRUE(PeekMessageW(&message, nullptr, WM_QUIT, WM_QUIT, PM_REMOVE));
   EXPECT_EQ(message.wParam, WPARAM{7});
   EXPECT_EQ(ownedObjects, owned);
+}
+
+TEST(PostStream, EndsWhenItsSourceIsNotWanted) {
+  const struct {
+    const char* name;
+    LoopbackServer::Answer answer;
+    std::uint64_t wantedTo;
+    bool answered;
+  } rows[] = {
+      {"before the first byte", {kOk}, 0, false},
+      {"in the body", {kOk}, kLarge / 2, false},
+      {"in a message, to a peer that reads no more", {"", End::kSilence, 100'000}, kLarge, false},
+      {"after the last byte", {kOk}, kLarge, true},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.name);
+    LoopbackServer server({row.answer});
+    Source source(kLarge);
+    source.wantedTo = row.wantedTo;
+    WindowsTimer timer;
+    timer.SetHandler([&] { source.wanted = false; });
+    if (row.answer.end == End::kSilence) timer.Start(300);
+    const DWORD begin = GetTickCount();
+    EXPECT_EQ(Stream(server.Port(), source).has_value(), row.answered);
+    // Of a time-out of 5 s.
+    EXPECT_LT(GetTickCount() - begin, 4000U);
+    timer.Stop();
+    const std::string& request = server.Requests().at(0);
+    EXPECT_EQ(request.size() - request.find("\r\n\r\n") - 4 == kLarge, row.answered) << request.size();
+  }
+}
+
+// A server whose queue is full answers nothing to who connects.
+TEST(PostStream, GivesUpAnAddressThatSwallowsPackets) {
+  LoopbackServer winsock({});
+  const SOCKET full = socket(AF_INET, SOCK_STREAM, 0);
+  sockaddr_in address{};
+  address.sin_family = AF_INET;
+  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+  int size = sizeof address;
+  ASSERT_EQ(bind(full, reinterpret_cast<sockaddr*>(&address), size), 0);
+  ASSERT_EQ(listen(full, 1), 0);
+  ASSERT_EQ(getsockname(full, reinterpret_cast<sockaddr*>(&address), &size), 0);
+  std::vector<SOCKET> waiting(8);
+  for (SOCKET& client : waiting) {
+    client = socket(AF_INET, SOCK_STREAM, 0);
+    unsigned long on = 1;
+    ioctlsocket(client, FIONBIO, &on);
+    connect(client, reinterpret_cast<const sockaddr*>(&address), size);
+  }
+  WindowsHttpTransport http(500, 30'000);
+  HttpPost post;
+  post.host = u"127.0.0.1";
+  post.port = ntohs(address.sin_port);
+  post.target = "/";
+  post.body = "a=1";
+  for (const bool streamed : {false, true}) {
+    Source source(3);
+    const DWORD begin = GetTickCount();
+    EXPECT_FALSE(streamed ? http.PostStream(post, source, 1000) : http.Post(post, 1000));
+    const DWORD took = GetTickCount() - begin;
+    EXPECT_GE(took, 450U) << streamed;
+    EXPECT_LT(took, 2000U) << streamed;
+  }
+  for (const SOCKET client : waiting) closesocket(client);
+  closesocket(full);
 }
 
 }  // namespace
