@@ -45,8 +45,9 @@ class BodySource {
   // Told when `sent` bytes have left, first with 0 before the first one. May pump messages.
   virtual void Sent(std::uint64_t sent) = 0;
 
-  // Whether the rest of the body is still to be sent. Asked after each message that was handled, until the
-  // last byte was handed to the system; from then on the post is carried out, whatever this says.
+  // Whether the rest of the body is still to be sent. Asked after each Sent, each Read and each message that
+  // was handled, and once more when all but a small last piece has left. From when that piece is handed to
+  // the system, the post is carried out, whatever this says.
   virtual bool IsWanted() const = 0;
 };
 
@@ -56,8 +57,9 @@ class HttpTransport {
 
   // The same as Post with the body from `source` (post.body is empty), which is called on the calling thread.
   // Handles messages while it waits, so that windows are painted even when the server is silent. A quit
-  // message ends it with nullopt, and so does a source that is not wanted any more: the server has not got
-  // the whole body then. What the source throws ends it too, and is passed on.
+  // message ends it with nullopt, and so does a source that is not wanted any more: the connection is closed
+  // at once, and the server has not got the whole body then. What the source throws ends it too, and is
+  // passed on.
   virtual std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source,
                                                std::size_t maxBodyBytes) = 0;
 

@@ -15,9 +15,9 @@ struct InternetKind {
 };
 using InternetOwner = Owner<InternetKind>;
 
-// Sets the time-outs, in milliseconds, of a session (inherited by what it opens) or of one request. A version
-// of the system that lacks one of them ignores it; then a peer that never answers the connection costs what
-// TCP itself takes to give up.
+// Sets the time-outs, in milliseconds, of a session, which what it opens inherits. A version of the system
+// that lacks one of them ignores it; then a peer that never answers the connection costs what TCP itself
+// takes to give up.
 inline void SetTimeouts(HINTERNET handle, std::uint32_t connectMs, std::uint32_t silenceMs) {
   const auto set = [&](DWORD option, DWORD value) {
     InternetSetOptionW(handle, option, &value, sizeof value);

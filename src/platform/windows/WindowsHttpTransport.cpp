@@ -223,7 +223,7 @@ void Request::Open(const HttpPost& post) {
   const std::wstring host = WideFromText(post.host);
   const std::wstring target = WideFromAscii(post.target);
   session_ = OpenSession(L"http://" + host + L":" + std::to_wstring(post.port) + target);
-  if (!session_) return;
+  if (!session_ || !exchange_->told) return;
   // What is left behind ends by these.
   WinHttpSetTimeouts(session_.Get(), static_cast<int>(waiting_.connectMs),
                      static_cast<int>(waiting_.connectMs), static_cast<int>(waiting_.silenceMs),

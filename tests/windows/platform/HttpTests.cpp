@@ -5,6 +5,7 @@
 #include <winhttp.h>
 
 #include "platform/windows/Owner.h"
+#include "platform/windows/UserProxy.h"
 #include "platform/windows/WindowsHttpTransport.h"
 
 namespace tarnwick {
@@ -14,12 +15,12 @@ using End = LoopbackServer::End;
 
 constexpr std::size_t kBound = 20;
 
-std::optional<HttpAnswer> PostTo(std::uint16_t port, std::string target = "/",
-                                 std::string_view body = "a=1") {
+std::optional<HttpAnswer> PostTo(std::uint16_t port, std::string target = "/", std::string_view body = "a=1",
+                                 Text host = u"127.0.0.1") {
   // Short time-outs, so that the silent cases end soon.
   WindowsHttpTransport http(5000, 1000);
   HttpPost post;
-  post.host = u"127.0.0.1";
+  post.host = std::move(host);
   post.port = port;
   post.target = std::move(target);
   post.contentType = "application/x-www-form-urlencoded; charset=utf-8";
@@ -137,6 +138,31 @@ TEST(WindowsHttpTransport, HasAConnectionForEachPost) {
   }
   ASSERT_EQ(server.Requests().size(), 4U);
   for (int i = 1; i < 4; ++i) EXPECT_EQ(server.Requests()[i].substr(0, 5), "POST ") << i;
+}
+
+TEST(WindowsHttpTransport, GoesThroughTheUsersProxy) {
+  const struct {
+    const wchar_t* list;
+    const wchar_t* server;
+  } lists[] = {{L"", L""},
+               {L"a:1", L"a:1"},
+               {L"http=a:1", L"a:1"},
+               {L"a:1;HTTP=b:2 https=c:3", L"b:2"},
+               {L"ftp=a:1;https=b:2", L""}};
+  for (const auto& row : lists) EXPECT_EQ(HttpProxyOf(row.list), row.server) << row.list;
+
+  LoopbackServer server({{"HTTP/1.1 200 OK\r\nContent-Length: 2\r\n\r\nok"}});
+  constexpr wchar_t kKey[] = L"Software\\Microsoft\\Windows\\CurrentVersion\\Internet Settings";
+  const auto set = [&](DWORD enabled, const std::wstring& list) {
+    RegSetKeyValueW(HKEY_CURRENT_USER, kKey, L"ProxyEnable", REG_DWORD, &enabled, sizeof enabled);
+    RegSetKeyValueW(HKEY_CURRENT_USER, kKey, L"ProxyServer", REG_SZ, list.c_str(),
+                    static_cast<DWORD>((list.size() + 1) * sizeof(wchar_t)));
+  };
+  set(1, L"ftp=127.0.0.1:1;http=127.0.0.1:" + std::to_wstring(server.Port()));
+  EXPECT_TRUE(PostTo(8080, "/a?b", "a=1", u"pictures.invalid"));
+  set(0, L"");
+  EXPECT_TRUE(server.Requests().at(0).starts_with("POST http://pictures.invalid:8080/a?b HTTP/1.1\r\n"))
+      << server.Requests()[0];
 }
 
 TEST(WindowsHttpTransport, FailsWhenNobodyListens) {
