@@ -22,9 +22,12 @@ namespace {
 
 constexpr std::size_t kFirstRoom = 16 * 1024;
 
-// Bytes of a body that are handed over at a time. A peer that takes less within the time-out counts as
-// silent, because the system does not tell what of a piece has left.
-constexpr std::uint64_t kPiece = 64 * 1024;
+// Bytes of a body that are handed over at a time: more while that takes less than kQuickMs, because each
+// hand-over costs as much as sending a few KiB. The system does not tell what of a piece has left, so a peer
+// that takes less than one within the time-out counts as silent.
+constexpr std::uint64_t kLeastPiece = 64 * 1024;
+constexpr std::uint64_t kMostPiece = 256 * 1024;
+constexpr ULONGLONG kQuickMs = 1000;
 // Bytes of the last piece, without which a server does not have the body. It holds the end mark of a form.
 constexpr std::uint64_t kLastPiece = 1024;
 
@@ -314,10 +317,11 @@ bool Request::Done(DWORD expected, Call&& call) {
 bool Request::SendBody() {
   const std::uint64_t step = std::clamp(length_ / 100, kLeastStep, kMostStep);
   std::string next;
+  std::uint64_t most = kLeastPiece;
   std::uint64_t read = 0;
   const auto readNext = [&] {
     const std::uint64_t left = length_ - read;
-    next.resize(static_cast<std::size_t>(left > kLastPiece ? std::min(kPiece, left - kLastPiece) : left));
+    next.resize(static_cast<std::size_t>(left > kLastPiece ? std::min(most, left - kLastPiece) : left));
     read += next.size();
     return source_.Read(next) == next.size();
   };
@@ -329,15 +333,15 @@ bool Request::SendBody() {
     if (!source_.IsWanted()) return false;
     exchange_->piece.swap(next);
     const std::string& piece = exchange_->piece;
-    bool readOn = true;
     givesUp_ = read < length_;
+    const ULONGLONG begin = GetTickCount64();
     const bool left = Done(WINHTTP_CALLBACK_STATUS_WRITE_COMPLETE, [&] {
       if (!WinHttpWriteData(request_.Get(), piece.data(), static_cast<DWORD>(piece.size()), nullptr))
         return false;
-      if (read < length_) readOn = readNext();
-      return readOn;
+      return read == length_ || readNext();
     });
     if (!left) return false;
+    most = GetTickCount64() - begin < kQuickMs ? kMostPiece : kLeastPiece;
     sent += piece.size();
     if (sent - told < step && sent < length_) continue;
     source_.Sent(sent);
