@@ -38,6 +38,9 @@ constexpr std::uint64_t kMostStep = 1024 * 1024;
 // How long a request that was given up may take to end, before it is left behind.
 constexpr DWORD kGraceMs = 200;
 
+// More than anybody leaves open to one server.
+constexpr int kMostOldConnections = 100;
+
 struct HttpKind {
   using Handle = HINTERNET;
   static Handle None() { return nullptr; }
@@ -431,12 +434,13 @@ std::optional<HttpAnswer> Exchanged(const HttpPost& post, BodySource& source, st
                                     const Waiting& waiting) {
   // The system counts in 32 bits.
   if (source.Length() > std::numeric_limits<DWORD>::max()) return std::nullopt;
-  for (;;) {
+  for (int tries = 0;; ++tries) {
     Request request(post, source, waiting);
     const bool sent = request.SendHead();
     // In some versions of the system all of the process share the connections that are kept. The head alone
-    // is no post, so another connection can be tried; this one is closed.
-    if (request.IsOnOldConnection() && source.Length() > 0) continue;
+    // is no post, so another connection can be tried; this one is closed. A system that tells of no
+    // connection at all would go on for ever.
+    if (request.IsOnOldConnection() && source.Length() > 0 && tries < kMostOldConnections) continue;
     if (!sent || !request.SendBody()) return std::nullopt;
     return request.Receive(maxBodyBytes);
   }
