@@ -51,6 +51,7 @@ bool WindowsListView::MakeChildren() {
 
 void WindowsListView::WindowGone() {
   list_ = label_ = nullptr;
+  buttons_ = 0;
 }
 
 void WindowsListView::ApplyLook() {
@@ -302,9 +303,16 @@ std::optional<LRESULT> WindowsListView::OnListMessage(UINT message, WPARAM wPara
   // The user's handlers come last, or nothing of this object is touched after them.
   switch (message) {
     case WM_LBUTTONDOWN:
-    case WM_RBUTTONDOWN:
+    case WM_RBUTTONDOWN: {
+      const HWND outer = Outer();
+      ++buttons_;
       user_.ButtonPressed();
-      return std::nullopt;
+      if (!IsAlive(this, outer)) return std::nullopt;
+      const LRESULT result = DefSubclassProc(list_, message, wParam, lParam);
+      // Of buttons one inside the other the first one tells, when the list has done with all.
+      if (IsAlive(this, outer) && --buttons_ == 0) user_.ButtonDone();
+      return result;
+    }
     case WM_GETDLGCODE: {
       // Of a form that handles its keys as a dialog does, Enter would press the default button.
       const auto* const key = reinterpret_cast<const MSG*>(lParam);

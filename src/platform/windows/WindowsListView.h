@@ -27,7 +27,9 @@ class ListViewUser {
   // A key was pressed, and the list has done with it what lists do.
   virtual void KeyPressed(int key) = 0;
   virtual void EnterPressed() = 0;
+  // The left or the right button goes down on the list, and the list has done with it what lists do.
   virtual void ButtonPressed() = 0;
+  virtual void ButtonDone() = 0;
   virtual void Clicked() = 0;
   virtual void DoubleClicked() = 0;
   // Whether the label may be edited, and whether the edited text stands.
@@ -89,6 +91,8 @@ class WindowsListView : public ListView, public ControlWindow {
   bool listShown_ = true;
   bool multiple_ = false;
   Text labelText_;
+  // Buttons that the list is busy with: it may handle messages of its own until a button is up.
+  int buttons_ = 0;
 };
 
 }  // namespace tarnwick

@@ -113,6 +113,10 @@ void ctrlListImageObject::EnterPressed() {
 void ctrlListImageObject::ButtonPressed() {
   const ComPtr<IUnknown> alive = KeptAlive();
   Activated();
+}
+
+void ctrlListImageObject::ButtonDone() {
+  const ComPtr<IUnknown> alive = KeptAlive();
   rules_->OnMouseButton();
 }
 

@@ -40,6 +40,7 @@ class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, priv
   void KeyPressed(int key) override;
   void EnterPressed() override;
   void ButtonPressed() override;
+  void ButtonDone() override;
   void Clicked() override;
   void DoubleClicked() override {}
   bool LabelEditBegins(std::size_t item) override;

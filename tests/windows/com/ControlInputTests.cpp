@@ -167,6 +167,33 @@ TEST(ListControl, DragsItsOwnFile) {
   const std::wstring address = L"http://" + TheServer().name + L"/users/anna.berg@example-org/" + name;
   std::wstring copy;
 
+  // A button says that nothing is selected when the list has done with it, and says it once.
+  const POINT beside = {item.x, item.y + 4 * (row.bottom - row.top)};
+  const auto press = [&](const POINT& at, bool left) {
+    form.events.clear();
+    SetCursorPos(at.x, at.y);
+    Mouse(left ? MOUSEEVENTF_LEFTDOWN : MOUSEEVENTF_RIGHTDOWN);
+    Mouse(left ? MOUSEEVENTF_LEFTUP : MOUSEEVENTF_RIGHTUP);
+    form.Pump();
+    return form.events;
+  };
+  const Lines none = {L"1015 "};
+  const Lines click = {L"1022 ", L"1015 " + address, L"1024 "};
+  const Lines clickBeside = {L"1015 ", L"1022 ", L"1024 "};
+  EXPECT_EQ(press(item, true), click);
+  EXPECT_EQ(press(beside, true), clickBeside);
+  EXPECT_EQ(press(item, false), Lines());
+  EXPECT_EQ(press(beside, false), none);
+  form.container->onActivate = [&](bool) {
+    SendMessageW(form.ListWindow(), WM_LBUTTONDOWN, 0, MAKELPARAM(row.left + 40, row.bottom + 40));
+    return S_OK;
+  };
+  SetFocus(form.frame);
+  EXPECT_EQ(form.container->Do(OLEIVERB_HIDE), S_OK);
+  EXPECT_EQ(form.container->Do(OLEIVERB_INPLACEACTIVATE), S_OK);
+  EXPECT_EQ(press(beside, true), clickBeside);
+  form.container->onActivate = {};
+
   const struct {
     bool hasCopy;
     bool byCall;  // of OLEDrag, in place of the mouse
@@ -176,7 +203,7 @@ TEST(ListControl, DragsItsOwnFile) {
     const wchar_t* told;
     std::vector<std::wstring> events;
   } rows[] = {
-      {false, false, 0, false, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1015 ", L"1021 "}},
+      {false, false, 0, false, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1021 "}},
       {true, false, 0, false, DROPEFFECT_NONE, L"start over complete:0 ", {}},
       {true, false, VK_ESCAPE, false, DROPEFFECT_COPY, L"start over complete:0 ", {}},
       {true, true, 0, false, DROPEFFECT_COPY, L"start over drop complete:1 ", {L"1021 "}},
@@ -255,13 +282,7 @@ TEST(ListControl, DragsItsOwnFile) {
     form.Pump();
 
     // The list is as before: a click is a click, so far away that it is no double click.
-    SetCursorPos(item.x + 25, item.y);
-    Mouse(MOUSEEVENTF_LEFTDOWN);
-    form.Pump();
-    form.events.clear();
-    Mouse(MOUSEEVENTF_LEFTUP);
-    form.Pump();
-    EXPECT_EQ(form.events, (std::vector<std::wstring>{L"1022 ", L"1015 " + address, L"1024 "}));
+    EXPECT_EQ(press({item.x + 25, item.y}, true), click);
   }
   EXPECT_EQ(Contents(copy), Contents(L"demo\\pictures\\wizard.gif"));
   DeleteFileW(copy.c_str());
