@@ -189,6 +189,12 @@ void ControlContainer::AmbientChanged(DISPID property) {
     control->OnAmbientPropertyChange(property);
 }
 
+void ControlContainer::Abandon() {
+  active_ = {};
+  object_ = {};
+  control_ = {};
+}
+
 ULONG ControlContainer::Close() {
   if (!control_) return 0;
   const ComPtr<ControlContainer> alive(this);
@@ -231,6 +237,7 @@ STDMETHODIMP_(ULONG) ControlContainer::Release() {
 // --- IOleClientSite ---
 
 STDMETHODIMP ControlContainer::SaveObject() {
+  Called("SaveObject");
   return E_NOTIMPL;
 }
 
@@ -242,6 +249,11 @@ STDMETHODIMP ControlContainer::GetMoniker(DWORD, DWORD, IMoniker** moniker) {
 STDMETHODIMP ControlContainer::GetContainer(IOleContainer** container) {
   *container = nullptr;
   return E_NOINTERFACE;
+}
+
+STDMETHODIMP ControlContainer::ShowObject() {
+  Called("ShowObject");
+  return S_OK;
 }
 
 STDMETHODIMP ControlContainer::OnShowWindow(BOOL) {
@@ -263,6 +275,7 @@ STDMETHODIMP ControlContainer::ContextSensitiveHelp(BOOL) {
 STDMETHODIMP ControlContainer::OnInPlaceActivate() {
   if (inPlace_) Violation("OnInPlaceActivate twice");
   inPlace_ = true;
+  Called("OnInPlaceActivate");
   const HRESULT agreed = onActivate ? onActivate(false) : S_OK;
   if (FAILED(agreed)) inPlace_ = false;
   return agreed;
@@ -270,6 +283,7 @@ STDMETHODIMP ControlContainer::OnInPlaceActivate() {
 
 STDMETHODIMP ControlContainer::OnUIActivate() {
   if (!inPlace_) Violation("OnUIActivate before OnInPlaceActivate");
+  Called("OnUIActivate");
   return onActivate ? onActivate(true) : S_OK;
 }
 
@@ -291,10 +305,12 @@ STDMETHODIMP ControlContainer::Scroll(SIZE) {
 }
 
 STDMETHODIMP ControlContainer::OnUIDeactivate(BOOL) {
+  Called("OnUIDeactivate");
   return S_OK;
 }
 
 STDMETHODIMP ControlContainer::OnInPlaceDeactivate() {
+  Called("OnInPlaceDeactivate");
   if (!inPlace_) Violation("OnInPlaceDeactivate without OnInPlaceActivate");
   inPlace_ = false;
   return S_OK;
@@ -321,6 +337,7 @@ STDMETHODIMP ControlContainer::SetBorderSpace(LPCBORDERWIDTHS widths) {
 
 STDMETHODIMP ControlContainer::SetActiveObject(IOleInPlaceActiveObject* object, LPCOLESTR) {
   active_ = ComPtr<IOleInPlaceActiveObject>(object);
+  Called("SetActiveObject");
   return S_OK;
 }
 
@@ -368,6 +385,7 @@ STDMETHODIMP ControlContainer::TranslateAccelerator(MSG* message, DWORD modifier
 }
 
 STDMETHODIMP ControlContainer::OnFocus(BOOL got) {
+  Called("OnFocus");
   hasFocus_ = got != FALSE;
   return S_OK;
 }
@@ -399,6 +417,7 @@ STDMETHODIMP ControlContainer::GetIDsOfNames(REFIID, LPOLESTR*, UINT, LCID, DISP
 STDMETHODIMP ControlContainer::Invoke(DISPID property, REFIID, LCID, WORD, DISPPARAMS*, VARIANT* result,
                                       EXCEPINFO*, UINT*) {
   if (!result) return E_POINTER;
+  Called("Ambient");
   VariantInit(result);
   switch (property) {
     case DISPID_AMBIENT_FONT:

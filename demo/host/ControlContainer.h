@@ -63,6 +63,9 @@ class ControlContainer final : public IOleClientSite,
   std::function<bool(const MSG& message, DWORD modifiers)> onKey;
   // Runs when the control is activated in place and when it gets the keyboard; a failure refuses that.
   std::function<HRESULT(bool ui)> onActivate;
+  // Runs first in each call of the control that tells the container something or asks for something of its
+  // own.
+  std::function<void(const char* call)> onCall;
   // Persisted properties that the control said to have changed.
   std::vector<DISPID> changed;
   // Calls that no container must get, in words.
@@ -79,6 +82,8 @@ class ControlContainer final : public IOleClientSite,
   bool TranslateKey(MSG& message);
   // Tells the control that an ambient property has changed.
   void AmbientChanged(DISPID property);
+  // Lets go of the control in the middle of what it does, without a word to it.
+  void Abandon();
   // Ends the control. Returns the references that it still had after the container's last one was released:
   // 0, when nobody else holds it.
   ULONG Close();
@@ -96,7 +101,7 @@ class ControlContainer final : public IOleClientSite,
   STDMETHODIMP SaveObject() override;
   STDMETHODIMP GetMoniker(DWORD assign, DWORD which, IMoniker** moniker) override;
   STDMETHODIMP GetContainer(IOleContainer** container) override;
-  STDMETHODIMP ShowObject() override { return S_OK; }
+  STDMETHODIMP ShowObject() override;
   STDMETHODIMP OnShowWindow(BOOL show) override;
   STDMETHODIMP RequestNewObjectLayout() override { return E_NOTIMPL; }
 
@@ -154,6 +159,9 @@ class ControlContainer final : public IOleClientSite,
   HRESULT Site(WayIn wayIn);
   HRESULT Connect(IUnknown* sink, REFIID interfaceId, DWORD& cookie) const;
   void Disconnect(REFIID interfaceId, DWORD cookie) const;
+  void Called(const char* call) const {
+    if (onCall) onCall(call);
+  }
   void Violation(const char* what) { violations.emplace_back(what); }
 
   HWND window_;

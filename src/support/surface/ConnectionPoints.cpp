@@ -37,6 +37,8 @@ STDMETHODIMP ConnectionPoint::GetConnectionPointContainer(IConnectionPointContai
 STDMETHODIMP ConnectionPoint::Advise(IUnknown* sink, DWORD* cookie) {
   if (!sink || !cookie) return E_POINTER;
   *cookie = 0;
+  // The sink's code may release the control.
+  const ComPtr<IConnectionPoint> alive(this);
   return Guarded([&]() -> HRESULT {
     // A host may offer its sink by the events' identifier or as a plain automation object.
     ComPtr<IUnknown> asked;

@@ -102,6 +102,8 @@ STDMETHODIMP Embedding::InitNew(IStorage* storage) {
 
 STDMETHODIMP Embedding::Load(IStorage* storage) {
   if (!storage) return E_POINTER;
+  // The storage may be the host's own, whose code may release the control.
+  const ComPtr<IPersistStorage> alive(this);
   ComPtr<IStream> stream;
   const HRESULT opened =
       storage->OpenStream(kStreamName, nullptr, STGM_READ | STGM_SHARE_EXCLUSIVE, 0, stream.Receive());
@@ -110,6 +112,7 @@ STDMETHODIMP Embedding::Load(IStorage* storage) {
 
 STDMETHODIMP Embedding::Save(IStorage* storage, BOOL sameAsLoad) {
   if (!storage) return E_POINTER;
+  const ComPtr<IPersistStorage> alive(this);
   ComPtr<IStream> stream;
   const HRESULT made = storage->CreateStream(kStreamName, STGM_CREATE | STGM_WRITE | STGM_SHARE_EXCLUSIVE, 0,
                                              0, stream.Receive());
@@ -193,11 +196,13 @@ STDMETHODIMP Embedding::DAdvise(FORMATETC* format, DWORD flags, IAdviseSink* sin
     const HRESULT made = CreateDataAdviseHolder(listeners_.Receive());
     if (FAILED(made)) return made;
   }
-  return listeners_->Advise(this, format, flags, sink, cookie);
+  const ComPtr<IDataAdviseHolder> listeners = listeners_;
+  return listeners->Advise(this, format, flags, sink, cookie);
 }
 
 STDMETHODIMP Embedding::DUnadvise(DWORD cookie) {
-  return listeners_ ? listeners_->Unadvise(cookie) : OLE_E_NOCONNECTION;
+  const ComPtr<IDataAdviseHolder> listeners = listeners_;
+  return listeners ? listeners->Unadvise(cookie) : OLE_E_NOCONNECTION;
 }
 
 STDMETHODIMP Embedding::EnumDAdvise(IEnumSTATDATA** enumerator) {

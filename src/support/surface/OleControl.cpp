@@ -18,6 +18,13 @@ bool IsContent(DWORD aspect) {
   return aspect == DVASPECT_CONTENT;
 }
 
+// Calls a method of what the call itself may replace or release, which stays until it returns. Null is not
+// called.
+template <typename Interface, typename Method, typename... Arguments>
+HRESULT CallHeld(ComPtr<Interface> called, Method method, Arguments... arguments) {
+  return called ? (called.Get()->*method)(arguments...) : S_OK;
+}
+
 // Whether a key that was pressed in a window of the control is the control's, although containers have uses
 // for it as a dialog key or an accelerator.
 bool Wants(const MSG& key) {
@@ -54,6 +61,14 @@ OleControl::OleControl(OleControlHooks& hooks, REFIID events, SIZEL extent)
 
 OleControl::~OleControl() = default;
 
+template <typename Interface>
+ComPtr<Interface> OleControl::SiteAs() const {
+  const ComPtr<IOleClientSite> site = site_;
+  ComPtr<Interface> found;
+  if (site) site->QueryInterface(__uuidof(Interface), found.ReceiveVoid());
+  return found;
+}
+
 void* OleControl::FindInterface(REFIID id) {
   if (id == IID_IOleObject) return static_cast<IOleObject*>(this);
   if (id == IID_IOleControl) return static_cast<IOleControl*>(this);
@@ -84,7 +99,7 @@ void OleControl::PropertyChanged(DISPID property) {
 }
 
 void OleControl::ViewChanged() {
-  const ComPtr<IUnknown> alive(&hooks_.Identity());
+  const ComPtr<IUnknown> alive = KeptAlive();
   embedding_.ViewChanged();
   const ComPtr<IAdviseSink> sink = viewSink_;
   if (sink && (viewAspects_ & DVASPECT_CONTENT)) {
@@ -104,9 +119,8 @@ void OleControl::LostFocus() {
 }
 
 void OleControl::TellFocus(bool focus) {
-  ComPtr<IOleControlSite> site;
-  if (std::exchange(hasFocus_, focus) == focus || !site_) return;
-  if (SUCCEEDED(site_->QueryInterface(IID_IOleControlSite, site.ReceiveVoid()))) site->OnFocus(focus);
+  if (std::exchange(hasFocus_, focus) != focus)
+    CallHeld(SiteAs<IOleControlSite>(), &IOleControlSite::OnFocus, focus);
 }
 
 STDMETHODIMP OleControl::QueryInterface(REFIID interfaceId, void** object) {
@@ -122,6 +136,7 @@ STDMETHODIMP_(ULONG) OleControl::Release() {
 // --- IOleObject ---
 
 STDMETHODIMP OleControl::SetClientSite(IOleClientSite* site) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   if (!site) InPlaceDeactivate();
   site_ = ComPtr<IOleClientSite>(site);
   if (site_)
@@ -142,9 +157,10 @@ STDMETHODIMP OleControl::SetHostNames(LPCOLESTR, LPCOLESTR) {
 }
 
 STDMETHODIMP OleControl::Close(DWORD saveOption) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   InPlaceDeactivate();
-  if (saveOption != OLECLOSE_NOSAVE && dirty_ && site_) site_->SaveObject();
-  if (adviseHolder_) adviseHolder_->SendOnClose();
+  if (saveOption != OLECLOSE_NOSAVE && dirty_) CallHeld(site_, &IOleClientSite::SaveObject);
+  CallHeld(adviseHolder_, &IOleAdviseHolder::SendOnClose);
   return S_OK;
 }
 
@@ -167,6 +183,7 @@ STDMETHODIMP OleControl::GetClipboardData(DWORD, IDataObject** data) {
 }
 
 STDMETHODIMP OleControl::DoVerb(LONG verb, LPMSG, IOleClientSite* site, LONG, HWND, LPCRECT) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   if (!site_ && site) SetClientSite(site);
   switch (verb) {
     case OLEIVERB_PRIMARY:
@@ -225,11 +242,11 @@ STDMETHODIMP OleControl::Advise(IAdviseSink* sink, DWORD* cookie) {
     const HRESULT made = CreateOleAdviseHolder(adviseHolder_.Receive());
     if (FAILED(made)) return made;
   }
-  return adviseHolder_->Advise(sink, cookie);
+  return CallHeld(adviseHolder_, &IOleAdviseHolder::Advise, sink, cookie);
 }
 
 STDMETHODIMP OleControl::Unadvise(DWORD cookie) {
-  return adviseHolder_ ? adviseHolder_->Unadvise(cookie) : OLE_E_NOCONNECTION;
+  return adviseHolder_ ? CallHeld(adviseHolder_, &IOleAdviseHolder::Unadvise, cookie) : OLE_E_NOCONNECTION;
 }
 
 STDMETHODIMP OleControl::EnumAdvise(IEnumSTATDATA** enumerator) {
@@ -262,6 +279,7 @@ STDMETHODIMP OleControl::OnMnemonic(MSG*) {
 }
 
 STDMETHODIMP OleControl::OnAmbientPropertyChange(DISPID) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   ReadAmbientValues();
   return S_OK;
 }
@@ -275,14 +293,14 @@ STDMETHODIMP OleControl::FreezeEvents(BOOL freeze) {
 }
 
 bool OleControl::Ambient(DISPID property, Variant& value) const {
-  ComPtr<IDispatch> ambient;
-  if (!site_ || FAILED(site_->QueryInterface(IID_IDispatch, ambient.ReceiveVoid()))) return false;
+  const ComPtr<IDispatch> ambient = SiteAs<IDispatch>();
   DISPPARAMS none = {};
-  return SUCCEEDED(ambient->Invoke(property, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_PROPERTYGET, &none,
-                                   &value.Get(), nullptr, nullptr));
+  return ambient && SUCCEEDED(ambient->Invoke(property, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_PROPERTYGET,
+                                              &none, &value.Get(), nullptr, nullptr));
 }
 
 void OleControl::ReadAmbientValues() {
+  const ComPtr<IOleClientSite> site = site_;
   AmbientValues values;
   const auto color = [&](DISPID property, COLORREF& result) {
     Variant value;
@@ -298,6 +316,8 @@ void OleControl::ReadAmbientValues() {
   Variant mode;
   if (Ambient(DISPID_AMBIENT_USERMODE, mode) && V_VT(&mode.Get()) == VT_BOOL)
     values.userMode = V_BOOL(&mode.Get()) != VARIANT_FALSE;
+  // The container may have let go of the control while it answered, or another one may have taken it up.
+  if (site_.Get() != site.Get()) return;
   userMode_ = values.userMode;
   hooks_.AmbientChanged(values);
   ViewChanged();
@@ -306,7 +326,6 @@ void OleControl::ReadAmbientValues() {
 // --- Activation ---
 
 HRESULT OleControl::Activate(bool withUi) {
-  const ComPtr<IUnknown> alive(&hooks_.Identity());
   const HRESULT inPlace = ActivateInPlace();
   if (FAILED(inPlace)) return inPlace;
   ShowWindow(hooks_.Window(), SW_SHOW);
@@ -314,16 +333,15 @@ HRESULT OleControl::Activate(bool withUi) {
     const HRESULT ui = ActivateUi();
     if (FAILED(ui)) return ui;
   }
-  if (site_) site_->ShowObject();
+  CallHeld(site_, &IOleClientSite::ShowObject);
   return S_OK;
 }
 
 HRESULT OleControl::ActivateInPlace() {
   if (inPlace_) return S_OK;
   if (!site_) return E_UNEXPECTED;
-  ComPtr<IOleInPlaceSite> inPlaceSite;
-  const HRESULT asked = site_->QueryInterface(IID_IOleInPlaceSite, inPlaceSite.ReceiveVoid());
-  if (FAILED(asked)) return asked;
+  const ComPtr<IOleInPlaceSite> inPlaceSite = SiteAs<IOleInPlaceSite>();
+  if (!inPlaceSite) return E_NOINTERFACE;
   if (inPlaceSite->CanInPlaceActivate() != S_OK) return E_FAIL;
 
   ComPtr<IOleInPlaceFrame> frame;
@@ -363,20 +381,21 @@ HRESULT OleControl::ActivateUi() {
     TakeFocus();
     return S_OK;
   }
+  if (!inPlace_) return E_FAIL;
   uiActive_ = true;
-  const ComPtr<IOleInPlaceSite> site = inPlaceSite_;
-  const HRESULT agreed = site->OnUIActivate();
+  const HRESULT agreed = CallHeld(inPlaceSite_, &IOleInPlaceSite::OnUIActivate);
   if (FAILED(agreed)) uiActive_ = false;
   // The container's code may have deactivated the control at once.
   if (!uiActive_) return FAILED(agreed) ? agreed : E_FAIL;
   TakeFocus();
   // So may the code of what had the focus.
   if (!uiActive_) return E_FAIL;
-  if (frame_) frame_->SetActiveObject(this, nullptr);
-  if (document_) document_->SetActiveObject(this, nullptr);
+  CallHeld(frame_, &IOleInPlaceFrame::SetActiveObject, this, nullptr);
+  if (uiActive_) CallHeld(document_, &IOleInPlaceUIWindow::SetActiveObject, this, nullptr);
+  if (!uiActive_) return E_FAIL;
   // The control has no tool bars of its own.
-  if (frame_) frame_->SetBorderSpace(nullptr);
-  if (document_) document_->SetBorderSpace(nullptr);
+  CallHeld(frame_, &IOleInPlaceFrame::SetBorderSpace, nullptr);
+  CallHeld(document_, &IOleInPlaceUIWindow::SetBorderSpace, nullptr);
   return S_OK;
 }
 
@@ -414,28 +433,30 @@ STDMETHODIMP OleControl::ContextSensitiveHelp(BOOL) {
 
 STDMETHODIMP OleControl::InPlaceDeactivate() {
   if (!inPlace_) return S_OK;
-  const ComPtr<IUnknown> alive(&hooks_.Identity());
+  const ComPtr<IUnknown> alive = KeptAlive();
   UIDeactivate();
-  inPlace_ = false;
+  // The container's code may have done the rest.
+  if (!std::exchange(inPlace_, false)) return S_OK;
+  // Before more of its code runs, which may activate the control anew.
+  const ComPtr<IOleInPlaceSite> site = std::move(inPlaceSite_);
+  frame_ = {};
+  document_ = {};
   // The window keeps what it shows, away from the container.
   hooks_.Park();
   TellFocus(false);
   // From here on the container draws what is shown now.
   ViewChanged();
-  frame_ = {};
-  document_ = {};
-  const ComPtr<IOleInPlaceSite> site = std::move(inPlaceSite_);
-  if (site) site->OnInPlaceDeactivate();
+  site->OnInPlaceDeactivate();
   return S_OK;
 }
 
 STDMETHODIMP OleControl::UIDeactivate() {
   if (!uiActive_) return S_OK;
-  const ComPtr<IUnknown> alive(&hooks_.Identity());
+  const ComPtr<IUnknown> alive = KeptAlive();
   uiActive_ = false;
-  if (document_) document_->SetActiveObject(nullptr, nullptr);
-  if (frame_) frame_->SetActiveObject(nullptr, nullptr);
-  if (inPlaceSite_) inPlaceSite_->OnUIDeactivate(FALSE);
+  CallHeld(document_, &IOleInPlaceUIWindow::SetActiveObject, nullptr, nullptr);
+  CallHeld(frame_, &IOleInPlaceFrame::SetActiveObject, nullptr, nullptr);
+  CallHeld(inPlaceSite_, &IOleInPlaceSite::OnUIDeactivate, FALSE);
   return S_OK;
 }
 
@@ -452,8 +473,8 @@ STDMETHODIMP OleControl::ReactivateAndUndo() {
 // --- IOleInPlaceActiveObject ---
 
 HRESULT OleControl::OfferToSite(MSG& message) const {
-  ComPtr<IOleControlSite> site;
-  if (!site_ || FAILED(site_->QueryInterface(IID_IOleControlSite, site.ReceiveVoid()))) return S_FALSE;
+  const ComPtr<IOleControlSite> site = SiteAs<IOleControlSite>();
+  if (!site) return S_FALSE;
   DWORD modifiers = 0;
   if (GetKeyState(VK_SHIFT) < 0) modifiers |= 1;
   if (GetKeyState(VK_CONTROL) < 0) modifiers |= 2;
@@ -464,6 +485,7 @@ HRESULT OleControl::OfferToSite(MSG& message) const {
 
 STDMETHODIMP OleControl::TranslateAccelerator(LPMSG message) {
   if (!message) return E_POINTER;
+  const ComPtr<IUnknown> alive = KeptAlive();
   const HWND window = inPlace_ ? hooks_.Window() : nullptr;
   if (window && message->message == WM_KEYDOWN && IsChild(window, message->hwnd)) {
     if (message->wParam == VK_TAB && GetKeyState(VK_CONTROL) >= 0 &&
@@ -482,7 +504,7 @@ STDMETHODIMP OleControl::OnFrameWindowActivate(BOOL) {
   return S_OK;
 }
 STDMETHODIMP OleControl::OnDocWindowActivate(BOOL activate) {
-  if (activate && uiActive_ && frame_) frame_->SetActiveObject(this, nullptr);
+  if (activate && uiActive_) CallHeld(frame_, &IOleInPlaceFrame::SetActiveObject, this, nullptr);
   return S_OK;
 }
 STDMETHODIMP OleControl::ResizeBorder(LPCRECT, IOleInPlaceUIWindow*, BOOL) {
@@ -532,6 +554,7 @@ STDMETHODIMP OleControl::Unfreeze(DWORD) {
 }
 
 STDMETHODIMP OleControl::SetAdvise(DWORD aspects, DWORD flags, IAdviseSink* sink) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   viewSink_ = ComPtr<IAdviseSink>(sink);
   viewAspects_ = aspects;
   viewFlags_ = flags;
@@ -571,6 +594,7 @@ STDMETHODIMP OleControl::InitNew() {
 // A version, then 32 bits for each property, little-endian.
 STDMETHODIMP OleControl::Load(IStream* stream) {
   if (!stream) return E_POINTER;
+  const ComPtr<IUnknown> alive = KeptAlive();
   const auto read = [&](auto& value) {
     ULONG count = 0;
     const HRESULT result = stream->Read(&value, sizeof value, &count);
@@ -592,6 +616,7 @@ STDMETHODIMP OleControl::Load(IStream* stream) {
 
 STDMETHODIMP OleControl::Save(IStream* stream, BOOL clearDirty) {
   if (!stream) return E_POINTER;
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Guarded([&]() -> HRESULT {
     std::vector<std::uint32_t> values = {kStreamVersion};
     for (const PersistedProperty& property : hooks_.Properties())
@@ -611,6 +636,7 @@ STDMETHODIMP OleControl::GetSizeMax(ULARGE_INTEGER* size) {
 
 STDMETHODIMP OleControl::Load(IPropertyBag* bag, IErrorLog* log) {
   if (!bag) return E_POINTER;
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Guarded([&] {
     for (const PersistedProperty& property : hooks_.Properties()) {
       Variant value;
@@ -627,6 +653,7 @@ STDMETHODIMP OleControl::Load(IPropertyBag* bag, IErrorLog* log) {
 
 STDMETHODIMP OleControl::Save(IPropertyBag* bag, BOOL clearDirty, BOOL all) {
   if (!bag) return E_POINTER;
+  const ComPtr<IUnknown> alive = KeptAlive();
   for (const PersistedProperty& property : hooks_.Properties()) {
     const std::int32_t number = hooks_.GetProperty(property.id);
     // 0 is what a bag without the value means.
@@ -647,6 +674,7 @@ STDMETHODIMP OleControl::Save(IPropertyBag* bag, BOOL clearDirty, BOOL all) {
 
 STDMETHODIMP OleControl::QuickActivate(QACONTAINER* container, QACONTROL* control) {
   if (!container || !control) return E_POINTER;
+  const ComPtr<IUnknown> alive = KeptAlive();
   const ULONG size = control->cbSize;
   *control = {};
   control->cbSize = size;

@@ -194,6 +194,12 @@ class OleControl final : public IOleObject,
   STDMETHODIMP GetGUID(DWORD kind, GUID* guid) override;
 
  private:
+  // For what runs code of the container's or of a listener's: it may release the control inside.
+  ComPtr<IUnknown> KeptAlive() const { return ComPtr<IUnknown>(&hooks_.Identity()); }
+  // Another interface of the container's site; null when it has none, or when there is no site.
+  template <typename Interface>
+  ComPtr<Interface> SiteAs() const;
+
   HRESULT Activate(bool withUi);
   HRESULT ActivateInPlace();
   HRESULT ActivateUi();

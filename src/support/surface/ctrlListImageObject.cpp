@@ -68,11 +68,13 @@ STDMETHODIMP ctrlListImageObject::Overlay(VARIANT* Key1, VARIANT* Key2, IPicture
   if (!result) return E_POINTER;
   *result = nullptr;
   if (!Key1 || !Key2) return E_POINTER;
+  // A key may be an object of the host's, whose code tells its number.
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Guarded([&]() -> HRESULT {
-    view_.Window();
-    const int count = ImageList_GetImageCount(view_.SmallIcons());
     const std::int32_t lower = NumberFromVariant(*Key1);
     const std::int32_t upper = NumberFromVariant(*Key2);
+    view_.Window();
+    const int count = ImageList_GetImageCount(view_.SmallIcons());
     if (lower < 1 || lower > count || upper < 1 || upper > count)
       throw RuntimeError(error::kSubscriptOutOfRange);
     const ImageListOwner merged(

@@ -328,21 +328,152 @@ TYPED_TEST(AnyControl, MayBeReleasedInAnEventOfItsWait) {
 }
 
 // Counts how often a container that draws the control itself is to draw it anew.
-struct ViewSink final : IAdviseSink {
+struct ViewSink final : IAdviseSinkEx {
   int changes = 0;
   int dataChanges = 0;
+  std::function<void(const char* call)> onCall = [](const char*) {};
   STDMETHODIMP QueryInterface(REFIID id, void** object) override {
     *object = id == IID_IUnknown || id == IID_IAdviseSink ? this : nullptr;
     return *object ? S_OK : E_NOINTERFACE;
   }
   STDMETHODIMP_(ULONG) AddRef() override { return 2; }
-  STDMETHODIMP_(ULONG) Release() override { return 1; }
-  STDMETHODIMP_(void) OnDataChange(FORMATETC*, STGMEDIUM*) override { ++dataChanges; }
-  STDMETHODIMP_(void) OnViewChange(DWORD, LONG) override { ++changes; }
+  STDMETHODIMP_(ULONG) Release() override {
+    onCall("Release");
+    return 1;
+  }
+  STDMETHODIMP_(void) OnDataChange(FORMATETC*, STGMEDIUM*) override {
+    ++dataChanges;
+    onCall("OnDataChange");
+  }
+  STDMETHODIMP_(void) OnViewChange(DWORD, LONG) override {
+    ++changes;
+    onCall("OnViewChange");
+  }
   STDMETHODIMP_(void) OnRename(IMoniker*) override {}
   STDMETHODIMP_(void) OnSave() override {}
-  STDMETHODIMP_(void) OnClose() override {}
+  STDMETHODIMP_(void) OnClose() override { onCall("OnClose"); }
+  STDMETHODIMP_(void) OnViewStatusChange(DWORD) override {}
 };
+
+// A form that keeps its values as they were once written, and gives them as they are.
+struct OldBag final : IPropertyBag {
+  VARIANT value = {};
+  std::function<void(const char* call)> onCall = [](const char*) {};
+  STDMETHODIMP QueryInterface(REFIID, void**) override { return E_NOINTERFACE; }
+  STDMETHODIMP_(ULONG) AddRef() override { return 2; }
+  STDMETHODIMP_(ULONG) Release() override { return 1; }
+  STDMETHODIMP Read(LPCOLESTR, VARIANT* kept, IErrorLog*) override {
+    onCall("Read");
+    return VariantCopy(kept, &value);
+  }
+  STDMETHODIMP Write(LPCOLESTR, VARIANT*) override {
+    onCall("Write");
+    return S_OK;
+  }
+};
+
+// An interface of the control that holds no reference to it.
+template <typename Interface>
+Interface& Uncounted(IUnknown& control) {
+  ComPtr<Interface> found;
+  EXPECT_EQ(control.QueryInterface(__uuidof(Interface), found.ReceiveVoid()), S_OK);
+  return *found;
+}
+
+// Whatever the control is in the middle of, the container may let go of it for good in each call that this
+// brings, with all that there is to say or without a word.
+TYPED_TEST(AnyControl, MayBeReleasedInsideACallOfItsContainer) {
+  using Calls = std::vector<std::string>;
+  struct Place {
+    ControlContainer& container;
+    ViewSink& sink;
+    OldBag& bag;
+  };
+  const struct {
+    void (*enter)(IUnknown& control, const Place& place);
+    Calls calls;
+  } rows[] = {
+      {[](IUnknown& control, const Place&) { Uncounted<IOleObject>(control).Close(OLECLOSE_SAVEIFDIRTY); },
+       {"SetActiveObject", "OnUIDeactivate", "OnFocus", "OnDataChange", "OnViewChange", "Release",
+        "OnInPlaceDeactivate", "SaveObject", "OnClose"}},
+      {[](IUnknown& control, const Place&) { Uncounted<IOleObject>(control).SetClientSite(nullptr); },
+       {"SetActiveObject", "OnUIDeactivate", "OnFocus", "OnDataChange", "OnViewChange", "Release",
+        "OnInPlaceDeactivate"}},
+      {[](IUnknown& control, const Place&) {
+         Uncounted<IOleObject>(control).DoVerb(OLEIVERB_HIDE, nullptr, nullptr, 0, nullptr, nullptr);
+       },
+       {"SetActiveObject", "OnUIDeactivate"}},
+      {[](IUnknown& control, const Place& place) {
+         Uncounted<IOleInPlaceObject>(control).InPlaceDeactivate();
+         if (place.container.Control())
+           Uncounted<IOleObject>(control).DoVerb(OLEIVERB_UIACTIVATE, nullptr, nullptr, 0, nullptr, nullptr);
+       },
+       {"SetActiveObject", "OnUIDeactivate", "OnFocus", "OnDataChange", "OnViewChange", "Release",
+        "OnInPlaceDeactivate", "OnInPlaceActivate", "OnUIActivate", "ShowObject"}},
+      {[](IUnknown& control, const Place& place) {
+         QACONTAINER container = {};
+         container.cbSize = sizeof container;
+         container.pClientSite = &place.container;
+         container.pAdviseSink = &place.sink;
+         container.pPropertyNotifySink = &place.container;
+         QACONTROL answer = {};
+         Uncounted<IQuickActivate>(control).QuickActivate(&container, &answer);
+       },
+       {"Ambient", "OnDataChange", "OnViewChange", "Release"}},
+      {[](IUnknown& control, const Place& place) {
+         Uncounted<IViewObject2>(control).SetAdvise(DVASPECT_CONTENT, ADVF_PRIMEFIRST, &place.sink);
+       },
+       {"Release", "OnDataChange", "OnViewChange"}},
+      {[](IUnknown& control, const Place& place) {
+         Uncounted<IPersistPropertyBag>(control).Save(&place.bag, TRUE, TRUE);
+         if (place.container.Control()) Uncounted<IPersistPropertyBag>(control).Load(&place.bag, nullptr);
+       },
+       {"Write", "Read"}},
+  };
+  for (const auto& row : rows) {
+    // First it is only seen what calls there are.
+    Calls calls;
+    for (std::size_t turn = 0; turn <= 2 * calls.size(); ++turn) {
+      const std::string wanted = turn == 0 ? "" : calls[(turn - 1) / 2];
+      SCOPED_TRACE(testing::Message() << &row - rows << " " << turn << " " << wanted);
+      bool left = false;
+      ViewSink sink;
+      ViewSink dataSink;
+      OldBag bag;
+      TypeParam form;
+      form.Show();
+      form.control->put_OLEDropMode(1);
+      const Place place = {*form.container, sink, bag};
+      IUnknown& control = *form.container->Control();
+      FORMATETC any = {CF_ENHMETAFILE, nullptr, DVASPECT_CONTENT, -1, TYMED_ENHMF};
+      DWORD ignored = 0;
+      Uncounted<IOleObject>(control).Advise(&sink, &ignored);
+      Uncounted<IDataObject>(control).DAdvise(&any, 0, &dataSink, &ignored);
+      Uncounted<IViewObject2>(control).SetAdvise(DVASPECT_CONTENT, 0, &sink);
+      const HWND window = form.Window();
+      form.control = {};
+      form.container->onCall = sink.onCall = bag.onCall = [&](const char* call) {
+        if (turn == 0 && std::find(calls.begin(), calls.end(), call) == calls.end()) calls.emplace_back(call);
+        if (call != wanted || std::exchange(left, true)) return;
+        if (turn % 2 == 0)
+          form.container->Close();
+        else
+          form.container->Abandon();
+      };
+      // How often it is released is the system's affair.
+      dataSink.onCall = [&](const char* call) {
+        if (call != std::string("Release")) sink.onCall(call);
+      };
+      row.enter(control, place);
+      EXPECT_EQ(left, turn != 0);
+      // What it was given since.
+      if (left) form.container->Abandon();
+      form.container->onCall = sink.onCall = bag.onCall = dataSink.onCall = [](const char*) {};
+      EXPECT_EQ(IsWindow(window), !left);
+    }
+    EXPECT_EQ(calls, row.calls);
+  }
+}
 
 // A container that shows a picture of the control only, as a form in design does, or a report.
 TYPED_TEST(AnyControl, DrawsItselfWithoutAWindowOfTheContainer) {
