@@ -25,6 +25,11 @@ HRESULT CallHeld(ComPtr<Interface> called, Method method, Arguments... arguments
   return called ? (called.Get()->*method)(arguments...) : S_OK;
 }
 
+// What a property becomes whose kept value is `number`: the default, if it cannot hold that.
+std::int32_t HeldBy(const PersistedProperty& property, std::int32_t number) {
+  return property.type == VT_I2 && number != static_cast<SHORT>(number) ? 0 : number;
+}
+
 // Whether a key that was pressed in a window of the control is the control's, although containers have uses
 // for it as a dialog key or an accelerator.
 bool Wants(const MSG& key) {
@@ -608,7 +613,10 @@ STDMETHODIMP OleControl::Load(IStream* stream) {
     for (std::int32_t& value : values)
       if (SUCCEEDED(result)) result = read(value);
     if (FAILED(result)) return result;
-    for (std::size_t i = 0; i < values.size(); ++i) hooks_.SetProperty(hooks_.Properties()[i].id, values[i]);
+    for (std::size_t i = 0; i < values.size(); ++i) {
+      const PersistedProperty& property = hooks_.Properties()[i];
+      hooks_.SetProperty(property.id, HeldBy(property, values[i]));
+    }
     dirty_ = false;
     return S_OK;
   });
@@ -642,9 +650,11 @@ STDMETHODIMP OleControl::Load(IPropertyBag* bag, IErrorLog* log) {
       Variant value;
       // Bags read the value as the type that they are asked for.
       V_VT(&value.Get()) = property.type;
-      std::int32_t number = 0;
-      if (SUCCEEDED(bag->Read(property.name, &value.Get(), log))) number = NumberFromVariant(value.Get());
-      hooks_.SetProperty(property.id, number);
+      // A value that is no number does not keep the form from loading.
+      const std::int32_t number = ResultAsItStood(0, [&](std::int32_t& kept) {
+        if (SUCCEEDED(bag->Read(property.name, &value.Get(), log))) kept = NumberFromVariant(value.Get());
+      });
+      hooks_.SetProperty(property.id, HeldBy(property, number));
     }
     dirty_ = false;
     return S_OK;

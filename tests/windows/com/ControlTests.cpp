@@ -372,6 +372,71 @@ struct OldBag final : IPropertyBag {
   }
 };
 
+TYPED_TEST(AnyControl, TakesTheDefaultForAKeptValueThatItCannotHold) {
+  TypeParam form;
+  ComPtr<IPersistPropertyBag> bagged;
+  ComPtr<IPersistStreamInit> streamed;
+  ASSERT_EQ(form.control->QueryInterface(IID_IPersistPropertyBag, bagged.ReceiveVoid()), S_OK);
+  ASSERT_EQ(form.control->QueryInterface(IID_IPersistStreamInit, streamed.ReceiveVoid()), S_OK);
+  const auto modes = [&] {
+    SHORT drop = 0;
+    LONG drag = 0;
+    form.control->get_OLEDropMode(&drop);
+    form.control->get_OLEDragMode(&drag);
+    return std::pair<LONG, LONG>(drop, drag);
+  };
+  using Modes = std::pair<LONG, LONG>;
+  const Bstr word(L"abc");
+  const Bstr digit(L"1");
+  const auto of = [](VARTYPE type, auto set) {
+    VARIANT value = {};
+    V_VT(&value) = type;
+    set(value);
+    return value;
+  };
+  SAFEARRAY* const array = SafeArrayCreateVector(VT_I4, 0, 2);
+  const auto nothing = [](VARIANT&) {};
+  const struct {
+    VARIANT kept;
+    Modes modes;
+  } rows[] = {
+      {VariantOf(word), {0, 0}},
+      {VariantOf(digit), {1, 1}},
+      {VariantOf(-32768L), {-32768, -32768}},
+      {VariantOf(32768L), {0, 32768}},
+      {VariantOf(-40000L), {0, -40000}},
+      {of(VT_R8, [](VARIANT& value) { V_R8(&value) = 1.5; }), {2, 2}},
+      {of(VT_R8, [](VARIANT& value) { V_R8(&value) = 3e9; }), {0, 0}},
+      {of(VT_BOOL, [](VARIANT& value) { V_BOOL(&value) = VARIANT_TRUE; }), {-1, -1}},
+      {of(VT_ERROR, [](VARIANT& value) { V_ERROR(&value) = DISP_E_PARAMNOTFOUND; }), {0, 0}},
+      {of(VT_ARRAY | VT_I4, [&](VARIANT& value) { V_ARRAY(&value) = array; }), {0, 0}},
+      // Without a value of its own.
+      {of(VT_DISPATCH, [&](VARIANT& value) { V_DISPATCH(&value) = form.container.Get(); }), {0, 0}},
+      {of(VT_DISPATCH, nothing), {0, 0}},
+      {of(VT_NULL, nothing), {0, 0}},
+      {of(VT_EMPTY, nothing), {0, 0}},
+  };
+  OldBag bag;
+  for (const auto& row : rows) {
+    SCOPED_TRACE(testing::Message() << V_VT(&row.kept) << " " << row.modes.second);
+    form.control->put_OLEDropMode(9);
+    form.control->put_OLEDragMode(9);
+    bag.value = row.kept;
+    EXPECT_EQ(bagged->Load(&bag, nullptr), S_OK);
+    EXPECT_EQ(modes(), row.modes);
+    if (V_VT(&row.kept) != VT_I4) continue;
+    const LONG kept[] = {1, V_I4(&row.kept), V_I4(&row.kept)};
+    ComPtr<IStream> memory;
+    CreateStreamOnHGlobal(nullptr, TRUE, memory.Receive());
+    memory->Write(kept, sizeof kept, nullptr);
+    memory->Seek({}, STREAM_SEEK_SET, nullptr);
+    form.control->put_OLEDropMode(9);
+    EXPECT_EQ(streamed->Load(memory.Get()), S_OK);
+    EXPECT_EQ(modes(), row.modes);
+  }
+  SafeArrayDestroy(array);
+}
+
 // An interface of the control that holds no reference to it.
 template <typename Interface>
 Interface& Uncounted(IUnknown& control) {
