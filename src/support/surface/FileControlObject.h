@@ -151,6 +151,7 @@ class FileControlObject : public DualObject<Interface>,
   void Park() override { View().Park(); }
   std::optional<SIZE> SizeOnOtherScreen() override { return View().SizeOnOtherScreen(); }
   void AmbientChanged(const AmbientValues& values) override;
+  void Closing() override { Rules().EndTransfer(); }
   void SiteGone() override { Rules().Close(); }
   std::span<const PersistedProperty> Properties() const override;
   std::int32_t GetProperty(DISPID id) const override;

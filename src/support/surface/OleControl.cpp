@@ -163,6 +163,7 @@ STDMETHODIMP OleControl::SetHostNames(LPCOLESTR, LPCOLESTR) {
 
 STDMETHODIMP OleControl::Close(DWORD saveOption) {
   const ComPtr<IUnknown> alive = KeptAlive();
+  hooks_.Closing();
   InPlaceDeactivate();
   if (saveOption != OLECLOSE_NOSAVE && dirty_) CallHeld(site_, &IOleClientSite::SaveObject);
   CallHeld(adviseHolder_, &IOleAdviseHolder::SendOnClose);

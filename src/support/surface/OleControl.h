@@ -65,6 +65,8 @@ class OleControlHooks {
   virtual void GiveFocus() = 0;
   // Moves the focus to the next stop inside the control, or to the one before; false at the end.
   virtual bool MoveFocus(bool backward) = 0;
+  // The container closes the control: what runs ends.
+  virtual void Closing() = 0;
   // The container has let go of the control.
   virtual void SiteGone() = 0;
 
