@@ -2,6 +2,8 @@
 // listing is whole.
 #include "Form.h"
 
+#include <fstream>
+
 namespace tarnwick::test {
 namespace {
 
@@ -10,6 +12,7 @@ constexpr wchar_t kPicture[] = L"demo\\pictures\\rocket.jpg";
 constexpr std::size_t kDripBytes = 300;
 
 constexpr LONG kSuccess = 32;
+constexpr LONG kStopped = 45;
 constexpr LONG kTimeout = 58;
 
 LONG LastError(const Form& form) {
@@ -95,6 +98,56 @@ TEST(ListControl, GivesUpADownloadThatStalls) {
   EXPECT_TRUE(form.events.empty());
   EXPECT_EQ(LastError(form), kSuccess);
   DeleteFileW(L"rocket.jpg");
+}
+
+// In an event, of which the first comes before the first byte and others in the middle.
+TEST(ListControl, StopsAnUploadWithoutATrace) {
+  Form form;
+  form.LogOn(TheServer().name);
+  ASSERT_TRUE(form.Init(L"*"));
+  form.Show();
+  std::ofstream("stop test.jpg", std::ios::binary) << std::string(std::size_t{32} << 20, 'x');
+  for (const bool closes : {false, true}) {
+    for (const int at : {0, 40}) {
+      SCOPED_TRACE(testing::Message() << closes << " at " << at);
+      form.events.clear();
+      form.progress.clear();
+      form.onEvent = [&](int) {
+        if (form.progress.empty() || form.progress.back() != at) return;
+        if (closes) {
+          form.container->Close();
+          return;
+        }
+        ComPtr<_CFileUpload> client;
+        form.list->get_mobjFileupload(client.Receive());
+        VARIANT stop = {};
+        V_VT(&stop) = VT_BOOL;
+        V_BOOL(&stop) = VARIANT_TRUE;
+        VARIANT nothing = {};
+        client->AbortFileTransfer(&stop, &nothing);
+      };
+      const ULONGLONG begin = GetTickCount64();
+      VARIANT_BOOL done = VARIANT_TRUE;
+      form.list->UploadImage(Bstr(L".\\stop test.jpg"), &done);
+      EXPECT_LT(GetTickCount64() - begin, 10'000U);
+      EXPECT_FALSE(done);
+      EXPECT_TRUE(form.events.empty());
+      EXPECT_EQ(form.progress.back(), at);
+      EXPECT_EQ(LastError(form), kStopped);
+      form.onEvent = nullptr;
+      if (closes) {
+        ASSERT_EQ(form.container->TakeUp(*form.list, ControlContainer::WayIn::kSteps), S_OK);
+        form.Show();
+      }
+      // The server is asked again.
+      form.LogOn(TheServer().name);
+      ASSERT_TRUE(form.Init(L"*"));
+      VARIANT_BOOL absent = VARIANT_FALSE;
+      form.list->CheckIfFileDoesNotExist(Bstr(L"stop test.jpg"), &absent);
+      EXPECT_TRUE(absent);
+    }
+  }
+  DeleteFileW(L"stop test.jpg");
 }
 
 TEST(ListControl, WorksInAnotherContainerAfterItsOwnClosed) {
