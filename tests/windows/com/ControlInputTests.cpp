@@ -165,7 +165,11 @@ TEST(ListControl, DragsItsOwnFile) {
   ClientToScreen(form.ListWindow(), &item);
   const std::wstring name = L"wizard.gif";
   const std::wstring address = L"http://" + TheServer().name + L"/users/anna.berg@example-org/" + name;
-  std::wstring copy;
+  // The copy that other tests may have left.
+  wchar_t temporary[MAX_PATH] = {};
+  GetTempPathW(MAX_PATH, temporary);
+  std::wstring copy = temporary + (L"bv\\" + FolderName() + L"\\" + name);
+  DeleteFileW(copy.c_str());
 
   // A button says that nothing is selected when the list has done with it, and says it once.
   const POINT beside = {item.x, item.y + 4 * (row.bottom - row.top)};
