@@ -27,8 +27,11 @@ class ComObject : public First, public Rest... {
   STDMETHODIMP_(ULONG) AddRef() override { return ++references_; }
   STDMETHODIMP_(ULONG) Release() override {
     const ULONG left = --references_;
-    if (left == 0) delete this;
-    return left;
+    if (left != 0) return left;
+    // Whoever counts the object once more while it ends must not end it again.
+    references_ = kEnding;
+    delete this;
+    return 0;
   }
 
  protected:
@@ -44,6 +47,7 @@ class ComObject : public First, public Rest... {
   }
 
  private:
+  static constexpr ULONG kEnding = 1UL << 30;
   std::atomic<ULONG> references_{1};
 };
 

@@ -62,15 +62,18 @@ HRESULT DropTarget::Tell(const std::function<void(DropUser&)>& what) {
 STDMETHODIMP DropTarget::DragEnter(IDataObject* data, DWORD keys, POINTL at, DWORD* effect) {
   if (!data || !effect) return E_INVALIDARG;
   return Guarded([&] {
-    data_ = ComPtr<DataObject>::Adopt(new DataObject(*data));
-    return Tell([&](DropUser& user) { user.DragMoves(*data_, *effect, PointOf(keys, at), kEnters); });
+    // Held: the host's code may end the drag inside.
+    const auto dragged = ComPtr<DataObject>::Adopt(new DataObject(*data));
+    data_ = dragged;
+    return Tell([&](DropUser& user) { user.DragMoves(*dragged, *effect, PointOf(keys, at), kEnters); });
   });
 }
 
 STDMETHODIMP DropTarget::DragOver(DWORD keys, POINTL at, DWORD* effect) {
   if (!effect) return E_INVALIDARG;
-  if (!data_) return E_UNEXPECTED;
-  return Tell([&](DropUser& user) { user.DragMoves(*data_, *effect, PointOf(keys, at), kMoves); });
+  const ComPtr<DataObject> data = data_;
+  if (!data) return E_UNEXPECTED;
+  return Tell([&](DropUser& user) { user.DragMoves(*data, *effect, PointOf(keys, at), kMoves); });
 }
 
 STDMETHODIMP DropTarget::DragLeave() {

@@ -453,8 +453,10 @@ void FileControlObject<Interface>::AmbientChanged(const AmbientValues& values) {
 
 template <typename Interface>
 void FileControlObject<Interface>::ApplyLook() {
+  // A font may be code of the host's, which may change the ambient values.
+  const ComPtr<IFont> ambientFont = ambient_.font;
   HFONT font = nullptr;
-  if (ambient_.font && FAILED(ambient_.font->get_hFont(&font))) font = nullptr;
+  if (ambientFont && FAILED(ambientFont->get_hFont(&font))) font = nullptr;
   // One colour of a container makes no legible pair with one of the system's.
   const bool colours = ambient_.hasForeColor && ambient_.hasBackColor;
   View().SetLook(font, colours ? std::optional(ambient_.foreColor) : std::nullopt,

@@ -286,7 +286,8 @@ STDMETHODIMP OleControl::OnMnemonic(MSG*) {
 
 STDMETHODIMP OleControl::OnAmbientPropertyChange(DISPID) {
   const ComPtr<IUnknown> alive = KeptAlive();
-  ReadAmbientValues();
+  // Of a container that is gone there are none, and the control stays closed.
+  if (site_) ReadAmbientValues();
   return S_OK;
 }
 
