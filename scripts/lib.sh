@@ -53,9 +53,22 @@ die() {
   exit 1
 }
 
+# build_preset PRESET [TARGET...]: all there is, or the targets, for which a folder that is new is made without the tests.
 build_preset() {
-  [[ -f $build/$1/build.ninja ]] || cmake --preset "$1"
-  cmake --build --preset "$1" -j 2
+  local preset=$1
+  shift
+  if (($# == 0)); then
+    configure_tests "$preset"
+  elif [[ ! -f $build/$preset/build.ninja ]]; then
+    cmake --preset "$preset" -DBUILD_TESTING=OFF
+  fi
+  cmake --build --preset "$preset" -j 2 "${@/#/--target=}"
+}
+
+# configure_tests PRESET: makes the folder with the tests in it, unless it is so already.
+configure_tests() {
+  [[ -f $build/$1/build.ninja ]] && ! grep -q '^BUILD_TESTING:BOOL=OFF' "$build/$1/CMakeCache.txt" ||
+    cmake --preset "$1" -DBUILD_TESTING=ON
 }
 
 # ---- What was started is ended -------------------------------------------------------------------------------------
