@@ -27,8 +27,10 @@ FileControl::Operation::Operation(FileControl& control)
 FileControl::Operation::~Operation() {
   control_.operation_ = outer_;
   // What nobody foresaw, such as a lack of memory.
-  if (ftpError_ == ftp_error::kSuccess && std::uncaught_exceptions() > exceptions_)
+  if (ftpError_ == ftp_error::kSuccess && std::uncaught_exceptions() > exceptions_) {
     ftpError_ = ftp_error::kAborted;
+    ResultAsItStood(0, [this](int&) { description_ = u"The operation failed unexpectedly."; });
+  }
   control_.m_LastError = ftpError_;
   control_.m_strLastErrorDesc = std::move(description_);
 }
@@ -189,12 +191,18 @@ bool FileControl::UploadImage(TextView szLocalPath) {
       Fail(ftp_error::kNotAllowed, u"The account takes no files, or the service could not be asked.");
       return Raise(event::kNotAllowed);
     }
+    const AccountKey account = apartment_.session.Account();
     const Text url = SendAndRegister(*client, path);
+    std::shared_ptr<CUpload> record;
+    if (!url.empty()) {
+      // Whatever the watchdog told meanwhile.
+      operation.Succeed();
+      record = RecordUploaded(path, url);
+    }
     TransferEnded();
-    if (url.empty()) return;
-    // Whatever the watchdog told meanwhile.
-    operation.Succeed();
-    ShowUploaded(RecordUploaded(path, url));
+    if (!record) return;
+    // Not among the files of another user who was logged on meanwhile.
+    if (apartment_.session.Account() == account) ShowUploaded(record);
     uploaded = true;
     RaiseCurrentItem();
   });
@@ -208,12 +216,9 @@ Text FileControl::SendAndRegister(CFileUpload& client, const Text& path) {
   // What is on the server is registered, whatever the host made of the control meanwhile, but not with
   // another user.
   if (SendFile(client, path)) {
-    if (apartment_.session.Account() == account) {
-      url = client.SaveUploadFile(path);
-      if (url.empty()) copies_.LoseUpload(path);
-    }
+    if (apartment_.session.Account() == account) url = client.SaveUploadFile(path);
     if (url.empty()) {
-      copies_.AbandonUpload();
+      copies_.LoseUpload(path);
       Fail(ftp_error::kNotTaken, u"The file was sent, but not registered.");
     }
   }
@@ -263,16 +268,24 @@ void FileControl::FailUpload(CFileUpload& client, const Text& path, std::int32_t
                     number);
   if (number == error::kPathAccess)
     return FailWith(ftp_error::kUnavailable, u"The file could not be read.", number);
-  if (number == acceptor::kNameRefused && IsTooLarge(client, path))
+  // An upload takes the place of a file of that very name.
+  const TextView name = FileNameFromPath(path);
+  if (number == acceptor::kNameRefused && IsNameFree(name, name) && IsTooLarge(client, path))
     return FailWith(ftp_error::kFull, u"The account is full.", number);
-  FailPage(FileNameFromPath(path), number);
+  FailPage(name, name, number);
+}
+
+bool FileControl::IsNameFree(TextView name, TextView own) const {
+  const std::size_t position = PositionOf(name);
+  return name.find_first_of(kRefusedCharacters) == TextView::npos &&
+         (position == 0 || apartment_.allFiles.At(position)->FileName == own);
 }
 
 void FileControl::FailWith(std::int32_t ftpError, TextView words, std::int32_t number) {
   Fail(ftpError, Text(words) + u" (" + TextFromNumber(number) + u")");
 }
 
-void FileControl::FailPage(TextView name, std::int32_t number) {
+void FileControl::FailPage(TextView name, TextView own, std::int32_t number) {
   switch (number) {
     case acceptor::kUnspecified:
       return FailWith(ftp_error::kConnectionLost,
@@ -284,7 +297,7 @@ void FileControl::FailPage(TextView name, std::int32_t number) {
     case acceptor::kNotThere:
       return FailWith(ftp_error::kUnavailable, u"The file was not found.", number);
     case acceptor::kNameRefused:
-      if (name.find_first_of(kRefusedCharacters) == TextView::npos && PositionOf(name) != 0)
+      if (name.find_first_of(kRefusedCharacters) == TextView::npos && !IsNameFree(name, own))
         return FailWith(ftp_error::kNameNotAllowed, u"The account has a file of that name.", number);
       return FailWith(ftp_error::kNameNotAllowed, u"The file's name is not allowed.", number);
     default:
@@ -294,25 +307,22 @@ void FileControl::FailPage(TextView name, std::int32_t number) {
 
 bool FileControl::IsTooLarge(CFileUpload& client, const Text& path) const {
   return ResultAsItStood(false, [&](bool& large) {
-    const TextView name = FileNameFromPath(path);
-    const std::size_t position = PositionOf(name);
-    const CUpload* same = position != 0 ? apartment_.allFiles.At(position).get() : nullptr;
-    // A name that differs in letter case is refused before its size is looked at.
-    if (same && same->FileName != name) return;
+    const std::size_t position = PositionOf(FileNameFromPath(path));
+    const double replaced = position != 0 ? apartment_.allFiles.At(position)->FileSize : 0;
     const SessionValues& session = apartment_.session;
     const Text product = TextFromNumber(session.productNumber);
     const auto used = client.GetTotalUsedQuota(product, session.userName);
     const double size = static_cast<double>(apartment_.platform.files.Length(path));
     const double most = client.GetMaxQuota(product, session.userName);
-    // The file takes the place of its old bytes. Nobody knows when the service does not tell.
-    large = used && most > 0 && *used + size - (same ? same->FileSize : 0) > most;
+    // Nobody knows when the service does not tell.
+    large = used && most > 0 && *used + size - replaced > most;
   });
 }
 
 // An upload that was stopped tells nothing more, also in the middle of what belongs together.
 void FileControl::Connecting() {
   Yield();
-  TellState(ConnectionState::kResolvingHost);
+  if (IsWanted()) TellState(ConnectionState::kResolvingHost);
 }
 
 void FileControl::UploadStarted() {
@@ -438,7 +448,7 @@ bool FileControl::RenameOnServer(const Text& oldName, const Text& newName) {
                          AcceptorPath(u"RenameAcceptor.asp"), session.userName, session.password,
                          kProductGuid);
   } catch (const RuntimeError& failure) {
-    FailPage(newName, failure.Number());
+    FailPage(newName, oldName, failure.Number());
     return false;
   }
   if (client->RenameFile(TextFromNumber(session.productNumber), session.userName, oldName, newName) ==
@@ -570,6 +580,7 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
 bool FileControl::Download(const Text& url, const Text& explicitTarget, const Text& expected,
                            const std::function<bool()>& stop) {
   const RunningTransfer running(*this);
+  const std::uint32_t changes = apartment_.ChangesOfCopy(expected);
   m_lDownloadedBytes = 0;
   downloadFinished_ = downloadWritten_ = downloadFailed_ = false;
   downloadRuns_ = true;
@@ -582,12 +593,18 @@ bool FileControl::Download(const Text& url, const Text& explicitTarget, const Te
   // Or it would run out later, on whatever comes next.
   downloader_.StopWatchdog();
   // Whether it was written is seen once more here: nothing else will come.
-  if (downloadFinished_ && downloadWritten_ && FileExists(apartment_.platform.files, expected)) return true;
+  const bool there = FileExists(apartment_.platform.files, expected);
+  if (downloadFinished_ && downloadWritten_ && there) return true;
+  // A copy that was changed meanwhile was not written over.
+  if (downloadFinished_ && explicitTarget.empty() && apartment_.ChangesOfCopy(expected) != changes)
+    return there;
+  // Of a failure the reason was told.
+  if (downloadFailed_) return false;
   if (downloadFinished_) {
     Fail(ftp_error::kAborted, u"The local file could not be written.");
   } else if (IsStopped()) {
     FailStopped();
-  } else if (told && !downloadFailed_) {
+  } else if (told) {
     Fail(ftp_error::kAborted, u"gbConnectionFailed was set.");
   }
   return false;
@@ -626,9 +643,10 @@ void FileControl::Failed(std::int32_t ftpError, TextView description, bool told)
 
 FileControl::DragContent FileControl::ContentOfDrag() const {
   return ResultAsItStood(DragContent(), [&](DragContent& content) {
-    content.address = SelectedKey();
-    Text copy = copies_.PathOf(content.address);
-    if (!copy.empty() && FileExists(apartment_.platform.files, copy)) content.localFile = std::move(copy);
+    const std::shared_ptr<CUpload> selected = SelectedRecord();
+    if (!selected) return;
+    content.address = selected->FilePath;
+    if (copies_.Has(*selected)) content.localFile = copies_.PathOf(content.address);
   });
 }
 

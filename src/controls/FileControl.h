@@ -22,25 +22,10 @@
 #include "service/CFileUpload.h"
 #include "support/Apartment.h"
 #include "support/Text.h"
+#include "transfer/FtpErrors.h"
 #include "transfer/Transfers.h"
 
 namespace tarnwick {
-
-// FtpErrors that the controls set; the downloader has more of them.
-namespace ftp_error {
-inline constexpr std::int32_t kNoClient = 24;
-inline constexpr std::int32_t kSuccess = 32;
-inline constexpr std::int32_t kConnectionLost = 43;
-inline constexpr std::int32_t kNotTaken = 44;
-inline constexpr std::int32_t kAborted = 45;
-inline constexpr std::int32_t kNotLoggedOn = 52;
-inline constexpr std::int32_t kNotAllowed = 53;   // by the account
-inline constexpr std::int32_t kUnavailable = 54;  // the file, here or there
-inline constexpr std::int32_t kFull = 56;
-inline constexpr std::int32_t kNameNotAllowed = 57;
-inline constexpr std::int32_t kTimeout = 58;
-inline constexpr std::int32_t kTransferInProgress = 59;
-}  // namespace ftp_error
 
 // Numbers with which Init fails to the host.
 namespace init_error {
@@ -217,8 +202,15 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool IsStopped() const { return IsAborted() || closings_ != closingsBefore_; }
   // Whether AbortFileTransfer(True) was called since the transfer began.
   bool IsAborted() const { return apartment_.aborts != abortsBefore_; }
+  // From here on only a later stop is meant.
+  void ForgetStops() {
+    closingsBefore_ = closings_;
+    abortsBefore_ = apartment_.aborts;
+  }
   // Notes the outcome of the operation that runs, for m_LastError.
   void Fail(std::int32_t ftpError, TextView description);
+  // Notes why what was told to stop has no result.
+  void FailStopped();
   // Whether a transfer may start now; else the reason is noted.
   bool MayTransfer();
   // The client; null, with the reason noted, when there is none.
@@ -281,15 +273,15 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Sends and registers the file; its address, empty on failure.
   Text SendAndRegister(CFileUpload& client, const Text& path);
   bool SendFile(CFileUpload& client, const Text& path);
-  // Note why: the upload component failed with that number; so did a page, which was asked to give a file
-  // that name; in these words, with the number behind them.
+  // Note why: the upload component failed with that number; so did a page, which was asked to give `name` to
+  // the file that is called `own`; in these words, with the number behind them.
   void FailUpload(CFileUpload& client, const Text& path, std::int32_t number);
-  void FailPage(TextView name, std::int32_t number);
+  void FailPage(TextView name, TextView own, std::int32_t number);
   void FailWith(std::int32_t ftpError, TextView words, std::int32_t number);
+  // Whether the name is allowed, and no other file than the one that is called `own` has it.
+  bool IsNameFree(TextView name, TextView own) const;
   // Whether the account has no room for the file. Asks the service.
   bool IsTooLarge(CFileUpload& client, const Text& path) const;
-  // Notes why a transfer that was told to stop has no result.
-  void FailStopped();
   std::shared_ptr<CUpload> RecordUploaded(const Text& path, const Text& url);
   bool RenameOnServer(const Text& oldName, const Text& newName);
   // The record and the address that it had.
@@ -335,6 +327,7 @@ class FileControl::Operation {
 
   void Fail(std::int32_t ftpError, TextView description);
   void Succeed() { Fail(ftp_error::kSuccess, {}); }
+  bool Succeeds() const { return ftpError_ == ftp_error::kSuccess; }
 
  private:
   FileControl& control_;

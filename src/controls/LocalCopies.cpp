@@ -16,19 +16,19 @@ Text LocalCopies::PathOf(TextView url) const {
   return apartment_.UserFolderPath + u"\\" + Text(name);
 }
 
-bool LocalCopies::IsDue(const CUpload& file) {
-  return ResultAsItStood(false, [&](bool& due) {
+bool LocalCopies::Has(const CUpload& file) const {
+  return ResultAsItStood(false, [&](bool& has) {
     const Text copy = PathOf(file.FilePath);
-    if (copy.empty()) return;
     FileSystem& files = apartment_.platform.files;
-    if (!FileExists(files, copy)) {
-      due = true;
-      return;
-    }
+    if (copy.empty() || !FileExists(files, copy)) return;
     // A size of 2 GiB and more is negative after an upload.
-    if (file.FileSize < 0 || static_cast<double>(files.Length(copy)) == file.FileSize) return;
-    due = apartment_.copiesAskedAgain.insert(file.FilePath).second;
+    has = file.FileSize < 0 || static_cast<double>(files.Length(copy)) == file.FileSize ||
+          apartment_.copiesAskedAgain.contains(file.FilePath);
   });
+}
+
+void LocalCopies::AskedAgain(const CUpload& file) {
+  ResultAsItStood(0, [&](int&) { apartment_.copiesAskedAgain.insert(file.FilePath); });
 }
 
 void LocalCopies::RemoveUnless(const Text& copy, double length) {
@@ -90,10 +90,10 @@ void LocalCopies::FinishUpload(const Text& path, const Text& url) {
 void LocalCopies::LoseUpload(const Text& path) {
   writer_.reset();
   ResultAsItStood(0, [&](int&) {
-    const Text copy = PathOf(FileNameFromPath(path));
-    if (copy.empty()) return;
-    apartment_.CopyChanged(copy);
-    if (!apartment_.platform.files.SameFile(copy, path)) RemoveFile(copy);
+    // As it was at the beginning: another user may be logged on by now.
+    if (writerPath_.empty()) return;
+    apartment_.CopyChanged(writerPath_);
+    if (!apartment_.platform.files.SameFile(writerPath_, path)) RemoveFile(writerPath_);
   });
 }
 

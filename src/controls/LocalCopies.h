@@ -23,9 +23,11 @@ class LocalCopies {
   // Where the copy of the file at `url` is or would be; empty when there cannot be one.
   Text PathOf(TextView url) const;
 
-  // Whether the file is to be fetched: there is no copy, or one of another length than the listing tells, for
-  // which this is true once in each listing.
-  bool IsDue(const CUpload& file);
+  // Whether there is a copy that can be used: of the length that the listing tells, or, once that was asked
+  // for again in vain, of any.
+  bool Has(const CUpload& file) const;
+  // The file was fetched although there was a copy. Once in each listing is enough.
+  void AskedAgain(const CUpload& file);
 
   // Takes out what came in place of a file, which its length tells.
   void RemoveUnless(const Text& copy, double length);
@@ -37,7 +39,7 @@ class LocalCopies {
   void Write(std::string_view bytes);
   // The file that was sent is the one at `url` now.
   void FinishUpload(const Text& path, const Text& url);
-  // The server may have the file at `path`, but nobody knows.
+  // The server may have the file at `path`, which began to be sent, but nobody knows.
   void LoseUpload(const Text& path);
   // The server has not got it.
   void AbandonUpload() { writer_.reset(); }
@@ -53,7 +55,7 @@ class LocalCopies {
   Apartment& apartment_;
   // Null when no copy is written.
   std::unique_ptr<FileWriter> writer_;
-  // Where it will be.
+  // Where the copy of the upload will be; empty when there cannot be one.
   Text writerPath_;
 };
 

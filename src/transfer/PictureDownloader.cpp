@@ -7,6 +7,7 @@
 #include "platform/Platform.h"
 #include "support/PathHelpers.h"
 #include "support/RuntimeError.h"
+#include "transfer/FtpErrors.h"
 
 namespace tarnwick {
 namespace {
@@ -29,12 +30,7 @@ struct Reason {
 };
 
 Reason ReasonOf(DownloadFailure failure, std::int32_t socketError) {
-  constexpr std::int32_t kConnectAborted = 5;
-  constexpr std::int32_t kConnectionRefused = 6;
-  constexpr std::int32_t kConnectionReset = 7;
-  constexpr std::int32_t kHostNotFound = 9;
-  constexpr std::int32_t kAborted = 45;
-  constexpr std::int32_t kTimeout = 58;
+  using namespace ftp_error;
   switch (failure) {
     case DownloadFailure::kAddress:
       return {kAborted, u"The file's address is not safe."};
@@ -108,8 +104,7 @@ bool PictureDownloader::CanStart(TextView url) const {
 
 void PictureDownloader::Start(TextView url, TextView explicitTarget) {
   socketError_ = 0;
-  copy_ = apartment_.UserFolderPath + u"\\" + Text(FileNameFromUrl(url));
-  changes_ = apartment_.ChangesOfCopy(copy_);
+  changes_ = apartment_.ChangesOfCopy(apartment_.UserFolderPath + u"\\" + Text(FileNameFromUrl(url)));
   machine_.StartDownload(url, apartment_.UserFolderPath, explicitTarget, apartment_.proxy.ProxyHost,
                          apartment_.proxy.ProxyPort);
 }
@@ -159,12 +154,16 @@ void PictureDownloader::OnSocketError(std::int32_t number) {
 bool PictureDownloader::WriteFile(TextView path, TextView explicitPath, std::string_view bytes) {
   return ResultAsItStood(false, [&](bool& written) {
     FileSystem& files = apartment_.platform.files;
+    // An upload, a rename or a delete has come before these bytes, which are not the file's any more.
+    const bool overtaken = apartment_.ChangesOfCopy(path) != changes_;
     if (!explicitPath.empty()) {
+      // The target may be the copy itself.
+      if (overtaken && (LowerCase(explicitPath) == LowerCase(path) || files.SameFile(explicitPath, path)))
+        return;
       files.Write(explicitPath, bytes);
       written = true;
     }
-    // An upload, a rename or a delete has come before these bytes, which are not the file's any more.
-    if (apartment_.ChangesOfCopy(copy_) != changes_) return;
+    if (overtaken) return;
     // Not copied from the other one: the bytes are here. Most often the picture has been shown before, and
     // the user's folder has it.
     if (explicitPath != path && !Holds(files, path, bytes)) files.Write(path, bytes);

@@ -54,8 +54,7 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   DownloadEvents* events_ = nullptr;
   // Winsock's number of the last failure of the socket.
   std::int32_t socketError_ = 0;
-  // The local copy that is fetched, and how often it had changed before: see Apartment::copyChanges.
-  Text copy_;
+  // How often the local copy that is fetched had changed before: see Apartment::copyChanges.
   std::uint32_t changes_ = 0;
 };
 

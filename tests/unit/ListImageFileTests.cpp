@@ -150,6 +150,11 @@ TEST_F(ListImageUpload, IsStoppedInAnyEventBeforeItsEnd) {
       EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
     }
   }
+  // In the pass of the pump before the first event.
+  List({});
+  fake.pump.onYield = [&] { std::exchange(fake.pump.onYield, nullptr), control.EndTransfer(); };
+  EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));
+  EXPECT_EQ(std::ranges::count(log, "state 0"), 0);
   // A stop is meant for what runs, and a flag that is stored without one ends nothing.
   List({});
   OnEvent("9999 50", [&] { control.mobjFileupload->AbortFileTransfer(false); });
@@ -188,7 +193,7 @@ TEST_F(ListImageUpload, TellsWhyItFailed) {
       {u"C:\\a.jpg", -2147220881, "949", "56 The account is full. (-2147220881)"},
       {u"C:\\a.jpg", -2147220881, "0", "57 The file's name is not allowed. (-2147220881)"},
       {u"C:\\a.jpg", -2147220881, "950", "57 The file's name is not allowed. (-2147220881)"},
-      {u"C:\\NEW.jpg", -2147220881, "800", "57 The account has a file of that name. (-2147220881)"},
+      {u"C:\\NEW.jpg", -2147220881, "", "57 The file's name is not allowed. (-2147220881)"},
       {u"C:\\a.jpg", -2147220878, "", "52 The server refused the user name or the password. (-2147220878)"},
       {u"C:\\a.jpg", -2147220840, "", "54 The account has no folder on the server. (-2147220840)"},
       {u"C:\\a.jpg", -2147467259, "",
@@ -464,9 +469,16 @@ TEST_F(ListImageTest, DeleteOutcomes) {
   EXPECT_EQ(Events(), "1001 ,1015 http://h/u/a.jpg,1002 ,");
   EXPECT_EQ(Names(), "");
   EXPECT_TRUE(view.listShown);
-  EXPECT_EQ(control.m_LastError, ftp_error::kNotTaken);
+  EXPECT_EQ(control.m_strLastErrorDesc, u"The files were deleted, but the rest could not be listed.");
   EXPECT_FALSE(fake.apartment.listingIsCurrent);
   EXPECT_EQ(log.back(), "view pointer");
+  listingFails = false;
+  List({{"a.jpg", "1"}});
+  view.Select(0, true);
+  listingFails = true;
+  replies["DeleteFileRequest"] = "fails";
+  control.DeleteFile();
+  EXPECT_EQ(control.m_strLastErrorDesc, u"The file was not deleted.");
 }
 
 TEST_F(ListImageTest, LeavesTheFilesOfAnotherUserAlone) {
@@ -525,6 +537,7 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
       if (const std::size_t at = line.find("ToBeDeleted="); at != std::string::npos)
         deleted += line.substr(at + 12) + ",";
     EXPECT_EQ(deleted, test.deleted);
+    EXPECT_EQ(deleting.m_LastError == ftp_error::kSuccess, deleted == "a.jpg,b.jpg,c.jpg,");
     EXPECT_EQ(log.back(), "view pointer");
     host.onEvent = nullptr;
     fake.apartment.session.userName = u"u@x";
@@ -699,9 +712,12 @@ TEST_F(ListImageDownload, Failures) {
     return Events();
   };
   downloader.waits = {[](FakeDownloader& d) { d.events->Failed(6, u"refused", true); }};
+  // A stop that comes too late is not the reason.
+  OnEvent("5555 ", [&] { control.EndTransfer(); });
   EXPECT_EQ(download(), "5555 ,");
   EXPECT_EQ(control.m_LastError, 6);
   EXPECT_EQ(control.m_strLastErrorDesc, u"refused");
+  host.onEvent = nullptr;
   // Silence.
   EXPECT_EQ(download(), "");
   EXPECT_EQ(control.m_LastError, ftp_error::kTimeout);

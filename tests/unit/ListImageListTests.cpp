@@ -278,7 +278,10 @@ TEST_F(ListImageTest, DragsAndDrops) {
 
   EXPECT_EQ(control.ContentOfDrag().address, u"");
   view.Select(0, true);
-  fake.files.files[u"C:\\Temp\\bv\\u@x\\a.jpg"] = {};
+  // An older copy, of another length, is not what the user sees.
+  fake.files.files[u"C:\\Temp\\bv\\u@x\\a.jpg"] = {2, 0};
+  EXPECT_EQ(control.ContentOfDrag().localFile, u"");
+  fake.files.files[u"C:\\Temp\\bv\\u@x\\a.jpg"] = {1, 0};
   EXPECT_EQ(control.ContentOfDrag().address, u"http://h/u/a.jpg");
   EXPECT_EQ(control.ContentOfDrag().localFile, u"C:\\Temp\\bv\\u@x\\a.jpg");
   fake.files.files.clear();

@@ -158,6 +158,13 @@ TEST_F(DriverTest, AChangeInTheAccountOvertakesTheCopy) {
     EXPECT_EQ(log.back(), target.empty() ? "finished without a file" : "finished");
     EXPECT_EQ(Saved(kTarget), "old") << "what was asked for is delivered";
   }
+  // Unless the target is the copy.
+  Start(u"C:\\t\\A.jpg");
+  socket.events->OnConnected();
+  socket.Arrives("A\r\n\r\nold");
+  fake.apartment.CopyChanged(u"C:\\t\\a.jpg");
+  socket.events->OnClosedByPeer();
+  EXPECT_EQ(Saved(u"C:\\t\\A.jpg"), "none");
 }
 
 TEST_F(DriverTest, AnEventMayReplaceTheDownload) {

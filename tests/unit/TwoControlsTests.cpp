@@ -119,6 +119,7 @@ TEST_F(TwoControlsTest, ChangesOvertakeAFetch) {
     EXPECT_TRUE(thumbnails->Init(u"*"));
     EXPECT_EQ(asked, test.asked);
     EXPECT_EQ(page.Look(), test.look);
+    EXPECT_EQ(thumbnails->m_LastError, ftp_error::kSuccess);
     EXPECT_EQ(bytesOf("b.gif"), test.copyOfB);
     EXPECT_EQ(bytesOf("z.gif"), test.copyOfZ);
   }

@@ -56,7 +56,8 @@ void ctrlListImage::DeleteFile() {
     } catch (const RuntimeError&) {
       // The account is not empty; what it holds is not known.
       view_.ShowList(true);
-      Fail(ftp_error::kNotTaken, u"The files were deleted, but the rest could not be listed.");
+      if (operation.Succeeds())
+        Fail(ftp_error::kNotTaken, u"The files were deleted, but the rest could not be listed.");
     }
     if (items_.empty()) return;
     SelectAlone(0);
@@ -76,13 +77,15 @@ void ctrlListImage::DeleteSelected() {
   for (std::size_t i = 0; i < chosen.size(); ++i) {
     // The host may fill the list anew, take the client away or log another user on in any event; the rest
     // then stays.
-    if (filling != filling_ || IsClosed() || apartment_.session.Account() != account) return;
-    if (apartment_.aborts != aborts) return Fail(ftp_error::kAborted, u"The delete was stopped.");
+    if (apartment_.session.Account() != account)
+      return Fail(ftp_error::kNotLoggedOn, u"The files are those of another user.");
+    if (filling != filling_ || IsClosed() || apartment_.aborts != aborts)
+      return Fail(ftp_error::kAborted, u"The delete was stopped.");
     if (!chosen[i]) {
       Raise(event::kNotSelected);
       continue;
     }
-    const std::shared_ptr<CFileUpload> client = mobjFileupload;
+    const std::shared_ptr<CFileUpload> client = Client();
     if (!client) return;
     const std::shared_ptr<CUpload> record = items_[i].record;
     if (DeleteOnServer(*client, *record)) {

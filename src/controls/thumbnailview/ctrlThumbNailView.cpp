@@ -99,7 +99,6 @@ void ctrlThumbNailView::ChangeFileFilter(TextView szFileFilter) {
   ResultAsItStood(0, [&](int&) {
     const Text filter(szFileFilter);
     selectedPath_.clear();
-    keepSelection_ = false;
     Show(filter);
   });
 }
@@ -121,10 +120,10 @@ void ctrlThumbNailView::Show(const Text& filter) {
     // A second file of the same address is not shown.
     ResultAsItStood(0, [&](int&) { shown.Add(record, record->FilePath); });
   }
-  if (shown.PositionOf(selectedPath_) == 0) {
-    selectedPath_.clear();
-    keepSelection_ = false;
-  }
+  // What is selected is on the first page.
+  keepSelection_ = false;
+  const std::size_t selected = shown.PositionOf(selectedPath_);
+  if (selected == 0 || selected > kSlotCount) selectedPath_.clear();
   // The bar stands at 0 from here on, unless the user pages on while the page is being filled.
   SetScrollRange();
   scrolledBack_ = false;
@@ -153,8 +152,14 @@ void ctrlThumbNailView::ShowPage(int first) {
   nextPage_ = first;
   if (fillRuns_) return;
   fillRuns_ = true;
-  while (nextPage_ && !IsClosed())
+  while (nextPage_ && !IsClosed()) {
+    // A stop, and a failure, were those of the page before.
+    if (busy_) {
+      ForgetStops();
+      busy_->operation.Succeed();
+    }
     ResultAsItStood(0, [&](int&) { FillPage(*std::exchange(nextPage_, std::nullopt)); });
+  }
   fillRuns_ = false;
   // The host may do anything in the event, so the transfers are over before.
   if (!busy_) return;
@@ -163,15 +168,20 @@ void ctrlThumbNailView::ShowPage(int first) {
 }
 
 void ctrlThumbNailView::FillPage(int first) {
-  firstIndex_ = pageFirst_ = first;
+  firstIndex_ = first;
+  const Text edited = editedName_.empty() ? Text() : PathOf(editedSlot_);
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     page_.ClearSlot(slot);
-    PathOf(slot).clear();
+    const auto position = static_cast<std::size_t>(first + slot);
+    const FileList& shown = apartment_.shownFiles;
+    PathOf(slot) = position <= shown.Count() ? shown.At(position)->FilePath : Text();
   }
-  const bool empty = apartment_.allFiles.IsEmpty();
+  // A name is edited over its own picture only.
+  if (!editedName_.empty() && PathOf(editedSlot_) != edited) OnEditorLeft();
+  // While the account is not listed, nobody knows whether it is empty.
+  const bool empty = apartment_.allFiles.IsEmpty() && apartment_.listLoaded;
   page_.ShowGrid(!empty);
   if (empty) {
-    editedName_.clear();
     page_.EnableScroll(false);
     iImgNo = 0;
     return;
@@ -199,7 +209,7 @@ bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
   FileSystem& files = apartment_.platform.files;
   Text copy = copies_.PathOf(record.FilePath);
   // Once more when the file was changed in the account meanwhile; not when it was deleted.
-  for (int tries = 0; tries < 2 && copies_.IsDue(record); ++tries) {
+  for (int tries = 0; tries < 2 && !copy.empty() && !copies_.Has(record); ++tries) {
     const std::uint32_t changes = apartment_.ChangesOfCopy(copy);
     if (!Fetch(slot, record, copy)) return false;
     if (apartment_.ChangesOfCopy(copy) == changes || !apartment_.allFiles.Find(record.FilePath)) break;
@@ -227,10 +237,16 @@ bool ctrlThumbNailView::Fetch(int slot, const CUpload& record, const Text& copy)
     if (IsReplaced()) return false;
   }
   // A stop is meant for the whole page.
-  if (IsStopped()) return true;
+  if (IsStopped()) {
+    FailStopped();
+    return true;
+  }
   page_.SetCaption(slot, u"Downloading " + ReplaceAll(record.FileName, u"&", u"&&"));
+  const bool again = FileExists(apartment_.platform.files, copy);
   Download(Text(record.FilePath), {}, copy, [this] { return IsReplaced(); });
-  return !IsReplaced();
+  if (IsReplaced()) return false;
+  if (again && !IsStopped()) copies_.AskedAgain(record);
+  return true;
 }
 
 bool ctrlThumbNailView::ShowPicture(int slot, const Text& copy) {

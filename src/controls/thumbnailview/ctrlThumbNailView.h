@@ -97,8 +97,6 @@ class ctrlThumbNailView final : public FileControl {
   void ShowFrom(int first, std::optional<std::size_t> position);
 
   Text& PathOf(int slot) { return paths_[static_cast<std::size_t>(slot - 1)]; }
-  // Address of the picture that a slot shows or waits for; empty when there is none.
-  Text AddressIn(int slot);
   // 0 when the picture is not on the page.
   int SlotOf(TextView path) const;
   void RaiseSelection();
@@ -108,14 +106,11 @@ class ctrlThumbNailView final : public FileControl {
   ThumbnailPage& page_;
   // Kept, because it holds the memory that it reads into.
   CImageHeight header_;
-  // Address of the picture in each slot, empty for none.
+  // Address of the picture that each slot shows or waits for, empty for none.
   std::array<Text, kSlotCount> paths_;
   // Address of the selected picture.
   Text selectedPath_;
   int firstIndex_ = 0;
-  // Of the page that is shown or being filled; firstIndex_ is 0 already while the thumb is dragged to the
-  // top.
-  int pageFirst_ = 0;
   int selectionFirstIndex_ = 0;
   int previousScroll_ = 0;
   bool scrolledBack_ = false;
@@ -136,8 +131,9 @@ class ctrlThumbNailView final : public FileControl {
   std::optional<Fetching> busy_;
 
   bool deleteRuns_ = false;
-  // The name that the editor started from; empty while it is hidden.
+  // The name that the editor started from, empty while it is hidden, and the slot that it stands in.
   Text editedName_;
+  int editedSlot_ = 0;
 };
 
 }  // namespace tarnwick

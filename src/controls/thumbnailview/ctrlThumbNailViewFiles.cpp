@@ -63,14 +63,6 @@ void ctrlThumbNailView::FocusGrid() {
   if (!apartment_.allFiles.IsEmpty() && editedName_.empty()) page_.Focus();
 }
 
-Text ctrlThumbNailView::AddressIn(int slot) {
-  Text& path = PathOf(slot);
-  const auto position = static_cast<std::size_t>(pageFirst_ + slot);
-  if (path.empty() && position <= apartment_.shownFiles.Count())
-    path = apartment_.shownFiles.At(position)->FilePath;
-  return path;
-}
-
 int ctrlThumbNailView::SlotOf(TextView path) const {
   if (Trim(path).empty()) return 0;
   const auto slot = std::ranges::find(paths_, path);
@@ -216,13 +208,12 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
 // --- What the user does ---
 
 void ctrlThumbNailView::OnSlotPressed(int slot, bool rightButton) {
-  const Text pressed = AddressIn(slot);
+  const Text pressed = PathOf(slot);
   if (pressed.empty()) return OnBackgroundPressed(rightButton);
   keepSelection_ = false;
   selectionFirstIndex_ = firstIndex_;
   selectedPath_ = pressed;
   UpdateSelection();
-  FocusGrid();
   RaiseSelection();
   if (rightButton) Raise(event::kContextMenu, Text(selectedPath_));
 }
@@ -244,7 +235,8 @@ void ctrlThumbNailView::OnKeyDown(int keyCode) {
       if (const std::shared_ptr<CUpload> record = SelectedRecord();
           record && SlotOf(selectedPath_) != 0 && !IsClosed()) {
         editedName_ = record->FileName;
-        page_.ShowEditor(SlotOf(selectedPath_), editedName_);
+        editedSlot_ = SlotOf(selectedPath_);
+        page_.ShowEditor(editedSlot_, editedName_);
       }
       return;
     case kEnterKey:

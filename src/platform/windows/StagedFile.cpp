@@ -51,8 +51,8 @@ bool Lives(DWORD process, const FILETIME& fileMade) {
          CompareFileTime(&started, &fileMade) <= 0;
 }
 
-FileOwner Opened(const std::wstring& path, DWORD access, DWORD disposition) {
-  return FileOwner(CreateFileW(path.c_str(), access, 0, nullptr, disposition, 0, nullptr));
+FileOwner Opened(const std::wstring& path, DWORD access, DWORD disposition, DWORD share = 0) {
+  return FileOwner(CreateFileW(path.c_str(), access, share, nullptr, disposition, 0, nullptr));
 }
 
 // Whether the file goes when `file`, its only handle, is closed, be it by the end of the process.
@@ -145,7 +145,9 @@ bool StagedFile::Commit() {
   const DWORD attributes = GetFileAttributesW(target_.c_str());
   // Not left to the rename, which some versions of the system let through.
   if (attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_READONLY) != 0) return false;
-  if (!file_) file_ = Opened(path_, DELETE, OPEN_EXISTING);
+  // A scanner may have opened what was written by its name.
+  if (!file_)
+    file_ = Opened(path_, DELETE, OPEN_EXISTING, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE);
   if (!file_ || !Keep() || !Rename(file_.Get(), target_)) return false;
   path_.clear();
   return true;

@@ -23,11 +23,13 @@ namespace {
 constexpr std::size_t kFirstRoom = 16 * 1024;
 
 // Bytes of a body that are handed over at a time: more while that takes less than kQuickMs, because each
-// hand-over costs as much as sending a few KiB. The system does not tell what of a piece has left, so a peer
-// that takes less than one within the time-out counts as silent.
+// hand-over costs as much as sending a few KiB; but not for the first ones, which the system may only have
+// put into a buffer. It does not tell what of a piece has left, so a peer that takes less than one within the
+// time-out counts as silent.
 constexpr std::uint64_t kLeastPiece = 64 * 1024;
 constexpr std::uint64_t kMostPiece = 256 * 1024;
 constexpr ULONGLONG kQuickMs = 1000;
+constexpr int kQuickPieces = 16;
 // Bytes of the last piece, without which a server does not have the body. It holds the end mark of a form.
 constexpr std::uint64_t kLastPiece = 1024;
 
@@ -320,10 +322,11 @@ bool Request::Done(DWORD expected, Call&& call) {
 bool Request::SendBody() {
   const std::uint64_t step = std::clamp(length_ / 100, kLeastStep, kMostStep);
   std::string next;
-  std::uint64_t most = kLeastPiece;
+  int quick = 0;  // pieces in a row
   std::uint64_t read = 0;
   const auto readNext = [&] {
     const std::uint64_t left = length_ - read;
+    const std::uint64_t most = quick > kQuickPieces ? kMostPiece : kLeastPiece;
     next.resize(static_cast<std::size_t>(left > kLastPiece ? std::min(most, left - kLastPiece) : left));
     read += next.size();
     return source_.Read(next) == next.size();
@@ -344,7 +347,7 @@ bool Request::SendBody() {
       return read == length_ || readNext();
     });
     if (!left) return false;
-    most = GetTickCount64() - begin < kQuickMs ? kMostPiece : kLeastPiece;
+    quick = GetTickCount64() - begin < kQuickMs ? quick + 1 : 0;
     sent += piece.size();
     if (sent - told < step && sent < length_) continue;
     source_.Sent(sent);
