@@ -318,9 +318,14 @@ TEST_F(CFileUploadTest, FtpProxy) {
   ASSERT_TRUE(Logon(u"u"));
   EXPECT_EQ(connectedTo(), "plain|0|u@h 21|pw");
 
-  settings[u"ProxyEnable"] = FakeRegistry::Number(0);
-  ASSERT_TRUE(Logon(u"u"));
-  EXPECT_EQ(connectedTo(), "h|21|u|pw");
+  // An entry without an address; then the same setting, not in use.
+  settings[u"ProxyServer"] = FakeRegistry::String("ftp;http=h1:80");
+  for (const FakeRegistry::Value& enabled : {FakeRegistry::Number(1), FakeRegistry::Number(0)}) {
+    settings[u"ProxyEnable"] = enabled;
+    ASSERT_TRUE(Logon(u"u"));
+    EXPECT_EQ(connectedTo(), "h|21|u|pw");
+    settings[u"ProxyServer"] = FakeRegistry::String("Plain:3128");
+  }
   fake.registry.keys.clear();
   ASSERT_TRUE(Logon(u"u"));
   EXPECT_EQ(connectedTo(), "h|21|u|pw");

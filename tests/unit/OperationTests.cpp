@@ -209,6 +209,7 @@ TEST_P(OperationTest, ReadsTheReply) {
   const std::optional<HttpAnswer> failures[] = {std::nullopt,
                                                 HttpAnswer{500, reply},
                                                 HttpAnswer{302, reply},
+                                                HttpAnswer{201, reply},
                                                 HttpAnswer{200, "ErrorOccured=1&" + reply},
                                                 HttpAnswer{200, reply + "&Broken=%4"},
                                                 HttpAnswer{200, reply + "&Latin1=%FC"}};

@@ -135,5 +135,42 @@ TEST(PictureBytes, GifKeepsItsFirstPicture) {
   EXPECT_FALSE(shown(800));
 }
 
+TEST(PictureBytes, BmpFillsItsPicture) {
+  const auto shown = [](std::uint32_t width, std::uint32_t height, char bits, char compression,
+                        const std::string& pixels) {
+    const auto little = [](std::uint32_t value) {
+      const std::string big = Big(value, 4);
+      return std::string(big.rbegin(), big.rend());
+    };
+    const std::string format{1, 0, bits, 0, compression};
+    return Reduced("BM" + std::string(8, '\0') + little(54) + little(40) + little(width) + little(height) +
+                   format + std::string(23, '\0') + pixels) != "refused";
+  };
+  // Lines of 24 bits take 12 bytes for three pixels; a negative height counts from the top.
+  for (const std::uint32_t height : {2U, 0U - 2U}) {
+    EXPECT_TRUE(shown(3, height, 24, 0, std::string(24, 'p')));
+    EXPECT_FALSE(shown(3, height, 24, 0, std::string(23, 'p')));
+  }
+  const struct {
+    std::uint32_t width;
+    char compression;
+    std::string code;
+    bool shown;
+  } rows[] = {
+      {3, 1, {"\3p\0\0\3p\0\1", 8}, true},
+      {3, 1, {"\3p\0\0\3p\0\0", 8}, true},
+      {3, 1, {"\0\3abc\0\0\0\1p\2p\0\1", 14}, true},  // pixels as they are, of 8 bits
+      {5, 2, {"\0\5abc\0\0\0\5p\0\1", 12}, true},     // of 4 bits
+      {3, 1, {"\3p\0\0\0\3ab", 8}, false},            // cut off
+      {3, 1, {"\3p\0\0\2p\0\1", 8}, false},           // a line that is too short
+      {3, 1, {"\4p\0\0\3p\0\1", 8}, false},           // too long
+      {3, 1, {"\3p\0\0\3p\0\0\3p\0\1", 12}, false},   // one too many
+      {3, 1, {"\3p\0\1", 4}, false},                  // one too few
+      {3, 1, {"\0\2\3\1\3p\0\1", 8}, false},          // skipped pixels
+  };
+  for (const auto& row : rows)
+    EXPECT_EQ(shown(row.width, 2, 8, row.compression, row.code), row.shown) << &row - rows;
+}
+
 }  // namespace
 }  // namespace tarnwick

@@ -15,6 +15,7 @@ namespace tarnwick {
 namespace {
 
 TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
+  EXPECT_EQ(Utf8FromText(u"\xD83D\xDE00\xD83Dx\xDE00"), "\xF0\x9F\x98\x80\uFFFDx\uFFFD");
   const Reply reply = Reply::FromBody("A=1&&Bare&E=&A=b+c&U=%C3%A9&V=%f0%9F%98%80\r\n");
   EXPECT_EQ(reply.ErrorOccured(), 0);
   const auto& values = *reply.GetValueByVariableName(u"A");
@@ -42,13 +43,15 @@ TEST(HttpAddress, SplitsAndRefuses) {
   EXPECT_EQ(address->path, u"/a/b");
   EXPECT_EQ(SplitHttpAddress(u"[::1]:81")->port, 81);
   EXPECT_EQ(SplitHttpAddress(u"[::1]")->port, 80);
-  for (const TextView bad : {u"", u"/a", u":80", u"h:", u"h:0", u"h:65536", u"h:9x", u"h\r\n/a", u"a b/c"})
+  for (const TextView bad :
+       {u"", u"/a", u":80", u"h:", u"h:0", u"h:65536", u"h:9x", u"h\r\n/a", u"h\u007f/a", u"a b/c"})
     EXPECT_FALSE(SplitHttpAddress(bad)) << Utf8FromText(bad);
 }
 
 TEST(Numbers, FromText) {
   EXPECT_EQ(NumberFromText(u" -2147220891 "), -2147220891);
   EXPECT_EQ(LeadingNumber(u"12.5 Bytes"), 12.5);
+  EXPECT_EQ(LeadingNumber(u"+12"), 12);
   EXPECT_EQ(LeadingNumber(u"nan"), 0);
   EXPECT_TRUE(BooleanFromText(u"tRuE") && BooleanFromText(u"-1") && !BooleanFromText(u"0"));
   for (const TextView bad : {u"", u"1x", u"+-1", u"2147483648"})
@@ -216,7 +219,8 @@ TEST(UserFolder, Branches) {
       {"no proxy settings", {}, {}, {}, false, {service, user}, false},
   };
   for (const Case& test : cases) {
-    for (const TextView temp : {u"C:\\Temp\\", u"C:\\Temp"}) {
+    for (const TextView temp : {u"C:\\Temp\\", u"C:\\Temp", u""}) {
+      const bool prepared = test.prepared && !temp.empty();
       FakePlatform fake;
       fake.apartment.session.userName = u"a@b.c";
       fake.apartment.UserFolderPath = u"old";
@@ -229,9 +233,9 @@ TEST(UserFolder, Branches) {
                                             {u"ProxyServer", FakeRegistry::String("h:80")}};
       }
       PrepareUserFolder(fake.apartment);
-      EXPECT_EQ(fake.files.made, test.made) << test.name;
-      EXPECT_EQ(fake.apartment.UserFolderPath, test.prepared ? user : u"old") << test.name;
-      EXPECT_EQ(fake.apartment.proxy.ProxyHost, test.prepared ? u"h" : u"") << test.name;
+      EXPECT_EQ(fake.files.made, temp.empty() ? Folders() : test.made) << test.name;
+      EXPECT_EQ(fake.apartment.UserFolderPath, prepared ? user : u"old") << test.name;
+      EXPECT_EQ(fake.apartment.proxy.ProxyHost, prepared ? u"h" : u"") << test.name;
     }
   }
 }

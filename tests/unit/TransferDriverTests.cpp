@@ -61,7 +61,8 @@ struct DriverTest : testing::Test {
 };
 
 TEST_F(DriverTest, TellsADownloadInOrderAndWritesBothFiles) {
-  fake.files.files[u"C:\\t\\a.jpg"] = {3, 0, "old"};
+  // A longer copy that begins alike.
+  fake.files.files[u"C:\\t\\a.jpg"] = {6, 0, "abcold"};
   Start();
   EXPECT_EQ(watchdog.runs, kWatchdogMs);
   socket.events->OnResolved();
@@ -73,7 +74,7 @@ TEST_F(DriverTest, TellsADownloadInOrderAndWritesBothFiles) {
   socket.Arrives("HTTP/1.1 200 OK\r\n\r\nab");
   EXPECT_EQ(watchdog.runs, kWatchdogMs);
   socket.Arrives("c");
-  EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "old");
+  EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "abcold");
   socket.events->OnClosedByPeer();
   EXPECT_EQ(log, (Transcript{"connect h:80", "resolving", "connected", "send GET /users/a@b/a.jpg HTTP/1.1",
                              "starting", "received 21", "reply HTTP/1.1 200 OK 2", "received 3", "close",
@@ -193,12 +194,15 @@ TEST_F(DriverTest, WatchdogQuitAndEnd) {
   EXPECT_EQ(watchdog.runs, 0U);
 
   Start();
+  socket.events->OnSocketError(10061);
+  EXPECT_EQ(log.back(), "failed 6 told");
+  Start();
   fake.pump.onWait = [] { return true; };
   downloader->Wait();
   EXPECT_EQ(log.back(), "resolving");
   fake.pump.onWait = [] { return false; };
   downloader->Wait();
-  EXPECT_EQ(log.back().substr(0, 6), "failed");
+  EXPECT_EQ(log.back(), "failed 5");
   EXPECT_EQ(std::ranges::count(log, "close"), 1);
 
   Start();
