@@ -132,6 +132,23 @@ TEST_F(ThumbNailTest, PagingMovesTheSelection) {
   EXPECT_EQ(control.iImgNo, 0);
 }
 
+TEST_F(ThumbNailTest, PagingBackHidesThePageThatWasThere) {
+  ListNumbers(6);
+  const auto shows = [this](const char* missing, const std::function<void()>& action) {
+    fake.files.files.erase(CopyOf(missing));
+    bool shown = false;
+    downloader.waits = {[&](FakeDownloader& from) {
+      shown = page.At(1).shown;
+      Arrives(from);
+    }};
+    action();
+    return shown;
+  };
+  EXPECT_TRUE(shows("3.gif", [this] { Scroll(2); }));
+  EXPECT_FALSE(shows("1.gif", [this] { Scroll(0); }));
+  EXPECT_TRUE(shows("1.gif", [this] { control.ChangeFileFilter(u"*"); }));
+}
+
 TEST_F(ThumbNailTest, FiltersByTheEndOfTheName) {
   List("a.GIF b.jpg c.jpeg d.png e.Jpg f", u"gif");
   EXPECT_EQ(Shown(), "a.GIF,");
@@ -309,6 +326,10 @@ TEST_F(ThumbNailTest, FetchesACopyOfAnotherLengthOnceInAListing) {
     host.onEvent = nullptr;
     EXPECT_TRUE(isAsked());
   }
+  // A size that is too large to be told.
+  List("a.gif b.gif");
+  fake.apartment.allFiles.At(1)->FileSize = -1;
+  EXPECT_FALSE(isAsked());
 }
 
 TEST_F(ThumbNailTest, PagingReplacesTheFill) {
@@ -367,6 +388,16 @@ TEST_F(ThumbNailTest, FillsThePageAfterATransferOfTheHosts) {
                       Arrival()};
   control.DownLoadFileFromServer(u"C:\\x");
   EXPECT_EQ(page.Look(), "3.gif* 4.gif 5.gif 6.gif ");
+  // Somebody has logged on by then.
+  fake.files.files.erase(CopyOf("1.gif"));
+  downloader.waits = {[this](FakeDownloader& from) {
+    Scroll(0);
+    fake.apartment.ForgetListing();
+    Arrives(from);
+  }};
+  control.DownLoadFileFromServer(u"C:\\x");
+  EXPECT_EQ(page.Look(), "No pictures./Click here for it");
+  EXPECT_EQ(control.iImgNo, 0);
 }
 
 TEST_F(ThumbNailTest, ClosingEndsTheWaitAndOpeningAllowsAnother) {
@@ -451,6 +482,12 @@ TEST_F(ThumbNailTest, SelectionIsOfTheListAndOfThePage) {
   EXPECT_TRUE(control.RenameFile(u"4.gif", u"x.gif"));
   EXPECT_EQ(page.Look(), "1.gif 3.gif* x.gif ");
   EXPECT_EQ(Selected(), AddressOf("3.gif"));
+  // A rename of what another listing has by now.
+  const auto again = std::make_shared<CUpload>(*fake.apartment.allFiles.Take(2));
+  fake.apartment.allFiles.Insert(2, again, again->FilePath);
+  EXPECT_TRUE(control.RenameFile(u"3.gif", u"y.gif"));
+  EXPECT_EQ(page.Look(), "1.gif y.gif* x.gif ");
+  EXPECT_EQ(Selected(), AddressOf("y.gif"));
   // The list gets shorter while the page is filled, by the hand of another control.
   ListNumbers(4);
   fake.files.files.erase(CopyOf("3.gif"));
@@ -565,6 +602,8 @@ TEST_F(ThumbNailTest, EditsTheNameInPlace) {
   control.OnKeyDown(113);
   page.edited = u"new & old";
   control.OnEditorEntered();
+  // When it hides, the window tells that the focus has left it.
+  control.OnEditorLeft();
   ExpectLog({"8888 ", "editor 2 new & old.gif", "caption 2 new && old", "editor hides",
              "caption 2 new && old.gif", "1031 "});
 
@@ -579,6 +618,9 @@ TEST_F(ThumbNailTest, EditsTheNameInPlace) {
   control.OnEditorLeft();
   control.OnEditorEntered();
   ExpectLog({"8888 ", "editor 2 new & old.gif", "editor hides"});
+  OnEvent("8888 ", [this] { control.Close(); });
+  control.OnKeyDown(113);
+  ExpectLog({"8888 ", "cancel"});
 }
 
 // A host calls the control while the editor is open, or while a page waits for its pictures.
@@ -587,6 +629,7 @@ TEST_F(ThumbNailTest, TakesCallsOfTheHostInBetween) {
   control.EnableRename(true);
   control.OnKeyDown(113);
   EXPECT_EQ(Validate("x.gif"), "1031 ,");
+  control.OnEditorLeft();
   EXPECT_EQ(std::ranges::count(log, "editor hides"), 1);
   EXPECT_EQ(page.Look(), "x.gif* 2.gif 3.gif 4.gif ");
 
@@ -608,7 +651,9 @@ TEST_F(ThumbNailTest, TakesCallsOfTheHostInBetween) {
   EXPECT_TRUE(control.Init(u"*"));
   EXPECT_FALSE(fake.apartment.listLoaded);
 
-  // Without a selected picture there is nothing to rename, and nobody is asked to.
+  // Without a selected picture there is nothing to rename, and nobody is asked to; an editor went with it.
+  control.OnKeyDown(113);
+  EXPECT_EQ(page.editor, 1);
   List("");
   EXPECT_EQ(Validate("y.gif"), "1033 ,");
 }
@@ -657,7 +702,12 @@ TEST_F(ThumbNailTest, DeletesTheSelectedPicture) {
   Scroll(2);
   control.OnSlotPressed(3, false);
   log.clear();
+  bool again = true;
+  fake.pump.onYield = [&] {
+    if (std::exchange(again, false)) control.DeleteFile();
+  };
   control.DeleteFile();
+  fake.pump.onYield = nullptr;
   EXPECT_EQ(Events(), "1001 ,1022 ,1015 " + AddressOf("1.gif") + ",") << "the page went with its last row";
   EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
   EXPECT_EQ(Shown() + Records(), "1.gif,2.gif,3.gif,4.gif,1.gif,2.gif,3.gif,4.gif,");
@@ -699,13 +749,16 @@ TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
   Scroll(0);
   EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
   EXPECT_EQ(Selected(), AddressOf("new.jpg"));
-  control.UploadedFileSetFocus(u"2.gif");
+  for (const TextView name : {u"2.gif", u"3.GIF"}) control.UploadedFileSetFocus(name);
   EXPECT_EQ(page.Look(), "1.gif 2.gif* 3.gif 4.gif ");
+  control.OnSlotPressed(1, false);
+  Scroll(2);
+  EXPECT_EQ(Selected(), AddressOf("3.gif")) << "another one was chosen meanwhile";
 
   // A picture that replaces one is shown instead of its old copy; what the filter hides is not shown.
-  fake.files.files[u"C:\\new.jpg"].bytes = "GIF89a....";
+  fake.files.files[u"C:\\new.jpg"].bytes = "GIF89a.....";
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
-  EXPECT_EQ(fake.files.files[CopyOf("new.jpg")].bytes, "GIF89a....");
+  EXPECT_EQ(fake.files.files[CopyOf("new.jpg")].bytes, "GIF89a.....");
   EXPECT_EQ(fake.apartment.shownFiles.Count(), 7U);
   control.ChangeFileFilter(u"gif");
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
@@ -738,8 +791,8 @@ TEST_F(ThumbNailTest, Drops) {
   EXPECT_FALSE(fake.apartment.abortTransfer);
   std::int32_t allowed = 1;
   control.OnStartDrag(data, allowed);
+  OnEvent("OLEDragDrop 1 0", [&] { control.OnCompleteDrag(0); });
   EXPECT_EQ(drop(files), "1021 ,") << "a picture dropped on its own page is none to upload";
-  control.OnCompleteDrag(0);
 }
 
 }  // namespace

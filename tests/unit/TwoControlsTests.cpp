@@ -3,6 +3,7 @@
 #include "controls/thumbnailview/ctrlThumbNailView.h"
 #include "fakes/FakeListView.h"
 #include "fakes/FakeThumbnailPage.h"
+#include "transfer/AcceptorPages.h"
 #include "unit/ControlFixture.h"
 
 namespace tarnwick {
@@ -37,6 +38,9 @@ class TwoControlsTest : public ControlTest {
 TEST_F(TwoControlsTest, ThumbnailsEndThenUploadThenInit) {
   EXPECT_TRUE(thumbnails->Init(u"*"));
   EXPECT_TRUE(list.mobjFileupload->ListIsCurrent()) << "the page has listed the same account";
+  fake.apartment.listingIsCurrent = false;
+  EXPECT_TRUE(list.Init(u"*"));
+  EXPECT_TRUE(fake.apartment.listLoaded) << "nor need the page list what the list has listed";
   thumbnails.reset();
   EXPECT_TRUE(list.UploadImage(u"C:\\new.jpg"));
   EXPECT_EQ(Records(), "new.jpg,");
@@ -81,6 +85,13 @@ TEST_F(TwoControlsTest, ChangesOvertakeAFetch) {
   } kCases[] = {
       {"upload", [this] { EXPECT_TRUE(list.UploadImage(u"C:\\b.gif")); }, "b.gif ", "a.gif* b.gif c.gif ",
        uploaded, ""},
+      {"upload that nobody answers",
+       [this] {
+         uploader.error = acceptor::kUnspecified;
+         EXPECT_FALSE(list.UploadImage(u"C:\\b.gif"));
+         uploader.error = 0;
+       },
+       "b.gif b.gif ", "a.gif* b.gif c.gif ", fetched, ""},
       {"rename", [this] { EXPECT_TRUE(list.RenameFile(u"b.gif", u"z.gif")); }, "b.gif z.gif ",
        "a.gif* z.gif c.gif ", "", fetched},
       {"delete",
