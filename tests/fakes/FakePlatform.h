@@ -152,7 +152,12 @@ struct FakeFiles : FileSystem {
   bool SameFile(TextView first, TextView second) override {
     return files.contains(Spelled(first)) && Spelled(first) == Spelled(second);
   }
-  void Copy(TextView source, TextView destination) override { files[Text(destination)] = At(source); }
+  // Like the system's: a file is not copied onto itself.
+  void Copy(TextView source, TextView destination) override {
+    if (SameFile(source, destination) || At(source).length > mostWritten)
+      throw RuntimeError(error::kPathAccess);
+    files[Text(destination)] = At(source);
+  }
   struct Reader : FileReader {
     explicit Reader(std::string itsBytes) : bytes(std::move(itsBytes)) {}
     std::size_t Read(std::span<char> room) override {
@@ -172,7 +177,8 @@ struct FakeFiles : FileSystem {
     return files[Text(path)].bytes.copy(room.data(), room.size());
   }
   struct Writer : FileWriter {
-    Writer(FakeFiles& itsOwner, TextView itsPath) : owner(itsOwner), path(itsPath) {}
+    Writer(FakeFiles& itsOwner, TextView itsPath) : owner(itsOwner), path(itsPath) { ++owner.writers; }
+    ~Writer() override { --owner.writers; }
     void Write(std::string_view more) override {
       if (bytes.size() + more.size() > owner.mostWritten) throw RuntimeError(error::kPathAccess);
       bytes += more;
@@ -182,6 +188,8 @@ struct FakeFiles : FileSystem {
     const Text path;
     std::string bytes;
   };
+  // Files that are being written.
+  int writers = 0;
   std::unique_ptr<FileWriter> Create(TextView path) override { return std::make_unique<Writer>(*this, path); }
   void Remove(TextView path) override {
     constexpr std::uint32_t kReadOnly = 1;

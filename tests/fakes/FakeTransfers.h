@@ -1,6 +1,8 @@
 // Scripted doubles of the components that move bytes.
 #pragma once
 
+#include <gtest/gtest.h>
+
 #include <deque>
 #include <functional>
 #include <string>
@@ -56,12 +58,16 @@ struct FakeDownloader : Downloader {
   DownloadEvents* events = nullptr;
   Text url;
   Text target;
-  // What happens while a wait sleeps, one entry a wait. When they are used up the watchdog runs out.
+  // What happens while a wait sleeps, one entry a wait. A wait without one would never end.
   std::deque<std::function<void(FakeDownloader&)>> waits;
+  // An entry: the watchdog runs out.
+  static void Silence(FakeDownloader& from) { from.events->Failed(58, u"timeout", false); }
 
   void Wait() override {
-    if (!events) return;
-    if (waits.empty()) return events->Failed(58, u"timeout", false);
+    if (waits.empty() || !events) {
+      ADD_FAILURE() << "nothing ends this wait";
+      throw RuntimeError(error::kInterrupted);
+    }
     const auto next = std::move(waits.front());
     waits.pop_front();
     next(*this);

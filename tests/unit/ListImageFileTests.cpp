@@ -93,6 +93,7 @@ TEST_F(ListImageUpload, Outcomes) {
     uploader.error = test.error;
     EXPECT_EQ(control.UploadImage(u"C:\\new.jpg"), test.result);
     fake.apartment.session.userName = u"u@x";
+    EXPECT_EQ(fake.files.writers, 0);
     EXPECT_EQ(Events(), test.events);
     const auto asks = [](const std::string& line) { return line.starts_with("ask FileUpload"); };
     EXPECT_EQ(std::ranges::count_if(log, asks), test.registered ? 1 : 0);
@@ -297,6 +298,8 @@ TEST_F(ListImageUpload, LocalCopyHasTheBytesThatWereSent) {
       {"no answer", "FileURL=http://h/u/new.jpg", acceptor::kUnspecified, 99, copy, ""},
       // The upload goes on; the file is copied as it is then.
       {"disk full for a while", "FileURL=http://h/u/new.jpg", 0, 5, copy, "later"},
+      // Nothing is better than the picture that was there before.
+      {"disk full", "FileURL=http://h/u/new.jpg", 0, 3, copy, ""},
       {"another name", "FileURL=http://h/u/x.jpg", 0, 99, fake.apartment.UserFolderPath + u"\\x.jpg",
        "later"},
       {"no safe name", "FileURL=http://h/u/a%3Ab", 0, 99, copy, "old"},
@@ -310,6 +313,7 @@ TEST_F(ListImageUpload, LocalCopyHasTheBytesThatWereSent) {
     uploader.error = test.error;
     control.UploadImage(u"C:\\new.jpg");
     EXPECT_EQ(fake.files.files[test.copy].bytes, test.bytes);
+    EXPECT_EQ(fake.files.writers, 0);
   }
   // A file that is already where its copy would be stays the one it is, however its name is spelled.
   uploader.error = 0;
@@ -486,12 +490,14 @@ TEST_F(ListImageTest, LeavesTheFilesOfAnotherUserAlone) {
   view.Select(0, true);
   control.bRenameEnabled = true;
   log.clear();
-  fake.apartment.session.userName = u"other";
-  control.DeleteFile();
-  EXPECT_FALSE(control.OnBeforeLabelEdit());
-  EXPECT_FALSE(control.OnAfterLabelEdit(0, u"b.jpg"));
-  ExpectLog({"view hourglass", "view pointer"});
-  fake.apartment.session.userName = u"u@x";
+  for (Text* of : {&fake.apartment.session.userName, &fake.apartment.session.serverName}) {
+    const Text own = std::exchange(*of, u"other");
+    control.DeleteFile();
+    EXPECT_FALSE(control.OnBeforeLabelEdit());
+    EXPECT_FALSE(control.OnAfterLabelEdit(0, u"b.jpg"));
+    ExpectLog({"view hourglass", "view pointer"});
+    *of = own;
+  }
   EXPECT_TRUE(control.OnAfterLabelEdit(0, u"b.jpg"));
 }
 
@@ -538,6 +544,9 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
         deleted += line.substr(at + 12) + ",";
     EXPECT_EQ(deleted, test.deleted);
     EXPECT_EQ(deleting.m_LastError == ftp_error::kSuccess, deleted == "a.jpg,b.jpg,c.jpg,");
+    if (std::string_view(test.name) == "closes") {
+      EXPECT_EQ(std::ranges::count(log, kAskList), 1) << "only before";
+    }
     EXPECT_EQ(log.back(), "view pointer");
     host.onEvent = nullptr;
     fake.apartment.session.userName = u"u@x";
@@ -549,11 +558,17 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
 TEST_F(ListImageTest, RenameTranscript) {
   List({{"a.jpg", "1"}, {"b.jpg", "1"}});
   view.Select(1, true);
+  // Another picture's, which had the name.
+  const Text old = fake.apartment.UserFolderPath + u"\\c d.jpg";
+  fake.files.files[old] = {1, 0};
   EXPECT_TRUE(control.RenameFile(u"b.jpg", u"  c d.jpg "));
   ExpectLog({"view hourglass", "page rename|http://h:81/users/|b.jpg|c d.jpg" + kRenameTail,
              "ask RenameFileRequest Username=u@x&ProductID=7&OldFileName=b.jpg&NewFileName=c%20d.jpg",
              "view refresh 1", "1031 c d.jpg", "view pointer"});
   EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_FALSE(fake.files.files.contains(old));
+  for (const TextView name : {u"\\B.jpg", u"\\C d.jpg"})
+    EXPECT_EQ(fake.apartment.ChangesOfCopy(fake.apartment.UserFolderPath + Text(name)), 1U);
   EXPECT_EQ(Names() + Records(), "a.jpg,c d.jpg,a.jpg,c d.jpg,");
   EXPECT_EQ(control.GetSelectedFilesHttpPath(), u"http://h/u/c d.jpg");
   EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/c d.jpg"), 2U);
@@ -641,7 +656,10 @@ TEST_F(ListImageDownload, Transcript) {
   for (const TextView folder : {u"C:\\To", u"C:\\To\\"}) {
     fake.files.files[u"C:\\To\\b.jpg"] = {1, 0};
     Succeed();
-    downloader.waits.push_front([](FakeDownloader& d) { EXPECT_FALSE(d.files.files.contains(d.target)); });
+    downloader.waits.push_front([this](FakeDownloader& d) {
+      EXPECT_FALSE(d.files.files.contains(d.target));
+      EXPECT_EQ(control.m_lDownloadedBytes, 0);
+    });
     EXPECT_EQ(control.DownLoadFileFromServer(folder), u"C:\\To\\b.jpg");
     ExpectLog({"download http://h/u/b.jpg to C:\\To\\b.jpg", "state 0", "state 2", "state 9", "9999 20",
                "downloaded 20", "reply HTTP/1.1 200 OK", "9999 5", "downloaded 5", "state 10",
@@ -717,8 +735,14 @@ TEST_F(ListImageDownload, Failures) {
   EXPECT_EQ(download(), "5555 ,");
   EXPECT_EQ(control.m_LastError, 6);
   EXPECT_EQ(control.m_strLastErrorDesc, u"refused");
+  // It is the outcome of the download, whatever else runs then.
+  replies["RenameFileRequest"] = "fails";
+  OnEvent("1033 ", [&] { downloader.events->Failed(6, u"refused", true); });
+  downloader.waits = {[&](FakeDownloader&) { control.RenameFile(u"a.jpg", u"b.jpg"); }};
+  EXPECT_EQ(download(), "1033 ,5555 ,");
+  EXPECT_EQ(control.m_LastError, 6);
   host.onEvent = nullptr;
-  // Silence.
+  downloader.waits = {FakeDownloader::Silence};
   EXPECT_EQ(download(), "");
   EXPECT_EQ(control.m_LastError, ftp_error::kTimeout);
   // The writer failed.
@@ -730,6 +754,10 @@ TEST_F(ListImageDownload, Failures) {
     EXPECT_EQ(control.m_strLastErrorDesc, folder == u"C:\\To" ? u"The local file could not be written."
                                                               : u"The local folder was not found.");
   }
+  // Or somebody has taken the file away by now.
+  downloader.waits = {[](FakeDownloader& d) { d.events->Finished(true); }};
+  EXPECT_EQ(download(), "");
+  EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
   // What is there already stays and is not taken for the download.
   constexpr std::uint32_t kReadOnly = 1;
   fake.files.files[u"C:\\To\\a.jpg"] = {3, kReadOnly, "old"};
@@ -813,10 +841,12 @@ TEST_F(ListImageDownload, CloseEndsTheWait) {
   List({{"a.jpg", "1"}});
   view.Select(0, true);
   Succeed();
-  OnEvent("9999 20", [&] { control.Close(); });
+  OnEvent("9999 20", [&] {
+    control.Close();
+    EXPECT_EQ(log.back(), "cancel") << "the host may pump messages here";
+  });
   EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
   EXPECT_EQ(downloader.waits.size(), 3U);
-  EXPECT_GE(std::ranges::count(log, "cancel"), 1);
   log.clear();
   EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"");
   EXPECT_FALSE(control.UploadImage(u"C:\\new.jpg"));

@@ -214,6 +214,12 @@ TEST_F(ListImageTest, ReselectsAfterRename) {
   view.Select(1, true);
   control.ChangeFileFilter(u"jpg");
   EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"New.jpg"});
+  // Another listing spells it in another way.
+  const auto again = std::make_shared<CUpload>(*fake.apartment.allFiles.Take(2));
+  again->FileName = u"NEW.jpg";
+  fake.apartment.allFiles.Insert(2, again);
+  control.ChangeFileFilter(u"jpg");
+  EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"NEW.jpg"});
   // What is not shown cannot be selected again; the first one stands in.
   control.ChangeFileFilter(u"gif");
   EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"c.gif"});
@@ -254,7 +260,9 @@ TEST_F(ListImageTest, DragsAndDrops) {
   } data;
   std::int32_t effect = 3;
   bool cursors = true;
-  const std::vector<Text> files{u"C:\\a.jpg", u"C:\\b.jpg"};
+  std::vector<Text> files{u"C:\\a.jpg", u"C:\\b.jpg"};
+  const std::vector<Text> all = files;
+  OnEvent("1023 C:\\a.jpg", [&] { files.clear(); });
   // A drag that the list did not start has no end to tell.
   control.OnCompleteDrag(0);
   control.OnDragOver(data, effect, {1, 0, 0, 0}, 2);
@@ -270,7 +278,7 @@ TEST_F(ListImageTest, DragsAndDrops) {
   control.OnSetData(data, 13);
   control.OnGiveFeedback(effect, cursors);
   EXPECT_FALSE(cursors);
-  control.OnDrop(data, files, effect, {});
+  control.OnDrop(data, all, effect, {});
   control.OnCompleteDrag(effect);
   control.OnCompleteDrag(effect);
   ExpectLog({"view drag", "OLEStartDrag 0", "OLESetData 13", "OLEGiveFeedback 1", "OLEDragDrop 1 0", "1021 ",
@@ -285,6 +293,10 @@ TEST_F(ListImageTest, DragsAndDrops) {
   EXPECT_EQ(control.ContentOfDrag().address, u"http://h/u/a.jpg");
   EXPECT_EQ(control.ContentOfDrag().localFile, u"C:\\Temp\\bv\\u@x\\a.jpg");
   fake.files.files.clear();
+  EXPECT_EQ(control.ContentOfDrag().localFile, u"");
+  // Without a user folder it is not looked for in the root of a drive.
+  fake.apartment.UserFolderPath.clear();
+  fake.files.files[u"\\a.jpg"] = {};
   EXPECT_EQ(control.ContentOfDrag().localFile, u"");
 }
 
@@ -318,6 +330,13 @@ TEST_F(ListImageTest, EditsLabels) {
   EXPECT_FALSE(control.OnAfterLabelEdit(1, u"y.gif"));
   control.StartLabelExit();
   ExpectLog({"view end edit"});
+  // A rename in the event of another one.
+  OnEvent("1031 m.gif", [&] {
+    EXPECT_TRUE(control.RenameFile(u"m.gif", u"n.gif"));
+    EXPECT_FALSE(control.OnBeforeLabelEdit());
+  });
+  EXPECT_TRUE(control.RenameFile(u"z.gif", u"m.gif"));
+  EXPECT_TRUE(control.OnBeforeLabelEdit());
   EXPECT_FALSE(control.EnableRename(false));
   EXPECT_FALSE(control.bRenameEnabled);
 }
