@@ -196,7 +196,8 @@ struct FakeFiles : FileSystem {
     if ((At(path).attributes & kReadOnly) != 0) throw RuntimeError(error::kPathAccess);
     files.erase(Text(path));
   }
-  void RemoveLeftovers(TextView) noexcept override {}
+  Text cleaned;
+  void RemoveLeftovers(TextView folder) noexcept override { cleaned = folder; }
   bool Exists(TextView pattern, bool withFolders) override {
     return files.contains(Text(pattern)) || (withFolders && std::ranges::count(folders, pattern) > 0);
   }

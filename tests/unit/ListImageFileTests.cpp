@@ -46,6 +46,7 @@ TEST_F(ListImageUpload, Transcript) {
   // The next filling spells the size as it spells the others.
   control.ChangeFileFilter(u"*");
   EXPECT_EQ(control.ItemText(0, 2), u"1536 Bytes (2 KB)");
+  EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"new.jpg"}) << "it stays selected";
 }
 
 TEST_F(ListImageUpload, Outcomes) {
@@ -754,6 +755,9 @@ TEST_F(ListImageDownload, Failures) {
     EXPECT_EQ(control.m_strLastErrorDesc, folder == u"C:\\To" ? u"The local file could not be written."
                                                               : u"The local folder was not found.");
   }
+  downloader.waits = {[](FakeDownloader& d) { d.events->Finished(false); }};
+  control.DownLoadFileFromServer(u"");
+  EXPECT_EQ(control.m_strLastErrorDesc, u"The local file could not be written.");
   // Or somebody has taken the file away by now.
   downloader.waits = {[](FakeDownloader& d) { d.events->Finished(true); }};
   EXPECT_EQ(download(), "");

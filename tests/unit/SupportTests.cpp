@@ -234,6 +234,9 @@ TEST(UserFolder, Branches) {
       }
       PrepareUserFolder(fake.apartment);
       EXPECT_EQ(fake.files.made, temp.empty() ? Folders() : test.made) << test.name;
+      if (prepared) {
+        EXPECT_EQ(fake.files.cleaned, user) << test.name;
+      }
       EXPECT_EQ(fake.apartment.UserFolderPath, prepared ? user : u"old") << test.name;
       EXPECT_EQ(fake.apartment.proxy.ProxyHost, prepared ? u"h" : u"") << test.name;
     }

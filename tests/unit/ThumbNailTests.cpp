@@ -133,7 +133,7 @@ TEST_F(ThumbNailTest, PagingMovesTheSelection) {
 }
 
 TEST_F(ThumbNailTest, PagingBackHidesThePageThatWasThere) {
-  ListNumbers(6);
+  ListNumbers(8);
   const auto shows = [this](const char* missing, const std::function<void()>& action) {
     fake.files.files.erase(CopyOf(missing));
     bool shown = false;
@@ -144,9 +144,13 @@ TEST_F(ThumbNailTest, PagingBackHidesThePageThatWasThere) {
     action();
     return shown;
   };
-  EXPECT_TRUE(shows("3.gif", [this] { Scroll(2); }));
+  EXPECT_TRUE(shows("5.gif", [this] { Scroll(4); }));
   EXPECT_FALSE(shows("1.gif", [this] { Scroll(0); }));
   EXPECT_TRUE(shows("1.gif", [this] { control.ChangeFileFilter(u"*"); }));
+  // From the first page, which the filter has shown.
+  Scroll(4);
+  control.ChangeFileFilter(u"*");
+  EXPECT_TRUE(shows("3.gif", [this] { Scroll(2); }));
 }
 
 TEST_F(ThumbNailTest, FiltersByTheEndOfTheName) {
@@ -354,6 +358,7 @@ TEST_F(ThumbNailTest, PagingReplacesTheFill) {
   OnEvent("1234 1", [this] { control.ChangeFileFilter(u"none"); });
   control.ChangeFileFilter(u"*");
   EXPECT_EQ(Events(), "1234 1,1234 -1,");
+  EXPECT_TRUE(std::ranges::none_of(log, [](const auto& line) { return line.starts_with("download"); }));
 }
 
 TEST_F(ThumbNailTest, RefusesTransfersOfTheHostWhileItFetches) {
@@ -729,7 +734,13 @@ TEST_F(ThumbNailTest, DeletesTheSelectedPicture) {
   EXPECT_EQ(Events(), "");
   EXPECT_TRUE(HasCopy("1.gif"));
   replies["DeleteFileRequest"] = "DeleteStatus=TRUE";
-  for (int i = 0; i < 4; ++i) control.DeleteFile();
+  OnEvent("1001 ", [this] { control.Close(); });
+  control.DeleteFile();
+  EXPECT_EQ(Events(), "1001 ,");
+  host.onEvent = nullptr;
+  control.Open();
+  control.ChangeFileFilter(u"*");
+  for (int i = 0; i < 3; ++i) control.DeleteFile();
   EXPECT_EQ(page.Look(), "No pictures./Click here for it");
   log.clear();
   control.DeleteFile();
@@ -744,11 +755,15 @@ TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
   EXPECT_EQ(Events(), "9999 0,9999 50,9999 100,1015 " + AddressOf("new.jpg") + ",");
   EXPECT_EQ(page.Look(), "5.gif 6.gif new.jpg* ");
+  EXPECT_EQ(page.value, 4);
   EXPECT_TRUE(HasCopy("new.jpg"));
   // It stays selected while pages change; where it is not on the page the first slot looks selected.
   Scroll(0);
   EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
   EXPECT_EQ(Selected(), AddressOf("new.jpg"));
+  control.EnableRename(true);
+  control.OnKeyDown(113);
+  EXPECT_EQ(log.back(), "8888 ") << "there is no place for an editor";
   for (const TextView name : {u"2.gif", u"3.GIF"}) control.UploadedFileSetFocus(name);
   EXPECT_EQ(page.Look(), "1.gif 2.gif* 3.gif 4.gif ");
   control.OnSlotPressed(1, false);

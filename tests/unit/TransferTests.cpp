@@ -69,6 +69,8 @@ TEST_F(DownloaderTest, FetchesAFile) {
             "42;w+;reply HTTP/1.1 404 Nope 2;3;w+;close;w-;write C:\\t\\my \xC3\xA9.jpg D:\\x.jpg;finished;");
   EXPECT_EQ(actions.body, "abc");
   EXPECT_EQ(machine.ContentLength(), 3);
+  Start(u"h/a.gif");
+  EXPECT_EQ(machine.ContentLength(), 0);
 }
 
 TEST_F(DownloaderTest, FindsTheHeaderAcrossAnySplit) {
@@ -85,7 +87,7 @@ TEST_F(DownloaderTest, FindsTheHeaderAcrossAnySplit) {
       ASSERT_EQ(machine.ContentLength(), 0);
     }
   Start(u"h/a.gif");
-  Data("A\r\nContent-Length: 3x\r\n\r\n");
+  Data("A\r\nContent-Length: 3x\r\nContent-Length: 4\r\n\r\n");
   EXPECT_EQ(machine.ContentLength(), 0);
 }
 
