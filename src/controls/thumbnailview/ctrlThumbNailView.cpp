@@ -207,7 +207,8 @@ void ctrlThumbNailView::FillPage(int first) {
 
 bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
   FileSystem& files = apartment_.platform.files;
-  Text copy = copies_.PathOf(record.FilePath);
+  // Another user's folder is none for these pictures.
+  Text copy = ShowsOtherAccount() ? Text() : copies_.PathOf(record.FilePath);
   // Once more when the file was changed in the account meanwhile; not when it was deleted.
   for (int tries = 0; tries < 2 && !copy.empty() && !copies_.Has(record); ++tries) {
     const std::uint32_t changes = apartment_.ChangesOfCopy(copy);
