@@ -20,7 +20,7 @@
 #include "fakes/FakePlatform.h"
 #include "service/CFileUpload.h"
 #include "service/modEnctyption.h"
-#include "support/Apartment.h"
+#include "session/Apartment.h"
 
 namespace tarnwick {
 namespace {

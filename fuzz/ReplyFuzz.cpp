@@ -7,7 +7,7 @@
 #include <string>
 #include <vector>
 
-#include "service/Reply.h"
+#include "transfer/Reply.h"
 
 namespace {
 

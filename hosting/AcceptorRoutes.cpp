@@ -6,7 +6,7 @@
 #include <string>
 #include <vector>
 
-#include "support/RuntimeError.h"
+#include "base/RuntimeError.h"
 #include "transfer/AcceptorPages.h"
 
 namespace tarnwick::hosting {

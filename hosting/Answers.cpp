@@ -5,7 +5,7 @@
 #include <memory>
 #include <string>
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick::hosting {
 namespace {

@@ -1,6 +1,6 @@
 #include "hosting/FormBody.h"
 
-#include "support/Text.h"
+#include "base/Text.h"
 #include "transfer/HttpAddress.h"
 
 namespace tarnwick::hosting {

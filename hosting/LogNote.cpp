@@ -1,6 +1,6 @@
 #include "hosting/LogNote.h"
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick::hosting {
 

@@ -3,9 +3,9 @@
 #include <clocale>
 #include <cwctype>
 
+#include "base/Text.h"
 #include "service/modEnctyption.h"
 #include "support/PathHelpers.h"
-#include "support/Text.h"
 
 namespace tarnwick::hosting {
 namespace {

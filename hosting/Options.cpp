@@ -3,8 +3,8 @@
 #include <charconv>
 #include <limits>
 
+#include "base/Text.h"
 #include "hosting/Names.h"
-#include "support/Text.h"
 
 namespace tarnwick::hosting {
 namespace {

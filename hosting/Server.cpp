@@ -17,7 +17,7 @@
 #include "hosting/Answers.h"
 #include "hosting/Connection.h"
 #include "hosting/LogNote.h"
-#include "service/Reply.h"
+#include "transfer/Reply.h"
 
 namespace tarnwick::hosting {
 

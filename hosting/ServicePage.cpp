@@ -7,9 +7,9 @@
 #include <limits>
 #include <map>
 
+#include "base/RuntimeError.h"
 #include "hosting/Names.h"
 #include "service/modEnctyption.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick::hosting {
 namespace {

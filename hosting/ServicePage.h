@@ -7,7 +7,7 @@
 #include "hosting/LogNote.h"
 #include "hosting/Options.h"
 #include "hosting/Store.h"
-#include "service/Reply.h"
+#include "transfer/Reply.h"
 
 namespace tarnwick::hosting {
 

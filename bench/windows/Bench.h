@@ -1,9 +1,9 @@
 // What the benchmarks under Wine share: measuring, one row of the table each, and the account.
 #pragma once
 
+#include "platform/windows/ComPtr.h"
 #include "platform/windows/WindowsHeaders.h"
-#include "support/surface/ComPtr.h"
-#include "support/surface/TypeLibrary.h"
+#include "surface/TypeLibrary.h"
 
 #include <oleauto.h>
 

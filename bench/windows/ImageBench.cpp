@@ -15,8 +15,8 @@
 #include <iterator>
 
 #include "StbImage.h"
+#include "controls/windows/PictureLoader.h"
 #include "platform/windows/AnsiText.h"
-#include "platform/windows/PictureLoader.h"
 #include "platform/windows/WindowsFileSystem.h"
 #include "support/CImageHeight.h"
 

@@ -13,8 +13,8 @@
 #include <string>
 #include <vector>
 
-#include "support/surface/Automation.h"
-#include "support/surface/ComPtr.h"
+#include "platform/windows/ComPtr.h"
+#include "surface/Automation.h"
 
 namespace tarnwick::demo {
 

@@ -3,7 +3,7 @@
 #pragma once
 
 #include "ControlContainer.h"
-#include "support/surface/TypeLibrary.h"
+#include "surface/TypeLibrary.h"
 
 #include "Argument.h"
 

@@ -16,12 +16,12 @@
 #include <utility>
 #include <vector>
 
+#include "base/Text.h"
 #include "controls/ControlEvents.h"
 #include "controls/ControlView.h"
 #include "controls/LocalCopies.h"
 #include "service/CFileUpload.h"
-#include "support/Apartment.h"
-#include "support/Text.h"
+#include "session/Apartment.h"
 #include "transfer/FtpErrors.h"
 #include "transfer/Transfers.h"
 

@@ -2,9 +2,9 @@
 
 #include <utility>
 
+#include "base/RuntimeError.h"
 #include "controls/FileNames.h"
 #include "support/PathHelpers.h"
-#include "support/RuntimeError.h"
 #include "transfer/FileNameGuard.h"
 
 namespace tarnwick {

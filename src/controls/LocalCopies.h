@@ -8,10 +8,10 @@
 #include <memory>
 #include <string_view>
 
+#include "base/Text.h"
 #include "platform/FileSystem.h"
-#include "service/CUpload.h"
-#include "support/Apartment.h"
-#include "support/Text.h"
+#include "session/Apartment.h"
+#include "session/CUpload.h"
 
 namespace tarnwick {
 

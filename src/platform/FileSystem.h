@@ -7,7 +7,7 @@
 #include <span>
 #include <string_view>
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

@@ -5,7 +5,7 @@
 #include <memory>
 #include <span>
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

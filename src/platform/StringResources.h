@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <memory>
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

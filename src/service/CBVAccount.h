@@ -2,7 +2,7 @@
 
 #include <cstdint>
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

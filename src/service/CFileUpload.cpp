@@ -2,11 +2,12 @@
 // on accounts are in CFileUploadFiles.cpp and CFileUploadAccounts.cpp.
 #include "service/CFileUpload.h"
 
+#include "base/RuntimeError.h"
+#include "platform/Internet.h"
 #include "service/Log.h"
 #include "service/modEnctyption.h"
-#include "support/ProxySettings.h"
-#include "support/ResourceStrings.h"
-#include "support/RuntimeError.h"
+#include "session/ProxySettings.h"
+#include "session/ResourceStrings.h"
 #include "transfer/HttpAddress.h"
 
 namespace tarnwick {

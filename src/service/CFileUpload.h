@@ -12,11 +12,11 @@
 #include <memory>
 #include <optional>
 
+#include "base/Text.h"
 #include "service/CBVAccount.h"
-#include "service/CUpload.h"
 #include "service/HTTPServer.h"
-#include "support/Apartment.h"
-#include "support/Text.h"
+#include "session/Apartment.h"
+#include "session/CUpload.h"
 
 namespace tarnwick {
 

@@ -1,8 +1,8 @@
 // The operations that administer accounts.
+#include "base/RuntimeError.h"
 #include "service/CFileUpload.h"
 #include "service/Log.h"
 #include "support/PathHelpers.h"
-#include "support/RuntimeError.h"
 #include "transfer/AcceptorPages.h"
 
 namespace tarnwick {

@@ -1,8 +1,9 @@
 // The operations on the files of the account.
+#include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
+#include "platform/Internet.h"
 #include "service/CFileUpload.h"
 #include "support/PathHelpers.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

@@ -11,8 +11,8 @@
 #include <utility>
 #include <vector>
 
-#include "service/Reply.h"
-#include "support/Text.h"
+#include "base/Text.h"
+#include "transfer/Reply.h"
 
 namespace tarnwick {
 

@@ -1,6 +1,6 @@
 #pragma once
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

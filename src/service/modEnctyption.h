@@ -3,7 +3,7 @@
 // the text's length. The cipher is its own inverse.
 #pragma once
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

@@ -3,8 +3,8 @@
 #include <algorithm>
 #include <span>
 
+#include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

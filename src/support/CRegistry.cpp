@@ -4,7 +4,7 @@
 #include <cstring>
 #include <memory>
 
-#include "support/RuntimeError.h"
+#include "base/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

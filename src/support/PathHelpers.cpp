@@ -2,8 +2,8 @@
 
 #include <cstdint>
 
+#include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

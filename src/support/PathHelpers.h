@@ -1,7 +1,7 @@
 // Names, files and folders. Names are split and compared exactly; nothing is trimmed.
 #pragma once
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

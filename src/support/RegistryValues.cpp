@@ -5,7 +5,7 @@
 #include <cstring>
 #include <vector>
 
-#include "support/RuntimeError.h"
+#include "base/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

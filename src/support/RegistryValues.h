@@ -4,8 +4,8 @@
 #include <cstdint>
 #include <memory>
 
+#include "base/Text.h"
 #include "platform/Registry.h"
-#include "support/Text.h"
 
 namespace tarnwick {
 

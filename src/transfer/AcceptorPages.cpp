@@ -1,9 +1,9 @@
 #include "transfer/AcceptorPages.h"
 
+#include "base/RuntimeError.h"
 #include "platform/HttpTransport.h"
-#include "service/Reply.h"
-#include "support/RuntimeError.h"
 #include "transfer/HttpAddress.h"
+#include "transfer/Reply.h"
 
 namespace tarnwick {
 namespace {

@@ -6,8 +6,8 @@
 #include <string_view>
 #include <utility>
 
+#include "base/Text.h"
 #include "platform/HttpTransport.h"
-#include "support/Text.h"
 
 namespace tarnwick {
 

@@ -4,7 +4,7 @@
 #include <cstdint>
 #include <optional>
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

@@ -3,10 +3,10 @@
 #include <algorithm>
 #include <memory>
 
+#include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
 #include "platform/Platform.h"
 #include "support/PathHelpers.h"
-#include "support/RuntimeError.h"
 #include "transfer/FtpErrors.h"
 
 namespace tarnwick {

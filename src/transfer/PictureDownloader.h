@@ -3,7 +3,7 @@
 
 #include "platform/StreamSocket.h"
 #include "platform/Timer.h"
-#include "support/Apartment.h"
+#include "session/Apartment.h"
 #include "transfer/SocketDownloader.h"
 #include "transfer/Transfers.h"
 

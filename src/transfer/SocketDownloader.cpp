@@ -5,8 +5,8 @@
 #include <new>
 #include <utility>
 
+#include "base/RuntimeError.h"
 #include "support/PathHelpers.h"
-#include "support/RuntimeError.h"
 #include "transfer/FileNameGuard.h"
 #include "transfer/HttpAddress.h"
 

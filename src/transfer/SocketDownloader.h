@@ -18,7 +18,7 @@
 #include <string>
 #include <string_view>
 
-#include "support/Text.h"
+#include "base/Text.h"
 #include "transfer/ReplyBuffer.h"
 
 namespace tarnwick {

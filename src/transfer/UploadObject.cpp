@@ -6,10 +6,10 @@
 #include <random>
 #include <string>
 
+#include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
 #include "platform/HttpTransport.h"
 #include "support/PathHelpers.h"
-#include "support/RuntimeError.h"
 #include "transfer/AcceptorPages.h"
 
 namespace tarnwick {

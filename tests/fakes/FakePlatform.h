@@ -10,14 +10,14 @@
 #include <utility>
 #include <vector>
 
+#include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
 #include "platform/HttpTransport.h"
 #include "platform/Internet.h"
 #include "platform/Platform.h"
 #include "platform/Registry.h"
 #include "platform/StringResources.h"
-#include "support/Apartment.h"
-#include "support/RuntimeError.h"
+#include "session/Apartment.h"
 
 namespace tarnwick {
 

@@ -7,11 +7,11 @@
 #include <functional>
 #include <string>
 
+#include "base/RuntimeError.h"
 #include "fakes/FakeHost.h"
 #include "fakes/FakePlatform.h"
 #include "platform/StreamSocket.h"
 #include "platform/Timer.h"
-#include "support/RuntimeError.h"
 #include "transfer/Transfers.h"
 
 namespace tarnwick {

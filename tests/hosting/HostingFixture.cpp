@@ -12,8 +12,8 @@
 #include <fstream>
 #include <iterator>
 
+#include "base/RuntimeError.h"
 #include "service/modEnctyption.h"
-#include "support/RuntimeError.h"
 #include "transfer/HttpAddress.h"
 
 namespace tarnwick::hosting {

@@ -16,7 +16,7 @@
 #include "hosting/Files.h"
 #include "hosting/Options.h"
 #include "hosting/Server.h"
-#include "service/Reply.h"
+#include "transfer/Reply.h"
 
 namespace tarnwick::hosting {
 

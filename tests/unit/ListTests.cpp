@@ -1,8 +1,8 @@
 #include <gtest/gtest.h>
 
+#include "base/KeyedList.h"
 #include "fakes/FakePlatform.h"
-#include "support/KeyedList.h"
-#include "support/TransferLists.h"
+#include "session/TransferLists.h"
 
 namespace tarnwick {
 namespace {

@@ -2,14 +2,14 @@
 
 #include "fakes/FakePlatform.h"
 #include "service/CFileUpload.h"
-#include "service/Reply.h"
+#include "session/ProxySettings.h"
+#include "session/ResourceStrings.h"
+#include "session/UserFolder.h"
 #include "support/CRegistry.h"
 #include "support/PathHelpers.h"
-#include "support/ProxySettings.h"
 #include "support/RegistryValues.h"
-#include "support/ResourceStrings.h"
-#include "support/UserFolder.h"
 #include "transfer/HttpAddress.h"
+#include "transfer/Reply.h"
 
 namespace tarnwick {
 namespace {

@@ -3,8 +3,8 @@
 
 #include <cmath>
 
+#include "base/RuntimeError.h"
 #include "fakes/FakeThumbnailPage.h"
-#include "support/RuntimeError.h"
 #include "transfer/AcceptorPages.h"
 #include "unit/ControlFixture.h"
 

@@ -1,6 +1,6 @@
 #include "controls/listimage/DirectoryDate.h"
 
-#include "support/RuntimeError.h"
+#include "base/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

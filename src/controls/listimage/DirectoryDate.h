@@ -2,7 +2,7 @@
 
 #include <chrono>
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

@@ -6,8 +6,8 @@
 #include <optional>
 #include <span>
 
+#include "base/Text.h"
 #include "controls/ControlView.h"
-#include "support/Text.h"
 
 namespace tarnwick {
 

@@ -5,10 +5,10 @@
 #include <array>
 #include <utility>
 
+#include "base/RuntimeError.h"
 #include "controls/FileNames.h"
-#include "support/ResourceStrings.h"
-#include "support/RuntimeError.h"
-#include "support/UserFolder.h"
+#include "session/ResourceStrings.h"
+#include "session/UserFolder.h"
 
 namespace tarnwick {
 namespace {

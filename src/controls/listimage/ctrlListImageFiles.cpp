@@ -1,9 +1,9 @@
 // What the operations on files do to the list.
 #include <algorithm>
 
+#include "base/RuntimeError.h"
 #include "controls/FileNames.h"
 #include "controls/listimage/ctrlListImage.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 

@@ -4,8 +4,8 @@
 
 #include <cstdint>
 
+#include "base/Text.h"
 #include "controls/ControlView.h"
-#include "support/Text.h"
 
 namespace tarnwick {
 

@@ -2,7 +2,7 @@
 // end the control. No member throws.
 #pragma once
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

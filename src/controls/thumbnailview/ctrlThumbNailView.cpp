@@ -6,12 +6,12 @@
 #include <limits>
 #include <utility>
 
+#include "base/RuntimeError.h"
 #include "controls/FileNames.h"
 #include "platform/FileSystem.h"
+#include "session/ResourceStrings.h"
+#include "session/UserFolder.h"
 #include "support/PathHelpers.h"
-#include "support/ResourceStrings.h"
-#include "support/RuntimeError.h"
-#include "support/UserFolder.h"
 
 namespace tarnwick {
 namespace {

@@ -2,11 +2,11 @@
 #include <algorithm>
 #include <utility>
 
+#include "base/RuntimeError.h"
 #include "controls/FileNames.h"
 #include "controls/thumbnailview/ctrlThumbNailView.h"
+#include "session/TransferLists.h"
 #include "support/PathHelpers.h"
-#include "support/RuntimeError.h"
-#include "support/TransferLists.h"
 
 namespace tarnwick {
 namespace {
@@ -83,7 +83,11 @@ void ctrlThumbNailView::UploadedFileSetFocus(TextView szFileName) {
   ResultAsItStood(0, [&](int&) {
     const std::size_t position =
         Find(apartment_.shownFiles, [&](const CUpload& file) { return file.FileName == szFileName; });
-    if (position != 0) ShowItem(position);
+    // Another one than what was uploaded last.
+    if (position != 0) {
+      keepSelection_ = false;
+      ShowItem(position);
+    }
     page_.Focus();
   });
 }

@@ -6,7 +6,7 @@
 #include <string>
 #include <string_view>
 
-#include "support/Text.h"
+#include "base/Text.h"
 
 namespace tarnwick {
 

@@ -2,8 +2,8 @@
 
 #include <utility>
 
+#include "base/RuntimeError.h"
 #include "platform/windows/Owner.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 

@@ -6,10 +6,10 @@
 #include <string>
 #include <utility>
 
+#include "base/RuntimeError.h"
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/Owner.h"
 #include "platform/windows/StagedFile.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

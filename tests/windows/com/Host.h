@@ -1,8 +1,8 @@
 // What the tests of this folder share: the server that they were started for, and values of automation.
 #pragma once
 
-#include "support/surface/ComPtr.h"
-#include "support/surface/TypeLibrary.h"
+#include "platform/windows/ComPtr.h"
+#include "surface/TypeLibrary.h"
 
 #include <oleauto.h>
 

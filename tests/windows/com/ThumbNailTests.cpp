@@ -5,7 +5,7 @@
 #include <thread>
 
 #include "Form.h"
-#include "platform/windows/ThumbnailLayout.h"
+#include "controls/windows/ThumbnailLayout.h"
 
 namespace tarnwick::test {
 namespace {

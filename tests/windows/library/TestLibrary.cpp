@@ -7,9 +7,9 @@
 #include "platform/windows/Owner.h"
 #include "platform/windows/WindowsRegistry.h"
 #include "support/CRegistry.h"
-#include "support/surface/DualObject.h"
-#include "support/surface/Guard.h"
-#include "support/surface/TypeLibrary.h"
+#include "surface/DualObject.h"
+#include "surface/Guard.h"
+#include "surface/TypeLibrary.h"
 
 namespace {
 

@@ -1,5 +1,5 @@
 // Pictures for small views: what a file's pixels become, and which files become nothing.
-#include "platform/windows/PictureLoader.h"
+#include "controls/windows/PictureLoader.h"
 
 #include <gtest/gtest.h>
 #include <objbase.h>
@@ -11,7 +11,7 @@
 #include <utility>
 #include <vector>
 
-#include "support/surface/ComPtr.h"
+#include "platform/windows/ComPtr.h"
 
 namespace tarnwick {
 namespace {

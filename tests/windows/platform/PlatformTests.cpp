@@ -3,11 +3,11 @@
 
 #include <functional>
 
+#include "base/RuntimeError.h"
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/Owner.h"
 #include "platform/windows/WindowsPlatform.h"
 #include "support/CRegistry.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

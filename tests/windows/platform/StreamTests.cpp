@@ -6,12 +6,12 @@
 #include <algorithm>
 #include <functional>
 
+#include "base/RuntimeError.h"
 #include "platform/windows/Owner.h"
 #include "platform/windows/WindowsHttpTransport.h"
 #include "platform/windows/WindowsMessagePump.h"
 #include "platform/windows/WindowsStreamSocket.h"
 #include "platform/windows/WindowsTimer.h"
-#include "support/RuntimeError.h"
 
 namespace tarnwick {
 namespace {

@@ -10,10 +10,10 @@
 #include <string>
 #include <vector>
 
+#include "controls/windows/WindowsScrollHook.h"
+#include "controls/windows/WindowsThumbnailPage.h"
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/SystemDpi.h"
-#include "platform/windows/WindowsScrollHook.h"
-#include "platform/windows/WindowsThumbnailPage.h"
 
 namespace tarnwick {
 namespace {

@@ -1,0 +1,87 @@
+// Finds the entries of a list by their key, of which each has another one.
+#pragma once
+
+#include <algorithm>
+#include <cstddef>
+#include <cstdint>
+#include <functional>
+#include <utility>
+#include <vector>
+
+#include "base/Text.h"
+
+namespace tarnwick {
+
+// Entry has a member `key`, which is not empty. Entries stay where they are as long as they are in the index.
+//
+// Open addressing with linear probing. Hashes lie apart from the pointers, so that a search, which jumps at
+// random, touches four bytes a place; a set with a node for each key costs three times as much once it
+// outgrows the processor's cache.
+template <typename Entry>
+class KeyIndex {
+ public:
+  Entry* Find(TextView key) const {
+    const std::size_t place = PlaceOf(key, HashOf(key));
+    return hashes_.empty() || hashes_[place] == 0 ? nullptr : entries_[place];
+  }
+  // Makes room for one more, so that Add cannot fail.
+  void MakeRoom() {
+    if ((count_ + 1) * 2 > hashes_.size()) Grow();
+  }
+  // The entry's key is not in the index yet, and there is room.
+  void Add(Entry* entry) {
+    Put(HashOf(entry->key), entry);
+    ++count_;
+  }
+  // The entry is in the index.
+  void Remove(const Entry* entry) {
+    std::size_t hole = PlaceOf(entry->key, HashOf(entry->key));
+    const std::size_t mask = hashes_.size() - 1;
+    // What follows moves up, unless it stands between its own place and the hole.
+    for (std::size_t next = (hole + 1) & mask; hashes_[next] != 0; next = (next + 1) & mask) {
+      if (((next - hashes_[next]) & mask) < ((next - hole) & mask)) continue;
+      hashes_[hole] = hashes_[next];
+      entries_[hole] = entries_[next];
+      hole = next;
+    }
+    hashes_[hole] = 0;
+    --count_;
+  }
+
+ private:
+  // Never 0, which marks a free place.
+  static std::uint32_t HashOf(TextView key) {
+    return static_cast<std::uint32_t>(std::hash<TextView>()(key)) | 0x80000000U;
+  }
+  // Where the key is, or the free place where it would go.
+  std::size_t PlaceOf(TextView key, std::uint32_t hash) const {
+    if (hashes_.empty()) return 0;
+    const std::size_t mask = hashes_.size() - 1;
+    std::size_t place = hash & mask;
+    while (hashes_[place] != 0 && !(hashes_[place] == hash && entries_[place]->key == key))
+      place = (place + 1) & mask;
+    return place;
+  }
+  void Put(std::uint32_t hash, Entry* entry) {
+    const std::size_t mask = hashes_.size() - 1;
+    std::size_t place = hash & mask;
+    while (hashes_[place] != 0) place = (place + 1) & mask;
+    hashes_[place] = hash;
+    entries_[place] = entry;
+  }
+  void Grow() {
+    const std::size_t size = std::max<std::size_t>(16, hashes_.size() * 2);
+    std::vector<std::uint32_t> hashes(size);
+    std::vector<Entry*> entries(size);
+    hashes.swap(hashes_);
+    entries.swap(entries_);
+    for (std::size_t i = 0; i < hashes.size(); ++i)
+      if (hashes[i] != 0) Put(hashes[i], entries[i]);
+  }
+
+  std::vector<std::uint32_t> hashes_;
+  std::vector<Entry*> entries_;
+  std::size_t count_ = 0;
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,737 @@
+#include "controls/windows/WindowsThumbnailPage.h"
+
+#include <algorithm>
+#include <string>
+
+#include "base/RuntimeError.h"
+#include "platform/windows/AnsiText.h"
+#include "platform/windows/CommonControls.h"
+
+namespace tarnwick {
+namespace {
+
+using layout::kCaption;
+using layout::kFrames;
+
+constexpr wchar_t kClassName[] = L"TarnwickThumbNailView";
+// Names for screen readers.
+constexpr wchar_t kPageName[] = L"Pictures of the account";
+constexpr wchar_t kScrollName[] = L"Pages";
+constexpr wchar_t kEditorName[] = L"New name";
+constexpr wchar_t kSlotName[] = L"Picture ";
+constexpr wchar_t kSwitchText[] = L"List view";
+
+constexpr COLORREF kLinkColor = RGB(0, 0, 255);
+constexpr COLORREF kCaptionColor = RGB(0, 0, 0x40);
+constexpr COLORREF kSelectedCaptionColor = RGB(255, 255, 255);
+constexpr COLORREF kCaptionPaper = RGB(255, 255, 255);
+
+// Up to the lines that fit, names without blanks included.
+constexpr UINT kCaptionFormat = DT_CENTER | DT_WORDBREAK | DT_EDITCONTROL | DT_END_ELLIPSIS;
+constexpr UINT kLinkFormat = DT_CENTER | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
+
+// Pictures in a row, and on a page.
+constexpr int kStep = 2;
+
+struct MemoryDcKind {
+  using Handle = HDC;
+  static Handle None() { return nullptr; }
+  static void Close(Handle handle) { DeleteDC(handle); }
+};
+using MemoryDcOwner = Owner<MemoryDcKind>;
+
+void Fill(HDC dc, const RECT& area, COLORREF color) {
+  SetDCBrushColor(dc, color);
+  FillRect(dc, &area, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
+}
+
+RECT Moved(RECT area, LONG x, LONG y) {
+  OffsetRect(&area, x, y);
+  return area;
+}
+
+// What a drawing selects into a device context, taken out again at its end.
+class Selected {
+ public:
+  Selected(HDC dc, HGDIOBJ object) : dc_(dc), old_(SelectObject(dc, object)) {}
+  ~Selected() { SelectObject(dc_, old_); }
+  Selected(const Selected&) = delete;
+  Selected& operator=(const Selected&) = delete;
+
+ private:
+  const HDC dc_;
+  const HGDIOBJ old_;
+};
+
+void DrawFocus(HDC dc, const RECT& area) {
+  // The dots take these colours.
+  SetTextColor(dc, RGB(0, 0, 0));
+  SetBkColor(dc, RGB(255, 255, 255));
+  DrawFocusRect(dc, &area);
+}
+
+}  // namespace
+
+WindowsThumbnailPage::WindowsThumbnailPage(HINSTANCE module, ThumbnailPageUser& user)
+    : ControlWindow(module, kClassName), user_(user) {}
+
+// --- The windows ---
+
+bool WindowsThumbnailPage::MakeChildren() {
+  // The system's own classes, so that screen readers know what they are.
+  const HWND outer = Outer();
+  SetWindowTextW(outer, kPageName);
+  gridWindow_ =
+      MakeChild(outer, L"STATIC", kPageName, WS_TABSTOP | WS_CLIPCHILDREN | SS_OWNERDRAW | SS_NOTIFY);
+  // The editor lies above the slots. What stands before it is its name, even if it is never shown.
+  MakeChild(gridWindow_, L"STATIC", kEditorName, SS_NOPREFIX);
+  editorWindow_ = MakeChild(gridWindow_, L"EDIT", L"", WS_BORDER | WS_CLIPSIBLINGS | ES_AUTOHSCROLL);
+  for (std::size_t slot = 0; slot < kSlotCount; ++slot)
+    slots_[slot].window = MakeChild(gridWindow_, L"STATIC", L"", WS_CLIPSIBLINGS | SS_OWNERDRAW | SS_NOTIFY);
+  scrollWindow_ = MakeChild(outer, L"SCROLLBAR", kScrollName, WS_TABSTOP | SBS_VERT);
+  messageWindow_ = MakeChild(outer, L"STATIC", L"", SS_CENTER | SS_NOPREFIX);
+  linkWindow_ = MakeChild(outer, L"BUTTON", L"", WS_TABSTOP | BS_OWNERDRAW);
+  switchWindow_ = MakeChild(outer, L"BUTTON", kSwitchText, WS_TABSTOP | WS_VISIBLE | BS_PUSHBUTTON);
+  for (const HWND window :
+       {gridWindow_, editorWindow_, scrollWindow_, messageWindow_, linkWindow_, switchWindow_})
+    if (!window) return false;
+  for (int slot = 1; slot <= kSlotCount; ++slot) {
+    if (!At(slot).window) return false;
+    ApplyCaption(slot);
+  }
+  PlaceChildren();
+  ApplyScroll();
+  ApplyContent();
+  return true;
+}
+
+// All but the link, whose place depends on its text.
+void WindowsThumbnailPage::PlaceChildren() const {
+  const auto place = [this](HWND window, const layout::TwipRect& area) {
+    const RECT at = Pixels(area);
+    MoveWindow(window, at.left, at.top, at.right - at.left, at.bottom - at.top, TRUE);
+  };
+  place(gridWindow_, layout::kGrid);
+  for (std::size_t slot = 0; slot < kSlotCount; ++slot) place(slots_[slot].window, kFrames[slot]);
+  place(scrollWindow_, layout::kScrollBar);
+  place(messageWindow_, layout::kMessage);
+  place(switchWindow_, layout::kButton);
+}
+
+void WindowsThumbnailPage::DpiChanged(int) {
+  PlaceChildren();
+  for (Slot& slot : slots_)
+    if (slot.picture) LoadPictureOf(slot);
+  PlaceEditor();
+}
+
+void WindowsThumbnailPage::WindowGone() {
+  gridWindow_ = scrollWindow_ = messageWindow_ = linkWindow_ = switchWindow_ = editorWindow_ = nullptr;
+  for (Slot& slot : slots_) slot.window = nullptr;
+  edited_ = 0;
+  tellingFocus_ = tellingEditor_ = false;
+  dragFrom_.reset();
+}
+
+void WindowsThumbnailPage::ApplyLook() {
+  LOGFONTW font = {};
+  GetObjectW(Font(), sizeof font, &font);
+  font.lfUnderline = TRUE;
+  linkFont_ = FontOwner(CreateFontIndirectW(&font));
+  for (const HWND window : {editorWindow_, messageWindow_, switchWindow_})
+    SendMessageW(window, WM_SETFONT, reinterpret_cast<WPARAM>(Font()), TRUE);
+  ApplyTexts();
+  RefreshGrid();
+}
+
+void WindowsThumbnailPage::RefreshGrid() const {
+  if (gridWindow_) RedrawWindow(gridWindow_, nullptr, nullptr, RDW_INVALIDATE | RDW_ERASE | RDW_ALLCHILDREN);
+}
+
+int WindowsThumbnailPage::SlotOf(HWND window) const {
+  for (std::size_t slot = 0; slot < kSlotCount; ++slot)
+    if (slots_[slot].window == window) return static_cast<int>(slot) + 1;
+  return 0;
+}
+
+HWND WindowsThumbnailPage::FirstStop() const {
+  return content_ == Content::kGrid           ? gridWindow_
+         : content_ == Content::kEmptyAccount ? linkWindow_
+                                              : switchWindow_;
+}
+
+void WindowsThumbnailPage::Focus() {
+  // A window inside that has just got the focus keeps it. A page that nobody sees takes it from nobody.
+  if (!tellingFocus_ && Window() && IsWindowVisible(Outer())) SetFocus(FirstStop());
+}
+
+bool WindowsThumbnailPage::HasFocus() const {
+  const HWND outer = Outer();
+  const HWND focus = GetFocus();
+  return outer && (focus == outer || IsChild(outer, focus));
+}
+
+bool WindowsThumbnailPage::MoveFocus(bool backward) {
+  std::array stops = {gridWindow_, scrollWindow_, linkWindow_, switchWindow_};
+  if (backward) std::reverse(stops.begin(), stops.end());
+  const HWND focus = GetFocus();
+  const auto current = std::find(stops.begin(), stops.end(), focus == editorWindow_ ? gridWindow_ : focus);
+  if (current == stops.end()) return false;
+  const auto next = std::find_if(current + 1, stops.end(),
+                                 [](HWND stop) { return IsWindowVisible(stop) && IsWindowEnabled(stop); });
+  if (next == stops.end()) return false;
+  SetFocus(*next);
+  return true;
+}
+
+// --- What the rules show ---
+
+void WindowsThumbnailPage::ShowGrid(bool grid) {
+  content_ = grid ? Content::kGrid : Content::kEmptyAccount;
+  if (grid)
+    for (Slot& slot : slots_) slot.shown = true;
+  else
+    HideEditor();
+  ApplyContent();
+}
+
+void WindowsThumbnailPage::ApplyContent() const {
+  if (!gridWindow_) return;
+  const bool grid = content_ == Content::kGrid;
+  const bool texts = content_ == Content::kEmptyAccount;
+  for (const Slot& slot : slots_) ShowWindow(slot.window, slot.shown ? SW_SHOWNA : SW_HIDE);
+  // First what comes, so that the focus finds a place to go to.
+  const std::array windows = {gridWindow_, scrollWindow_, messageWindow_, linkWindow_};
+  const std::array shown = {grid, grid, texts, texts};
+  for (std::size_t i = 0; i < windows.size(); ++i)
+    if (shown[i]) ShowWindow(windows[i], SW_SHOWNA);
+  for (std::size_t i = 0; i < windows.size(); ++i)
+    if (!shown[i]) ShowWindow(windows[i], SW_HIDE);
+}
+
+void WindowsThumbnailPage::SetEmptyTexts(TextView message, TextView link) {
+  message_ = message;
+  link_ = link;
+  ApplyTexts();
+}
+
+void WindowsThumbnailPage::ApplyTexts() const {
+  if (!linkWindow_) return;
+  SetWindowTextW(messageWindow_, WideFromText(message_).c_str());
+  const std::wstring link = WideFromText(link_);
+  SetWindowTextW(linkWindow_, link.c_str());
+  // Only over its text is the link a link.
+  const RECT room = Pixels(layout::kLink);
+  SIZE text = {};
+  const HDC dc = GetDC(linkWindow_);
+  {
+    const Selected font(dc, linkFont_.Get());
+    GetTextExtentPoint32W(dc, link.c_str(), static_cast<int>(link.size()), &text);
+  }
+  ReleaseDC(linkWindow_, dc);
+  const int width = std::min<int>(text.cx + 2 * Pixels(60), room.right - room.left);
+  MoveWindow(linkWindow_, (room.left + room.right - width) / 2, room.top, width, room.bottom - room.top,
+             TRUE);
+  InvalidateRect(linkWindow_, nullptr, TRUE);
+}
+
+void WindowsThumbnailPage::ShowSlot(int slot, bool shown) {
+  At(slot).shown = shown;
+  if (At(slot).window) ShowWindow(At(slot).window, shown ? SW_SHOWNA : SW_HIDE);
+}
+
+void WindowsThumbnailPage::ClearSlot(int slot) {
+  At(slot).picture = {};
+  SetCaption(slot, {});
+}
+
+void WindowsThumbnailPage::SetCaption(int slot, TextView caption) {
+  At(slot).caption = caption;
+  ApplyCaption(slot);
+}
+
+void WindowsThumbnailPage::ApplyCaption(int slot) {
+  const Slot& changed = At(slot);
+  if (!changed.window) return;
+  const std::wstring name =
+      changed.caption.empty() ? kSlotName + std::to_wstring(slot) : WideFromText(changed.caption);
+  SetWindowTextW(changed.window, name.c_str());
+  InvalidateRect(changed.window, nullptr, FALSE);
+}
+
+bool WindowsThumbnailPage::SetPicture(int slot, TextView path, const PicturePlace& place) {
+  Slot& changed = At(slot);
+  changed.path = WideFromText(path);
+  changed.twips = place;
+  changed.picture = {};
+  LoadPictureOf(changed);
+  if (changed.window) {
+    // At once: the next picture may take its time.
+    InvalidateRect(changed.window, nullptr, FALSE);
+    UpdateWindow(changed.window);
+  }
+  return static_cast<bool>(changed.picture);
+}
+
+// A picture that is no longer there to be loaded again stays as it was loaded.
+void WindowsThumbnailPage::LoadPictureOf(Slot& slot) const {
+  const auto pixels = [this](double twips) { return layout::Pixels(twips, Dpi()); };
+  const PicturePlace& twips = slot.twips;
+  slot.place = {pixels(twips.left), pixels(twips.top), pixels(twips.left + twips.width),
+                pixels(twips.top + twips.height)};
+  // Of a very long or very high picture a line remains.
+  const int width = std::max<int>(1, slot.place.right - slot.place.left);
+  const int height = std::max<int>(1, slot.place.bottom - slot.place.top);
+  slot.place.right = slot.place.left + width;
+  slot.place.bottom = slot.place.top + height;
+  if (BitmapOwner picture = LoadPicture(slot.path, width, height, BackColor()))
+    slot.picture = std::move(picture);
+}
+
+void WindowsThumbnailPage::SetSelected(int slot, bool selected) {
+  Slot& changed = At(slot);
+  if (changed.selected == selected) return;
+  changed.selected = selected;
+  if (!changed.window) return;
+  InvalidateRect(changed.window, nullptr, FALSE);
+  if (selected) NotifyWinEvent(EVENT_OBJECT_SELECTION, changed.window, OBJID_CLIENT, CHILDID_SELF);
+}
+
+// --- The scroll bar ---
+
+void WindowsThumbnailPage::SetScrollRange(int max) {
+  scrollMax_ = std::max(0, max);
+  SetScrollValue(scrollValue_);
+}
+
+void WindowsThumbnailPage::EnableScroll(bool enabled) {
+  scrollEnabled_ = enabled;
+  ApplyScroll();
+}
+
+void WindowsThumbnailPage::SetScrollValue(int value) {
+  scrollValue_ = restValue_ = std::clamp(value, 0, scrollMax_);
+  ApplyScroll();
+}
+
+void WindowsThumbnailPage::ApplyScroll() const {
+  if (!scrollWindow_) return;
+  SCROLLINFO info = {};
+  info.cbSize = sizeof info;
+  info.fMask = SIF_RANGE | SIF_PAGE | SIF_POS;
+  // The thumb is as long as a page, so the range is as long as all pictures.
+  info.nMax = scrollMax_ + kSlotCount - 1;
+  info.nPage = kSlotCount;
+  info.nPos = scrollValue_;
+  SetScrollInfo(scrollWindow_, SB_CTL, &info, TRUE);
+  EnableWindow(scrollWindow_, scrollEnabled_);
+}
+
+void WindowsThumbnailPage::OnScroll(int code, int position) {
+  // The message carries 16 bits of the position; the bar knows them all.
+  SCROLLINFO info = {};
+  info.cbSize = sizeof info;
+  info.fMask = SIF_TRACKPOS;
+  if (GetScrollInfo(scrollWindow_, SB_CTL, &info) && (info.nTrackPos & 0xFFFF) == position)
+    position = info.nTrackPos;
+  // Between two rows the thumb stands for the upper one, so that no picture changes its column.
+  const int dragged = std::clamp(position - position % kStep, 0, scrollMax_);
+  switch (code) {
+    case SB_LINEUP:
+    case SB_PAGEUP:
+      ScrollTo(scrollValue_ - kStep);
+      break;
+    case SB_LINEDOWN:
+    case SB_PAGEDOWN:
+      ScrollTo(scrollValue_ + kStep);
+      break;
+    case SB_TOP:
+      ScrollTo(0);
+      break;
+    case SB_BOTTOM:
+      ScrollTo(scrollMax_);
+      break;
+    case SB_THUMBPOSITION:
+      ScrollTo(dragged);
+      break;
+    case SB_THUMBTRACK:
+      if (dragged == scrollValue_) break;
+      scrollValue_ = dragged;
+      draggedAway_ = true;
+      user_.ScrollDragged(dragged);
+      break;
+    default:
+      break;
+  }
+}
+
+void WindowsThumbnailPage::ScrollTo(int value) {
+  scrollValue_ = std::clamp(value, 0, scrollMax_);
+  ApplyScroll();
+  // Let go where it was, it has shown other pages meanwhile.
+  if (scrollValue_ == restValue_ && !draggedAway_) return;
+  draggedAway_ = false;
+  restValue_ = scrollValue_;
+  user_.ScrollChanged(scrollValue_);
+}
+
+// --- The editor ---
+
+void WindowsThumbnailPage::PlaceEditor() const {
+  if (edited_ == 0) return;
+  const RECT frame = Pixels(kFrames[static_cast<std::size_t>(edited_) - 1]);
+  const RECT caption = Pixels(kCaption);
+  TEXTMETRICW metrics = {};
+  const HDC dc = GetDC(editorWindow_);
+  {
+    const Selected font(dc, Font());
+    GetTextMetricsW(dc, &metrics);
+  }
+  ReleaseDC(editorWindow_, dc);
+  const int height = std::min<int>(metrics.tmHeight + 2 * Pixels(45), caption.bottom - caption.top);
+  MoveWindow(editorWindow_, frame.left + caption.left, frame.top + caption.top, caption.right - caption.left,
+             height, TRUE);
+}
+
+void WindowsThumbnailPage::ShowEditor(int slot, TextView name) {
+  if (!Window()) return;
+  edited_ = slot;
+  PlaceEditor();
+  SetWindowTextW(editorWindow_, WideFromText(name).c_str());
+  ShowWindow(editorWindow_, SW_SHOW);
+  SetFocus(editorWindow_);
+  SendMessageW(editorWindow_, EM_SETSEL, 0, -1);
+}
+
+void WindowsThumbnailPage::HideEditor() {
+  if (edited_ == 0) return;
+  edited_ = 0;
+  if (GetFocus() == editorWindow_) SetFocus(gridWindow_);
+  ShowWindow(editorWindow_, SW_HIDE);
+}
+
+Text WindowsThumbnailPage::EditorText() const {
+  if (!editorWindow_) return {};
+  std::wstring text(static_cast<std::size_t>(GetWindowTextLengthW(editorWindow_)) + 1, L'\0');
+  text.resize(
+      static_cast<std::size_t>(GetWindowTextW(editorWindow_, text.data(), static_cast<int>(text.size()))));
+  return TextFromWide(text);
+}
+
+// --- What the user does ---
+
+std::optional<LRESULT> WindowsThumbnailPage::OnMessage(HWND window, UINT message, WPARAM wParam,
+                                                       LPARAM lParam) {
+  if (message == WM_SETFOCUS) return OnFocus(window, wParam, lParam);
+  if (window == Outer()) return OnOuterMessage(message, wParam, lParam);
+  if (window == editorWindow_) return OnEditorMessage(message, wParam, lParam);
+  if (window == linkWindow_ || window == switchWindow_)
+    return OnButtonMessage(window, message, wParam, lParam);
+  if (window == gridWindow_ || SlotOf(window) != 0) return OnGridMessage(window, message, wParam, lParam);
+  return std::nullopt;
+}
+
+LRESULT WindowsThumbnailPage::OnFocus(HWND window, WPARAM wParam, LPARAM lParam) {
+  const HWND outer = Outer();
+  if (window == outer) {
+    SetFocus(FirstStop());
+    return 0;
+  }
+  const LRESULT result = DefSubclassProc(window, WM_SETFOCUS, wParam, lParam);
+  RefreshGrid();
+  tellingFocus_ = true;
+  user_.GotFocus();
+  if (IsAlive(this, outer)) tellingFocus_ = false;
+  return result;
+}
+
+std::optional<LRESULT> WindowsThumbnailPage::OnOuterMessage(UINT message, WPARAM wParam, LPARAM lParam) {
+  const auto sender = reinterpret_cast<HWND>(lParam);
+  switch (message) {
+    case WM_LBUTTONDOWN:
+    case WM_RBUTTONDOWN:
+    case WM_MBUTTONDOWN:
+      return OnPress(Outer(), message, {});
+    case WM_MOUSEWHEEL: {
+      if (content_ != Content::kGrid || !scrollEnabled_) return std::nullopt;
+      wheelRest_ += GET_WHEEL_DELTA_WPARAM(wParam);
+      const int notches = wheelRest_ / WHEEL_DELTA;
+      wheelRest_ -= notches * WHEEL_DELTA;
+      ScrollTo(scrollValue_ - notches * kStep);
+      return 0;
+    }
+    case WM_VSCROLL:
+      if (sender != scrollWindow_) return std::nullopt;
+      OnScroll(LOWORD(wParam), HIWORD(wParam));
+      return 0;
+    case WM_COMMAND:
+      if (HIWORD(wParam) != BN_CLICKED) return std::nullopt;
+      if (sender == linkWindow_)
+        user_.LinkClicked();
+      else if (sender == switchWindow_)
+        user_.SwitchViewClicked();
+      return 0;
+    case WM_DRAWITEM: {
+      const auto& item = *reinterpret_cast<const DRAWITEMSTRUCT*>(lParam);
+      if (item.hwndItem == linkWindow_) DrawLink(item.hDC, item.rcItem, GetFocus() == linkWindow_);
+      return TRUE;
+    }
+    default:
+      return std::nullopt;
+  }
+}
+
+std::optional<LRESULT> WindowsThumbnailPage::OnGridMessage(HWND window, UINT message, WPARAM wParam,
+                                                           LPARAM lParam) {
+  const POINT at = {static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))};
+  switch (message) {
+    case WM_PAINT:
+      Paint(window);
+      return 0;
+    case WM_ERASEBKGND:
+      return TRUE;
+    // The class tells double clicks; here the second press is one more.
+    case WM_LBUTTONDOWN:
+    case WM_RBUTTONDOWN:
+    case WM_MBUTTONDOWN:
+    case WM_LBUTTONDBLCLK:
+    case WM_RBUTTONDBLCLK:
+    case WM_MBUTTONDBLCLK:
+      return OnPress(window, message, at);
+    case WM_MOUSEMOVE:
+      if (!dragFrom_ || !(wParam & MK_LBUTTON)) return std::nullopt;
+      return OnMove(at);
+    case WM_LBUTTONUP:
+      EndDragWatch();
+      return 0;
+    case WM_CAPTURECHANGED:
+      dragFrom_.reset();
+      return 0;
+    case WM_KILLFOCUS:
+      RefreshGrid();
+      return std::nullopt;
+    case WM_GETDLGCODE:
+      // A dialog would take Enter for its own button.
+      if (window != gridWindow_) return std::nullopt;
+      return wParam == VK_RETURN ? DLGC_WANTMESSAGE : DLGC_WANTARROWS;
+    case WM_KEYDOWN:
+      user_.KeyPressed(static_cast<int>(wParam));
+      return 0;
+    default:
+      return std::nullopt;
+  }
+}
+
+LRESULT WindowsThumbnailPage::OnPress(HWND window, UINT message, POINT at) {
+  const HWND outer = Outer();
+  const int slot = SlotOf(window);
+  const bool left = message == WM_LBUTTONDOWN || message == WM_LBUTTONDBLCLK;
+  const bool right = message == WM_RBUTTONDOWN || message == WM_RBUTTONDBLCLK;
+  // Ends an edit, too.
+  SetFocus(FirstStop());
+  if (!IsAlive(this, outer)) return 0;
+  if (slot == 0) {
+    user_.BackgroundPressed(right);
+    return 0;
+  }
+  // Before the user is told, whose code may wait until the button is up again.
+  if (left && At(slot).picture && PtInRect(&At(slot).place, at)) {
+    SetCapture(window);
+    dragFrom_ = at;
+  }
+  user_.SlotPressed(slot, right);
+  return 0;
+}
+
+LRESULT WindowsThumbnailPage::OnMove(POINT at) {
+  if (std::abs(at.x - dragFrom_->x) <= GetSystemMetrics(SM_CXDRAG) &&
+      std::abs(at.y - dragFrom_->y) <= GetSystemMetrics(SM_CYDRAG))
+    return 0;
+  EndDragWatch();
+  user_.DragBegins();
+  return 0;
+}
+
+void WindowsThumbnailPage::EndDragWatch() {
+  if (!dragFrom_) return;
+  dragFrom_.reset();
+  ReleaseCapture();
+}
+
+std::optional<LRESULT> WindowsThumbnailPage::OnEditorMessage(UINT message, WPARAM wParam, LPARAM lParam) {
+  const HWND outer = Outer();
+  const auto tell = [&](void (ThumbnailPageUser::*what)()) {
+    tellingEditor_ = true;
+    (user_.*what)();
+    if (IsAlive(this, outer)) tellingEditor_ = false;
+  };
+  switch (message) {
+    case WM_GETDLGCODE:
+      // Delete deletes a letter, whatever the host's own key for it does.
+      if (wParam != 0 && wParam != VK_TAB) return DLGC_WANTALLKEYS;
+      return std::nullopt;
+    case WM_KEYDOWN:
+      if (wParam == VK_RETURN)
+        tell(&ThumbnailPageUser::EditorEntered);
+      else if (wParam == VK_ESCAPE)
+        tell(&ThumbnailPageUser::EditorLeft);
+      else
+        return std::nullopt;
+      return 0;
+    case WM_CHAR:
+      // Of the keys above, which would make the editor beep.
+      if (wParam == VK_RETURN || wParam == VK_ESCAPE || wParam == VK_TAB) return 0;
+      return std::nullopt;
+    case WM_KILLFOCUS: {
+      const LRESULT result = DefSubclassProc(editorWindow_, message, wParam, lParam);
+      if (edited_ != 0 && !tellingEditor_) tell(&ThumbnailPageUser::EditorLeft);
+      return result;
+    }
+    default:
+      return std::nullopt;
+  }
+}
+
+std::optional<LRESULT> WindowsThumbnailPage::OnButtonMessage(HWND window, UINT message, WPARAM wParam,
+                                                             LPARAM) {
+  switch (message) {
+    case WM_GETDLGCODE:
+      if (wParam == VK_RETURN) return DLGC_WANTMESSAGE;
+      return std::nullopt;
+    case WM_KEYDOWN:
+      // Buttons themselves take the space bar only.
+      if (wParam != VK_RETURN) return std::nullopt;
+      if (window == linkWindow_)
+        user_.LinkClicked();
+      else
+        user_.SwitchViewClicked();
+      return 0;
+    case WM_SETCURSOR:
+      if (window != linkWindow_ || HasHourglass()) return std::nullopt;
+      SetCursor(LoadCursorW(nullptr, reinterpret_cast<LPCWSTR>(IDC_HAND)));
+      return TRUE;
+    default:
+      return std::nullopt;
+  }
+}
+
+// --- Drawing ---
+
+// Everything of a window in memory first, so that nothing flickers.
+void WindowsThumbnailPage::Paint(HWND window) const {
+  PAINTSTRUCT paint = {};
+  const HDC screen = BeginPaint(window, &paint);
+  const int slot = SlotOf(window);
+  if (slot == 0) {
+    Fill(screen, paint.rcPaint, BackColor());
+  } else {
+    RECT client = {};
+    GetClientRect(window, &client);
+    const MemoryDcOwner memory(CreateCompatibleDC(screen));
+    const BitmapOwner bitmap(CreateCompatibleBitmap(screen, client.right, client.bottom));
+    const Selected picture(memory.Get(), bitmap.Get());
+    DrawSlot(memory.Get(), client, slots_[static_cast<std::size_t>(slot) - 1], GetFocus() == gridWindow_);
+    BitBlt(screen, 0, 0, client.right, client.bottom, memory.Get(), 0, 0, SRCCOPY);
+  }
+  EndPaint(window, &paint);
+}
+
+void WindowsThumbnailPage::DrawSlot(HDC dc, const RECT& frame, const Slot& slot, bool focus) const {
+  const auto placed = [&](const RECT& area) { return Moved(area, frame.left, frame.top); };
+  Fill(dc, frame, BackColor());
+  FrameRect(dc, &frame, GetSysColorBrush(COLOR_BTNSHADOW));
+  if (slot.selected) {
+    RECT ring = placed(Pixels(layout::kMarker));
+    Fill(dc, ring, GetSysColor(COLOR_HIGHLIGHT));
+    InflateRect(&ring, -Pixels(layout::kMarkerWidth), -Pixels(layout::kMarkerWidth));
+    Fill(dc, ring, BackColor());
+  }
+  if (slot.picture) {
+    const RECT place = placed(slot.place);
+    const MemoryDcOwner memory(CreateCompatibleDC(nullptr));
+    const Selected picture(memory.Get(), slot.picture.Get());
+    BITMAP bitmap = {};
+    GetObjectW(slot.picture.Get(), sizeof bitmap, &bitmap);
+    // One to one on the screen, as a rule; a printer may map pixels to many.
+    SetStretchBltMode(dc, HALFTONE);
+    SetBrushOrgEx(dc, 0, 0, nullptr);
+    StretchBlt(dc, place.left, place.top, place.right - place.left, place.bottom - place.top, memory.Get(), 0,
+               0, bitmap.bmWidth, bitmap.bmHeight, SRCCOPY);
+  }
+  DrawCaption(dc, placed(Pixels(kCaption)), slot);
+  if (slot.selected && focus) {
+    RECT dots = frame;
+    InflateRect(&dots, -Pixels(45), -Pixels(45));
+    DrawFocus(dc, dots);
+  }
+}
+
+void WindowsThumbnailPage::DrawCaption(HDC dc, RECT area, const Slot& slot) const {
+  if (slot.caption.empty()) return;
+  const std::wstring text = WideFromText(slot.caption);
+  const Selected font(dc, Font());
+  InflateRect(&area, -Pixels(15), -Pixels(15));
+  RECT lines = area;
+  DrawTextW(dc, text.c_str(), -1, &lines, kCaptionFormat | DT_CALCRECT);
+  area.bottom = std::min(area.bottom, lines.bottom);
+  RECT paper = area;
+  InflateRect(&paper, Pixels(15), Pixels(15));
+  Fill(dc, paper, slot.selected ? GetSysColor(COLOR_HIGHLIGHT) : kCaptionPaper);
+  SetTextColor(dc, slot.selected ? kSelectedCaptionColor : kCaptionColor);
+  SetBkMode(dc, TRANSPARENT);
+  DrawTextW(dc, text.c_str(), -1, &area, kCaptionFormat);
+}
+
+void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
+  Fill(dc, area, BackColor());
+  const Selected font(dc, linkFont_ ? linkFont_.Get() : Font());
+  SetTextColor(dc, kLinkColor);
+  SetBkMode(dc, TRANSPARENT);
+  DrawTextW(dc, WideFromText(link_).c_str(), -1, &area, kLinkFormat);
+  if (focus) DrawFocus(dc, area);
+}
+
+void WindowsThumbnailPage::DrawScrollBar(HDC dc, const RECT& area) const {
+  FillRect(dc, &area, GetSysColorBrush(COLOR_SCROLLBAR));
+  const UINT state = scrollEnabled_ ? 0 : DFCS_INACTIVE;
+  RECT up = area;
+  RECT down = area;
+  up.bottom = up.top + (area.right - area.left);
+  down.top = down.bottom - (area.right - area.left);
+  DrawFrameControl(dc, &up, DFC_SCROLL, DFCS_SCROLLUP | state);
+  DrawFrameControl(dc, &down, DFC_SCROLL, DFCS_SCROLLDOWN | state);
+  if (!scrollEnabled_) return;
+  const int track = down.top - up.bottom;
+  const int all = scrollMax_ + kSlotCount;
+  RECT thumb = {area.left, up.bottom + MulDiv(track, scrollValue_, all), area.right, 0};
+  thumb.bottom = thumb.top + std::max(Pixels(120), MulDiv(track, kSlotCount, all));
+  DrawFrameControl(dc, &thumb, DFC_BUTTON, DFCS_BUTTONPUSH);
+}
+
+void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) const {
+  const int saved = SaveDC(dc);
+  IntersectClipRect(dc, bounds.left, bounds.top, bounds.right, bounds.bottom);
+  Fill(dc, bounds, BackColor());
+  const auto placed = [&](const layout::TwipRect& area) {
+    return Moved(Pixels(area), bounds.left, bounds.top);
+  };
+  SelectObject(dc, Font());
+  SetBkMode(dc, TRANSPARENT);
+  if (content_ == Content::kGrid) {
+    for (std::size_t slot = 0; slot < kSlotCount; ++slot)
+      if (slots_[slot].shown) DrawSlot(dc, placed(kFrames[slot]), slots_[slot], false);
+    DrawScrollBar(dc, placed(layout::kScrollBar));
+  } else if (content_ == Content::kEmptyAccount) {
+    RECT message = placed(layout::kMessage);
+    SetTextColor(dc, TextColor());
+    DrawTextW(dc, WideFromText(message_).c_str(), -1, &message, DT_CENTER | DT_WORDBREAK | DT_NOPREFIX);
+    DrawLink(dc, placed(layout::kLink), false);
+  }
+  RECT button = placed(layout::kButton);
+  DrawFrameControl(dc, &button, DFC_BUTTON, DFCS_BUTTONPUSH);
+  SetTextColor(dc, GetSysColor(COLOR_BTNTEXT));
+  DrawTextW(dc, kSwitchText, -1, &button, DT_CENTER | DT_VCENTER | DT_SINGLELINE);
+  RestoreDC(dc, saved);
+}
+
+}  // namespace tarnwick

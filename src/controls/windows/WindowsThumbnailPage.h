@@ -1,0 +1,138 @@
+// The window of the thumbnail control: a grid of four pictures with captions, the scroll bar beside it, the
+// texts of an empty account in its place, the editor over a caption, and the button that switches to the
+// list.
+#pragma once
+
+#include "platform/windows/WindowsHeaders.h"
+
+#include <array>
+#include <optional>
+
+#include "controls/thumbnailview/ThumbnailPage.h"
+#include "controls/thumbnailview/ThumbnailPageUser.h"
+#include "controls/windows/ControlWindow.h"
+#include "controls/windows/PictureLoader.h"
+#include "controls/windows/ThumbnailLayout.h"
+#include "platform/windows/Owner.h"
+
+namespace tarnwick {
+
+class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
+ public:
+  // Size of a control that shows all of the page, in HIMETRIC.
+  static constexpr SIZEL kNaturalExtent = layout::kPageHimetric;
+
+  // `module` is where the window's class belongs. `user` outlives the window. The thread has initialised COM,
+  // which reads the pictures.
+  WindowsThumbnailPage(HINSTANCE module, ThumbnailPageUser& user);
+
+  // Draws the page as the window would show it, into `bounds` in pixels of the screen, which `dc` may map to
+  // others.
+  void Draw(HDC dc, const RECT& bounds) const;
+  // Moves the keyboard focus to the next stop inside the control, or to the one before; false at the end,
+  // when it is the container's turn.
+  bool MoveFocus(bool backward);
+
+  void ShowGrid(bool grid) override;
+  void SetEmptyTexts(TextView message, TextView link) override;
+  void ShowSlot(int slot, bool shown) override;
+  void ClearSlot(int slot) override;
+  void SetCaption(int slot, TextView caption) override;
+  bool SetPicture(int slot, TextView path, const PicturePlace& place) override;
+  void SetSelected(int slot, bool selected) override;
+  void SetScrollRange(int max) override;
+  void EnableScroll(bool enabled) override;
+  void SetScrollValue(int value) override;
+  int ScrollValue() const override { return scrollValue_; }
+  void ShowEditor(int slot, TextView name) override;
+  void HideEditor() override;
+  Text EditorText() const override;
+  bool HasFocus() const override;
+  void Focus() override;
+  void SetHourglass(bool hourglass) override { ShowHourglass(hourglass); }
+  void StartDrag() override { user_.DragBegins(); }
+
+ private:
+  struct Slot {
+    HWND window = nullptr;
+    Text caption;
+    // Where the picture comes from and goes to.
+    std::wstring path;
+    PicturePlace twips;
+    // As large as it is shown, at `place` in the frame; empty when there is none.
+    BitmapOwner picture;
+    RECT place = {};
+    bool shown = true;
+    bool selected = false;
+  };
+  enum class Content { kNothing, kGrid, kEmptyAccount };
+
+  bool MakeChildren() override;
+  void FocusLeft() override { user_.LostFocus(); }
+  void WindowGone() override;
+  void ApplyLook() override;
+  void DpiChanged(int before) override;
+  std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;
+  std::optional<LRESULT> OnOuterMessage(UINT message, WPARAM wParam, LPARAM lParam);
+  std::optional<LRESULT> OnGridMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  std::optional<LRESULT> OnEditorMessage(UINT message, WPARAM wParam, LPARAM lParam);
+  std::optional<LRESULT> OnButtonMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  LRESULT OnFocus(HWND window, WPARAM wParam, LPARAM lParam);
+  LRESULT OnPress(HWND window, UINT message, POINT at);
+  LRESULT OnMove(POINT at);
+  void OnScroll(int code, int position);
+  void ScrollTo(int value);
+  void EndDragWatch();
+
+  Slot& At(int slot) { return slots_[static_cast<std::size_t>(slot) - 1]; }
+  int SlotOf(HWND window) const;
+  HWND FirstStop() const;
+  void PlaceChildren() const;
+  void LoadPictureOf(Slot& slot) const;
+  void PlaceEditor() const;
+  void ApplyContent() const;
+  void ApplyCaption(int slot);
+  void ApplyScroll() const;
+  void ApplyTexts() const;
+  void RefreshGrid() const;
+  void Paint(HWND window) const;
+  void DrawSlot(HDC dc, const RECT& frame, const Slot& slot, bool focus) const;
+  void DrawCaption(HDC dc, RECT area, const Slot& slot) const;
+  void DrawLink(HDC dc, RECT area, bool focus) const;
+  void DrawScrollBar(HDC dc, const RECT& area) const;
+  int Pixels(int twips) const { return layout::Pixels(twips, Dpi()); }
+  RECT Pixels(const layout::TwipRect& area) const { return layout::Pixels(area, Dpi()); }
+
+  ThumbnailPageUser& user_;
+  std::array<Slot, kSlotCount> slots_;
+  Content content_ = Content::kNothing;
+  Text message_;
+  Text link_;
+  FontOwner linkFont_;
+
+  int scrollMax_ = 0;
+  int scrollValue_ = 0;
+  // Where the bar was at rest last; differs from the value while the thumb is dragged.
+  int restValue_ = 0;
+  // A drag of the thumb has shown another page since.
+  bool draggedAway_ = false;
+  bool scrollEnabled_ = true;
+  // What is left of the wheel's turn, less than a notch.
+  int wheelRest_ = 0;
+
+  HWND gridWindow_ = nullptr;
+  HWND scrollWindow_ = nullptr;
+  HWND messageWindow_ = nullptr;
+  HWND linkWindow_ = nullptr;
+  HWND switchWindow_ = nullptr;
+  HWND editorWindow_ = nullptr;
+  // The slot whose name is edited, or 0.
+  int edited_ = 0;
+  // The user is being told of the focus, or of the end of the edit: what follows from that is no news.
+  bool tellingFocus_ = false;
+  bool tellingEditor_ = false;
+  // Where the button went down on a picture that may be dragged out.
+  std::optional<POINT> dragFrom_;
+};
+
+}  // namespace tarnwick

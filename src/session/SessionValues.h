@@ -1,0 +1,32 @@
+// Who is connected to what.
+#pragma once
+
+#include <cstdint>
+
+#include "base/Text.h"
+
+namespace tarnwick {
+
+// One user's account at one server. What began for one account must not go on in another. The product number
+// does not count: a refused log-on changes it, and the user stays the same.
+struct AccountKey {
+  Text serverName;
+  Text userName;
+  bool operator==(const AccountKey&) const = default;
+};
+
+// Who is connected to what; set by `ConnectToServer` and `LogonAs`.
+struct SessionValues {
+  // "host" or "host:port".
+  Text serverName;
+  Text userName;
+  Text password;
+  std::int32_t productNumber = 0;
+  Text mguid;
+  // Set by a log-on; cleared once its FTP values were rewritten for the proxy.
+  bool loggedOn = false;
+
+  AccountKey Account() const { return {serverName, userName}; }
+};
+
+}  // namespace tarnwick

@@ -1,0 +1,74 @@
+// What a drag carries, as OLE sees it (formats) and as hosts see it in the drag events (an automation object
+// with GetData, SetData, GetFormat, Clear and Files).
+#pragma once
+
+#include "platform/windows/WindowsHeaders.h"
+
+#include <ole2.h>
+
+#include <functional>
+#include <optional>
+#include <utility>
+#include <vector>
+
+#include "base/Text.h"
+#include "controls/ControlEvents.h"
+#include "platform/windows/ComPtr.h"
+#include "surface/Automation.h"
+#include "surface/ComObject.h"
+
+namespace tarnwick {
+
+// Formats as hosts number them: those of the clipboard.
+inline constexpr std::int16_t kTextFormat = CF_TEXT;
+inline constexpr std::int16_t kFilesFormat = CF_HDROP;
+
+class DataObject final : public ComObject<IDataObject, IDispatch>, public DragData {
+ public:
+  // The data of a drag that begins in a control of ours: a text, and a file when its path is not empty.
+  DataObject(TextView text, TextView file);
+  // The data of a drag that comes from elsewhere, read when the object is made.
+  explicit DataObject(IDataObject& foreign);
+
+  // Who supplies a text that a host promised (SetData without a value) once a target asks for it: the handler
+  // is given the format as the host wrote it and calls SetData, or leaves the text empty. None at first.
+  void SetPromiseHandler(std::function<void(std::int16_t format)> handler) {
+    onPromised_ = std::move(handler);
+  }
+
+  const std::vector<Text>& Files() const { return files_; }
+  IDispatch* Dispatch() { return this; }
+
+  // IDataObject
+  STDMETHODIMP GetData(FORMATETC* format, STGMEDIUM* medium) override;
+  STDMETHODIMP GetDataHere(FORMATETC* format, STGMEDIUM* medium) override;
+  STDMETHODIMP QueryGetData(FORMATETC* format) override;
+  STDMETHODIMP GetCanonicalFormatEtc(FORMATETC* format, FORMATETC* canonical) override;
+  STDMETHODIMP SetData(FORMATETC* format, STGMEDIUM* medium, BOOL release) override;
+  STDMETHODIMP EnumFormatEtc(DWORD direction, IEnumFORMATETC** enumerator) override;
+  STDMETHODIMP DAdvise(FORMATETC* format, DWORD flags, IAdviseSink* sink, DWORD* cookie) override;
+  STDMETHODIMP DUnadvise(DWORD cookie) override;
+  STDMETHODIMP EnumDAdvise(IEnumSTATDATA** enumerator) override;
+
+  // IDispatch
+  STDMETHODIMP GetTypeInfoCount(UINT* count) override;
+  STDMETHODIMP GetTypeInfo(UINT index, LCID locale, ITypeInfo** info) override;
+  STDMETHODIMP GetIDsOfNames(REFIID reserved, LPOLESTR* names, UINT count, LCID locale, DISPID* ids) override;
+  STDMETHODIMP Invoke(DISPID member, REFIID reserved, LCID locale, WORD flags, DISPPARAMS* arguments,
+                      VARIANT* result, EXCEPINFO* exception, UINT* argumentError) override;
+
+ private:
+  HRESULT Call(DISPID member, const DISPPARAMS& arguments, VARIANT* result);
+  bool Has(CLIPFORMAT format) const;
+  // The text, which may have to be fetched first.
+  const Text& TheText();
+
+  Text text_;
+  bool hasText_ = false;
+  // The format in which the host promised the text.
+  std::optional<CLIPFORMAT> promised_;
+  std::function<void(std::int16_t)> onPromised_;
+  std::vector<Text> files_;
+};
+
+}  // namespace tarnwick

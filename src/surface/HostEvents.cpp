@@ -1,0 +1,148 @@
+#include "surface/HostEvents.h"
+
+#include <array>
+
+#include "surface/DataObject.h"
+#include "surface/Guard.h"
+
+namespace tarnwick {
+namespace {
+
+// Numbers of the events in the type library.
+enum EventNumber : DISPID {
+  kFileManagerEvent = 1,
+  kOLEStartDrag,
+  kOLESetData,
+  kOLEGiveFeedback,
+  kOLEDragOver,
+  kOLEDragDrop,
+  kOLECompleteDrag,
+  kStateChanged,
+  kDownloadProgress,
+  kUploadProgress,
+  kReplyMessage,
+};
+
+template <typename Value>
+VARIANT ReferenceTo(VARTYPE type, Value& value) {
+  VARIANT reference = {};
+  V_VT(&reference) = static_cast<VARTYPE>(type | VT_BYREF);
+  V_BYREF(&reference) = &value;
+  return reference;
+}
+
+// An object for a by-reference parameter: what the host puts in its place is released like the object itself.
+class ObjectReference {
+ public:
+  explicit ObjectReference(DragData& data) : object_(static_cast<DataObject&>(data).Dispatch()) {
+    object_->AddRef();
+  }
+  ~ObjectReference() {
+    if (object_) object_->Release();
+  }
+  ObjectReference(const ObjectReference&) = delete;
+  ObjectReference& operator=(const ObjectReference&) = delete;
+  VARIANT Argument() { return ReferenceTo(VT_DISPATCH, object_); }
+
+ private:
+  IDispatch* object_;
+};
+
+}  // namespace
+
+void HostEvents::FileManagerEvent(std::int16_t code, TextView description) {
+  Done([&] {
+    Variant number;
+    V_VT(&number.Get()) = VT_I2;
+    V_I2(&number.Get()) = code;
+    Variant text;
+    text.Get() = VariantFromText(description);
+    std::array arguments = {ReferenceTo(VT_VARIANT, number.Get()), ReferenceTo(VT_BSTR, V_BSTR(&text.Get()))};
+    ole_.Raise(kFileManagerEvent, arguments);
+  });
+}
+
+void HostEvents::OLEStartDrag(DragData& data, std::int32_t& allowedEffects) {
+  ObjectReference object(data);
+  LONG effects = allowedEffects;
+  std::array arguments = {object.Argument(), ReferenceTo(VT_I4, effects)};
+  ole_.Raise(kOLEStartDrag, arguments);
+  allowedEffects = effects;
+}
+
+void HostEvents::OLESetData(DragData& data, std::int16_t format) {
+  ObjectReference object(data);
+  std::array arguments = {object.Argument(), ReferenceTo(VT_I2, format)};
+  ole_.Raise(kOLESetData, arguments);
+}
+
+void HostEvents::OLEGiveFeedback(std::int32_t& effect, bool& defaultCursors) {
+  LONG shown = effect;
+  VARIANT_BOOL cursors = AutomationBoolean(defaultCursors);
+  std::array arguments = {ReferenceTo(VT_I4, shown), ReferenceTo(VT_BOOL, cursors)};
+  ole_.Raise(kOLEGiveFeedback, arguments);
+  effect = shown;
+  defaultCursors = cursors != VARIANT_FALSE;
+}
+
+void HostEvents::OLEDragOver(DragData& data, std::int32_t& effect, const DragPoint& at, std::int16_t state) {
+  ObjectReference object(data);
+  LONG wanted = effect;
+  DragPoint point = at;
+  std::array arguments = {object.Argument(),
+                          ReferenceTo(VT_I4, wanted),
+                          ReferenceTo(VT_I2, point.button),
+                          ReferenceTo(VT_I2, point.shift),
+                          ReferenceTo(VT_R4, point.x),
+                          ReferenceTo(VT_R4, point.y),
+                          ReferenceTo(VT_I2, state)};
+  ole_.Raise(kOLEDragOver, arguments);
+  effect = wanted;
+}
+
+void HostEvents::OLEDragDrop(DragData& data, std::int32_t& effect, const DragPoint& at) {
+  ObjectReference object(data);
+  LONG wanted = effect;
+  DragPoint point = at;
+  std::array arguments = {object.Argument(),
+                          ReferenceTo(VT_I4, wanted),
+                          ReferenceTo(VT_I2, point.button),
+                          ReferenceTo(VT_I2, point.shift),
+                          ReferenceTo(VT_R4, point.x),
+                          ReferenceTo(VT_R4, point.y)};
+  ole_.Raise(kOLEDragDrop, arguments);
+  effect = wanted;
+}
+
+void HostEvents::RaiseNumber(DISPID event, std::int32_t number) {
+  LONG value = number;
+  std::array arguments = {ReferenceTo(VT_I4, value)};
+  ole_.Raise(event, arguments);
+}
+
+void HostEvents::OLECompleteDrag(std::int32_t effect) {
+  RaiseNumber(kOLECompleteDrag, effect);
+}
+
+void HostEvents::StateChanged(ConnectionState state) {
+  RaiseNumber(kStateChanged, static_cast<std::int32_t>(state));
+}
+
+void HostEvents::DownloadProgress(std::int32_t lBytes) {
+  RaiseNumber(kDownloadProgress, lBytes);
+}
+
+void HostEvents::UploadProgress(std::int32_t lBytes) {
+  RaiseNumber(kUploadProgress, lBytes);
+}
+
+void HostEvents::ReplyMessage(TextView sMessage) {
+  Done([&] {
+    Variant text;
+    text.Get() = VariantFromText(sMessage);
+    std::array arguments = {text.Get()};
+    ole_.Raise(kReplyMessage, arguments);
+  });
+}
+
+}  // namespace tarnwick
