@@ -766,9 +766,13 @@ TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
   EXPECT_EQ(log.back(), "8888 ") << "there is no place for an editor";
   for (const TextView name : {u"2.gif", u"3.GIF"}) control.UploadedFileSetFocus(name);
   EXPECT_EQ(page.Look(), "1.gif 2.gif* 3.gif 4.gif ");
-  control.OnSlotPressed(1, false);
   Scroll(2);
   EXPECT_EQ(Selected(), AddressOf("3.gif")) << "another one was chosen meanwhile";
+  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+  Scroll(0);
+  control.OnSlotPressed(1, false);
+  Scroll(2);
+  EXPECT_EQ(Selected(), AddressOf("3.gif")) << "by a press";
 
   // A picture that replaces one is shown instead of its old copy; what the filter hides is not shown.
   fake.files.files[u"C:\\new.jpg"].bytes = "GIF89a.....";
