@@ -1,4 +1,4 @@
-// Finds the entries of a list by their key, of which each has another one.
+// A hash index over the entries of a list by their unique keys.
 #pragma once
 
 #include <algorithm>

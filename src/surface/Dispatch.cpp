@@ -162,7 +162,7 @@ HRESULT InvokeMember(ITypeInfo& description, void* object, DISPID member, WORD f
     return description.Invoke(object, member, flags, arguments, result, exception, argumentError);
   return Guarded([&] {
     const MemberDescription known(description, member, flags);
-    // Here and below errors that not every version of the system finds.
+    // Wine: the type information does not find all of the errors that are found here and below.
     if (known.IsKnown() && arguments->cArgs > known.ParameterCount()) return DISP_E_BADPARAMCOUNT;
     const auto refuse = [&](UINT argument, HRESULT error) {
       if (argumentError) *argumentError = argument;

@@ -19,7 +19,7 @@ class Embedding final : public IPersistStorage, public IDataObject {
   Embedding(const Embedding&) = delete;
   Embedding& operator=(const Embedding&) = delete;
 
-  // Tells those who asked for the data that they are other ones.
+  // Notifies the data advises that the control's picture has changed.
   void ViewChanged();
 
   STDMETHODIMP QueryInterface(REFIID interfaceId, void** object) override;

@@ -101,12 +101,10 @@ class FileControlObject : public DualObject<Interface>,
   STDMETHODIMP RenameFile(BSTR* strOldFileName, BSTR* strNewFileName, VARIANT_BOOL* result) override;
 
  protected:
-  // `outer` is the object that this one is a part of, and asks and counts in its place; it may be null, and
-  // lives longer.
+  // `outer` is the controlling unknown when the control is aggregated, else null. It outlives the control.
   FileControlObject(const ControlClass& itsClass, IUnknown* outer);
   ~FileControlObject() override = default;
-  // To be called first of all when the object ends: its window goes before the target that is registered for
-  // it.
+  // The first call of the destructor: the drop target is revoked before its window is destroyed.
   void StopDrops();
 
   virtual FileControl& Rules() = 0;

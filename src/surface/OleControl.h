@@ -49,13 +49,12 @@ class OleControlHooks {
   virtual IUnknown& Identity() = 0;
   virtual const CLSID& ClassId() const = 0;
 
-  // The window of the control, which is made on the first call; null on failure. It hangs at no container
-  // yet.
+  // The window of the control, created on the first call without a container as its parent; null on failure.
   virtual HWND Window() = 0;
   // Takes the window out of its container and hides it.
   virtual void Park() = 0;
-  // Size of the window in its own pixels, when these are not as large as the system's; they are the ones that
-  // Draw counts in.
+  // Client size of the window in its own pixels, which Draw uses, when its screen has another DPI than the
+  // system.
   virtual std::optional<SIZE> SizeOnOtherScreen() = 0;
   // Draws the control as it looks without a window, into `bounds` in pixels of `dc`.
   virtual void Draw(HDC dc, const RECT& bounds) = 0;

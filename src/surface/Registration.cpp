@@ -19,8 +19,8 @@ constexpr wchar_t kLibraryName[] = L"Tarnwick";
 constexpr wchar_t kVersion[] = L"1.1";
 // Below the type library's key, its file under its own locale and, for hosts that ask by theirs, under none.
 constexpr const wchar_t* kLocaleKeys[] = {L"\\1.1\\409\\", L"\\1.1\\0\\"};
-// Below those: for programs of this kind, and of the other kind, of which a 64-bit system runs both; and
-// where those see the registry.
+// Subkeys of these for programs of this bitness and of the other one, and the registry view of the other one:
+// a 64-bit system runs both.
 #ifdef _WIN64
 constexpr wchar_t kFileKey[] = L"win64";
 constexpr wchar_t kOtherFileKey[] = L"win32";
@@ -63,7 +63,7 @@ std::wstring GuidText(const GUID& guid) {
 }
 
 // The classes of all users or of the current one. A view says for which kind of programs; 0 is this one's.
-// Keys are named from the root on: below an open key some versions of the system know no views.
+// Wine: registry views work only for keys that are named from the root on.
 class Classes {
  public:
   explicit Classes(Scope scope) : root_(scope == Scope::kUser ? HKEY_CURRENT_USER : HKEY_LOCAL_MACHINE) {}
@@ -164,8 +164,8 @@ std::wstring KeyOf(const Interface& known) {
   return L"Interface\\" + GuidText(known.id);
 }
 
-// As RegisterTypeLib does it for all users; of a user's own classes some versions of the system know nothing
-// there.
+// Writes what RegisterTypeLib writes, also for one user: under Wine RegisterTypeLibForUser registers for all
+// users.
 void RegisterTypeLibrary(const Classes& classes, const std::wstring& path) {
   const std::wstring version = LibraryKey() + L"\\" + kVersion;
   classes.SetValue(version, nullptr, kLibraryName);

@@ -42,7 +42,6 @@ class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, priv
   void ButtonPressed() override;
   void ButtonDone() override;
   void Clicked() override;
-  void DoubleClicked() override {}
   bool LabelEditBegins(std::size_t item) override;
   bool LabelEditEnds(std::size_t item, TextView text) override;
   void DragBegins() override { RunDragOut(); }

@@ -50,7 +50,7 @@ class DownloadEvents {
   // Closed by the peer, and the file writer has run. `written`: the explicit target is there, or, without
   // one, the file in the user's folder.
   virtual void Finished(bool written) = 0;
-  // 5555 is due when `told`; a watchdog that ran out says nothing.
+  // There is no file. `told`: the host is to be notified by 5555, which a time-out does not do.
   virtual void Failed(std::int32_t ftpError, TextView description, bool told) = 0;
   // Whether the download is to go on. One that is not wanted any more is cancelled before it does anything
   // else.

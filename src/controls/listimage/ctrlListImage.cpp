@@ -198,7 +198,7 @@ void ctrlListImage::OnClick() {
 }
 
 void ctrlListImage::OnMouseButton() {
-  // Either button on an item is the host's own affair, which learns of it by the click.
+  // A button on an item raises nothing here: the click that follows does.
   if (mobjFileupload && SelectedFileName().empty()) Raise(event::kCurrentItem);
 }
 

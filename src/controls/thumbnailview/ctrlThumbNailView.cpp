@@ -124,7 +124,8 @@ void ctrlThumbNailView::Show(const Text& filter) {
   keepSelection_ = false;
   const std::size_t selected = shown.PositionOf(selectedPath_);
   if (selected == 0 || selected > kSlotCount) selectedPath_.clear();
-  // The bar stands at 0 from here on, unless the user pages on while the page is being filled.
+  // Sets the scroll bar to 0. The user may scroll while the page is filled, so it is not set once more
+  // afterwards.
   SetScrollRange();
   scrolledBack_ = false;
   ShowPage(0);
@@ -161,7 +162,7 @@ void ctrlThumbNailView::ShowPage(int first) {
     ResultAsItStood(0, [&](int&) { FillPage(*std::exchange(nextPage_, std::nullopt)); });
   }
   fillRuns_ = false;
-  // The host may do anything in the event, so the transfers are over before.
+  // The host may start a transfer in the event, so this one ends first.
   if (!busy_) return;
   busy_.reset();
   Raise(event::kBusy, u"-1");

@@ -19,7 +19,7 @@ class ControlWindow {
   ControlWindow(const ControlWindow&) = delete;
   ControlWindow& operator=(const ControlWindow&) = delete;
 
-  // Runs when the window ends by another hand than this object's, while it still is one.
+  // Notified before the window is destroyed by anybody but this object, such as its container.
   std::function<void()> onEnd;
 
   // The window of the whole control, made hidden and without a container on the first call; null on failure.
@@ -28,7 +28,7 @@ class ControlWindow {
   void Park();
   // Size in pixels, when the window's screen has other dots per inch than the system; else nullopt.
   std::optional<SIZE> SizeOnOtherScreen() const;
-  // Whether windows of controls are left in the process. One may outlive its control by a message.
+  // Whether the process has windows of controls. A window is destroyed up to one message after its control.
   static bool AnyLeft();
   // Null for the system's own font, nullopt for the system's own colour. The font stays the caller's.
   void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background);

@@ -26,11 +26,6 @@ void CopyTo(const NMLVDISPINFOW& info, const Text& text) {
 WindowsListView::WindowsListView(HINSTANCE module, ListViewUser& user)
     : ControlWindow(module, kClassName), user_(user) {}
 
-HWND WindowsListView::List() {
-  Window();
-  return list_;
-}
-
 bool WindowsListView::MakeChildren() {
   const INITCOMMONCONTROLSEX classes = {sizeof classes, ICC_LISTVIEW_CLASSES};
   InitCommonControlsEx(&classes);
@@ -287,9 +282,6 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
       return 0;
     case NM_CLICK:
       user_.Clicked();
-      return 0;
-    case NM_DBLCLK:
-      user_.DoubleClicked();
       return 0;
     case NM_SETFOCUS:
       user_.GotFocus();

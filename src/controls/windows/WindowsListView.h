@@ -31,7 +31,6 @@ class ListViewUser {
   virtual void ButtonPressed() = 0;
   virtual void ButtonDone() = 0;
   virtual void Clicked() = 0;
-  virtual void DoubleClicked() = 0;
   // Whether the label may be edited, and whether the edited text stands.
   virtual bool LabelEditBegins(std::size_t item) = 0;
   virtual bool LabelEditEnds(std::size_t item, TextView text) = 0;
@@ -45,8 +44,6 @@ class WindowsListView : public ListView, public ControlWindow {
   // `module` is where the window's class belongs. `user` outlives the window.
   WindowsListView(HINSTANCE module, ListViewUser& user);
 
-  // The list itself, where drops land.
-  HWND List();
   // Draws the list as the window would show it, into `bounds`.
   void Draw(HDC dc, const RECT& bounds) const;
   // The small pictures, for a picture made of two.

@@ -579,7 +579,7 @@ std::optional<LRESULT> WindowsThumbnailPage::OnEditorMessage(UINT message, WPARA
         return std::nullopt;
       return 0;
     case WM_CHAR:
-      // Of the keys above, which would make the editor beep.
+      // The characters of the keys that were handled above, at which an edit control would beep.
       if (wParam == VK_RETURN || wParam == VK_ESCAPE || wParam == VK_TAB) return 0;
       return std::nullopt;
     case WM_KILLFOCUS: {

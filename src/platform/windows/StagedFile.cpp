@@ -143,7 +143,7 @@ bool StagedFile::Keep() {
 bool StagedFile::Commit() {
   if (path_.empty()) return false;
   const DWORD attributes = GetFileAttributesW(target_.c_str());
-  // Not left to the rename, which some versions of the system let through.
+  // Wine: the rename would replace a read-only file.
   if (attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_READONLY) != 0) return false;
   // A scanner may have opened what was written by its name.
   if (!file_)

@@ -250,7 +250,7 @@ void Request::Open(const HttpPost& post) {
   // own, and could not tell which of the two is right. Hence a connection for each post.
   DWORD without = WINHTTP_DISABLE_KEEP_ALIVE | WINHTTP_DISABLE_REDIRECTS | WINHTTP_DISABLE_COOKIES |
                   WINHTTP_DISABLE_AUTHENTICATION;
-  // The length stands here, because some versions of the system write one of more than 2 GiB as negative.
+  // Wine: a length of more than 2 GiB would be written as a negative one.
   const std::wstring headers = L"Content-Type: " + WideFromAscii(post.contentType) + L"\r\nContent-Length: " +
                                std::to_wstring(length_) + L"\r\nConnection: close\r\n";
   if (!WinHttpSetOption(request.Get(), WINHTTP_OPTION_DISABLE_FEATURE, &without, sizeof without) ||
@@ -274,8 +274,8 @@ Request::~Request() {
   while (!exchange_->closed) {
     const ULONGLONG now = GetTickCount64();
     if (now >= limit) {
-      // Some versions of the system cannot end a call that blocks, and tell of its end later: this code stays
-      // loaded for that, until the process ends.
+      // Wine: a call that blocks cannot be ended, and its end is told later. This code stays loaded for that,
+      // until the process ends.
       HMODULE self = nullptr;
       GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_PIN | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
                          reinterpret_cast<const wchar_t*>(OnTold), &self);
@@ -411,7 +411,7 @@ bool Request::ReadBody(std::size_t maxBytes) {
     used += exchange_->count;
   }
   // The chunk that is the last one ends the answer before the connection ends, and an empty line its head.
-  // Not every version of the system tells an answer without it from a whole one.
+  // Wine: an answer without either would pass for a whole one.
   const bool cut = exchange_->ended && Header(WINHTTP_QUERY_TRANSFER_ENCODING);
   if (announced || cut || used > maxBytes) return false;
   if (used == 0 && !Header(WINHTTP_QUERY_RAW_HEADERS_CRLF).value_or(L"").ends_with(L"\r\n\r\n")) return false;
@@ -440,9 +440,9 @@ std::optional<HttpAnswer> Exchanged(const HttpPost& post, BodySource& source, st
   for (int tries = 0;; ++tries) {
     Request request(post, source, waiting);
     const bool sent = request.SendHead();
-    // In some versions of the system all of the process share the connections that are kept. The head alone
-    // is no post, so another connection can be tried; this one is closed. A system that tells of no
-    // connection at all would go on for ever.
+    // Wine: all clients of the process share the connections that any of them kept. The head alone is no
+    // post, so another connection can be tried; this one is closed. A system that tells of no connection at
+    // all would go on for ever.
     if (request.IsOnOldConnection() && source.Length() > 0 && tries < kMostOldConnections) continue;
     if (!sent || !request.SendBody()) return std::nullopt;
     return request.Receive(maxBodyBytes);

@@ -37,7 +37,7 @@ class WindowsFtpConnection : public FtpConnection {
     std::array<char, kDirectoryRoom> path{};
     DWORD size = kDirectoryRoom;
     if (!FtpGetCurrentDirectoryA(connection_.Get(), path.data(), &size)) return std::nullopt;
-    // Up to the terminator: whether the returned size counts it differs between versions of the system.
+    // Up to the terminator: Wine and Windows differ in whether the returned size counts it.
     return TextFromAnsi({path.data(), std::find(path.begin(), path.end(), '\0')});
   }
 

@@ -39,7 +39,7 @@ WindowsStreamSocket::~WindowsStreamSocket() {
 void WindowsStreamSocket::Close() {
   if (lookup_) {
     WSACancelAsyncRequest(lookup_);
-    // Not every version of the system stops it: it may still write its answer, which stays with it then.
+    // Wine: the look-up may go on and write its answer, so the memory for that is left to it.
     static_cast<void>(lookupAnswer_.release());
   }
   lookup_ = nullptr;
