@@ -89,20 +89,25 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // to `colFiles` in a new record.
   void GetFileDetails(TextView FileName,
                       const std::function<void(const std::shared_ptr<CUpload>&)>& colFiles);
-  // Gives the control the focus and selects the file of that name (letter case counts), and no other one.
+  // Gives the control the focus and selects the file of that name (letter case counts), and no other one. The
+  // thumbnails may have to fill a page for that, which pumps messages and raises events.
   virtual void UploadedFileSetFocus(TextView szFileName) = 0;
 
   // --- Operations ---
 
-  // Fills the control from the service. May throw an init_error.
+  // Fills the control from the service, which it asks without pumping messages. May throw an init_error.
+  // Filling the page of the thumbnails, here and by ChangeFileFilter, pumps messages and raises events while
+  // pictures are fetched.
   virtual bool Init(TextView szFileFilter) = 0;
   virtual void ChangeFileFilter(TextView szFileFilter) = 0;
 
-  // Sends the file to the account, registers it and shows it. Pumps messages meanwhile.
+  // Sends the file to the account, registers it and shows it. Pumps messages meanwhile, and raises events.
   bool UploadImage(TextView szLocalPath);
 
+  // Deletes what is selected. Pumps messages after each file, and raises events.
   virtual void DeleteFile() = 0;
 
+  // Blocks without pumping messages, then raises one event.
   bool RenameFile(TextView strOldFileName, TextView strNewFileName);
 
   // Fetches the selected file. `szLocalFilePath` is the folder to put it in, or, when the file's name is a

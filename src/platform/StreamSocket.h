@@ -32,6 +32,8 @@ class StreamSocket {
   virtual void SetEvents(SocketEvents* events) = 0;
   // Begins to connect; closes what was open. Failures are told as events.
   virtual void Connect(TextView host, std::uint16_t port) = 0;
+  // Sends as much as the system takes now, and the rest when it takes more; neither blocks nor pumps
+  // messages.
   virtual void Send(std::string_view bytes) = 0;
   // Reads what is there, as far as it fits; how many bytes.
   virtual std::size_t Read(std::span<char> room) = 0;

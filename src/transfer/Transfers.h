@@ -8,6 +8,8 @@
 
 namespace tarnwick {
 
+// What an upload tells while it runs. In all but FileBytes and IsWanted the host's code may run, which may
+// call the control again and pump messages.
 class UploadEvents {
  public:
   virtual ~UploadEvents() = default;
@@ -25,7 +27,8 @@ class UploadEvents {
   virtual bool IsWanted() const = 0;
 };
 
-// The three operations throw a RuntimeError with the component's number.
+// The three operations throw a RuntimeError with the component's number. UploadFile pumps messages, the
+// others block without doing so.
 class Uploader {
  public:
   virtual ~Uploader() = default;
@@ -37,6 +40,8 @@ class Uploader {
                           TextView user, TextView password, TextView productGuid) = 0;
 };
 
+// What a download tells, from messages that are handled in Downloader::Wait, or in any other loop of the
+// thread. The host's code may run in all but IsWanted.
 class DownloadEvents {
  public:
   virtual ~DownloadEvents() = default;

@@ -50,6 +50,8 @@ class ctrlThumbNailView final : public FileControl {
   void ValidateFileName(Text& NewString);
 
   // --- What the user does ---
+  // All of them raise events or, when the bar moves, fill a page, which pumps messages: the host may call the
+  // control inside, and may end it afterwards.
 
   void OnSlotPressed(int slot, bool rightButton);
   void OnBackgroundPressed(bool rightButton);
