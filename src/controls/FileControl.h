@@ -64,20 +64,6 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // silent for too long sets it until its own end.
   bool gbConnectionFailed = false;
   bool bRenameEnabled = false;
-  // The control stores these for the host and does nothing with them.
-  Text m_strWinsockBuffer;
-  Text m_strDataBuffer;
-  Text m_strLocalFilePath;
-  std::int16_t m_intLocalFileID = 0;
-  bool m_bUploadFile = false;
-  Text m_strLastServerResponse;
-  bool m_bFileIsOpened = false;
-  bool gbUploadImage = false;
-  Text gszDownloadPath;
-  bool gbDownload = false;
-  bool bConnectedToFtp = false;
-  std::int16_t OLEDropMode = 0;
-  std::int32_t OLEDragMode = 0;
 
   // --- Selection ---
 

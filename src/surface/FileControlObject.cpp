@@ -142,43 +142,43 @@ STDMETHODIMP FileControlObject<Interface>::put_m_strLastErrorDesc(BSTR value) {
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_strWinsockBuffer(BSTR* value) {
-  return GetText(Rules().m_strWinsockBuffer, value);
+  return GetText(stored_.m_strWinsockBuffer, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_m_strWinsockBuffer(BSTR value) {
-  return PutText(Rules().m_strWinsockBuffer, value);
+  return PutText(stored_.m_strWinsockBuffer, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_strDataBuffer(BSTR* value) {
-  return GetText(Rules().m_strDataBuffer, value);
+  return GetText(stored_.m_strDataBuffer, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_m_strDataBuffer(BSTR value) {
-  return PutText(Rules().m_strDataBuffer, value);
+  return PutText(stored_.m_strDataBuffer, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_strLocalFilePath(BSTR* value) {
-  return GetText(Rules().m_strLocalFilePath, value);
+  return GetText(stored_.m_strLocalFilePath, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_m_strLocalFilePath(BSTR value) {
-  return PutText(Rules().m_strLocalFilePath, value);
+  return PutText(stored_.m_strLocalFilePath, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_strLastServerResponse(BSTR* value) {
-  return GetText(Rules().m_strLastServerResponse, value);
+  return GetText(stored_.m_strLastServerResponse, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_m_strLastServerResponse(BSTR value) {
-  return PutText(Rules().m_strLastServerResponse, value);
+  return PutText(stored_.m_strLastServerResponse, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_gszDownloadPath(BSTR* value) {
-  return GetText(Rules().gszDownloadPath, value);
+  return GetText(stored_.gszDownloadPath, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_gszDownloadPath(BSTR value) {
-  return PutText(Rules().gszDownloadPath, value);
+  return PutText(stored_.gszDownloadPath, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_bTransferInProgress(VARIANT_BOOL* value) {
@@ -190,27 +190,27 @@ STDMETHODIMP FileControlObject<Interface>::put_m_bTransferInProgress(VARIANT_BOO
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_bUploadFile(VARIANT_BOOL* value) {
-  return GetBoolean(Rules().m_bUploadFile, value);
+  return GetBoolean(stored_.m_bUploadFile, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_m_bUploadFile(VARIANT_BOOL value) {
-  return PutBoolean(Rules().m_bUploadFile, value);
+  return PutBoolean(stored_.m_bUploadFile, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_bFileIsOpened(VARIANT_BOOL* value) {
-  return GetBoolean(Rules().m_bFileIsOpened, value);
+  return GetBoolean(stored_.m_bFileIsOpened, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_m_bFileIsOpened(VARIANT_BOOL value) {
-  return PutBoolean(Rules().m_bFileIsOpened, value);
+  return PutBoolean(stored_.m_bFileIsOpened, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_gbUploadImage(VARIANT_BOOL* value) {
-  return GetBoolean(Rules().gbUploadImage, value);
+  return GetBoolean(stored_.gbUploadImage, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_gbUploadImage(VARIANT_BOOL value) {
-  return PutBoolean(Rules().gbUploadImage, value);
+  return PutBoolean(stored_.gbUploadImage, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_gbConnectionFailed(VARIANT_BOOL* value) {
@@ -222,11 +222,11 @@ STDMETHODIMP FileControlObject<Interface>::put_gbConnectionFailed(VARIANT_BOOL v
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_gbDownload(VARIANT_BOOL* value) {
-  return GetBoolean(Rules().gbDownload, value);
+  return GetBoolean(stored_.gbDownload, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_gbDownload(VARIANT_BOOL value) {
-  return PutBoolean(Rules().gbDownload, value);
+  return PutBoolean(stored_.gbDownload, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_bRenameEnabled(VARIANT_BOOL* value) {
@@ -238,19 +238,19 @@ STDMETHODIMP FileControlObject<Interface>::put_bRenameEnabled(VARIANT_BOOL value
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_bConnectedToFtp(VARIANT_BOOL* value) {
-  return GetBoolean(Rules().bConnectedToFtp, value);
+  return GetBoolean(stored_.bConnectedToFtp, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_bConnectedToFtp(VARIANT_BOOL value) {
-  return PutBoolean(Rules().bConnectedToFtp, value);
+  return PutBoolean(stored_.bConnectedToFtp, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_intLocalFileID(short* value) {
-  return GetNumber<short>(Rules().m_intLocalFileID, value);
+  return GetNumber<short>(stored_.m_intLocalFileID, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_m_intLocalFileID(short value) {
-  return PutNumber(Rules().m_intLocalFileID, value);
+  return PutNumber(stored_.m_intLocalFileID, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_m_lUploadedBytes(LONG* value) {
@@ -263,21 +263,21 @@ STDMETHODIMP FileControlObject<Interface>::put_m_lUploadedBytes(LONG value) {
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_OLEDropMode(short* value) {
-  return GetNumber<short>(Rules().OLEDropMode, value);
+  return GetNumber<short>(stored_.OLEDropMode, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_OLEDropMode(short value) {
-  Rules().OLEDropMode = value;
+  stored_.OLEDropMode = value;
   ole_.PropertyChanged(kOleDropModeId);
   return S_OK;
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_OLEDragMode(LONG* value) {
-  return GetNumber<LONG>(Rules().OLEDragMode, value);
+  return GetNumber<LONG>(stored_.OLEDragMode, value);
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_OLEDragMode(LONG value) {
-  Rules().OLEDragMode = value;
+  stored_.OLEDragMode = value;
   ole_.PropertyChanged(kOleDragModeId);
   return S_OK;
 }
@@ -475,16 +475,15 @@ std::span<const PersistedProperty> FileControlObject<Interface>::Properties() co
 
 template <typename Interface>
 std::int32_t FileControlObject<Interface>::GetProperty(DISPID id) const {
-  const FileControl& rules = const_cast<FileControlObject*>(this)->Rules();
-  return id == kOleDropModeId ? rules.OLEDropMode : rules.OLEDragMode;
+  return id == kOleDropModeId ? stored_.OLEDropMode : stored_.OLEDragMode;
 }
 
 template <typename Interface>
 void FileControlObject<Interface>::SetProperty(DISPID id, std::int32_t value) {
   if (id == kOleDropModeId)
-    Rules().OLEDropMode = static_cast<std::int16_t>(value);
+    stored_.OLEDropMode = static_cast<std::int16_t>(value);
   else
-    Rules().OLEDragMode = value;
+    stored_.OLEDragMode = value;
 }
 
 // --- Drag and drop ---

@@ -176,6 +176,22 @@ class FileControlObject : public DualObject<Interface>,
   // As long as there is a window that was asked for.
   ComPtr<DropTarget> dropTarget_;
   AmbientValues ambient_;
+  // The control stores these for the host and does nothing with them.
+  struct {
+    Text m_strWinsockBuffer;
+    Text m_strDataBuffer;
+    Text m_strLocalFilePath;
+    std::int16_t m_intLocalFileID = 0;
+    bool m_bUploadFile = false;
+    Text m_strLastServerResponse;
+    bool m_bFileIsOpened = false;
+    bool gbUploadImage = false;
+    Text gszDownloadPath;
+    bool gbDownload = false;
+    bool bConnectedToFtp = false;
+    std::int16_t OLEDropMode = 0;
+    std::int32_t OLEDragMode = 0;
+  } stored_;
   // What the host was last given for the rules' client, so that it gets the same object again.
   ComPtr<CFileUploadObject> clientObject_;
 };
