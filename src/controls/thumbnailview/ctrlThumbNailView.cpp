@@ -183,6 +183,7 @@ void ctrlThumbNailView::FillPage(int first) {
   const bool empty = apartment_.allFiles.IsEmpty() && apartment_.listLoaded;
   page_.ShowGrid(!empty);
   if (empty) {
+    paths_.fill({});
     page_.EnableScroll(false);
     iImgNo = 0;
     return;
@@ -197,6 +198,7 @@ void ctrlThumbNailView::FillPage(int first) {
     const int position = first + slot;
     FileList& shown = apartment_.shownFiles;
     if (position > static_cast<int>(shown.Count())) {
+      PathOf(slot).clear();
       page_.ShowSlot(slot, false);
       continue;
     }
