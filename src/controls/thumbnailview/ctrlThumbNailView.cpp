@@ -173,7 +173,7 @@ void ctrlThumbNailView::FillPage(int first) {
   const Text edited = editedName_.empty() ? Text() : PathOf(editedSlot_);
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     page_.ClearSlot(slot);
-    const auto position = static_cast<std::size_t>(first + slot);
+    const std::size_t position = static_cast<std::size_t>(first) + static_cast<std::size_t>(slot);
     const FileList& shown = apartment_.shownFiles;
     PathOf(slot) = position <= shown.Count() ? shown.At(position)->FilePath : Text();
   }
