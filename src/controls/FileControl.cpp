@@ -529,6 +529,8 @@ bool FileControl::EnableRename(bool bEnableRename) {
 
 Text FileControl::AddressToFetch(const Text& key) const {
   const FileList& all = apartment_.allFiles;
+  // Of a file that the service listed without an address; every address contains an empty text.
+  if (key.empty()) return {};
   if (all.Find(key)) return key;
   for (std::size_t i = 1; i <= all.Count(); ++i)
     if (all.At(i)->FilePath.find(key) != Text::npos) return all.At(i)->FilePath;

@@ -193,10 +193,16 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool IsStopped() const { return IsAborted() || closings_ != closingsBefore_; }
   // Whether AbortFileTransfer(True) was called since the transfer began.
   bool IsAborted() const { return apartment_.aborts != abortsBefore_; }
-  // From here on only a later stop is meant.
-  void ForgetStops() {
-    closingsBefore_ = closings_;
-    abortsBefore_ = apartment_.aborts;
+  // How often the container and the host have told transfers to stop so far.
+  struct Stops {
+    std::uint32_t closings = 0;
+    std::uint32_t aborts = 0;
+  };
+  Stops StopsSoFar() const { return {closings_, apartment_.aborts}; }
+  // For the transfer that runs only stops after these are meant.
+  void IgnoreStops(const Stops& earlier) {
+    closingsBefore_ = earlier.closings;
+    abortsBefore_ = earlier.aborts;
   }
   // Notes the outcome of the operation that runs, for m_LastError.
   void Fail(std::int32_t ftpError, TextView description);

@@ -496,7 +496,14 @@ TEST_F(ListImageTest, LeavesTheFilesOfAnotherUserAlone) {
     control.DeleteFile();
     EXPECT_FALSE(control.OnBeforeLabelEdit());
     EXPECT_FALSE(control.OnAfterLabelEdit(0, u"b.jpg"));
-    ExpectLog({"view hourglass", "view pointer"});
+    ExpectLog({"view hourglass", "view pointer", "1033 "});
+    EXPECT_EQ(control.m_LastError, ftp_error::kNotLoggedOn);
+    // Nor is his upload shown among them.
+    fake.files.files[u"C:\\new.jpg"] = {1, 0};
+    uploader.script = Upload;
+    EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+    EXPECT_EQ(Names(), "a.jpg,");
+    log.clear();
     *of = own;
   }
   EXPECT_TRUE(control.OnAfterLabelEdit(0, u"b.jpg"));

@@ -432,6 +432,14 @@ TEST_F(ThumbNailTest, AStopEndsTheFetchingOfThePage) {
   EXPECT_EQ(page.Look(), "1.gif* 2.gif! 3.gif! 4.gif ");
   EXPECT_EQ(Events(), "1234 1,9999 11,1234 -1,");
   EXPECT_EQ(control.m_strLastErrorDesc, u"The transfer was stopped.");
+  // It ends that of a page which was asked for just before.
+  downloader.waits = {[this](FakeDownloader&) {
+    control.ChangeFileFilter(u"*");
+    control.mobjFileupload->AbortFileTransfer(true);
+  }};
+  control.ChangeFileFilter(u"*");
+  EXPECT_EQ(page.Look(), "1.gif* 2.gif! 3.gif! 4.gif ");
+  EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
   // It does not end that of a page which is asked for afterwards.
   downloader.waits = {[this](FakeDownloader&) {
                         control.mobjFileupload->AbortFileTransfer(true);
@@ -612,6 +620,13 @@ TEST_F(ThumbNailTest, EditsTheNameInPlace) {
   ExpectLog({"8888 ", "editor 2 new & old.gif", "caption 2 new && old", "editor hides",
              "caption 2 new && old.gif", "1031 "});
 
+  // An upload on the same page takes the selection, and not the caption.
+  control.OnKeyDown(113);
+  control.UploadedFileSetFocus(u"4.gif");
+  page.edited = u"new & old";
+  control.OnEditorEntered();
+  EXPECT_EQ(page.Look(), "1.gif new && old.gif 3.gif 4.gif* ");
+  control.OnSlotPressed(2, false);
   // A refused character restores the caption; leaving the editor changes nothing.
   log.clear();
   control.OnKeyDown(113);
@@ -761,6 +776,12 @@ TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
   Scroll(0);
   EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
   EXPECT_EQ(Selected(), AddressOf("new.jpg"));
+  // Which is not the one that looks selected, so neither is changed.
+  log.clear();
+  control.DeleteFile();
+  EXPECT_EQ(Events(), "1002 ,");
+  EXPECT_EQ(Validate("y.gif"), "1033 ,");
+  EXPECT_EQ(control.m_LastError, ftp_error::kUnavailable);
   control.EnableRename(true);
   control.OnKeyDown(113);
   EXPECT_EQ(log.back(), "8888 ") << "there is no place for an editor";

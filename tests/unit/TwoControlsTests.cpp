@@ -69,6 +69,19 @@ TEST_F(TwoControlsTest, AnUploadIntoTheWatchdogThenADownload) {
   EXPECT_EQ(list.m_LastError, ftp_error::kSuccess);
 }
 
+// The list has listed anew, so the page shows records of an older listing.
+TEST_F(TwoControlsTest, AnUploadTakesThePlaceOfAnOlderRecord) {
+  EXPECT_TRUE(thumbnails->Init(u"*"));
+  fake.apartment.listingIsCurrent = false;
+  EXPECT_TRUE(list.Init(u"*"));
+  fake.files.files[u"C:\\b.gif"] = {kGif.size(), 0, kGif};
+  pageUploader.script = Upload;
+  replies["FileUploadRequest"] = "FileURL=http://h/u/b.gif";
+  EXPECT_TRUE(thumbnails->UploadImage(u"C:\\b.gif"));
+  EXPECT_EQ(page.Look(), "a.gif b.gif* c.gif ");
+  EXPECT_EQ(fake.apartment.shownFiles.At(2), fake.apartment.allFiles.At(2));
+}
+
 // What the page is fetching is changed by the list meanwhile; the bytes on their way are the old ones.
 TEST_F(TwoControlsTest, ChangesOvertakeAFetch) {
   replies["FileUploadRequest"] = "FileURL=http://h/u/b.gif";

@@ -208,7 +208,12 @@ bool ctrlListImage::OnBeforeLabelEdit() const {
 
 bool ctrlListImage::OnAfterLabelEdit(std::size_t index, TextView newText) {
   return ResultAsItStood(false, [&](bool& renamed) {
-    if (!bRenameEnabled || index >= items_.size() || ShowsOtherAccount()) return;
+    if (!bRenameEnabled || index >= items_.size()) return;
+    if (ShowsOtherAccount()) {
+      const Operation operation(*this);
+      MayChangeShown();
+      return Raise(event::kRenameFailed);
+    }
     const Text oldName = items_[index].record->FileName;
     Text newName(newText);
     // An emptied or untouched label means that the user changed his mind.

@@ -16,6 +16,8 @@ bool ctrlListImage::ShowsFile(TextView name) const {
 
 void ctrlListImage::ShowUploaded(const std::shared_ptr<CUpload>& record) {
   if (items_.empty()) ShowsAccount();
+  // What is shown are still another user's files.
+  if (ShowsOtherAccount()) return;
   const auto same = std::ranges::find_if(items_, [&](const Item& item) {
     return item.record == record || EqualsIgnoringCase(item.record->FileName, record->FileName);
   });

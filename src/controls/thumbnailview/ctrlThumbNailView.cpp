@@ -151,12 +151,13 @@ void ctrlThumbNailView::SetScrollValue(int value) {
 
 void ctrlThumbNailView::ShowPage(int first) {
   nextPage_ = first;
+  stopsBeforeNext_ = StopsSoFar();
   if (fillRuns_) return;
   fillRuns_ = true;
   while (nextPage_ && !IsClosed()) {
     // A stop, and a failure, were those of the page before.
     if (busy_) {
-      ForgetStops();
+      IgnoreStops(stopsBeforeNext_);
       busy_->operation.Succeed();
     }
     ResultAsItStood(0, [&](int&) { FillPage(*std::exchange(nextPage_, std::nullopt)); });

@@ -102,6 +102,8 @@ class ctrlThumbNailView final : public FileControl {
   // 0 when the picture is not on the page.
   int SlotOf(TextView path) const;
   void RaiseSelection();
+  // Sets the caption of the slot with the picture of that name, if it is on the page.
+  void SetCaptionOf(TextView name, TextView caption);
   // The steps of ValidateFileName.
   void GiveNewName(Text& name, const Text& oldName);
 
@@ -120,8 +122,9 @@ class ctrlThumbNailView final : public FileControl {
   bool keepSelection_ = false;
 
   bool fillRuns_ = false;
-  // The page that takes the place of the one that is being filled.
+  // The page that takes the place of the one that is being filled, and the stops before it was asked for.
   std::optional<int> nextPage_;
+  Stops stopsBeforeNext_;
   // A page could not fetch its pictures because of a transfer of the host's.
   bool fillIsOwed_ = false;
   // From the first download of a page to the end of its filling; its outcome is that of the downloads.

@@ -50,7 +50,8 @@ void ctrlThumbNailView::UpdateSelection() {
     }
     if (selectedPath_.empty()) selectedPath_ = kNoPath;
     int selected = SlotOf(selectedPath_);
-    // Keys act on something: without a selected picture on the page the first slot looks like it.
+    // One slot always looks selected. Where that is not the selected picture, which is on another page then,
+    // nothing deletes or renames.
     if (selected == 0 && !shown.IsEmpty()) selected = 1;
     for (int slot = 1; slot <= kSlotCount; ++slot) page_.SetSelected(slot, slot == selected);
     iImgNo = static_cast<std::int16_t>(selected);
@@ -101,15 +102,19 @@ void ctrlThumbNailView::RaiseSelection() {
 
 void ctrlThumbNailView::ShowUploaded(const std::shared_ptr<CUpload>& record) {
   FileList& shown = apartment_.shownFiles;
-  std::size_t position = Find(shown, [&](const CUpload& file) { return &file == record.get(); });
+  if (shown.IsEmpty()) ShowsAccount();
+  if (ShowsOtherAccount()) return;
+  // The shown record may be one of an older listing.
+  std::size_t position = Find(shown, [&](const CUpload& file) {
+    return &file == record.get() || EqualsIgnoringCase(file.FileName, record->FileName);
+  });
   if (position != 0) {
-    SetAddress(shown, position, record->FilePath);
+    shown.Remove(position);
   } else if (Passes(record->FileName)) {
-    if (shown.IsEmpty()) ShowsAccount();
-    shown.Add(record, record->FilePath);
-    position = shown.Count();
+    position = shown.Count() + 1;
   }
   if (position == 0) return;
+  shown.Insert(position, record, shown.Find(record->FilePath) ? TextView() : TextView(record->FilePath));
   keepSelection_ = true;
   ShowItem(position);
 }
@@ -125,8 +130,8 @@ void ctrlThumbNailView::DeleteFile() {
       Fail(ftp_error::kNotAllowed, u"The account may not delete files.");
       return Raise(event::kNotAllowed);
     }
-    const std::shared_ptr<CUpload> record = SelectedRecord();
-    if (!record) Fail(ftp_error::kUnavailable, u"No file is selected.");
+    const std::shared_ptr<CUpload> record = SlotOf(selectedPath_) != 0 ? SelectedRecord() : nullptr;
+    if (!record) Fail(ftp_error::kUnavailable, u"No file on the page is selected.");
     if (!record || !MayChangeShown()) return Raise(event::kNotSelected);
     deleteRuns_ = true;
     const bool deleted = ResultAsItStood(false, [&](bool& gone) {
@@ -174,9 +179,14 @@ void ctrlThumbNailView::SetLabelText(TextView szString) {
   if (const int slot = SlotOf(selectedPath_)) page_.SetCaption(slot, FormatLabelText(szString));
 }
 
+void ctrlThumbNailView::SetCaptionOf(TextView name, TextView caption) {
+  for (int slot = 1; slot <= kSlotCount; ++slot)
+    if (FileNameFromUrl(PathOf(slot)) == name) page_.SetCaption(slot, FormatLabelText(caption));
+}
+
 void ctrlThumbNailView::ValidateFileName(Text& NewString) {
   const Text edited = std::exchange(editedName_, Text());
-  if (edited.empty()) return GiveNewName(NewString, SelectedFileName());
+  if (edited.empty()) return GiveNewName(NewString, SlotOf(selectedPath_) != 0 ? SelectedFileName() : Text());
   page_.HideEditor();
   GiveNewName(NewString, edited);
 }
@@ -185,7 +195,7 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
   ResultAsItStood(0, [&](int&) {
     const Operation operation(*this);
     const auto keepName = [&](std::int16_t code) {
-      SetLabelText(oldName);
+      SetCaptionOf(oldName, oldName);
       Raise(code);
     };
     NewString = Text(Trim(NewString));
@@ -194,7 +204,7 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
       return keepName(event::kNameUnfit);
     }
     if (oldName.empty()) Fail(ftp_error::kUnavailable, u"No file is selected.");
-    if (oldName.empty() || !MayChangeShown()) return Raise(event::kRenameFailed);
+    if (oldName.empty() || !MayChangeShown()) return keepName(event::kRenameFailed);
     CheckFileExtension(NewString, ExtensionOf(oldName));
     // The caption may show what was typed, such as the name without its extension.
     if (NewString == oldName) return keepName(event::kRenamed);
@@ -265,7 +275,7 @@ void ctrlThumbNailView::OnEditorEntered() {
   // Hiding the editor takes the focus from it, which would end the editing.
   const Text oldName = std::exchange(editedName_, Text());
   const bool valid = IsEditedNameValid(name);
-  SetLabelText(valid ? name : oldName);
+  SetCaptionOf(oldName, valid ? name : oldName);
   page_.HideEditor();
   page_.Focus();
   if (valid) GiveNewName(name, oldName);
