@@ -258,7 +258,7 @@ void Request::Open(const HttpPost& post) {
                                 WINHTTP_ADDREQ_FLAG_ADD | WINHTTP_ADDREQ_FLAG_REPLACE))
     return;
   auto share = std::make_unique<std::shared_ptr<Exchange>>(exchange_);
-  auto* context = share.get();
+  auto context = reinterpret_cast<DWORD_PTR>(share.get());
   if (!WinHttpSetOption(request.Get(), WINHTTP_OPTION_CONTEXT_VALUE, &context, sizeof context) ||
       WinHttpSetStatusCallback(request.Get(), OnTold, WINHTTP_CALLBACK_FLAG_ALL_NOTIFICATIONS, 0) ==
           WINHTTP_INVALID_STATUS_CALLBACK)
