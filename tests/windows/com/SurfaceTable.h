@@ -1,4 +1,4 @@
-// What hosts were promised: classes, interfaces, events and enumerations.
+// What hosts were promised: classes, interfaces and events. The enumerations stand in the reference.
 #pragma once
 
 namespace tarnwick::test {
@@ -8,8 +8,8 @@ namespace tarnwick::test {
 //   class NAME [creatable] [control] default INTERFACE [events INTERFACE]
 //   interface NAME         with lines  PROPERTY: TYPE  and  METHOD(PARAMETER, ...): RESULT
 //   events NAME            with lines  NUMBER EVENT(PARAMETER, ...)
-//   enumeration NAME       with lines  NAME = VALUE
 //
+// Lines below two names, parted by a comma, are of both of them, or of the control that is named in front.
 // A parameter is [optional] [ref] NAME: TYPE [= DEFAULT]; every property can be read and set.
 extern const char* const kSurface;
 
