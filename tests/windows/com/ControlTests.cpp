@@ -94,21 +94,16 @@ TEST(ListControl, WorksWithoutAWindow) {
   // Drawn for a form that is not running.
   ComPtr<IViewObject2> view;
   ASSERT_EQ(list->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
-  const HDC screen = GetDC(nullptr);
-  const HDC dc = CreateCompatibleDC(screen);
-  const HBITMAP bitmap = CreateCompatibleBitmap(screen, 320, 240);
-  const HGDIOBJ old = SelectObject(dc, bitmap);
-  const RECTL bounds = {0, 0, 320, 240};
-  EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
-            S_OK);
-  int inked = 0;
-  for (int x = 0; x < 320; x += 2)
-    for (int y = 30; y < 240; y += 2) inked += GetPixel(dc, x, y) != GetSysColor(COLOR_WINDOW);
-  EXPECT_GT(inked, 100);
-  SelectObject(dc, old);
-  DeleteObject(bitmap);
-  DeleteDC(dc);
-  ReleaseDC(nullptr, screen);
+  const Pixels drawn = Drawn(320, 240, [&](HDC dc) {
+    const RECTL bounds = {0, 0, 320, 240};
+    EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
+              S_OK);
+  });
+  const COLORREF window = GetSysColor(COLOR_WINDOW);
+  const std::uint32_t paper = RGB(GetBValue(window), GetGValue(window), GetRValue(window));
+  // Below the heads of the columns.
+  EXPECT_GT(drawn.end() - drawn.begin() - 320 * 30 - std::count(drawn.begin() + 320 * 30, drawn.end(), paper),
+            400);
 }
 
 TEST(ListControl, ShowsTheAccountInItsContainer) {
@@ -547,25 +542,19 @@ TYPED_TEST(AnyControl, DrawsItselfWithoutAWindowOfTheContainer) {
   ComPtr<IViewObject2> view;
   ASSERT_EQ(CoCreateInstance(classId, nullptr, CLSCTX_INPROC_SERVER, IID_IViewObject2, view.ReceiveVoid()),
             S_OK);
-  const HDC screen = GetDC(nullptr);
-  const HDC dc = CreateCompatibleDC(screen);
-  const HBITMAP bitmap = CreateCompatibleBitmap(screen, 100, 80);
-  const HGDIOBJ old = SelectObject(dc, bitmap);
-  const RECT all = {0, 0, 100, 80};
-  constexpr COLORREF kBefore = RGB(255, 0, 255);
-  SetDCBrushColor(dc, kBefore);
-  FillRect(dc, &all, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
-  const RECTL bounds = {10, 10, 90, 70};
-  EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
-            S_OK);
-  EXPECT_NE(GetPixel(dc, 50, 60), kBefore);
-  EXPECT_EQ(GetPixel(dc, 5, 5), kBefore) << "drawn beside its place";
-  EXPECT_EQ(view->Draw(DVASPECT_ICON, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
-            DV_E_DVASPECT);
-  SelectObject(dc, old);
-  DeleteObject(bitmap);
-  DeleteDC(dc);
-  ReleaseDC(nullptr, screen);
+  constexpr std::uint32_t kBefore = RGB(255, 0, 255);
+  const Pixels drawn = Drawn(100, 80, [&](HDC dc) {
+    const RECT all = {0, 0, 100, 80};
+    SetDCBrushColor(dc, kBefore);
+    FillRect(dc, &all, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
+    const RECTL bounds = {10, 10, 90, 70};
+    EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
+              S_OK);
+    EXPECT_EQ(view->Draw(DVASPECT_ICON, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
+              DV_E_DVASPECT);
+  });
+  EXPECT_NE(drawn[60 * 100 + 50], kBefore);
+  EXPECT_EQ(drawn[5 * 100 + 5], kBefore) << "drawn beside its place";
 
   // What changes the look is told.
   TypeParam form;
@@ -697,6 +686,62 @@ TYPED_TEST(AnyControl, TellsTheInterfaceThatASinkOffers) {
   point = {};
   ASSERT_EQ(points->FindConnectionPoint(IID_IPropertyNotifySink, point.Receive()), S_OK);
   EXPECT_EQ(point->Advise(&sink, &cookie), CONNECT_E_CANNOTCONNECT);
+  const bool isList = TypeParam::EventsId() == DIID___ctrlListImage;
+  EXPECT_NE(
+      points->FindConnectionPoint(isList ? DIID___ctrlThumbNailView : DIID___ctrlListImage, point.Receive()),
+      S_OK);
+  // As a host's designer sees them.
+  ComPtr<IProvideClassInfo> provider;
+  ComPtr<ITypeInfo> itsClass;
+  TYPEATTR* attributes = nullptr;
+  ASSERT_EQ(form.control->QueryInterface(IID_IProvideClassInfo, provider.ReceiveVoid()), S_OK);
+  ASSERT_EQ(provider->GetClassInfo(itsClass.Receive()), S_OK);
+  ASSERT_EQ(itsClass->GetTypeAttr(&attributes), S_OK);
+  EXPECT_EQ(attributes->guid, isList ? CLSID_ctrlListImage : CLSID_ctrlThumbNailView);
+  itsClass->ReleaseTypeAttr(attributes);
+}
+
+// What both controls answer about files, each late bound, with the last argument first.
+TYPED_TEST(AnyControl, AnswersAboutNamesAndFiles) {
+  TypeParam form;
+  form.LogOn(TheServer().name);
+  ASSERT_TRUE(form.Init(L"jpg"));
+  const auto call = [&](const wchar_t* member, std::initializer_list<VARIANT> arguments) {
+    return Call(form.control.Get(), member, arguments);
+  };
+  const auto truth = [](const VARIANT& answer) { return V_VT(&answer) == VT_BOOL ? V_BOOL(&answer) : 9; };
+  const auto reference = [](VARTYPE type, void* to) {
+    VARIANT value = {};
+    V_VT(&value) = static_cast<VARTYPE>(VT_BYREF | type);
+    V_BYREF(&value) = to;
+    return value;
+  };
+  for (VARIANT_BOOL enabled : {VARIANT_TRUE, VARIANT_FALSE}) {
+    const VARIANT_BOOL expected = enabled;
+    EXPECT_EQ(truth(call(L"EnableRename", {reference(VT_BOOL, &enabled)})), expected);
+  }
+  const Bstr valid(L"b c.jpg");
+  EXPECT_EQ(truth(call(L"IsFileNameValid", {VariantOf(valid)})), VARIANT_TRUE);
+  BSTR name = SysAllocString(L"a.gif");
+  const Bstr extension(L".jpg");
+  BSTR itsExtension = extension;
+  EXPECT_EQ(
+      truth(call(L"CheckFileExtension", {reference(VT_BSTR, &itsExtension), reference(VT_BSTR, &name)})),
+      VARIANT_TRUE);
+  EXPECT_STREQ(name, L"a.jpg");
+  SysFreeString(name);
+  const Bstr taken(L"COFFEE.jpg");
+  EXPECT_EQ(truth(call(L"CheckIfFileDoesNotExist", {VariantOf(taken)})), VARIANT_FALSE);
+  EXPECT_EQ(truth(call(L"CheckIfFileDoesNotExist", {VariantOf(valid)})), VARIANT_TRUE);
+  ComPtr<IDispatch> files;
+  const Bstr coffee(L"coffee.jpg");
+  call(L"GetFileDetails", {reference(VT_DISPATCH, files.Receive()), VariantOf(coffee)});
+  ASSERT_TRUE(files);
+  VARIANT record = Call(files.Get(), L"Item", {VariantOf(LONG{1})});
+  VARIANT found = Call(V_DISPATCH(&record), L"FileName", {});
+  EXPECT_STREQ(V_BSTR(&found), coffee);
+  VariantClear(&found);
+  VariantClear(&record);
 }
 
 // A container's addition to a control, and the control as a part of it.

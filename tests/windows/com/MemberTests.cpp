@@ -4,6 +4,7 @@
 
 #include <array>
 #include <functional>
+#include <map>
 #include <string>
 #include <vector>
 
@@ -34,6 +35,16 @@ class Argument {
   Argument(const Argument&) = delete;
   Argument& operator=(const Argument&) = delete;
 
+  void Set(VARIANT given) {
+    if (type_ == VT_VARIANT) {
+      VariantCopy(&variant_, &given);
+    } else if (type_ == VT_BSTR) {
+      SysReAllocString(&V_BSTR(&value_), V_BSTR(&given));
+    } else {
+      value_ = given;
+      if (type_ == VT_DISPATCH) V_DISPATCH(&value_)->AddRef();
+    }
+  }
   bool IsResult() const { return (flags_ & PARAMFLAG_FRETVAL) != 0; }
   bool IsReference() const { return (flags_ & PARAMFLAG_FOUT) != 0; }
   bool IsOptional() const { return (flags_ & PARAMFLAG_FOPT) != 0; }
@@ -167,6 +178,10 @@ class MemberCall {
   bool HasResult() const { return !arguments_.empty() && arguments_.back()->IsResult(); }
   std::size_t Given() const { return given_; }
   const Argument& At(std::size_t index) const { return *arguments_[index]; }
+  MemberCall& Giving(const VARIANT& value) {
+    arguments_[0]->Set(value);
+    return *this;
+  }
 
   // By the slot; `null` is the index of an argument that is a null pointer.
   HRESULT BySlot(std::size_t null = SIZE_MAX) {
@@ -282,6 +297,58 @@ TEST_P(Members, DoTheSameBySlotByNameAndWithNamedArguments) {
     MemberCall named(*object_, member);
     EXPECT_EQ(named.ByNamesOfArguments(), answer);
     EXPECT_EQ(named.Shown(), shown);
+  }
+}
+
+// Written on one way, a property is read on the other. A truth is left as false: one ends the next transfer.
+TEST_P(Members, KeepWhatTheyAreGivenOnBothWays) {
+  ASSERT_TRUE(object_);
+  const Bstr text(L"one \u00FC");
+  const Bstr empty;
+  const auto of = [](VARTYPE type, auto set) {
+    VARIANT value = {};
+    V_VT(&value) = type;
+    set(value);
+    return value;
+  };
+  const auto number = [&](short value) { return of(VT_I2, [=](VARIANT& held) { V_I2(&held) = value; }); };
+  const auto real = [&](double value) { return of(VT_R8, [=](VARIANT& held) { V_R8(&held) = value; }); };
+  const auto truth = [&](VARIANT_BOOL value) {
+    return of(VT_BOOL, [=](VARIANT& held) { V_BOOL(&held) = value; });
+  };
+  const std::map<VARTYPE, std::pair<VARIANT, VARIANT>> pairs = {
+      {VT_BSTR, {VariantOf(text), VariantOf(empty)}}, {VT_I2, {number(-5), number(300)}},
+      {VT_I4, {VariantOf(70'000L), VariantOf(-1L)}},  {VT_R8, {real(2.5), real(3e9)}},
+      {VT_VARIANT, {VariantOf(text), real(12.5)}},    {VT_BOOL, {truth(VARIANT_TRUE), truth(VARIANT_FALSE)}},
+  };
+  const ComPtr<IDispatch> owners[] = {GetParam().make(library_), GetParam().make(library_)};
+  std::map<DISPID, Member> readers;
+  for (const Member& member : MembersOf(*object_)) {
+    if (member.kind == INVOKE_PROPERTYGET) readers[member.id] = member;
+    if ((member.kind & (INVOKE_PROPERTYPUT | INVOKE_PROPERTYPUTREF)) == 0) continue;
+    SCOPED_TRACE(std::string(member.name.begin(), member.name.end()));
+    const VARTYPE type = member.parameters[0].first;
+    if (type == VT_DISPATCH) {
+      for (const ComPtr<IDispatch>& owner : owners) {
+        VARIANT given = Get(owner.Get(), member.name.c_str());
+        ASSERT_EQ(V_VT(&given), VT_DISPATCH);
+        MemberCall put(*object_, member);
+        EXPECT_EQ(&owner == owners ? put.Giving(given).BySlot() : put.Giving(given).ByName(), S_OK);
+        VARIANT read = Get(object_.Get(), member.name.c_str());
+        EXPECT_EQ(V_DISPATCH(&read), V_DISPATCH(&given));
+        VariantClear(&read);
+        VariantClear(&given);
+      }
+      continue;
+    }
+    const auto& [first, second] = pairs.at(type);
+    MemberCall read(*object_, readers.at(member.id));
+    EXPECT_EQ(MemberCall(*object_, member).Giving(first).BySlot(), S_OK);
+    EXPECT_EQ(read.ByName(), S_OK);
+    EXPECT_EQ(read.Shown(), Argument::TextOf(first));
+    EXPECT_EQ(MemberCall(*object_, member).Giving(second).ByName(), S_OK);
+    EXPECT_EQ(read.BySlot(), S_OK);
+    EXPECT_EQ(read.Shown(), Argument::TextOf(second));
   }
 }
 

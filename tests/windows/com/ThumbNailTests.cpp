@@ -143,29 +143,6 @@ TEST(ThumbNailControl, ShowsPagesOfPicturesFromTheServer) {
   EXPECT_EQ(form.events, Lines());
 }
 
-TEST(ThumbNailControl, ShowsThePageThatIsWantedLast) {
-  RemoveCopies();
-  ThumbForm form;
-  form.LogOn(TheServer().name);
-  form.Show();
-  ASSERT_TRUE(form.Init(L"jpg"));
-  RemoveCopies();
-  // The user turns the page while the one before is fetched.
-  form.onEvent = [&](int code) {
-    if (code != 9999) return;
-    form.onEvent = {};
-    PostMessageW(form.Window(), WM_VSCROLL, SB_BOTTOM, reinterpret_cast<LPARAM>(form.ScrollBar()));
-  };
-  form.events.clear();
-  form.control->ChangeFileFilter(Bstr(L"*"));
-  const Lines account = Account();
-  EXPECT_EQ(form.Captions(), Lines(account.end() - 4, account.end()));
-  EXPECT_EQ(ScrollPosition(form), static_cast<int>(account.size()) - 4);
-  EXPECT_EQ(form.events, (Lines{L"1234 1", L"1234 -1"}));
-  // Of the first page's pictures none was fetched after that.
-  EXPECT_LE(Copies().size(), 5U);
-}
-
 TEST(ThumbNailControl, TellsWhatTheUserDoes) {
   ThumbForm form;
   form.LogOn(TheServer().name);
@@ -337,47 +314,6 @@ TEST(ThumbNailControl, ShowsTheOthersWhenAServerLosesOne) {
   }
 }
 
-TEST(ThumbNailControl, LeavesTheSquareOfABrokenPictureEmpty) {
-  ThumbForm form;
-  form.LogOn(TheServer().name);
-  form.Show();
-  ASSERT_TRUE(form.Init(L"jpg"));
-  const std::string rocket = Contents(L"demo\\pictures\\rocket.jpg").value_or("");
-  const struct {
-    const char* what;
-    std::string bytes;
-  } rows[] = {
-      {"words", "<html>No picture here</html>"},
-      {"nothing", ""},
-      {"only a head", rocket.substr(0, 300)},
-      {"half", rocket.substr(0, rocket.size() / 2)},
-      {"60,000 pixels square", std::string("GIF89a\x60\xEA\x60\xEA\xF0\0\0", 13)},
-  };
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.what);
-    std::ofstream("x.jpg", std::ios::binary) << row.bytes;
-    form.events.clear();
-    EXPECT_TRUE(Upload(form, L".\\x.jpg"));
-    DeleteFileW(L"x.jpg");
-    EXPECT_EQ(form.events, Lines{L"1015 " + Address(L"x.jpg")});
-    for (const bool again : {false, true}) {
-      if (again) {
-        Scroll(form, SB_TOP);
-        Scroll(form, SB_BOTTOM);
-      }
-      EXPECT_EQ(form.Captions(), (Lines{kJpegs[2], kJpegs[3], L"x.jpg"}));
-      EXPECT_TRUE(Picture(form, 3).empty());
-      EXPECT_FALSE(Picture(form, 1).empty());
-      // It is what the account has, so it is not fetched again and again.
-      EXPECT_EQ(Contents(CopyOf(L"x.jpg")), row.bytes);
-    }
-    EXPECT_FALSE(Holds(form.events, L"5555 "));
-    EXPECT_EQ(form.Select(L"x.jpg"), L"x.jpg");
-    form.control->DeleteFile();
-    EXPECT_EQ(form.Captions(), kJpegs);
-  }
-}
-
 // The page is filled in a message, or in a late-bound call; in both nothing but the library itself holds the
 // control when its host let go of it.
 TEST(ThumbNailControl, MayEndInAnEventOfAPageThatIsFilled) {
@@ -409,29 +345,6 @@ TEST(ThumbNailControl, MayEndInAnEventOfAPageThatIsFilled) {
         EXPECT_EQ(form.events, closes ? Lines{L"1234 1"} : (Lines{L"1234 1", L"1234 -1"}));
         EXPECT_EQ(Copies().size(), closes ? 0U : 4U);
       }
-}
-
-TEST(ThumbNailControl, TakesFilesThatAreDroppedOnIt) {
-  ThumbForm form;
-  form.LogOn(TheServer().name);
-  form.Show();
-  ASSERT_TRUE(form.Init(L"jpg"));
-  const Lines files = {L"C:\\one.jpg", L"C:\\Bl\u00FCmchen.gif"};
-  const ComPtr<IDataObject> data = FilesFromOutside(form.frame, files);
-  auto* target = static_cast<IDropTarget*>(GetPropW(form.Window(), L"OleDropTargetInterface"));
-  ASSERT_TRUE(data && target);
-  std::wstring told;
-  form.onOther = [&](DISPID event, std::vector<VARIANT>&) { told += std::to_wstring(event); };
-  form.events.clear();
-  DWORD effect = DROPEFFECT_COPY;
-  target->DragEnter(data.Get(), MK_LBUTTON, {30, 40}, &effect);
-  const std::wstring entered = L"1020 " + Address(kJpegs[0]);
-  EXPECT_EQ(form.events, Lines{entered});
-  target->DragOver(MK_LBUTTON, {30, 40}, &effect);
-  target->Drop(data.Get(), MK_LBUTTON, {30, 40}, &effect);
-  EXPECT_EQ(form.events, (Lines{entered, L"1023 " + files[0], L"1023 " + files[1], L"1023 "}));
-  EXPECT_EQ(told, L"556");
-  EXPECT_EQ(effect, static_cast<DWORD>(DROPEFFECT_COPY));
 }
 
 TEST(ThumbNailControl, WorksWithoutAWindow) {
@@ -478,6 +391,44 @@ TEST(ThumbNailControl, WorksWithoutAWindow) {
   const Pixels shown = Picture(form, 2);
   EXPECT_FALSE(shown.empty());
   EXPECT_TRUE(drawn == shown);
+}
+
+TEST(ThumbNailControl, HasItsOwnMembers) {
+  ThumbForm form;
+  form.LogOn(TheServer().name);
+  form.Show();
+  ASSERT_TRUE(form.Init(L"jpg"));
+  EXPECT_EQ(form.Select(L"coffee.jpg"), L"coffee.jpg");
+  VARIANT nothing = VariantOf(LONG{1});
+  SetFocus(form.frame);
+  EXPECT_EQ(form.control->PictureSetFocus(&nothing), S_OK);
+  EXPECT_EQ(V_VT(&nothing), VT_EMPTY);
+  EXPECT_EQ(GetFocus(), form.Grid());
+  VARIANT_BOOL edits = VARIANT_TRUE;
+  EXPECT_EQ(form.control->EditFileLabel(&edits), S_OK);
+  EXPECT_FALSE(edits);
+  const Bstr caption(L"Tom & Jerry");
+  BSTR given = caption;
+  EXPECT_EQ(form.control->SetLabelText(&given, &nothing), S_OK);
+  EXPECT_EQ(TextOf(form.Slot(2)), L"Tom && Jerry");
+  VARIANT key = VariantOf(LONG{1});
+  ComPtr<IPictureDisp> overlay;
+  EXPECT_EQ(form.control->Overlay(&key, &key, overlay.Receive()), S_OK);
+  EXPECT_FALSE(overlay);
+  form.events.clear();
+  const Bstr name(L"coffee.jpg");
+  given = name;
+  EXPECT_EQ(form.control->ValidateFileName(&given, &nothing), S_OK);
+  EXPECT_EQ(form.events, Lines{L"1031 "});
+  std::wstring told;
+  form.onOther = [&](DISPID event, std::vector<VARIANT>&) {
+    if (event == kOLEStartDrag) keybd_event(VK_ESCAPE, 0, 0, 0);
+    if (event == kOLEStartDrag || event == kOLECompleteDrag) told += std::to_wstring(event);
+  };
+  EXPECT_EQ(form.control->OLEDrag(), S_OK);
+  keybd_event(VK_ESCAPE, 0, KEYEVENTF_KEYUP, 0);
+  form.Pump();
+  EXPECT_EQ(told, L"27");
 }
 
 }  // namespace
