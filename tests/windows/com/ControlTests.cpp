@@ -95,6 +95,8 @@ TEST(ListControl, WorksWithoutAWindow) {
   ComPtr<IViewObject2> view;
   ASSERT_EQ(list->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
   const Pixels drawn = Drawn(320, 240, [&](HDC dc) {
+    const RECT whole = {0, 0, 320, 240};
+    FillRect(dc, &whole, GetSysColorBrush(COLOR_WINDOW));
     const RECTL bounds = {0, 0, 320, 240};
     EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
               S_OK);
