@@ -429,7 +429,12 @@ bool FileControl::RenameFile(TextView strOldFileName, TextView strNewFileName) {
 }
 
 bool FileControl::Rename(const Text& oldName, const Text& newName) {
-  if (!RenameOnServer(oldName, newName)) return false;
+  // Whatever is thrown, such as for a lack of memory: the rename has an end that is told.
+  if (!ResultAsItStood(false, [&](bool& renamed) { renamed = RenameOnServer(oldName, newName); })) {
+    if (operation_ && operation_->Succeeds())
+      Fail(ftp_error::kAborted, u"The operation failed unexpectedly.");
+    return false;
+  }
   apartment_.listingIsCurrent = false;
   ResultAsItStood(0, [&](int&) {
     const auto [record, oldUrl] = RecordRenamed(oldName, newName);

@@ -5,6 +5,7 @@
 
 #include <deque>
 #include <functional>
+#include <new>
 #include <string>
 
 #include "base/RuntimeError.h"
@@ -24,6 +25,8 @@ struct FakeUploader : Uploader {
   std::function<void(UploadEvents&)> script;
   // The error with which the next calls end; 0 for none.
   std::int32_t error = 0;
+  // Whether a rename ends for a lack of memory.
+  bool noMemory = false;
 
   void Called(std::string call, std::initializer_list<TextView> arguments) {
     for (const TextView argument : arguments) call += "|" + Utf8FromText(argument);
@@ -47,6 +50,7 @@ struct FakeUploader : Uploader {
   void RenameFile(TextView base, TextView oldName, TextView newName, TextView page, TextView user,
                   TextView password, TextView product) override {
     Called("page rename", {base, oldName, newName, page, user, password, product});
+    if (noMemory) throw std::bad_alloc();
     End();
   }
 };

@@ -701,6 +701,10 @@ TEST_F(ThumbNailTest, NamesThatAreRefusedOrTaken) {
     EXPECT_EQ(control.m_LastError, error);
   }
   EXPECT_EQ(page.Look(), "console.gif* 2.gif 3.gif ");
+  uploader.noMemory = true;
+  EXPECT_EQ(Validate("x.gif"), "1033 ,");
+  EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
+  uploader.noMemory = false;
   uploader.error = 0;
   EXPECT_EQ(Validate("3.gif"), "1032 ,");
   EXPECT_EQ(control.m_strLastErrorDesc, u"The account has a file of that name.");
