@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstring>
 #include <limits>
+#include <utility>
 
 #include "platform/windows/AnsiText.h"
 
@@ -46,6 +47,7 @@ void WindowsStreamSocket::Close() {
   pending_.clear();
   if (socket_ != INVALID_SOCKET) closesocket(socket_);
   socket_ = INVALID_SOCKET;
+  sent_ = false;
   connection_ = (connection_ + 1) % kConnections;
 }
 
@@ -90,6 +92,7 @@ void WindowsStreamSocket::Send(std::string_view bytes) {
     // What cannot go now goes when the socket tells that it may.
     if (count <= 0) return;
     pending_.erase(0, static_cast<std::size_t>(count));
+    sent_ = true;
     PostMessageW(window_.Get(), MessageOf(Tells::kSent), 0, 0);
   }
 }
@@ -110,10 +113,11 @@ bool WindowsStreamSocket::OnMessage(UINT message, WPARAM wParam, LPARAM lParam) 
       OnLookedUp(WSAGETASYNCERROR(lParam));
       break;
     case Tells::kNetworkEvent:
-      OnNetworkEvent(WSAGETSELECTEVENT(lParam), WSAGETSELECTERROR(lParam));
+      // The answer to what was sent may be posted before the message that tells of the sending.
+      if (TellSent()) OnNetworkEvent(WSAGETSELECTEVENT(lParam), WSAGETSELECTERROR(lParam));
       break;
     case Tells::kSent:
-      events_->OnSent();
+      TellSent();
       break;
     case Tells::kError:
     case Tells::kCount:
@@ -121,6 +125,12 @@ bool WindowsStreamSocket::OnMessage(UINT message, WPARAM wParam, LPARAM lParam) 
       break;
   }
   return true;
+}
+
+bool WindowsStreamSocket::TellSent() {
+  const UINT connection = connection_;
+  if (std::exchange(sent_, false)) events_->OnSent();
+  return connection == connection_;
 }
 
 void WindowsStreamSocket::OnLookedUp(int error) {

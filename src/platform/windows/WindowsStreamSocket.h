@@ -35,6 +35,8 @@ class WindowsStreamSocket : public StreamSocket {
   void OnClose();
   void ConnectTo(std::uint32_t address);
   void TellError(int error);
+  // Whether the connection is still the same afterwards.
+  bool TellSent();
 
   SocketEvents* events_ = nullptr;
   SOCKET socket_ = INVALID_SOCKET;
@@ -45,6 +47,8 @@ class WindowsStreamSocket : public StreamSocket {
   std::unique_ptr<char[]> lookupAnswer_;
   std::uint16_t port_ = 0;
   std::string pending_;
+  // Bytes have left that the user was not told of.
+  bool sent_ = false;
   bool started_ = false;
   // Whether something was read since it was set back.
   bool read_ = false;
