@@ -89,9 +89,9 @@ double ListingRun(const std::string& reply, std::size_t files) {
   bool listed = false;
   const double seconds = Seconds([&] {
     listed = client.ListFilesForUser(
-        [&](const std::shared_ptr<CUpload>& file, TextView key) { apartment.allFiles.Add(file, key); });
+        [&](const std::shared_ptr<CUpload>& file) { apartment.listing.all.Add(file); });
   });
-  if (!listed || apartment.allFiles.Count() != files) Stop("the listing is not complete");
+  if (!listed || apartment.listing.all.Count() != files) Stop("the listing is not complete");
   return seconds;
 }
 

@@ -12,12 +12,13 @@
 
 namespace tarnwick {
 
-// Entry has a member `key`, which is not empty. Entries stay where they are as long as they are in the index.
+// An entry's member `Key` is its key, which is not empty. Entries stay where they are and keep their keys as
+// long as they are in the index.
 //
 // Open addressing with linear probing. Hashes lie apart from the pointers, so that a search, which jumps at
 // random, touches four bytes a place; a set with a node for each key costs three times as much once it
 // outgrows the processor's cache.
-template <typename Entry>
+template <typename Entry, auto Key = &Entry::key>
 class KeyIndex {
  public:
   Entry* Find(TextView key) const {
@@ -30,12 +31,12 @@ class KeyIndex {
   }
   // The entry's key is not in the index yet, and there is room.
   void Add(Entry* entry) {
-    Put(HashOf(entry->key), entry);
+    Put(HashOf(entry->*Key), entry);
     ++count_;
   }
   // The entry is in the index.
   void Remove(const Entry* entry) {
-    std::size_t hole = PlaceOf(entry->key, HashOf(entry->key));
+    std::size_t hole = PlaceOf(entry->*Key, HashOf(entry->*Key));
     const std::size_t mask = hashes_.size() - 1;
     // What follows moves up, unless it stands between its own place and the hole.
     for (std::size_t next = (hole + 1) & mask; hashes_[next] != 0; next = (next + 1) & mask) {
@@ -58,7 +59,7 @@ class KeyIndex {
     if (hashes_.empty()) return 0;
     const std::size_t mask = hashes_.size() - 1;
     std::size_t place = hash & mask;
-    while (hashes_[place] != 0 && !(hashes_[place] == hash && entries_[place]->key == key))
+    while (hashes_[place] != 0 && !(hashes_[place] == hash && entries_[place]->*Key == key))
       place = (place + 1) & mask;
     return place;
   }

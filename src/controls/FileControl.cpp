@@ -70,6 +70,7 @@ FileControl::Hourglass::~Hourglass() {
 FileControl::FileControl(const ControlParts& parts, ControlView& view, TransferEvents transferEvents)
     : mobjFileupload(std::make_shared<CFileUpload>(parts.apartment)),
       apartment_(parts.apartment),
+      listing_(parts.apartment.listing),
       events_(parts.events),
       copies_(parts.apartment),
       controlView_(view),
@@ -131,12 +132,10 @@ void FileControl::FailStopped() {
 bool FileControl::ListAccount() {
   const std::shared_ptr<CFileUpload> client = Client();
   if (!client) return false;
-  FileList& all = apartment_.allFiles;
-  if (client->ListFilesForUser(
-          [&](const std::shared_ptr<CUpload>& record, TextView key) { all.Add(record, key); }))
+  if (client->ListFilesForUser([&](const std::shared_ptr<CUpload>& record) { listing_.all.Add(record); }))
     return true;
   // Half a listing would pass for the account.
-  apartment_.ForgetListing();
+  listing_.Forget();
   Fail(ftp_error::kNotTaken, u"The service did not list the files.");
   return false;
 }
@@ -161,14 +160,13 @@ std::optional<Text> FileControl::GetSelectedFilesHttpPath() const {
 void FileControl::GetFileDetails(TextView FileName,
                                  const std::function<void(const std::shared_ptr<CUpload>&)>& colFiles) {
   ResultAsItStood(0, [&](int&) {
-    for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i) {
-      const CUpload& record = *apartment_.allFiles.At(i);
-      if (record.FilePath != FileName && FileNameFromUrl(record.FilePath) != FileName) continue;
-      auto details = std::make_shared<CUpload>(record);
-      details->FilePath.clear();
-      colFiles(details);
-      return;
-    }
+    const std::size_t position = listing_.all.PositionWhere([&](const CUpload& record) {
+      return record.FilePath == FileName || FileNameFromUrl(record.FilePath) == FileName;
+    });
+    if (position == 0) return;
+    auto details = std::make_shared<CUpload>(*listing_.all.At(position));
+    details->FilePath.clear();
+    colFiles(details);
   });
 }
 
@@ -193,7 +191,7 @@ bool FileControl::UploadImage(TextView szLocalPath) {
     }
     const AccountKey account = apartment_.session.Account();
     const Text url = SendAndRegister(*client, path);
-    std::shared_ptr<CUpload> record;
+    FileRecord record;
     if (!url.empty()) {
       // Whatever the watchdog told meanwhile.
       operation.Succeed();
@@ -276,9 +274,8 @@ void FileControl::FailUpload(CFileUpload& client, const Text& path, std::int32_t
 }
 
 bool FileControl::IsNameFree(TextView name, TextView own) const {
-  const std::size_t position = PositionOf(name);
-  return name.find_first_of(kRefusedCharacters) == TextView::npos &&
-         (position == 0 || apartment_.allFiles.At(position)->FileName == own);
+  const FileRecord same = RecordNamed(name);
+  return name.find_first_of(kRefusedCharacters) == TextView::npos && (!same || same->FileName == own);
 }
 
 void FileControl::FailWith(std::int32_t ftpError, TextView words, std::int32_t number) {
@@ -307,8 +304,8 @@ void FileControl::FailPage(TextView name, TextView own, std::int32_t number) {
 
 bool FileControl::IsTooLarge(CFileUpload& client, const Text& path) const {
   return ResultAsItStood(false, [&](bool& large) {
-    const std::size_t position = PositionOf(FileNameFromPath(path));
-    const double replaced = position != 0 ? apartment_.allFiles.At(position)->FileSize : 0;
+    const FileRecord same = RecordNamed(FileNameFromPath(path));
+    const double replaced = same ? same->FileSize : 0;
     const SessionValues& session = apartment_.session;
     const Text product = TextFromNumber(session.productNumber);
     const auto used = client.GetTotalUsedQuota(product, session.userName);
@@ -368,9 +365,8 @@ void FileControl::TellState(ConnectionState state) {
   if (tellsTransfers_) events_.StateChanged(state);
 }
 
-std::shared_ptr<CUpload> FileControl::RecordUploaded(const Text& path, const Text& url) {
+FileRecord FileControl::RecordUploaded(const Text& path, const Text& url) {
   FileSystem& files = apartment_.platform.files;
-  FileList& all = apartment_.allFiles;
   auto record = std::make_shared<CUpload>();
   record->FileName = FileNameFromPath(path);
   record->FilePath = url;
@@ -378,16 +374,15 @@ std::shared_ptr<CUpload> FileControl::RecordUploaded(const Text& path, const Tex
   record->FileDate = GetLocalFileDate(files, path);
   copies_.FinishUpload(path, url);
   // An upload that replaced a file takes over its record.
-  std::size_t position = PositionOf(record->FileName);
-  if (position == 0) position = all.PositionOf(url);
-  if (position == 0) {
-    all.Add(record, url);
-    return record;
+  FileRecord known = RecordNamed(record->FileName);
+  if (const std::size_t position = listing_.all.PositionOf(url); !known && position != 0)
+    known = listing_.all.At(position);
+  if (known) {
+    listing_.Change(known, [&](CUpload& values) { values = *record; });
+    return known;
   }
-  std::shared_ptr<CUpload> known = all.At(position);
-  *known = *record;
-  SetAddress(all, position, url);
-  return known;
+  listing_.all.Add(record);
+  return record;
 }
 
 // --- Delete ---
@@ -435,7 +430,7 @@ bool FileControl::Rename(const Text& oldName, const Text& newName) {
       Fail(ftp_error::kAborted, u"The operation failed unexpectedly.");
     return false;
   }
-  apartment_.listingIsCurrent = false;
+  listing_.isCurrent = false;
   ResultAsItStood(0, [&](int&) {
     const auto [record, oldUrl] = RecordRenamed(oldName, newName);
     ShowRenamed(record, oldUrl, oldName, newName);
@@ -463,35 +458,15 @@ bool FileControl::RenameOnServer(const Text& oldName, const Text& newName) {
   return false;
 }
 
-std::pair<std::shared_ptr<CUpload>, Text> FileControl::RecordRenamed(const Text& oldName,
-                                                                     const Text& newName) {
-  FileList& all = apartment_.allFiles;
-  for (std::size_t i = 1; i <= all.Count(); ++i) {
-    std::shared_ptr<CUpload> record = all.At(i);
-    if (record->FileName != oldName) continue;
-    const Text oldUrl = record->FilePath;
-    FileList& shown = apartment_.shownFiles;
-    const std::size_t shownAt = shown.PositionOf(oldUrl);
-    GiveName(*record, newName);
-    SetAddress(all, i, record->FilePath);
-    if (shownAt != 0 && shown.At(shownAt) == record) SetAddress(shown, shownAt, record->FilePath);
-    copies_.Move(oldUrl, record->FilePath);
-    return {record, oldUrl};
-  }
-  return {};
-}
-
-void FileControl::GiveName(CUpload& record, const Text& newName) {
-  const std::size_t folder = record.FilePath.size() - FileNameFromUrl(record.FilePath).size();
-  record.FilePath = record.FilePath.substr(0, folder) + newName;
-  record.FileName = newName;
-}
-
-void FileControl::SetAddress(FileList& list, std::size_t position, const Text& url) {
-  std::shared_ptr<CUpload> record = list.Take(position);
-  record->FilePath = url;
-  const bool taken = list.PositionOf(url) != 0;
-  list.Insert(position, std::move(record), taken ? TextView() : TextView(url));
+std::pair<FileRecord, Text> FileControl::RecordRenamed(const Text& oldName, const Text& newName) {
+  const std::size_t position =
+      listing_.all.PositionWhere([&](const CUpload& file) { return file.FileName == oldName; });
+  if (position == 0) return {};
+  const FileRecord record = listing_.all.At(position);
+  const Text oldUrl = record->FilePath;
+  listing_.GiveName(record, newName);
+  copies_.Move(oldUrl, record->FilePath);
+  return {record, oldUrl};
 }
 
 bool FileControl::IsFileNameValid(TextView szFileName) {
@@ -516,13 +491,13 @@ bool FileControl::CheckFileExtension(Text& szNewString, TextView szOriExt) {
 }
 
 bool FileControl::CheckIfFileDoesNotExist(TextView szFileName) const {
-  return !ShowsFile(szFileName) && PositionOf(szFileName) == 0;
+  return !ShowsFile(szFileName) && !RecordNamed(szFileName);
 }
 
-std::size_t FileControl::PositionOf(TextView name) const {
-  for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i)
-    if (EqualsIgnoringCase(Trim(apartment_.allFiles.At(i)->FileName), Trim(name))) return i;
-  return 0;
+FileRecord FileControl::RecordNamed(TextView name) const {
+  const std::size_t position = listing_.all.PositionWhere(
+      [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), Trim(name)); });
+  return position == 0 ? nullptr : listing_.all.At(position);
 }
 
 bool FileControl::EnableRename(bool bEnableRename) {
@@ -532,21 +507,11 @@ bool FileControl::EnableRename(bool bEnableRename) {
 
 // --- Download ---
 
-Text FileControl::AddressToFetch(const Text& key) const {
-  const FileList& all = apartment_.allFiles;
-  // Of a file that the service listed without an address; every address contains an empty text.
-  if (key.empty()) return {};
-  if (all.Find(key)) return key;
-  for (std::size_t i = 1; i <= all.Count(); ++i)
-    if (all.At(i)->FilePath.find(key) != Text::npos) return all.At(i)->FilePath;
-  return {};
-}
-
 Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
   return ResultAsItStood(Text(), [&](Text& local) {
     const Operation operation(*this);
     if (!MayTransfer() || !Client() || !CFileUpload::CanDownLoadFile()) return;
-    const std::shared_ptr<CUpload> selected = SelectedRecord();
+    const FileRecord selected = SelectedRecord();
     if (!selected) return Fail(ftp_error::kUnavailable, u"No file is selected.");
     const Text name = selected->FileName;
     Text target(szLocalFilePath);
@@ -557,7 +522,7 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
     if (inFolder) target += u"\\" + name;
     local = target;
 
-    const Text url = AddressToFetch(selected->FilePath);
+    const Text url = listing_.AddressLike(selected->FilePath);
     if (url.empty()) return Fail(ftp_error::kUnavailable, u"The file is not in the listing any more.");
     // The name comes from the server; it must not lead out of the folder.
     if (inFolder && !IsSafeFileName(name)) {
@@ -650,7 +615,7 @@ void FileControl::Failed(std::int32_t ftpError, TextView description, bool told)
 
 FileControl::DragContent FileControl::ContentOfDrag() const {
   return ResultAsItStood(DragContent(), [&](DragContent& content) {
-    const std::shared_ptr<CUpload> selected = SelectedRecord();
+    const FileRecord selected = SelectedRecord();
     if (!selected) return;
     content.address = selected->FilePath;
     if (copies_.Has(*selected)) content.localFile = copies_.PathOf(content.address);

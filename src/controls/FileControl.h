@@ -163,13 +163,13 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // --- What each control does in its own way ---
 
   // Record of the (first) selected file; null when there is none.
-  virtual std::shared_ptr<CUpload> SelectedRecord() const = 0;
+  virtual FileRecord SelectedRecord() const = 0;
   virtual bool ShowsFile(TextView name) const = 0;
   // The record is new in the list of all files, or, when an upload replaced a file, has new values.
-  virtual void ShowUploaded(const std::shared_ptr<CUpload>& record) = 0;
+  virtual void ShowUploaded(const FileRecord& record) = 0;
   // The file has another name now, also in the list of all files, where `record` is it and `oldUrl` was its
   // address (null and empty when it is not there).
-  virtual void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl, const Text& oldName,
+  virtual void ShowRenamed(const FileRecord& record, const Text& oldUrl, const Text& oldName,
                            const Text& newName) = 0;
   // A drop without files, or of the control's own drag (`own`).
   virtual void DroppedNoFiles(bool own) = 0;
@@ -219,7 +219,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // tell them all or there is no client.
   bool ListAccount();
   // What is shown from here on is the account of now.
-  void ShowsAccount() { shownAccount_ = apartment_.session.Account(); }
+  void NoteAccount() { shownAccount_ = apartment_.session.Account(); }
   // Whether another user has been logged on since: what is shown must not be changed in his account.
   bool ShowsOtherAccount() const { return apartment_.session.Account() != shownAccount_; }
   // Fetches `url` into the user's folder, and to `explicitTarget` first unless that is empty. Waits, pumping,
@@ -234,15 +234,11 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Renames a file on the server and wherever it is known here, without an event.
   bool Rename(const Text& oldName, const Text& newName);
   bool RenameRuns() const { return renameInProgress_; }
-  // Position of the record of that name in the list of all files, in any letter case; 0 when there is none.
-  std::size_t PositionOf(TextView name) const;
-  // Gives a record another name, and its address that name at the end.
-  static void GiveName(CUpload& record, const Text& newName);
-  // Gives the record at `position` of a list another address, which is its key as well. Another record that
-  // has the key already keeps it.
-  static void SetAddress(FileList& list, std::size_t position, const Text& url);
+  // The record of that name in the list of all files, in any letter case; null when there is none.
+  FileRecord RecordNamed(TextView name) const;
 
   Apartment& apartment_;
+  Listing& listing_;
   ControlEvents& events_;
   LocalCopies copies_;
 
@@ -279,12 +275,10 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool IsNameFree(TextView name, TextView own) const;
   // Whether the account has no room for the file. Asks the service.
   bool IsTooLarge(CFileUpload& client, const Text& path) const;
-  std::shared_ptr<CUpload> RecordUploaded(const Text& path, const Text& url);
+  FileRecord RecordUploaded(const Text& path, const Text& url);
   bool RenameOnServer(const Text& oldName, const Text& newName);
   // The record and the address that it had.
-  std::pair<std::shared_ptr<CUpload>, Text> RecordRenamed(const Text& oldName, const Text& newName);
-  // Address of the record to fetch for the selected one; empty when it is not listed any more.
-  Text AddressToFetch(const Text& key) const;
+  std::pair<FileRecord, Text> RecordRenamed(const Text& oldName, const Text& newName);
 
   ControlView& controlView_;
   Uploader& uploader_;

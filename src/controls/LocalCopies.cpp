@@ -23,12 +23,12 @@ bool LocalCopies::Has(const CUpload& file) const {
     if (copy.empty() || !FileExists(files, copy)) return;
     // A size of 2 GiB and more is negative after an upload.
     has = file.FileSize < 0 || static_cast<double>(files.Length(copy)) == file.FileSize ||
-          apartment_.copiesAskedAgain.contains(file.FilePath);
+          apartment_.listing.copiesAskedAgain.contains(file.FilePath);
   });
 }
 
 void LocalCopies::AskedAgain(const CUpload& file) {
-  ResultAsItStood(0, [&](int&) { apartment_.copiesAskedAgain.insert(file.FilePath); });
+  ResultAsItStood(0, [&](int&) { apartment_.listing.copiesAskedAgain.insert(file.FilePath); });
 }
 
 void LocalCopies::RemoveUnless(const Text& copy, double length) {

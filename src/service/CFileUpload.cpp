@@ -116,7 +116,7 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
     if (LowerCase(status) != u"true") return;
     session.loggedOn = true;
     // What was listed may be another user's.
-    apartment_.ForgetListing();
+    apartment_.listing.Forget();
     // The folder is the previous user's until a control prepares this one's.
     if (user != previousUser) apartment_.UserFolderPath.clear();
     SetFtpLogon(apartment_.ftp, session);

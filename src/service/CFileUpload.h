@@ -32,7 +32,7 @@ inline constexpr std::int32_t kRenameRefused = 1033;
 class CFileUpload {
  public:
   // Take what an operation adds to a collection; they may throw to refuse it, which ends the operation.
-  using FileSink = std::function<void(const std::shared_ptr<CUpload>& file, TextView key)>;
+  using FileSink = std::function<void(const std::shared_ptr<CUpload>& file)>;
   using AccountSink = std::function<void(const std::shared_ptr<CBVAccount>& account)>;
 
   // `apartment` outlives the object. The first object of an apartment loads the host product's strings.
@@ -77,13 +77,13 @@ class CFileUpload {
 
   // --- Files ---
 
-  // Hands a record per file of the account to `colFiles`, with the file's address as its key, in the server's
-  // order. When ListIsCurrent, returns true at once without a request and hands over nothing. An error
-  // half-way leaves what was handed over and returns false.
+  // Hands a record per file of the account to `colFiles`, in the server's order. When ListIsCurrent, returns
+  // true at once without a request and hands over nothing. An error half-way leaves what was handed over and
+  // returns false.
   bool ListFilesForUser(const FileSink& colFiles);
 
   // Whether ListFilesForUser has nothing to ask: the all-files list is current and not empty. No request.
-  bool ListIsCurrent() const { return apartment_.listingIsCurrent && !apartment_.allFiles.IsEmpty(); }
+  bool ListIsCurrent() const { return apartment_.listing.isCurrent && !apartment_.listing.all.IsEmpty(); }
 
   // Does nothing and returns false; the controls have an operation of this name.
   static bool GetFileDetails() { return false; }
@@ -118,7 +118,7 @@ class CFileUpload {
   bool FileExists(TextView szNewFileName) const;
 
   // Whether the all-files list is empty. No request.
-  bool IsAccountEmpty() const { return apartment_.allFiles.IsEmpty(); }
+  bool IsAccountEmpty() const { return apartment_.listing.all.IsEmpty(); }
 
   // Fetches a file over the FTP connection and returns `szLocalFileName`, or an empty text.
   Text DownloadFile(TextView szServerFileName, TextView szLocalFileName);

@@ -62,7 +62,7 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
       file->FilePath = ElementAt(*urls, i);
       file->FileSize = LeadingNumber(ElementAt(*sizes, i));
       file->FileDate = ElementAt(*dates, i);
-      colFiles(file, file->FilePath);
+      colFiles(file);
     }
     listed = true;
   });
@@ -153,9 +153,8 @@ std::int32_t CFileUpload::CanUploadFile() {
 }
 
 bool CFileUpload::FileExists(TextView szNewFileName) const {
-  for (std::size_t i = 1; i <= apartment_.allFiles.Count(); ++i)
-    if (apartment_.allFiles.At(i)->FileName == szNewFileName) return true;
-  return false;
+  return apartment_.listing.all.PositionWhere(
+             [&](const CUpload& file) { return file.FileName == szNewFileName; }) != 0;
 }
 
 void CFileUpload::AbortFileTransfer(bool bAbortStatus) {

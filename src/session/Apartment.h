@@ -5,12 +5,10 @@
 #include <cstdint>
 #include <map>
 #include <memory>
-#include <set>
 
-#include "base/KeyedList.h"
 #include "base/Text.h"
 #include "platform/Platform.h"
-#include "session/CUpload.h"
+#include "session/Listing.h"
 #include "session/SessionValues.h"
 #include "support/ScrollHookState.h"
 
@@ -19,8 +17,6 @@ namespace tarnwick {
 class FtpConnection;
 class InternetSession;
 class ResourceLibrary;
-
-using FileList = KeyedList<std::shared_ptr<CUpload>>;
 
 // How an FTP proxy learns the server behind it.
 enum class ProxyStyle { kUserAtHostColonPort, kUserAtHostBlankPort };
@@ -66,19 +62,7 @@ struct Apartment {
   // Working folder of the user without a trailing separator; empty until it is prepared.
   Text UserFolderPath;
 
-  // The server's listing, and the part of it that the thumbnails' filter shows.
-  FileList allFiles;
-  FileList shownFiles;
-  Text shownFilter = u"*";
-  bool listingIsCurrent = false;
-  bool listLoaded = false;
-  // Empties the list of all files. Nobody may take what comes into it afterwards, such as one uploaded file,
-  // for the whole account, so both flags go in the same step.
-  void ForgetListing() {
-    allFiles.Clear();
-    listingIsCurrent = listLoaded = false;
-    copiesAskedAgain.clear();
-  }
+  Listing listing;
 
   // How often a local copy was made, moved or removed for an upload, a rename or a delete, by its path in
   // lower case. Bytes that were asked for before such a change are not the file's any more.
@@ -88,8 +72,6 @@ struct Apartment {
     return changes == copyChanges.end() ? 0 : changes->second;
   }
   void CopyChanged(TextView path) { ++copyChanges[LowerCase(path)]; }
-  // Addresses of the files whose copies were fetched again since the listing, because of their length.
-  std::set<Text> copiesAskedAgain;
 
   bool abortTransfer = false;
   // How often transfers were told to stop. One that sees another number than at its beginning ends.

@@ -11,7 +11,7 @@ namespace {
 bool RemoveFirst(FileList& list, MessagePump& pump, TextView name, bool yieldPerItem) {
   const std::size_t count = list.Count();
   for (std::size_t i = 1; i <= std::min(count, list.Count()); ++i) {
-    const std::shared_ptr<CUpload> record = list.At(i);
+    const FileRecord record = list.At(i);
     if (yieldPerItem) pump.Yield();
     if (Trim(record->FileName) != name) continue;
     pump.Yield();
@@ -31,8 +31,8 @@ bool RemoveFirst(FileList& list, MessagePump& pump, TextView name, bool yieldPer
 void RemoveFromTransferLists(Apartment& apartment, TextView name) {
   const Text wanted(Trim(FileNameFromUrl(name)));
   MessagePump& pump = apartment.platform.pump;
-  if (RemoveFirst(apartment.allFiles, pump, wanted, true))
-    RemoveFirst(apartment.shownFiles, pump, wanted, false);
+  if (RemoveFirst(apartment.listing.all, pump, wanted, true))
+    RemoveFirst(apartment.listing.shown, pump, wanted, false);
 }
 
 }  // namespace tarnwick

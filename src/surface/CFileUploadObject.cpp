@@ -102,9 +102,9 @@ STDMETHODIMP CFileUploadObject::ListFilesForUser(IDispatch** colFiles, VARIANT_B
     if (client_->ListIsCurrent()) return true;
     if (!colFiles) return false;
     const HostCollection collection(colFiles);
-    return client_->ListFilesForUser([&](const std::shared_ptr<CUpload>& file, TextView key) {
+    return client_->ListFilesForUser([&](const std::shared_ptr<CUpload>& file) {
       const auto object = ComPtr<CUploadObject>::Adopt(new CUploadObject(file));
-      collection.Add(object.Get(), key);
+      collection.Add(object.Get(), file->FilePath);
     });
   });
 }

@@ -78,30 +78,28 @@ TEST_F(CFileUploadTest, EveryFalseLogonRestoresTheUser) {
 
 TEST_F(CFileUploadTest, LogonRenewsTheListing) {
   ASSERT_TRUE(Logon(u"first"));
-  const auto sink = [&](const std::shared_ptr<CUpload>& file, TextView key) {
-    fake.apartment.allFiles.Add(file, key);
-  };
+  const auto sink = [&](const std::shared_ptr<CUpload>& file) { fake.apartment.listing.all.Add(file); };
   // A second file of the address ends the listing; the first stays.
   Answer("FileName=a&FileName=b&FileURL=u&FileURL=u&FileSize=1&FileSize=2&FileDate=d&FileDate=d");
   EXPECT_FALSE(client.ListFilesForUser(sink));
-  EXPECT_EQ(fake.apartment.allFiles.Count(), 1U);
+  EXPECT_EQ(fake.apartment.listing.all.Count(), 1U);
   EXPECT_TRUE(client.FileExists(u"a"));
   EXPECT_FALSE(client.FileExists(u"A"));
 
-  fake.apartment.listingIsCurrent = fake.apartment.listLoaded = true;
+  fake.apartment.listing.isCurrent = fake.apartment.listing.isLoaded = true;
   EXPECT_TRUE(client.ListFilesForUser(sink));
   EXPECT_EQ(Requests(), "ValidationRequest ListFilesRequest");
 
   Answer("UserAuthenticationStatus=FALSE");
   EXPECT_FALSE(client.LogonAs(u"9", u"second", u"other", u"{N}"));
-  EXPECT_TRUE(client.ListIsCurrent() && fake.apartment.listLoaded)
+  EXPECT_TRUE(client.ListIsCurrent() && fake.apartment.listing.isLoaded)
       << "what is shown is still the first user's";
   ASSERT_TRUE(Logon(u"second"));
   EXPECT_TRUE(client.IsAccountEmpty());
-  EXPECT_FALSE(fake.apartment.listingIsCurrent);
-  EXPECT_FALSE(fake.apartment.listLoaded);
+  EXPECT_FALSE(fake.apartment.listing.isCurrent);
+  EXPECT_FALSE(fake.apartment.listing.isLoaded);
   // Current but empty: the service is asked.
-  fake.apartment.listingIsCurrent = true;
+  fake.apartment.listing.isCurrent = true;
   EXPECT_FALSE(client.ListFilesForUser(sink));
 }
 
@@ -109,9 +107,9 @@ TEST_F(CFileUploadTest, CollectionsMayCallTheClient) {
   // A collection is code of the host, which may ask the service for more while it takes a file.
   Answer("FileName=a&FileName=b&FileURL=u1&FileURL=u2&FileSize=1&FileSize=2&FileDate=d1&FileDate=d2");
   Text names;
-  EXPECT_TRUE(client.ListFilesForUser([&](const std::shared_ptr<CUpload>& file, TextView key) {
+  EXPECT_TRUE(client.ListFilesForUser([&](const std::shared_ptr<CUpload>& file) {
     EXPECT_EQ(client.CanUploadFile(), 1004);
-    names += file->FileName + file->FileDate + Text(key);
+    names += file->FileName + file->FileDate + file->FilePath;
   }));
   EXPECT_EQ(names, u"ad1u1bd2u2");
 }

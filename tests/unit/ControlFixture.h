@@ -58,7 +58,7 @@ class ControlTest : public testing::Test {
   static std::string AddressOf(const std::string& name) { return "http://h/u/" + name; }
   std::string Records() const {
     std::string names;
-    const FileList& all = fake.apartment.allFiles;
+    const FileList& all = fake.apartment.listing.all;
     for (std::size_t i = 1; i <= all.Count(); ++i) names += Utf8FromText(all.At(i)->FileName) + ",";
     return names;
   }

@@ -40,7 +40,7 @@ TEST_F(ListImageUpload, Transcript) {
   EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
   EXPECT_FALSE(control.m_bTransferInProgress);
   ASSERT_EQ(Records(), "new.jpg,");
-  const CUpload& record = *fake.apartment.allFiles.At(1);
+  const CUpload& record = *fake.apartment.listing.all.At(1);
   EXPECT_EQ(record.FilePath, u"http://h/u/new.jpg");
   EXPECT_EQ(record.FileDate, u"1/2/2026 3:04:05 AM");
   // The next filling spells the size as it spells the others.
@@ -263,8 +263,8 @@ TEST_F(ListImageUpload, ReplacesAFile) {
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
   EXPECT_EQ(Names() + Records(), "old.jpg,new.jpg,z.jpg,old.jpg,new.jpg,z.jpg,");
   EXPECT_EQ(control.ItemText(1, 1) + control.ItemText(1, 2), u"http://h/u/new.jpg1536Bytes (2KB)");
-  EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/new.jpg"), 2U);
-  EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/NEW.jpg"), 0U);
+  EXPECT_EQ(fake.apartment.listing.all.PositionOf(u"http://h/u/new.jpg"), 2U);
+  EXPECT_EQ(fake.apartment.listing.all.PositionOf(u"http://h/u/NEW.jpg"), 0U);
   EXPECT_TRUE(std::ranges::count(log, "view refresh 1") == 1 && std::ranges::count(log, "view append") == 0);
   // Once more, under the address that it has by now; then a service that gives it another file's address.
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
@@ -422,7 +422,7 @@ TEST_F(ListImageTest, DeleteTranscript) {
              "1015 " + AddressOf("a.jpg"),
              "view pointer"});
   EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"a.jpg"});
-  EXPECT_TRUE(fake.apartment.listingIsCurrent);
+  EXPECT_TRUE(fake.apartment.listing.isCurrent);
 }
 
 TEST_F(ListImageTest, DeletesOneOfTen) {
@@ -475,7 +475,7 @@ TEST_F(ListImageTest, DeleteOutcomes) {
   EXPECT_EQ(Names(), "");
   EXPECT_TRUE(view.listShown);
   EXPECT_EQ(control.m_strLastErrorDesc, u"The files were deleted, but the rest could not be listed.");
-  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_FALSE(fake.apartment.listing.isCurrent);
   EXPECT_EQ(log.back(), "view pointer");
   listingFails = false;
   List({{"a.jpg", "1"}});
@@ -536,7 +536,7 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
   for (const auto& test : kCases) {
     SCOPED_TRACE(test.name);
     log.clear();
-    fake.apartment.listingIsCurrent = false;
+    fake.apartment.listing.isCurrent = false;
     account = {{"a.jpg", "1"}, {"b.jpg", "1"}, {"c.jpg", "1"}};
     ctrlListImage deleting{parts, view};
     ASSERT_TRUE(deleting.Init(u"*"));
@@ -573,14 +573,14 @@ TEST_F(ListImageTest, RenameTranscript) {
   ExpectLog({"view hourglass", "page rename|http://h:81/users/|b.jpg|c d.jpg" + kRenameTail,
              "ask RenameFileRequest Username=u@x&ProductID=7&OldFileName=b.jpg&NewFileName=c%20d.jpg",
              "view refresh 1", "1031 c d.jpg", "view pointer"});
-  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_FALSE(fake.apartment.listing.isCurrent);
   EXPECT_FALSE(fake.files.files.contains(old));
   for (const TextView name : {u"\\B.jpg", u"\\C d.jpg"})
     EXPECT_EQ(fake.apartment.ChangesOfCopy(fake.apartment.UserFolderPath + Text(name)), 1U);
   EXPECT_EQ(Names() + Records(), "a.jpg,c d.jpg,a.jpg,c d.jpg,");
   EXPECT_EQ(control.GetSelectedFilesHttpPath(), u"http://h/u/c d.jpg");
-  EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/c d.jpg"), 2U);
-  EXPECT_EQ(fake.apartment.allFiles.PositionOf(u"http://h/u/b.jpg"), 0U);
+  EXPECT_EQ(fake.apartment.listing.all.PositionOf(u"http://h/u/c d.jpg"), 2U);
+  EXPECT_EQ(fake.apartment.listing.all.PositionOf(u"http://h/u/b.jpg"), 0U);
 
   // The file system takes both names for one file, which stays.
   const Text copy = fake.apartment.UserFolderPath + u"\\a.jpg";
@@ -603,7 +603,7 @@ TEST_F(ListImageTest, RenameOutcomes) {
     replies["RenameFileRequest"] = answer;
     EXPECT_EQ(rename(), 5U) << answer;
   }
-  EXPECT_TRUE(fake.apartment.listingIsCurrent);
+  EXPECT_TRUE(fake.apartment.listing.isCurrent);
   // The service hears nothing of what the page refused, and without a client nobody does.
   uploader.error = 380;
   EXPECT_EQ(rename(), 4U);
@@ -618,7 +618,7 @@ TEST_F(ListImageTest, RenamesWhatIsOnlyHalfKnown) {
   EXPECT_EQ(Names() + Records(), "a.jpg,b.jpg,a.jpg,b.jpg,");
   EXPECT_TRUE(control.RenameFile(u"a.jpg", u"b.jpg"));
   EXPECT_EQ(Names() + Records(), "b.jpg,b.jpg,b.jpg,b.jpg,");
-  fake.apartment.allFiles.Clear();
+  fake.apartment.listing.all.Clear();
   EXPECT_TRUE(control.RenameFile(u"b.jpg", u"c.jpg"));
   EXPECT_EQ(Names(), "c.jpg,b.jpg,");
   EXPECT_EQ(control.ItemText(0, 1), u"http://h/u/c.jpg");
@@ -652,10 +652,10 @@ class ListImageDownload : public ListImageTest {
 
 TEST_F(ListImageDownload, ARenameIsKnownToTheThumbnails) {
   List({{"a.jpg", "1"}});
-  const auto record = fake.apartment.allFiles.At(1);
-  fake.apartment.shownFiles.Add(record, record->FilePath);
+  const auto record = fake.apartment.listing.all.At(1);
+  fake.apartment.listing.shown.Add(record);
   EXPECT_TRUE(control.RenameFile(u"a.jpg", u"b.jpg"));
-  EXPECT_EQ(fake.apartment.shownFiles.PositionOf(u"http://h/u/b.jpg"), 1U);
+  EXPECT_EQ(fake.apartment.listing.shown.PositionOf(u"http://h/u/b.jpg"), 1U);
 }
 
 TEST_F(ListImageDownload, Transcript) {
@@ -710,7 +710,7 @@ TEST_F(ListImageDownload, FindsTargetAndAddress) {
     control.DownLoadFileFromServer(u"C:\\To");
     EXPECT_EQ(log.front(), "download http://h/u/" + std::string(address) + " to C:\\To\\a.jpg");
     log.clear();
-    fake.apartment.allFiles.Remove(fake.apartment.allFiles.Count());
+    fake.apartment.listing.all.Remove(fake.apartment.listing.all.Count());
   }
   // Nothing can be attempted: the older file stays, and the reason is told.
   fake.files.files[u"C:\\To\\a.jpg"] = {3, 0, "old"};

@@ -11,7 +11,7 @@ class ListImageTest : public ControlTest {
  protected:
   void List(std::vector<File> files, TextView filter = u"*") {
     account = std::move(files);
-    fake.apartment.listingIsCurrent = false;
+    fake.apartment.listing.isCurrent = false;
     ASSERT_TRUE(control.Init(filter));
     log.clear();
   }

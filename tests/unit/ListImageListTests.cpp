@@ -18,13 +18,13 @@ TEST_F(ListImageTest, ListsTheAccount) {
   EXPECT_EQ(control.ItemText(0, 2), u"1536 Bytes (2 KB)");
   EXPECT_EQ(control.ItemText(0, 3) + control.ItemText(2, 0), u"");
   EXPECT_EQ(fake.apartment.UserFolderPath, u"C:\\Temp\\bv\\u@x");
-  EXPECT_TRUE(fake.apartment.listingIsCurrent);
+  EXPECT_TRUE(fake.apartment.listing.isCurrent);
 
   // While the listing is current nothing is asked.
   account.clear();
   EXPECT_TRUE(control.Init(u"*"));
   ExpectLog({"view list", "view columns", "view items 2"});
-  fake.apartment.listingIsCurrent = false;
+  fake.apartment.listing.isCurrent = false;
   EXPECT_TRUE(control.Init(u"*"));
   ExpectLog({"ask ListFilesRequest Username=u@x&ProductID=7", "view label", "view columns", "view items 0"});
 }
@@ -39,10 +39,10 @@ TEST_F(ListImageTest, FailingInitLeavesTheList) {
     }
     return std::int32_t{0};
   };
-  fake.apartment.listingIsCurrent = false;
+  fake.apartment.listing.isCurrent = false;
   listingFails = true;
   EXPECT_EQ(failure(), init_error::kListingFailed);
-  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_FALSE(fake.apartment.listing.isCurrent);
   control.mobjFileupload.reset();
   EXPECT_EQ(failure(), init_error::kNoClient);
   EXPECT_EQ(Names(), "a.jpg,");
@@ -162,7 +162,7 @@ TEST_F(ListImageTest, ChecksNames) {
   EXPECT_FALSE(EqualsIgnoringCase(u"\u0130", u"\u0131"));
   for (const TextView free : {u"", u"a", u"a.jpgx"}) EXPECT_TRUE(control.CheckIfFileDoesNotExist(free));
   // The list counts too.
-  fake.apartment.allFiles.Clear();
+  fake.apartment.listing.all.Clear();
   EXPECT_FALSE(control.CheckIfFileDoesNotExist(u"A.jpg"));
   EXPECT_TRUE(control.CheckIfFileDoesNotExist(u" a.jpg"));
 }
@@ -217,9 +217,10 @@ TEST_F(ListImageTest, ReselectsAfterRename) {
   control.ChangeFileFilter(u"jpg");
   EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"New.jpg"});
   // Another listing spells it in another way.
-  const auto again = std::make_shared<CUpload>(*fake.apartment.allFiles.Take(2));
+  const auto again = std::make_shared<CUpload>(*fake.apartment.listing.all.At(2));
+  fake.apartment.listing.all.Remove(2);
   again->FileName = u"NEW.jpg";
-  fake.apartment.allFiles.Insert(2, again);
+  fake.apartment.listing.all.Insert(2, again);
   control.ChangeFileFilter(u"jpg");
   EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"NEW.jpg"});
   // What is not shown cannot be selected again; the first one stands in.
@@ -356,7 +357,7 @@ TEST_F(ListImageTest, EndMakesTheNextControlList) {
     EXPECT_TRUE(second.Init(u"*"));
     log.clear();
   }
-  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_FALSE(fake.apartment.listing.isCurrent);
 }
 
 }  // namespace

@@ -85,8 +85,8 @@ class TransferListsTest : public testing::Test {
   }
 
   FakePlatform fake;
-  FileList& all = fake.apartment.allFiles;
-  FileList& shown = fake.apartment.shownFiles;
+  FileList& all = fake.apartment.listing.all;
+  FileList& shown = fake.apartment.listing.shown;
 };
 
 TEST_F(TransferListsTest, RemovesTheFirstOfEach) {

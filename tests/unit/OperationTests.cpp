@@ -55,9 +55,9 @@ void PrintTo(const Operation& operation, std::ostream* out) {
 
 std::string ListFiles(CFileUpload& client) {
   std::string files;
-  const bool listed = client.ListFilesForUser([&](const std::shared_ptr<CUpload>& file, TextView key) {
+  const bool listed = client.ListFilesForUser([&](const std::shared_ptr<CUpload>& file) {
     files += Show(file->FileName) + "|" + Show(file->FilePath) + "|" + Show(file->FileSize) + "|" +
-             Show(file->FileDate) + "|" + Show(key) + "\n";
+             Show(file->FileDate) + "|" + Show(file->FilePath) + "\n";
   });
   return files + Show(listed);
 }

@@ -34,7 +34,7 @@ class ThumbNailTest : public ControlTest {
       account.push_back({Utf8FromText(name), std::to_string(kGif.size())});
       fake.files.files[CopyOf(account.back().name)] = {kGif.size(), 0, kGif};
     }
-    fake.apartment.listLoaded = false;
+    fake.apartment.listing.isLoaded = false;
     EXPECT_TRUE(control.Init(filter));
     log.clear();
   }
@@ -52,7 +52,7 @@ class ThumbNailTest : public ControlTest {
   }
   std::string Shown() const {
     std::string names;
-    const FileList& shown = fake.apartment.shownFiles;
+    const FileList& shown = fake.apartment.listing.shown;
     for (std::size_t i = 1; i <= shown.Count(); ++i) names += Utf8FromText(shown.At(i)->FileName) + ",";
     return names;
   }
@@ -126,7 +126,7 @@ TEST_F(ThumbNailTest, PagingMovesTheSelection) {
   EXPECT_EQ(page.Look(), "6.gif* 7.gif 8.gif 9.gif ");
   // The handler of the thumb asks how many files there are in all.
   control.ChangeFileFilter(u"jpg");
-  fake.apartment.shownFiles.Clear();
+  fake.apartment.listing.shown.Clear();
   control.OnScrollDragged(8);
   EXPECT_EQ(page.Look(), "");
   EXPECT_EQ(control.iImgNo, 0);
@@ -175,9 +175,9 @@ TEST_F(ThumbNailTest, FiltersByTheEndOfTheName) {
 
 TEST_F(ThumbNailTest, ListsAgainAfterAFailure) {
   listingFails = true;
-  fake.apartment.listingIsCurrent = true;
+  fake.apartment.listing.isCurrent = true;
   EXPECT_FALSE(control.Init(u"*"));
-  EXPECT_FALSE(fake.apartment.listingIsCurrent);
+  EXPECT_FALSE(fake.apartment.listing.isCurrent);
   EXPECT_EQ(control.m_LastError, ftp_error::kNotTaken);
   EXPECT_EQ(page.Look(), "") << "which does not say that the account is empty";
   listingFails = false;
@@ -189,19 +189,19 @@ TEST_F(ThumbNailTest, ListsAgainAfterAFailure) {
   EXPECT_EQ(Shown(), "a.gif,");
   EXPECT_EQ(Selected(), AddressOf("a.gif"));
   control.mobjFileupload = nullptr;
-  fake.apartment.listLoaded = false;
+  fake.apartment.listing.isLoaded = false;
   EXPECT_FALSE(control.Init(u"*"));
 }
 
 TEST_F(ThumbNailTest, EndEmptiesTheListsOfAll) {
   ListNumbers(2);
-  fake.apartment.listingIsCurrent = true;
+  fake.apartment.listing.isCurrent = true;
   {
     FakeThumbnailPage other(log);
     ctrlThumbNailView second(parts, other);
   }
   EXPECT_EQ(Records() + Shown(), "");
-  EXPECT_FALSE(fake.apartment.listLoaded || fake.apartment.listingIsCurrent);
+  EXPECT_FALSE(fake.apartment.listing.isLoaded || fake.apartment.listing.isCurrent);
 }
 
 // --- Places and captions ---
@@ -332,7 +332,7 @@ TEST_F(ThumbNailTest, FetchesACopyOfAnotherLengthOnceInAListing) {
   }
   // A size that is too large to be told.
   List("a.gif b.gif");
-  fake.apartment.allFiles.At(1)->FileSize = -1;
+  fake.apartment.listing.Change(fake.apartment.listing.all.At(1), [](CUpload& file) { file.FileSize = -1; });
   EXPECT_FALSE(isAsked());
 }
 
@@ -397,7 +397,7 @@ TEST_F(ThumbNailTest, FillsThePageAfterATransferOfTheHosts) {
   fake.files.files.erase(CopyOf("1.gif"));
   downloader.waits = {[this](FakeDownloader& from) {
     Scroll(0);
-    fake.apartment.ForgetListing();
+    fake.apartment.listing.Forget();
     fake.apartment.session.userName = u"other";
     Arrives(from);
   }};
@@ -453,7 +453,7 @@ TEST_F(ThumbNailTest, AStopEndsTheFetchingOfThePage) {
 
 TEST_F(ThumbNailTest, AListingThatIsForgottenEmptiesNoPage) {
   ListNumbers(8);
-  fake.apartment.ForgetListing();  // the list control could not list again
+  fake.apartment.listing.Forget();  // the list control could not list again
   Scroll(4);
   EXPECT_EQ(page.Look(), "5.gif* 6.gif 7.gif 8.gif ");
 }
@@ -486,7 +486,7 @@ TEST_F(ThumbNailTest, SelectionIsOfTheListAndOfThePage) {
   ListNumbers(4);
   control.OnSlotPressed(2, false);
   account.erase(account.begin() + 1);
-  fake.apartment.listLoaded = false;
+  fake.apartment.listing.isLoaded = false;
   EXPECT_TRUE(control.Init(u"*"));
   EXPECT_EQ(Selected(), AddressOf("1.gif"));
   EXPECT_EQ(page.Look(), "1.gif* 3.gif 4.gif ");
@@ -496,8 +496,9 @@ TEST_F(ThumbNailTest, SelectionIsOfTheListAndOfThePage) {
   EXPECT_EQ(page.Look(), "1.gif 3.gif* x.gif ");
   EXPECT_EQ(Selected(), AddressOf("3.gif"));
   // A rename of what another listing has by now.
-  const auto again = std::make_shared<CUpload>(*fake.apartment.allFiles.Take(2));
-  fake.apartment.allFiles.Insert(2, again, again->FilePath);
+  const auto again = std::make_shared<CUpload>(*fake.apartment.listing.all.At(2));
+  fake.apartment.listing.all.Remove(2);
+  fake.apartment.listing.all.Insert(2, again);
   EXPECT_TRUE(control.RenameFile(u"3.gif", u"y.gif"));
   EXPECT_EQ(page.Look(), "1.gif y.gif* x.gif ");
   EXPECT_EQ(Selected(), AddressOf("y.gif"));
@@ -505,7 +506,7 @@ TEST_F(ThumbNailTest, SelectionIsOfTheListAndOfThePage) {
   ListNumbers(4);
   fake.files.files.erase(CopyOf("3.gif"));
   downloader.waits = {[this](FakeDownloader& from) {
-    fake.apartment.shownFiles.Remove(2);
+    fake.apartment.listing.shown.Remove(2);
     control.OnSlotPressed(3, false);
     Arrives(from);
   }};
@@ -665,11 +666,11 @@ TEST_F(ThumbNailTest, TakesCallsOfTheHostInBetween) {
   // Somebody logs on during the fill: the listing is not taken for the new user's.
   fake.files.files.erase(CopyOf("x.gif"));
   downloader.waits = {[&](FakeDownloader& from) {
-    fake.apartment.listLoaded = false;
+    fake.apartment.listing.isLoaded = false;
     Arrives(from);
   }};
   EXPECT_TRUE(control.Init(u"*"));
-  EXPECT_FALSE(fake.apartment.listLoaded);
+  EXPECT_FALSE(fake.apartment.listing.isLoaded);
 
   // Without a selected picture there is nothing to rename, and nobody is asked to; an editor went with it.
   control.OnKeyDown(113);
@@ -803,10 +804,10 @@ TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
   fake.files.files[u"C:\\new.jpg"].bytes = "GIF89a.....";
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
   EXPECT_EQ(fake.files.files[CopyOf("new.jpg")].bytes, "GIF89a.....");
-  EXPECT_EQ(fake.apartment.shownFiles.Count(), 7U);
+  EXPECT_EQ(fake.apartment.listing.shown.Count(), 7U);
   control.ChangeFileFilter(u"gif");
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
-  EXPECT_EQ(fake.apartment.shownFiles.Count(), 6U);
+  EXPECT_EQ(fake.apartment.listing.shown.Count(), 6U);
 }
 
 TEST_F(ThumbNailTest, NeedsNoListingToTakeBackAnUpload) {

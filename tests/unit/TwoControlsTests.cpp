@@ -38,9 +38,9 @@ class TwoControlsTest : public ControlTest {
 TEST_F(TwoControlsTest, ThumbnailsEndThenUploadThenInit) {
   EXPECT_TRUE(thumbnails->Init(u"*"));
   EXPECT_TRUE(list.mobjFileupload->ListIsCurrent()) << "the page has listed the same account";
-  fake.apartment.listingIsCurrent = false;
+  fake.apartment.listing.isCurrent = false;
   EXPECT_TRUE(list.Init(u"*"));
-  EXPECT_TRUE(fake.apartment.listLoaded) << "nor need the page list what the list has listed";
+  EXPECT_TRUE(fake.apartment.listing.isLoaded) << "nor need the page list what the list has listed";
   thumbnails.reset();
   EXPECT_TRUE(list.UploadImage(u"C:\\new.jpg"));
   EXPECT_EQ(Records(), "new.jpg,");
@@ -72,14 +72,14 @@ TEST_F(TwoControlsTest, AnUploadIntoTheWatchdogThenADownload) {
 // The list has listed anew, so the page shows records of an older listing.
 TEST_F(TwoControlsTest, AnUploadTakesThePlaceOfAnOlderRecord) {
   EXPECT_TRUE(thumbnails->Init(u"*"));
-  fake.apartment.listingIsCurrent = false;
+  fake.apartment.listing.isCurrent = false;
   EXPECT_TRUE(list.Init(u"*"));
   fake.files.files[u"C:\\b.gif"] = {kGif.size(), 0, kGif};
   pageUploader.script = Upload;
   replies["FileUploadRequest"] = "FileURL=http://h/u/b.gif";
   EXPECT_TRUE(thumbnails->UploadImage(u"C:\\b.gif"));
   EXPECT_EQ(page.Look(), "a.gif b.gif* c.gif ");
-  EXPECT_EQ(fake.apartment.shownFiles.At(2), fake.apartment.allFiles.At(2));
+  EXPECT_EQ(fake.apartment.listing.shown.At(2), fake.apartment.listing.all.At(2));
 }
 
 // What the page is fetching is changed by the list meanwhile; the bytes on their way are the old ones.
@@ -122,9 +122,9 @@ TEST_F(TwoControlsTest, ChangesOvertakeAFetch) {
   for (const auto& test : kCases) {
     SCOPED_TRACE(test.name);
     account = {{"a.gif", "11"}, {"b.gif", "11"}, {"c.gif", "11"}};
-    fake.apartment.ForgetListing();
+    fake.apartment.listing.Forget();
     EXPECT_TRUE(list.Init(u"*"));
-    fake.apartment.listLoaded = true;
+    fake.apartment.listing.isLoaded = true;
     fake.files.files.erase(CopyOf("b.gif"));
     fake.files.files.erase(CopyOf("z.gif"));
     std::string asked;

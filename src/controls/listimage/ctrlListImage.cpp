@@ -39,7 +39,7 @@ ctrlListImage::ctrlListImage(const ControlParts& parts, ListView& view)
 }
 
 ctrlListImage::~ctrlListImage() {
-  apartment_.listingIsCurrent = false;
+  listing_.isCurrent = false;
 }
 
 // --- Listing ---
@@ -48,12 +48,12 @@ bool ctrlListImage::Init(TextView szFileFilter) {
   Text filter(szFileFilter);
   const Operation operation(*this);
   // Until the listing is there, the thumbnails have none either.
-  const bool loaded = apartment_.listLoaded;
-  if (!apartment_.listingIsCurrent) apartment_.ForgetListing();
+  const bool loaded = listing_.isLoaded;
+  if (!listing_.isCurrent) listing_.Forget();
   if (!Client()) throw RuntimeError(init_error::kNoClient);
   PrepareUserFolder(apartment_);
   if (!ListAccount()) throw RuntimeError(init_error::kListingFailed);
-  apartment_.listLoaded = loaded;
+  listing_.isLoaded = loaded;
   ShowListOrLabel();
   view_.SetColumns(kColumns);
   currentFilter_ = std::move(filter);
@@ -67,7 +67,7 @@ bool ctrlListImage::Init(TextView szFileFilter) {
   } else {
     Fill([](const CUpload&) { return false; });
   }
-  apartment_.listingIsCurrent = true;
+  listing_.isCurrent = true;
   return true;
 }
 
@@ -97,13 +97,12 @@ void ctrlListImage::ChangeFileFilter(TextView szFileFilter) {
 }
 
 void ctrlListImage::Fill(const std::function<bool(const CUpload&)>& shows) {
-  const FileList& all = apartment_.allFiles;
   std::vector<Item> items;
-  items.reserve(all.Count());
-  for (std::size_t i = 1; i <= all.Count(); ++i)
-    if (const auto& record = all.At(i); shows(*record)) items.push_back({record});
+  items.reserve(listing_.all.Count());
+  for (const FileRecord& record : listing_.all)
+    if (shows(*record)) items.push_back({record});
   items_ = std::move(items);
-  ShowsAccount();
+  NoteAccount();
   ++filling_;
   view_.SetItemCount(items_.size());
 }
@@ -120,7 +119,7 @@ std::optional<std::size_t> ctrlListImage::NextSelected(std::size_t from) const {
   return selected && *selected < items_.size() ? selected : std::nullopt;
 }
 
-std::shared_ptr<CUpload> ctrlListImage::SelectedRecord() const {
+FileRecord ctrlListImage::SelectedRecord() const {
   const auto selected = Selected();
   return selected ? items_[*selected].record : nullptr;
 }

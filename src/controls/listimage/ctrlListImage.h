@@ -73,15 +73,15 @@ class ctrlListImage final : public FileControl {
  private:
   // One line of the list. The record is shared with the list of all files.
   struct Item {
-    std::shared_ptr<CUpload> record;
+    FileRecord record;
     // Shown since an upload, which spells the size in its own way until the list is filled again.
     bool uploaded = false;
   };
 
-  std::shared_ptr<CUpload> SelectedRecord() const override;
+  FileRecord SelectedRecord() const override;
   bool ShowsFile(TextView name) const override;
-  void ShowUploaded(const std::shared_ptr<CUpload>& record) override;
-  void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl, const Text& oldName,
+  void ShowUploaded(const FileRecord& record) override;
+  void ShowRenamed(const FileRecord& record, const Text& oldUrl, const Text& oldName,
                    const Text& newName) override;
   void DroppedNoFiles(bool own) override;
 
@@ -91,7 +91,7 @@ class ctrlListImage final : public FileControl {
 
   // Puts the records that `shows` lets pass into the list.
   void Fill(const std::function<bool(const CUpload&)>& shows);
-  void ShowListOrLabel() { view_.ShowList(!apartment_.allFiles.IsEmpty()); }
+  void ShowListOrLabel() { view_.ShowList(!listing_.all.IsEmpty()); }
   bool ShowsWhenUploaded(TextView name) const;
 
   void DeleteSelected();

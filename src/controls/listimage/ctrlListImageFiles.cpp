@@ -14,8 +14,8 @@ bool ctrlListImage::ShowsFile(TextView name) const {
       items_, [&](const Item& item) { return EqualsIgnoringCase(item.record->FileName, name); });
 }
 
-void ctrlListImage::ShowUploaded(const std::shared_ptr<CUpload>& record) {
-  if (items_.empty()) ShowsAccount();
+void ctrlListImage::ShowUploaded(const FileRecord& record) {
+  if (items_.empty()) NoteAccount();
   // What is shown are still another user's files.
   if (ShowsOtherAccount()) return;
   const auto same = std::ranges::find_if(items_, [&](const Item& item) {
@@ -51,7 +51,7 @@ void ctrlListImage::DeleteFile() {
     ResultAsItStood(0, [&](int&) { DeleteSelected(); });
     deleteRuns_ = false;
     if (IsClosed()) return;
-    apartment_.listingIsCurrent = false;
+    listing_.isCurrent = false;
     Fill([](const CUpload&) { return false; });
     try {
       Init(currentFilter_);
@@ -89,7 +89,7 @@ void ctrlListImage::DeleteSelected() {
     }
     const std::shared_ptr<CFileUpload> client = Client();
     if (!client) return;
-    const std::shared_ptr<CUpload> record = items_[i].record;
+    const FileRecord record = items_[i].record;
     if (DeleteOnServer(*client, *record)) {
       position = RemoveRecord(record->FileName, position);
       Raise(event::kDeleted);
@@ -101,7 +101,7 @@ void ctrlListImage::DeleteSelected() {
 }
 
 std::size_t ctrlListImage::RemoveRecord(TextView name, std::size_t from) {
-  FileList& all = apartment_.allFiles;
+  FileList& all = listing_.all;
   const std::size_t count = all.Count();
   for (std::size_t step = 0; step < count; ++step) {
     const std::size_t position = (from - 1 + step) % count + 1;
@@ -114,14 +114,14 @@ std::size_t ctrlListImage::RemoveRecord(TextView name, std::size_t from) {
 
 // --- Rename ---
 
-void ctrlListImage::ShowRenamed(const std::shared_ptr<CUpload>& record, const Text&, const Text& oldName,
+void ctrlListImage::ShowRenamed(const FileRecord& record, const Text&, const Text& oldName,
                                 const Text& newName) {
   reselect_ = true;
   // Record and item are one object as a rule, but the item of an older listing has a record of its own.
   const auto item = std::ranges::find_if(
       items_, [&](const Item& shown) { return shown.record == record || shown.record->FileName == oldName; });
   if (item == items_.end()) return;
-  if (item->record != record) GiveName(*item->record, newName);
+  if (item->record != record) listing_.GiveName(item->record, newName);
   view_.RefreshItem(static_cast<std::size_t>(item - items_.begin()));
 }
 

@@ -57,12 +57,12 @@ Text FormatLabelText(TextView name) {
 
 ctrlThumbNailView::ctrlThumbNailView(const ControlParts& parts, ThumbnailPage& page)
     : FileControl(parts, page, TransferEvents::kSilent), page_(page), header_(apartment_.platform.files) {
-  apartment_.shownFiles.Clear();
+  listing_.shown.Clear();
 }
 
 ctrlThumbNailView::~ctrlThumbNailView() {
-  apartment_.ForgetListing();
-  apartment_.shownFiles.Clear();
+  listing_.Forget();
+  listing_.shown.Clear();
 }
 
 // --- Listing ---
@@ -84,14 +84,14 @@ bool ctrlThumbNailView::Init(TextView szFileFilter) {
 
 bool ctrlThumbNailView::List() {
   const Operation operation(*this);
-  if (apartment_.listLoaded) return true;
-  const bool current = apartment_.listingIsCurrent;
-  apartment_.ForgetListing();
+  if (listing_.isLoaded) return true;
+  const bool current = listing_.isCurrent;
+  listing_.Forget();
   PrepareUserFolder(apartment_);
   if (!ListAccount()) return false;
   // Set before the page pumps messages: what forgets the listing meanwhile is not to be undone.
-  apartment_.listLoaded = true;
-  apartment_.listingIsCurrent = current;
+  listing_.isLoaded = true;
+  listing_.isCurrent = current;
   return true;
 }
 
@@ -105,21 +105,17 @@ void ctrlThumbNailView::ChangeFileFilter(TextView szFileFilter) {
 
 bool ctrlThumbNailView::Passes(TextView name) const {
   const TextView end = name.substr(name.size() - std::min<std::size_t>(name.size(), 3));
-  return apartment_.shownFilter == u"*" || LowerCase(end) == apartment_.shownFilter;
+  return listing_.filter == u"*" || LowerCase(end) == listing_.filter;
 }
 
 void ctrlThumbNailView::Show(const Text& filter) {
-  const FileList& all = apartment_.allFiles;
-  FileList& shown = apartment_.shownFiles;
+  FileList& shown = listing_.shown;
   shown.Clear();
-  ShowsAccount();
-  apartment_.shownFilter = filter;
-  for (std::size_t i = 1; i <= all.Count(); ++i) {
-    const std::shared_ptr<CUpload>& record = all.At(i);
-    if (!Passes(record->FileName)) continue;
-    // A second file of the same address is not shown.
-    ResultAsItStood(0, [&](int&) { shown.Add(record, record->FilePath); });
-  }
+  NoteAccount();
+  listing_.filter = filter;
+  // A second file of the same address is not shown.
+  for (const FileRecord& record : listing_.all)
+    if (Passes(record->FileName) && !shown.Find(record->FilePath)) shown.Add(record);
   // What is selected is on the first page.
   keepSelection_ = false;
   const std::size_t selected = shown.PositionOf(selectedPath_);
@@ -133,7 +129,7 @@ void ctrlThumbNailView::Show(const Text& filter) {
 }
 
 int ctrlThumbNailView::SetScrollRange() {
-  const int count = static_cast<int>(apartment_.shownFiles.Count());
+  const int count = static_cast<int>(listing_.shown.Count());
   // The last page begins with the last row but one; with four pictures or fewer there is one page.
   const int max = count % 2 != 0 ? count - 3 : count - 4;
   page_.EnableScroll(count > kSlotCount);
@@ -175,13 +171,13 @@ void ctrlThumbNailView::FillPage(int first) {
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     page_.ClearSlot(slot);
     const std::size_t position = static_cast<std::size_t>(first) + static_cast<std::size_t>(slot);
-    const FileList& shown = apartment_.shownFiles;
+    const FileList& shown = listing_.shown;
     PathOf(slot) = position <= shown.Count() ? shown.At(position)->FilePath : Text();
   }
   // A name is edited over its own picture only.
   if (!editedName_.empty() && PathOf(editedSlot_) != edited) OnEditorLeft();
   // While the account is not listed, nobody knows whether it is empty.
-  const bool empty = apartment_.allFiles.IsEmpty() && apartment_.listLoaded;
+  const bool empty = listing_.all.IsEmpty() && listing_.isLoaded;
   page_.ShowGrid(!empty);
   if (empty) {
     paths_.fill({});
@@ -197,13 +193,13 @@ void ctrlThumbNailView::FillPage(int first) {
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     // The list may change in any event of the fill.
     const int position = first + slot;
-    FileList& shown = apartment_.shownFiles;
+    FileList& shown = listing_.shown;
     if (position > static_cast<int>(shown.Count())) {
       PathOf(slot).clear();
       page_.ShowSlot(slot, false);
       continue;
     }
-    const std::shared_ptr<CUpload> record = shown.At(static_cast<std::size_t>(position));
+    const FileRecord record = shown.At(static_cast<std::size_t>(position));
     if (!FillSlot(slot, *record)) return;
   }
   UpdateSelection();
@@ -217,7 +213,7 @@ bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
   for (int tries = 0; tries < 2 && !copy.empty() && !copies_.Has(record); ++tries) {
     const std::uint32_t changes = apartment_.ChangesOfCopy(copy);
     if (!Fetch(slot, record, copy)) return false;
-    if (apartment_.ChangesOfCopy(copy) == changes || !apartment_.allFiles.Find(record.FilePath)) break;
+    if (apartment_.ChangesOfCopy(copy) == changes || !listing_.all.Find(record.FilePath)) break;
     copy = copies_.PathOf(record.FilePath);
   }
   page_.SetCaption(slot, FormatLabelText(record.FileName));
@@ -271,11 +267,11 @@ void ctrlThumbNailView::OnScrollChanged(int value) {
     page_.EnableScroll(false);
     scrolledBack_ = value < previousScroll_;
     previousScroll_ = value;
-    if (value < static_cast<int>(apartment_.shownFiles.Count())) {
+    if (value < static_cast<int>(listing_.shown.Count())) {
       ShowPage(value);
       UpdateSelection();
     }
-    page_.EnableScroll(apartment_.shownFiles.Count() > kSlotCount);
+    page_.EnableScroll(listing_.shown.Count() > kSlotCount);
   });
 }
 
@@ -284,7 +280,7 @@ void ctrlThumbNailView::OnScrollDragged(int value) {
     if (value == 0) {
       firstIndex_ = 0;
       // Other than in OnScrollChanged it is the number of all files that counts.
-    } else if (value < static_cast<int>(apartment_.allFiles.Count())) {
+    } else if (value < static_cast<int>(listing_.all.Count())) {
       ShowPage(value);
       UpdateSelection();
     }
@@ -297,7 +293,7 @@ void ctrlThumbNailView::ShowItem(std::size_t position) {
 
 void ctrlThumbNailView::ShowFrom(int first, std::optional<std::size_t> position) {
   first = std::clamp(first, 0, std::max(0, SetScrollRange()));
-  selectedPath_ = apartment_.shownFiles.At(position.value_or(static_cast<std::size_t>(first) + 1))->FilePath;
+  selectedPath_ = listing_.shown.At(position.value_or(static_cast<std::size_t>(first) + 1))->FilePath;
   // The page does not choose a selection of its own.
   selectionFirstIndex_ = first;
   firstIndex_ = first;

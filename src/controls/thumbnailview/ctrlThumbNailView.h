@@ -65,10 +65,10 @@ class ctrlThumbNailView final : public FileControl {
   void OnFilesEnter() override;
 
  private:
-  std::shared_ptr<CUpload> SelectedRecord() const override;
+  FileRecord SelectedRecord() const override;
   bool ShowsFile(TextView name) const override;
-  void ShowUploaded(const std::shared_ptr<CUpload>& record) override;
-  void ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl, const Text& oldName,
+  void ShowUploaded(const FileRecord& record) override;
+  void ShowRenamed(const FileRecord& record, const Text& oldUrl, const Text& oldName,
                    const Text& newName) override;
   void TransferEnded() override;
   void DroppedNoFiles(bool own) override;

@@ -27,21 +27,13 @@ bool BeginsUnfit(TextView name) {
   return device == u"con" || device == u"prn" || device == u"aux" || device == u"nul";
 }
 
-// Position of the file of that name in the list, 0 when there is none.
-template <typename Matches>
-std::size_t Find(const FileList& list, const Matches& matches) {
-  for (std::size_t i = 1; i <= list.Count(); ++i)
-    if (matches(*list.At(i))) return i;
-  return 0;
-}
-
 }  // namespace
 
 // --- Selection ---
 
 void ctrlThumbNailView::UpdateSelection() {
   ResultAsItStood(0, [&](int&) {
-    const FileList& shown = apartment_.shownFiles;
+    const FileList& shown = listing_.shown;
     if (Trim(selectedPath_).empty() && !shown.IsEmpty()) selectedPath_ = shown.At(1)->FilePath;
     if (firstIndex_ != selectionFirstIndex_ && !keepSelection_ && !shown.IsEmpty()) {
       const auto first = static_cast<std::size_t>(page_.ScrollValue());
@@ -61,7 +53,7 @@ void ctrlThumbNailView::UpdateSelection() {
 }
 
 void ctrlThumbNailView::FocusGrid() {
-  if (!apartment_.allFiles.IsEmpty() && editedName_.empty()) page_.Focus();
+  if (!listing_.all.IsEmpty() && editedName_.empty()) page_.Focus();
 }
 
 int ctrlThumbNailView::SlotOf(TextView path) const {
@@ -70,20 +62,20 @@ int ctrlThumbNailView::SlotOf(TextView path) const {
   return slot == paths_.end() ? 0 : static_cast<int>(slot - paths_.begin()) + 1;
 }
 
-std::shared_ptr<CUpload> ctrlThumbNailView::SelectedRecord() const {
-  const std::size_t position = apartment_.shownFiles.PositionOf(selectedPath_);
-  return position == 0 ? nullptr : apartment_.shownFiles.At(position);
+FileRecord ctrlThumbNailView::SelectedRecord() const {
+  const std::size_t position = listing_.shown.PositionOf(selectedPath_);
+  return position == 0 ? nullptr : listing_.shown.At(position);
 }
 
 bool ctrlThumbNailView::ShowsFile(TextView name) const {
-  return Find(apartment_.shownFiles,
-              [&](const CUpload& file) { return EqualsIgnoringCase(file.FileName, name); }) != 0;
+  return listing_.shown.PositionWhere(
+             [&](const CUpload& file) { return EqualsIgnoringCase(file.FileName, name); }) != 0;
 }
 
 void ctrlThumbNailView::UploadedFileSetFocus(TextView szFileName) {
   ResultAsItStood(0, [&](int&) {
     const std::size_t position =
-        Find(apartment_.shownFiles, [&](const CUpload& file) { return file.FileName == szFileName; });
+        listing_.shown.PositionWhere([&](const CUpload& file) { return file.FileName == szFileName; });
     // Another one than what was uploaded last.
     if (position != 0) {
       keepSelection_ = false;
@@ -100,12 +92,12 @@ void ctrlThumbNailView::RaiseSelection() {
 
 // --- Operations ---
 
-void ctrlThumbNailView::ShowUploaded(const std::shared_ptr<CUpload>& record) {
-  FileList& shown = apartment_.shownFiles;
-  if (shown.IsEmpty()) ShowsAccount();
+void ctrlThumbNailView::ShowUploaded(const FileRecord& record) {
+  FileList& shown = listing_.shown;
+  if (shown.IsEmpty()) NoteAccount();
   if (ShowsOtherAccount()) return;
   // The shown record may be one of an older listing.
-  std::size_t position = Find(shown, [&](const CUpload& file) {
+  std::size_t position = shown.PositionWhere([&](const CUpload& file) {
     return &file == record.get() || EqualsIgnoringCase(file.FileName, record->FileName);
   });
   if (position != 0) {
@@ -114,7 +106,7 @@ void ctrlThumbNailView::ShowUploaded(const std::shared_ptr<CUpload>& record) {
     position = shown.Count() + 1;
   }
   if (position == 0) return;
-  shown.Insert(position, record, shown.Find(record->FilePath) ? TextView() : TextView(record->FilePath));
+  shown.Insert(position, record);
   keepSelection_ = true;
   ShowItem(position);
 }
@@ -130,7 +122,7 @@ void ctrlThumbNailView::DeleteFile() {
       Fail(ftp_error::kNotAllowed, u"The account may not delete files.");
       return Raise(event::kNotAllowed);
     }
-    const std::shared_ptr<CUpload> record = SlotOf(selectedPath_) != 0 ? SelectedRecord() : nullptr;
+    const FileRecord record = SlotOf(selectedPath_) != 0 ? SelectedRecord() : nullptr;
     if (!record) Fail(ftp_error::kUnavailable, u"No file on the page is selected.");
     if (!record || !MayChangeShown()) return Raise(event::kNotSelected);
     deleteRuns_ = true;
@@ -143,7 +135,7 @@ void ctrlThumbNailView::DeleteFile() {
     Raise(event::kDeleted);
     if (IsClosed()) return;
     keepSelection_ = false;
-    if (apartment_.shownFiles.IsEmpty()) {
+    if (listing_.shown.IsEmpty()) {
       selectedPath_.clear();
       SetScrollRange();
       ShowPage(0);
@@ -154,19 +146,16 @@ void ctrlThumbNailView::DeleteFile() {
   });
 }
 
-void ctrlThumbNailView::ShowRenamed(const std::shared_ptr<CUpload>& record, const Text& oldUrl,
-                                    const Text& oldName, const Text& newName) {
-  FileList& shown = apartment_.shownFiles;
-  const std::size_t position =
-      Find(shown, [&](const CUpload& file) { return &file == record.get() || file.FileName == oldName; });
+void ctrlThumbNailView::ShowRenamed(const FileRecord& record, const Text& oldUrl, const Text& oldName,
+                                    const Text& newName) {
+  FileList& shown = listing_.shown;
+  const std::size_t position = shown.PositionWhere(
+      [&](const CUpload& file) { return &file == record.get() || file.FileName == oldName; });
   if (position == 0) return;
-  const std::shared_ptr<CUpload> renamed = shown.At(position);
+  const FileRecord renamed = shown.At(position);
   // A record of an older listing is not in the list of all files.
   const Text before = renamed == record ? oldUrl : renamed->FilePath;
-  if (renamed != record) {
-    GiveName(*renamed, newName);
-    SetAddress(shown, position, renamed->FilePath);
-  }
+  if (renamed != record) listing_.GiveName(renamed, newName);
   if (selectedPath_ == before) selectedPath_ = renamed->FilePath;
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     if (PathOf(slot) != before) continue;
@@ -208,8 +197,8 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
     CheckFileExtension(NewString, ExtensionOf(oldName));
     // The caption may show what was typed, such as the name without its extension.
     if (NewString == oldName) return keepName(event::kRenamed);
-    if (Find(apartment_.shownFiles,
-             [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), NewString); }) != 0) {
+    if (listing_.shown.PositionWhere(
+            [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), NewString); }) != 0) {
       Fail(ftp_error::kNameNotAllowed, u"The account has a file of that name.");
       return keepName(event::kNameTaken);
     }
@@ -246,8 +235,7 @@ void ctrlThumbNailView::OnKeyDown(int keyCode) {
     case kF2Key:
       if (!bRenameEnabled) return;
       Raise(event::kRenameKey);
-      if (const std::shared_ptr<CUpload> record = SelectedRecord();
-          record && SlotOf(selectedPath_) != 0 && !IsClosed()) {
+      if (const FileRecord record = SelectedRecord(); record && SlotOf(selectedPath_) != 0 && !IsClosed()) {
         editedName_ = record->FileName;
         editedSlot_ = SlotOf(selectedPath_);
         page_.ShowEditor(editedSlot_, editedName_);

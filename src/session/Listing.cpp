@@ -1,0 +1,32 @@
+#include "session/Listing.h"
+
+#include "support/PathHelpers.h"
+
+namespace tarnwick {
+
+void Listing::Forget() {
+  all.Clear();
+  isCurrent = isLoaded = false;
+  copiesAskedAgain.clear();
+}
+
+Text Listing::AddressLike(const Text& address) const {
+  // Every address contains an empty text, which a file has that the service listed without one.
+  if (address.empty()) return {};
+  if (all.Find(address)) return address;
+  const std::size_t position =
+      all.PositionWhere([&](const CUpload& record) { return record.FilePath.find(address) != Text::npos; });
+  return position == 0 ? Text() : all.At(position)->FilePath;
+}
+
+void Listing::GiveName(const FileRecord& record, const Text& newName) {
+  Text address = record->FilePath;
+  address.resize(address.size() - FileNameFromUrl(address).size());
+  address += newName;
+  Change(record, [&](CUpload& values) {
+    values.FileName = newName;
+    values.FilePath = address;
+  });
+}
+
+}  // namespace tarnwick
