@@ -190,7 +190,7 @@ bool FileControl::UploadImage(TextView szLocalPath) {
       return Raise(event::kNotAllowed);
     }
     const AccountKey account = apartment_.session.Account();
-    const Text url = SendAndRegister(*client, path);
+    const Text url = SendAndRegister(*client, path, account);
     FileRecord record;
     if (!url.empty()) {
       // Whatever the watchdog told meanwhile.
@@ -206,9 +206,8 @@ bool FileControl::UploadImage(TextView szLocalPath) {
   });
 }
 
-Text FileControl::SendAndRegister(CFileUpload& client, const Text& path) {
+Text FileControl::SendAndRegister(CFileUpload& client, const Text& path, const AccountKey& account) {
   const RunningTransfer running(*this);
-  const AccountKey account = apartment_.session.Account();
   uploadTimedOut_ = false;
   Text url;
   // What is on the server is registered, whatever the host made of the control meanwhile, but not with
@@ -259,47 +258,29 @@ void FileControl::FailUpload(CFileUpload& client, const Text& path, std::int32_t
   if (number == error::kInterrupted) return FailStopped();
   // The watchdog has told why.
   if (uploadTimedOut_) return;
-  if (number == error::kFileNotFound)
-    return FailWith(ftp_error::kUnavailable,
-                    FolderExists(apartment_.platform.files, path) ? u"This is a folder, not a file."
-                                                                  : u"The file was not found.",
-                    number);
-  if (number == error::kPathAccess)
-    return FailWith(ftp_error::kUnavailable, u"The file could not be read.", number);
   // An upload takes the place of a file of that very name.
   const TextView name = FileNameFromPath(path);
-  if (number == acceptor::kNameRefused && IsNameFree(name, name) && IsTooLarge(client, path))
-    return FailWith(ftp_error::kFull, u"The account is full.", number);
-  FailPage(name, name, number);
-}
-
-bool FileControl::IsNameFree(TextView name, TextView own) const {
-  const FileRecord same = RecordNamed(name);
-  return name.find_first_of(kRefusedCharacters) == TextView::npos && (!same || same->FileName == own);
-}
-
-void FileControl::FailWith(std::int32_t ftpError, TextView words, std::int32_t number) {
-  Fail(ftpError, Text(words) + u" (" + TextFromNumber(number) + u")");
-}
-
-void FileControl::FailPage(TextView name, TextView own, std::int32_t number) {
-  switch (number) {
-    case acceptor::kUnspecified:
-      return FailWith(ftp_error::kConnectionLost,
-                      u"The connection was lost, or the server gave no usable answer.", number);
-    case acceptor::kRefused:
-      return FailWith(ftp_error::kNotLoggedOn, u"The server refused the user name or the password.", number);
-    case acceptor::kFolderState:
-      return FailWith(ftp_error::kUnavailable, u"The account has no folder on the server.", number);
-    case acceptor::kNotThere:
-      return FailWith(ftp_error::kUnavailable, u"The file was not found.", number);
-    case acceptor::kNameRefused:
-      if (name.find_first_of(kRefusedCharacters) == TextView::npos && !IsNameFree(name, own))
-        return FailWith(ftp_error::kNameNotAllowed, u"The account has a file of that name.", number);
-      return FailWith(ftp_error::kNameNotAllowed, u"The file's name is not allowed.", number);
-    default:
-      return FailWith(ftp_error::kNotTaken, u"The server refused.", number);
+  const bool taken = IsNameTaken(name, name);
+  if (number == error::kFileNotFound) {
+    const bool folder = FolderExists(apartment_.platform.files, path);
+    Fail(NumberedFailure(ftp_error::kUnavailable,
+                         folder ? u"This is a folder, not a file." : u"The file was not found.", number));
+  } else if (number == error::kPathAccess) {
+    Fail(NumberedFailure(ftp_error::kUnavailable, u"The file could not be read.", number));
+  } else if (number == acceptor::kNameRefused && IsNameAllowed(name) && !taken && IsTooLarge(client, path)) {
+    Fail(NumberedFailure(ftp_error::kFull, u"The account is full.", number));
+  } else {
+    Fail(PageFailure(number, taken));
   }
+}
+
+bool FileControl::IsNameAllowed(TextView name) {
+  return name.find_first_of(kRefusedCharacters) == TextView::npos;
+}
+
+bool FileControl::IsNameTaken(TextView name, TextView own) const {
+  const FileRecord same = RecordNamed(name);
+  return IsNameAllowed(name) && same && same->FileName != own;
 }
 
 bool FileControl::IsTooLarge(CFileUpload& client, const Text& path) const {
@@ -448,7 +429,7 @@ bool FileControl::RenameOnServer(const Text& oldName, const Text& newName) {
                          AcceptorPath(u"RenameAcceptor.asp"), session.userName, session.password,
                          kProductGuid);
   } catch (const RuntimeError& failure) {
-    FailPage(newName, oldName, failure.Number());
+    Fail(PageFailure(failure.Number(), IsNameTaken(newName, oldName)));
     return false;
   }
   if (client->RenameFile(TextFromNumber(session.productNumber), session.userName, oldName, newName) ==
@@ -471,15 +452,14 @@ std::pair<FileRecord, Text> FileControl::RecordRenamed(const Text& oldName, cons
 
 bool FileControl::IsFileNameValid(TextView szFileName) {
   return ResultAsItStood(false, [&](bool& valid) {
-    valid = szFileName.find_first_of(kRefusedCharacters) == TextView::npos;
+    valid = IsNameAllowed(szFileName);
     if (!valid) Raise(event::kNameRefused);
   });
 }
 
 bool FileControl::IsEditedNameValid(TextView name) {
   Operation operation(*this);
-  if (name.find_first_of(kRefusedCharacters) != TextView::npos)
-    operation.Fail(ftp_error::kNameNotAllowed, u"The file's name is not allowed.");
+  if (!IsNameAllowed(name)) operation.Fail(ftp_error::kNameNotAllowed, u"The file's name is not allowed.");
   return IsFileNameValid(name);
 }
 

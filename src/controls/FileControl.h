@@ -20,6 +20,7 @@
 #include "controls/ControlEvents.h"
 #include "controls/ControlView.h"
 #include "controls/LocalCopies.h"
+#include "controls/PageFailures.h"
 #include "service/CFileUpload.h"
 #include "session/Apartment.h"
 #include "transfer/FtpErrors.h"
@@ -206,6 +207,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   }
   // Notes the outcome of the operation that runs, for m_LastError.
   void Fail(std::int32_t ftpError, TextView description);
+  void Fail(const Failure& failure) { Fail(failure.ftpError, failure.description); }
   // Notes why what was told to stop has no result.
   void FailStopped();
   // Whether a transfer may start now; else the reason is noted.
@@ -263,16 +265,14 @@ class FileControl : private UploadEvents, private DownloadEvents {
   void Failed(std::int32_t ftpError, TextView description, bool told) override;
   void TellState(ConnectionState state);
 
-  // Sends and registers the file; its address, empty on failure.
-  Text SendAndRegister(CFileUpload& client, const Text& path);
+  // Sends and registers the file with the account; its address, empty on failure.
+  Text SendAndRegister(CFileUpload& client, const Text& path, const AccountKey& account);
   bool SendFile(CFileUpload& client, const Text& path);
-  // Note why: the upload component failed with that number; so did a page, which was asked to give `name` to
-  // the file that is called `own`; in these words, with the number behind them.
+  // Notes why the upload component failed with that number.
   void FailUpload(CFileUpload& client, const Text& path, std::int32_t number);
-  void FailPage(TextView name, TextView own, std::int32_t number);
-  void FailWith(std::int32_t ftpError, TextView words, std::int32_t number);
-  // Whether the name is allowed, and no other file than the one that is called `own` has it.
-  bool IsNameFree(TextView name, TextView own) const;
+  static bool IsNameAllowed(TextView name);
+  // Whether the name is allowed, but another file than the one that is called `own` has it.
+  bool IsNameTaken(TextView name, TextView own) const;
   // Whether the account has no room for the file. Asks the service.
   bool IsTooLarge(CFileUpload& client, const Text& path) const;
   FileRecord RecordUploaded(const Text& path, const Text& url);

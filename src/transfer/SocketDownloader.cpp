@@ -67,7 +67,7 @@ void SocketDownloader::StartDownload(TextView url, TextView folder, TextView exp
   actions_.RestartWatchdog();
   explicitTarget_ = explicitTarget;
   if (const auto failure = MakeDownloadPlan(url, folder, proxyHost, proxyPort, plan_))
-    return Fail(*failure, true);
+    return EndWith(*failure, true);
   actions_.Connect(plan_.host, plan_.port);
 }
 
@@ -93,7 +93,7 @@ std::span<char> SocketDownloader::Room(std::size_t most) {
     return reply_.Room(most);
   } catch (const std::bad_alloc&) {
     // A file with a hole in it is worse than none.
-    Fail(DownloadFailure::kMemory, true);
+    EndWith(DownloadFailure::kMemory, true);
     return {};
   }
 }
@@ -101,7 +101,7 @@ std::span<char> SocketDownloader::Room(std::size_t most) {
 void SocketDownloader::OnArrived(std::size_t count) {
   if (!running_ || count == 0) return;
   reply_.Add(count);
-  if (reply_.Size() > kMostReplyBytes) return Fail(DownloadFailure::kTooLong, true);
+  if (reply_.Size() > kMostReplyBytes) return EndWith(DownloadFailure::kTooLong, true);
   actions_.Received(BodyBytes());
   // The host may have ended or replaced the download in its event.
   if (!running_) return;
@@ -143,7 +143,8 @@ void SocketDownloader::OnClosedByPeer() {
   // A host that pumps messages in the event of an arrival gets the close before the arrival was searched.
   const auto statusLine = FindHeader();
   if (!headerFound_)
-    return reply_.Size() == 0 ? Fail(DownloadFailure::kEmpty, true) : Fail(DownloadFailure::kCut, false);
+    return reply_.Size() == 0 ? EndWith(DownloadFailure::kEmpty, true)
+                              : EndWith(DownloadFailure::kCut, false);
   const std::int32_t bytes = BodyBytes();
   const ReplyBuffer reply = std::exchange(reply_, {});
   running_ = false;
@@ -159,7 +160,7 @@ void SocketDownloader::OnSent() {
 }
 
 void SocketDownloader::OnSocketError() {
-  if (running_) Fail(DownloadFailure::kConnection, true);
+  if (running_) EndWith(DownloadFailure::kConnection, true);
 }
 
 void SocketDownloader::OnWatchdog() {
@@ -171,7 +172,7 @@ void SocketDownloader::OnWatchdog() {
   actions_.Failed(DownloadFailure::kSilence, false);
 }
 
-void SocketDownloader::Fail(DownloadFailure failure, bool told) {
+void SocketDownloader::EndWith(DownloadFailure failure, bool told) {
   running_ = false;
   reply_ = {};
   actions_.CloseSocket();

@@ -107,7 +107,7 @@ class SocketDownloader {
   std::int32_t ContentLength() const { return contentLength_; }
 
  private:
-  void Fail(DownloadFailure failure, bool told);
+  void EndWith(DownloadFailure failure, bool told);
   // The status line when the header, which was not known before, is whole.
   std::optional<std::string> FindHeader();
   std::int32_t BodyBytes() const { return static_cast<std::int32_t>(reply_.Size() - bodyStart_); }
