@@ -1,6 +1,7 @@
 #include "hosting/Options.h"
 
-#include <charconv>
+#include <CLI/CLI.hpp>
+#include <algorithm>
 #include <limits>
 
 #include "base/Text.h"
@@ -11,94 +12,7 @@ namespace {
 
 constexpr std::int64_t kMostInt32 = std::numeric_limits<std::int32_t>::max();
 
-std::int64_t Number(std::string_view name, std::string_view text, std::int64_t most) {
-  std::int64_t number = 0;
-  const auto [stop, status] = std::from_chars(text.data(), text.data() + text.size(), number);
-  if (status != std::errc{} || stop != text.data() + text.size() || number < 0 || number > most)
-    throw OptionError(std::string(name) + " wants a number from 0 to " + std::to_string(most) + ", not \"" +
-                      std::string(text) + "\"");
-  return number;
-}
-
-void Check(const Options& options) {
-  if (options.data.empty()) throw OptionError("--data is missing");
-  if (options.seedUser.empty()) {
-    if (!options.seedPassword.empty() || !options.seedPictures.empty() || options.seedProduct != 0)
-      throw OptionError("--seed-password, --seed-product and --seed-pictures need --seed-user");
-    return;
-  }
-  if (IsRefusedUserName(options.seedUser)) throw OptionError("--seed-user is no name for a user");
-  if (!TextFromUtf8(options.seedPassword) || Strip(options.seedPassword).empty())
-    throw OptionError("--seed-user needs a --seed-password with letters or digits");
-  if (!options.seedPictures.empty() && !std::filesystem::is_directory(options.seedPictures))
-    throw OptionError("--seed-pictures is no folder: " + options.seedPictures.string());
-}
-
-}  // namespace
-
-Options ParseOptions(const std::vector<std::string_view>& arguments) {
-  Options options;
-  for (std::size_t i = 0; i < arguments.size(); i += 2) {
-    const std::string_view name = arguments[i];
-    if (name == "--help") {
-      options.help = true;
-      return options;
-    }
-    if (i + 1 == arguments.size()) throw OptionError(std::string(name) + " is unknown or lacks its value");
-    const std::string_view value = arguments[i + 1];
-
-    if (name == "--host") {
-      options.host = value;
-    } else if (name == "--port") {
-      options.port = static_cast<int>(Number(name, value, 65535));
-    } else if (name == "--data") {
-      options.data = value;
-    } else if (name == "--seed-user") {
-      options.seedUser = value;
-    } else if (name == "--seed-password") {
-      options.seedPassword = value;
-    } else if (name == "--seed-product") {
-      options.seedProduct = Number(name, value, kMostInt32);
-    } else if (name == "--seed-pictures") {
-      options.seedPictures = value;
-    } else if (name == "--soft-limit") {
-      options.softLimit = Number(name, value, kMostInt32);
-    } else if (name == "--hard-limit") {
-      options.hardLimit = Number(name, value, kMostInt32);
-    } else if (name == "--quota") {
-      options.quota = static_cast<std::uint64_t>(Number(name, value, std::int64_t{1} << 50));
-    } else if (name == "--expire-days") {
-      options.expireDays = Number(name, value, 1'000'000);
-    } else if (name == "--fault") {
-      const auto fault = ParseFault(value);
-      if (!fault) throw OptionError("--fault wants WHERE=KIND[:ARG], not \"" + std::string(value) + "\"");
-      options.faults.push_back(*fault);
-    } else {
-      throw OptionError("unknown option " + std::string(name));
-    }
-  }
-  Check(options);
-  return options;
-}
-
-std::string_view HelpText() {
-  return R"(tarnwick-hosting: a hosting server for development and tests on this machine
-
-  --data DIR            folder of accounts, files and mails (made when it is not there); required
-  --host ADDRESS        address to listen on (127.0.0.1)
-  --port N              port to listen on; 0 is any free one (0). The first line printed names it.
-  --seed-user NAME      account to make when it is not there yet
-  --seed-password TEXT  its password
-  --seed-product N      its product number; 0 fits every product (0)
-  --seed-pictures DIR   its first files
-  --soft-limit N        number of accounts from which a host should warn; only told (900)
-  --hard-limit N        most accounts (1000)
-  --quota BYTES         of each account (104857600)
-  --expire-days N       period of an account; 0 makes every account an expired one (365)
-  --fault WHERE=KIND[:ARG]
-                        a fault to show; may be given several times
-  --help                this text
-
+constexpr const char* kFaults = R"(
 WHERE is an action word (ListFiles), a page (UploadAcceptor.asp), the start of a path (/users/) or *.
 KIND is one of
   refuse            the connection is closed without an answer; nothing is carried out
@@ -116,8 +30,84 @@ KIND is one of
   empty             200 and no body
   length:N          N as the announced length of the body
   late-close[:MS]   a whole answer that says nothing about the connection, which serves no other request and is
-                    closed 20, or MS, milliseconds later
-)";
+                    closed 20, or MS, milliseconds later)";
+
+// The messages of these checks follow the option's name.
+std::string CheckUserName(const std::string& name) {
+  return IsRefusedUserName(name) ? "no name for a user" : "";
+}
+std::string CheckPassword(const std::string& password) {
+  return TextFromUtf8(password) && !Strip(password).empty() ? "" : "wants letters or digits";
+}
+std::string CheckFault(const std::string& fault) {
+  return ParseFault(fault) ? "" : "wants WHERE=KIND[:ARG], not \"" + fault + "\"";
+}
+std::string CheckNotEmpty(const std::string& value) {
+  return value.empty() ? "is empty" : "";
+}
+
+}  // namespace
+
+Options ParseOptions(std::vector<std::string> arguments) {
+  Options options;
+  CLI::App app("A hosting server for development and tests on this machine", "tarnwick-hosting");
+  app.set_help_flag("--help", "this text");
+  app.footer(kFaults);
+  // Whoever calls a script that starts the server can give an option once more.
+  app.option_defaults()->take_last();
+  const auto number = [&](const std::string& name, auto& value, std::int64_t most, const std::string& what) {
+    return app.add_option(name, value, what)
+        ->type_name("N")
+        ->check(CLI::Range(std::int64_t{0}, most).description(""))
+        ->capture_default_str();
+  };
+
+  app.add_option("--data", options.data, "folder of accounts, files and mails (made when it is not there)")
+      ->type_name("DIR")
+      ->check(CheckNotEmpty)
+      ->required();
+  app.add_option("--host", options.host, "address to listen on")->type_name("ADDRESS")->capture_default_str();
+  number("--port", options.port, 65'535,
+         "port to listen on; 0 is any free one. The first line printed names it.");
+  CLI::Option* const user =
+      app.add_option("--seed-user", options.seedUser, "account to make when it is not there yet")
+          ->type_name("NAME")
+          ->check(CheckUserName);
+  CLI::Option* const password = app.add_option("--seed-password", options.seedPassword, "its password")
+                                    ->type_name("TEXT")
+                                    ->check(CheckPassword)
+                                    ->needs(user);
+  user->needs(password);
+  number("--seed-product", options.seedProduct, kMostInt32, "its product number; 0 fits every product")
+      ->needs(user);
+  app.add_option("--seed-pictures", options.seedPictures, "its first files")
+      ->type_name("DIR")
+      ->check(CLI::ExistingDirectory.description(""))
+      ->needs(user);
+  number("--soft-limit", options.softLimit, kMostInt32,
+         "number of accounts from which a host should warn; only told");
+  number("--hard-limit", options.hardLimit, kMostInt32, "most accounts");
+  number("--quota", options.quota, std::int64_t{1} << 50, "bytes of each account");
+  number("--expire-days", options.expireDays, 1'000'000,
+         "period of an account; 0 makes every account an expired one");
+  std::vector<std::string> faults;
+  app.add_option("--fault", faults, "a fault to show; may be given several times")
+      ->type_name("WHERE=KIND[:ARG]")
+      ->check(CheckFault)
+      ->take_all()
+      ->allow_extra_args(false);
+
+  try {
+    // The last one is read first.
+    std::reverse(arguments.begin(), arguments.end());
+    app.parse(std::move(arguments));
+  } catch (const CLI::CallForHelp&) {
+    options.help = app.help();
+  } catch (const CLI::ParseError& error) {
+    throw OptionError(error.what());
+  }
+  for (const std::string& fault : faults) options.faults.push_back(*ParseFault(fault));
+  return options;
 }
 
 }  // namespace tarnwick::hosting

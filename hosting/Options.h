@@ -5,7 +5,6 @@
 #include <filesystem>
 #include <stdexcept>
 #include <string>
-#include <string_view>
 #include <vector>
 
 #include "hosting/Faults.h"
@@ -28,7 +27,7 @@ struct Options {
   std::int64_t expireDays = 365;
   std::vector<Fault> faults;
 
-  bool help = false;
+  std::string help;  // what --help asked for; empty: nothing did
 };
 
 class OptionError : public std::runtime_error {
@@ -36,9 +35,6 @@ class OptionError : public std::runtime_error {
 };
 
 // Reads the arguments after the program's name. Throws OptionError with a sentence for the user.
-Options ParseOptions(const std::vector<std::string_view>& arguments);
-
-// The text of --help.
-std::string_view HelpText();
+Options ParseOptions(std::vector<std::string> arguments);
 
 }  // namespace tarnwick::hosting

@@ -4,7 +4,6 @@
 #include <cstdio>
 #include <exception>
 #include <string>
-#include <string_view>
 #include <vector>
 
 #include "hosting/Options.h"
@@ -47,9 +46,9 @@ int Serve(const hosting::Options& options) {
 int main(int count, char** arguments) {
   try {
     const hosting::Options options =
-        hosting::ParseOptions(std::vector<std::string_view>(arguments + 1, arguments + count));
-    if (options.help) {
-      std::fputs(std::string(hosting::HelpText()).c_str(), stdout);
+        hosting::ParseOptions(std::vector<std::string>(arguments + 1, arguments + count));
+    if (!options.help.empty()) {
+      std::fputs(options.help.c_str(), stdout);
       return 0;
     }
     return Serve(options);

@@ -297,17 +297,17 @@ TEST(ConnectionTest, AHeadHasItsTimeAndABodyTakesAsLongAsItArrives) {
 }
 
 TEST(OptionsTest, BadOptionsAreToldApartFromGoodOnes) {
-  using Arguments = std::vector<std::string_view>;
+  using Arguments = std::vector<std::string>;
   const Options options =
-      ParseOptions({"--data", "d", "--port", "81", "--fault", "/a=b/=drip:5", "--seed-user", "a@b.c",
-                    "--seed-password", "x=y", "--quota", "5", "--expire-days", "0"});
-  EXPECT_EQ(options.data, "d");
+      ParseOptions({"--data", "d d", "--port=80", "--port", "81", "--fault", "/a=b/=drip:5", "--fault=*=cut",
+                    "--seed-user", "a@b.c", "--seed-password=x=y", "--quota", "5", "--expire-days", "0"});
+  EXPECT_EQ(options.data, "d d");
   EXPECT_EQ(options.port, 81);
   EXPECT_EQ(options.seedPassword, "x=y");
-  ASSERT_EQ(options.faults.size(), 1U);
+  ASSERT_EQ(options.faults.size(), 2U);
   EXPECT_EQ(options.faults[0].where, "/a=b/");
   EXPECT_EQ(options.faults[0].amount, 5U);
-  EXPECT_TRUE(ParseOptions({"--help"}).help);
+  EXPECT_NE(ParseOptions({"--help"}).help.find("--data"), std::string::npos);
   for (const Arguments& bad :
        {Arguments{}, Arguments{"--data"}, Arguments{"--data", "d", "--port", "65536"},
         Arguments{"--data", "d", "--port", "x"}, Arguments{"--data", "d", "--prot", "1"},
