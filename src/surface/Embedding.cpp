@@ -20,12 +20,7 @@ constexpr std::array kFormats = {
     FORMATETC{CF_METAFILEPICT, nullptr, DVASPECT_CONTENT, -1, TYMED_MFPICT},
 };
 
-struct MetafileKind {
-  using Handle = HENHMETAFILE;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { DeleteEnhMetaFile(handle); }
-};
-using MetafileOwner = Owner<MetafileKind>;
+using MetafileOwner = Owner<HENHMETAFILE, DeleteEnhMetaFile>;
 
 // The screen, as what a metafile measures itself against.
 class Reference {

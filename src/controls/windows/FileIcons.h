@@ -7,12 +7,7 @@
 
 namespace tarnwick {
 
-struct ImageListKind {
-  using Handle = HIMAGELIST;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { ImageList_Destroy(handle); }
-};
-using ImageListOwner = Owner<ImageListKind>;
+using ImageListOwner = Owner<HIMAGELIST, ImageList_Destroy>;
 
 // Entries count from 1, as hosts count. GIF files have entry 2 of the large pictures and entry 4 of the small
 // ones, JPEG files and all others entries 4 and 5; the entries between are plain pages.

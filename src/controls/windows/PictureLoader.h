@@ -7,13 +7,6 @@
 
 namespace tarnwick {
 
-struct BitmapKind {
-  using Handle = HBITMAP;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { DeleteObject(handle); }
-};
-using BitmapOwner = Owner<BitmapKind>;
-
 // Reads a PNG, GIF (its first picture), JPEG or BMP file, told by its bytes and not by its name, scales it to
 // exactly `width` x `height` device pixels and lays it on `background`, which shows through where the picture
 // is transparent. When it shrinks, each pixel is the average of all that it covers, parts of pixels included.

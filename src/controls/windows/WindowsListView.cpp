@@ -84,7 +84,7 @@ void WindowsListView::Layout() const {
 }
 
 void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
-  const HGDIOBJ oldFont = SelectObject(dc, Font());
+  const SelectionOwner font = SelectInto(dc, Font());
   SetDCBrushColor(dc, BackColor());
   FillRect(dc, &bounds, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
   SetTextColor(dc, TextColor());
@@ -96,7 +96,6 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
   if (!listShown_) {
     RECT middle = {bounds.left, (bounds.top + bounds.bottom - line) / 2, bounds.right, bounds.bottom};
     DrawTextW(dc, WideFromText(labelText_).c_str(), -1, &middle, DT_CENTER | DT_TOP | DT_NOPREFIX);
-    SelectObject(dc, oldFont);
     return;
   }
   const int width = MulDiv(kColumnWidth, Dpi(), 96);
@@ -120,7 +119,6 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
       DrawTextW(dc, WideFromText(text).c_str(), -1, &cell, kCell);
     }
   }
-  SelectObject(dc, oldFont);
 }
 
 void WindowsListView::SetColumns(std::span<const ListColumn> columns) {

@@ -33,13 +33,6 @@ constexpr UINT kLinkFormat = DT_CENTER | DT_VCENTER | DT_SINGLELINE | DT_NOPREFI
 // Pictures in a row, and on a page.
 constexpr int kStep = 2;
 
-struct MemoryDcKind {
-  using Handle = HDC;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { DeleteDC(handle); }
-};
-using MemoryDcOwner = Owner<MemoryDcKind>;
-
 void Fill(HDC dc, const RECT& area, COLORREF color) {
   SetDCBrushColor(dc, color);
   FillRect(dc, &area, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
@@ -49,19 +42,6 @@ RECT Moved(RECT area, LONG x, LONG y) {
   OffsetRect(&area, x, y);
   return area;
 }
-
-// What a drawing selects into a device context, taken out again at its end.
-class Selected {
- public:
-  Selected(HDC dc, HGDIOBJ object) : dc_(dc), old_(SelectObject(dc, object)) {}
-  ~Selected() { SelectObject(dc_, old_); }
-  Selected(const Selected&) = delete;
-  Selected& operator=(const Selected&) = delete;
-
- private:
-  const HDC dc_;
-  const HGDIOBJ old_;
-};
 
 void DrawFocus(HDC dc, const RECT& area) {
   // The dots take these colours.
@@ -223,12 +203,11 @@ void WindowsThumbnailPage::ApplyTexts() const {
   // Only over its text is the link a link.
   const RECT room = Pixels(layout::kLink);
   SIZE text = {};
-  const HDC dc = GetDC(linkWindow_);
   {
-    const Selected font(dc, linkFont_.Get());
-    GetTextExtentPoint32W(dc, link.c_str(), static_cast<int>(link.size()), &text);
+    const WindowDcOwner dc = DcOf(linkWindow_);
+    const SelectionOwner font = SelectInto(dc.Get().dc, linkFont_.Get());
+    GetTextExtentPoint32W(dc.Get().dc, link.c_str(), static_cast<int>(link.size()), &text);
   }
-  ReleaseDC(linkWindow_, dc);
   const int width = std::min<int>(text.cx + 2 * Pixels(60), room.right - room.left);
   MoveWindow(linkWindow_, (room.left + room.right - width) / 2, room.top, width, room.bottom - room.top,
              TRUE);
@@ -382,12 +361,11 @@ void WindowsThumbnailPage::PlaceEditor() const {
   const RECT frame = Pixels(kFrames[static_cast<std::size_t>(edited_) - 1]);
   const RECT caption = Pixels(kCaption);
   TEXTMETRICW metrics = {};
-  const HDC dc = GetDC(editorWindow_);
   {
-    const Selected font(dc, Font());
-    GetTextMetricsW(dc, &metrics);
+    const WindowDcOwner dc = DcOf(editorWindow_);
+    const SelectionOwner font = SelectInto(dc.Get().dc, Font());
+    GetTextMetricsW(dc.Get().dc, &metrics);
   }
-  ReleaseDC(editorWindow_, dc);
   const int height = std::min<int>(metrics.tmHeight + 2 * Pixels(45), caption.bottom - caption.top);
   MoveWindow(editorWindow_, frame.left + caption.left, frame.top + caption.top, caption.right - caption.left,
              height, TRUE);
@@ -629,7 +607,7 @@ void WindowsThumbnailPage::Paint(HWND window) const {
     GetClientRect(window, &client);
     const MemoryDcOwner memory(CreateCompatibleDC(screen));
     const BitmapOwner bitmap(CreateCompatibleBitmap(screen, client.right, client.bottom));
-    const Selected picture(memory.Get(), bitmap.Get());
+    const SelectionOwner picture = SelectInto(memory.Get(), bitmap.Get());
     DrawSlot(memory.Get(), client, slots_[static_cast<std::size_t>(slot) - 1], GetFocus() == gridWindow_);
     BitBlt(screen, 0, 0, client.right, client.bottom, memory.Get(), 0, 0, SRCCOPY);
   }
@@ -649,7 +627,7 @@ void WindowsThumbnailPage::DrawSlot(HDC dc, const RECT& frame, const Slot& slot,
   if (slot.picture) {
     const RECT place = placed(slot.place);
     const MemoryDcOwner memory(CreateCompatibleDC(nullptr));
-    const Selected picture(memory.Get(), slot.picture.Get());
+    const SelectionOwner picture = SelectInto(memory.Get(), slot.picture.Get());
     BITMAP bitmap = {};
     GetObjectW(slot.picture.Get(), sizeof bitmap, &bitmap);
     // One to one on the screen, as a rule; a printer may map pixels to many.
@@ -669,7 +647,7 @@ void WindowsThumbnailPage::DrawSlot(HDC dc, const RECT& frame, const Slot& slot,
 void WindowsThumbnailPage::DrawCaption(HDC dc, RECT area, const Slot& slot) const {
   if (slot.caption.empty()) return;
   const std::wstring text = WideFromText(slot.caption);
-  const Selected font(dc, Font());
+  const SelectionOwner font = SelectInto(dc, Font());
   InflateRect(&area, -Pixels(15), -Pixels(15));
   RECT lines = area;
   DrawTextW(dc, text.c_str(), -1, &lines, kCaptionFormat | DT_CALCRECT);
@@ -684,7 +662,7 @@ void WindowsThumbnailPage::DrawCaption(HDC dc, RECT area, const Slot& slot) cons
 
 void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
   Fill(dc, area, BackColor());
-  const Selected font(dc, linkFont_ ? linkFont_.Get() : Font());
+  const SelectionOwner font = SelectInto(dc, linkFont_ ? linkFont_.Get() : Font());
   SetTextColor(dc, kLinkColor);
   SetBkMode(dc, TRANSPARENT);
   DrawTextW(dc, WideFromText(link_).c_str(), -1, &area, kLinkFormat);
@@ -709,13 +687,13 @@ void WindowsThumbnailPage::DrawScrollBar(HDC dc, const RECT& area) const {
 }
 
 void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) const {
-  const int saved = SaveDC(dc);
+  const SavedDcOwner saved = SaveStateOf(dc);
   IntersectClipRect(dc, bounds.left, bounds.top, bounds.right, bounds.bottom);
   Fill(dc, bounds, BackColor());
   const auto placed = [&](const layout::TwipRect& area) {
     return Moved(Pixels(area), bounds.left, bounds.top);
   };
-  SelectObject(dc, Font());
+  const SelectionOwner font = SelectInto(dc, Font());
   SetBkMode(dc, TRANSPARENT);
   if (content_ == Content::kGrid) {
     for (std::size_t slot = 0; slot < kSlotCount; ++slot)
@@ -731,7 +709,6 @@ void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) const {
   DrawFrameControl(dc, &button, DFC_BUTTON, DFCS_BUTTONPUSH);
   SetTextColor(dc, GetSysColor(COLOR_BTNTEXT));
   DrawTextW(dc, kSwitchText, -1, &button, DT_CENTER | DT_VCENTER | DT_SINGLELINE);
-  RestoreDC(dc, saved);
 }
 
 }  // namespace tarnwick

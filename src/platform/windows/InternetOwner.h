@@ -8,12 +8,7 @@
 
 namespace tarnwick {
 
-struct InternetKind {
-  using Handle = HINTERNET;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { InternetCloseHandle(handle); }
-};
-using InternetOwner = Owner<InternetKind>;
+using InternetOwner = Owner<HINTERNET, InternetCloseHandle>;
 
 // Sets the time-outs, in milliseconds, of a session, which what it opens inherits. A version of the system
 // that lacks one of them ignores it; then a peer that never answers the connection costs what TCP itself

@@ -3,6 +3,7 @@
 
 #include <atomic>
 #include <cstdint>
+#include <type_traits>
 #include <utility>
 
 #include "platform/windows/WindowsHeaders.h"
@@ -13,75 +14,108 @@ namespace tarnwick {
 // everywhere, so this is how tests and diagnostics see a leak.
 inline std::atomic<std::int32_t> ownedObjects{0};
 
-// Kind names the type `Handle`, the value None() that means "nothing" and the function Close(handle).
-template <typename Kind>
+// Holds a T, which Close(held) ends; a T of the value None holds nothing. None may be a number where the
+// system's "nothing" is no null pointer.
+template <typename T, auto Close, auto None = nullptr>
 class Owner {
  public:
-  using Handle = typename Kind::Handle;
-
   Owner() = default;
-  // Takes over `handle`, which may be None().
-  explicit Owner(Handle handle) : handle_(handle) {
+  // Takes over `held`, which may be nothing.
+  explicit Owner(T held) : held_(held) {
     if (*this) ++ownedObjects;
   }
-  Owner(Owner&& other) noexcept : handle_(std::exchange(other.handle_, Kind::None())) {}
+  Owner(Owner&& other) noexcept : held_(std::exchange(other.held_, Nothing())) {}
   Owner& operator=(Owner&& other) noexcept {
     Owner(std::move(other)).Swap(*this);
     return *this;
   }
   ~Owner() {
     if (!*this) return;
-    Kind::Close(handle_);
+    Close(held_);
     --ownedObjects;
   }
 
-  explicit operator bool() const { return handle_ != Kind::None(); }
-  Handle Get() const { return handle_; }
+  explicit operator bool() const { return held_ != Nothing(); }
+  T Get() const { return held_; }
   // Gives up what it holds without closing it.
-  Handle Detach() {
+  T Detach() {
     if (*this) --ownedObjects;
-    return std::exchange(handle_, Kind::None());
+    return std::exchange(held_, Nothing());
   }
 
  private:
-  void Swap(Owner& other) noexcept { std::swap(handle_, other.handle_); }
+  static T Nothing() {
+    if constexpr (std::is_null_pointer_v<decltype(None)>)
+      return {};
+    else
+      return reinterpret_cast<T>(None);
+  }
+  void Swap(Owner& other) noexcept { std::swap(held_, other.held_); }
 
-  Handle handle_ = Kind::None();
+  T held_ = Nothing();
 };
 
-struct RegistryKeyKind {
-  using Handle = HKEY;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { RegCloseKey(handle); }
-};
-using KeyOwner = Owner<RegistryKeyKind>;
+// INVALID_HANDLE_VALUE, which is no constant for the compiler.
+inline constexpr std::intptr_t kInvalidHandle = -1;
 
-struct LibraryKind {
-  using Handle = HMODULE;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { FreeLibrary(handle); }
-};
-using LibraryOwner = Owner<LibraryKind>;
+using KeyOwner = Owner<HKEY, RegCloseKey>;
+using LibraryOwner = Owner<HMODULE, FreeLibrary>;
+using FileOwner = Owner<HANDLE, CloseHandle, kInvalidHandle>;
+using FindOwner = Owner<HANDLE, FindClose, kInvalidHandle>;
+// Of all other objects of the kernel, such as processes and events, whose "nothing" is null.
+using HandleOwner = Owner<HANDLE, CloseHandle>;
 
-struct FileKind {
-  using Handle = HANDLE;
-  static Handle None() { return INVALID_HANDLE_VALUE; }
-  static void Close(Handle handle) { CloseHandle(handle); }
-};
-using FileOwner = Owner<FileKind>;
+// --- For drawing ---
 
-struct FindKind {
-  using Handle = HANDLE;
-  static Handle None() { return INVALID_HANDLE_VALUE; }
-  static void Close(Handle handle) { FindClose(handle); }
-};
-using FindOwner = Owner<FindKind>;
+using FontOwner = Owner<HFONT, DeleteObject>;
+using BitmapOwner = Owner<HBITMAP, DeleteObject>;
+using BrushOwner = Owner<HBRUSH, DeleteObject>;
+using PenOwner = Owner<HPEN, DeleteObject>;
+using MemoryDcOwner = Owner<HDC, DeleteDC>;
 
-struct FontKind {
-  using Handle = HFONT;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { DeleteObject(handle); }
+// Owners of two values that end together.
+
+// The device context of a window; of the screen for a null window.
+struct WindowDc {
+  HWND window;
+  HDC dc;
+  bool operator==(const WindowDc&) const = default;
 };
-using FontOwner = Owner<FontKind>;
+inline void ReleaseWindowDc(const WindowDc& held) {
+  ReleaseDC(held.window, held.dc);
+}
+using WindowDcOwner = Owner<WindowDc, ReleaseWindowDc>;
+inline WindowDcOwner DcOf(HWND window) {
+  const HDC dc = GetDC(window);
+  return dc ? WindowDcOwner({window, dc}) : WindowDcOwner();
+}
+
+// What was selected before, and is selected again at the end.
+struct Selection {
+  HDC dc;
+  HGDIOBJ before;
+  bool operator==(const Selection&) const = default;
+};
+inline void EndSelection(const Selection& held) {
+  SelectObject(held.dc, held.before);
+}
+using SelectionOwner = Owner<Selection, EndSelection>;
+[[nodiscard]] inline SelectionOwner SelectInto(HDC dc, HGDIOBJ object) {
+  return SelectionOwner({dc, SelectObject(dc, object)});
+}
+
+// The state of a device context, which comes back at the end.
+struct SavedDc {
+  HDC dc;
+  int state;
+  bool operator==(const SavedDc&) const = default;
+};
+inline void RestoreSavedDc(const SavedDc& held) {
+  RestoreDC(held.dc, held.state);
+}
+using SavedDcOwner = Owner<SavedDc, RestoreSavedDc>;
+[[nodiscard]] inline SavedDcOwner SaveStateOf(HDC dc) {
+  return SavedDcOwner({dc, SaveDC(dc)});
+}
 
 }  // namespace tarnwick

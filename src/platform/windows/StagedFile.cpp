@@ -11,13 +11,6 @@
 namespace tarnwick {
 namespace {
 
-struct ProcessKind {
-  using Handle = HANDLE;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { CloseHandle(handle); }
-};
-using ProcessOwner = Owner<ProcessKind>;
-
 std::wstring NameOf(DWORD process, DWORD tick, DWORD number) {
   std::array<wchar_t, 40> name{};
   wsprintfW(name.data(), L"twk%lx-%lx-%lx.tmp", process, tick, number);
@@ -41,7 +34,7 @@ DWORD WriterOf(const wchar_t* name) {
 
 // Whether the process runs and was there when the file was made: a later one may have the number again.
 bool Lives(DWORD process, const FILETIME& fileMade) {
-  const ProcessOwner owner(OpenProcess(PROCESS_QUERY_LIMITED_INFORMATION, FALSE, process));
+  const HandleOwner owner(OpenProcess(PROCESS_QUERY_LIMITED_INFORMATION, FALSE, process));
   if (!owner) return GetLastError() == ERROR_ACCESS_DENIED;
   DWORD code = 0;
   if (GetExitCodeProcess(owner.Get(), &code) && code != STILL_ACTIVE) return false;

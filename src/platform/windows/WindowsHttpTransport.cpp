@@ -43,19 +43,7 @@ constexpr DWORD kGraceMs = 200;
 // More than anybody leaves open to one server.
 constexpr int kMostOldConnections = 100;
 
-struct HttpKind {
-  using Handle = HINTERNET;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { WinHttpCloseHandle(handle); }
-};
-using HttpOwner = Owner<HttpKind>;
-
-struct EventKind {
-  using Handle = HANDLE;
-  static Handle None() { return nullptr; }
-  static void Close(Handle handle) { CloseHandle(handle); }
-};
-using EventOwner = Owner<EventKind>;
+using HttpOwner = Owner<HINTERNET, WinHttpCloseHandle>;
 
 std::wstring WideFromAscii(std::string_view ascii) {
   return {ascii.begin(), ascii.end()};
@@ -65,7 +53,7 @@ std::wstring WideFromAscii(std::string_view ascii) {
 // live until it has let go of the request.
 struct Exchange {
   // Something was told.
-  const EventOwner told{CreateEventW(nullptr, FALSE, FALSE, nullptr)};
+  const HandleOwner told{CreateEventW(nullptr, FALSE, FALSE, nullptr)};
   // The notification that ended the call that runs; 0 until it comes.
   std::atomic<DWORD> end = 0;
   // Bytes that a read has brought.
