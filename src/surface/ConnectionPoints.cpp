@@ -4,6 +4,7 @@
 
 #include "surface/ComEnumerator.h"
 #include "surface/Guard.h"
+#include "surface/Module.h"
 
 namespace tarnwick {
 
@@ -53,13 +54,16 @@ STDMETHODIMP ConnectionPoint::Advise(IUnknown* sink, DWORD* cookie) {
 }
 
 STDMETHODIMP ConnectionPoint::Unadvise(DWORD cookie) {
-  const auto found = std::find_if(connections_.begin(), connections_.end(),
-                                  [&](const Connection& known) { return known.cookie == cookie; });
-  if (found == connections_.end()) return CONNECT_E_NOCONNECTION;
-  // Released last: that may run code of the host's that comes back here.
-  const ComPtr<IUnknown> gone = std::move(found->sink);
-  connections_.erase(found);
-  return S_OK;
+  const ComPtr<IConnectionPoint> alive(this);
+  return Guarded([&] {
+    const auto found = std::find_if(connections_.begin(), connections_.end(),
+                                    [&](const Connection& known) { return known.cookie == cookie; });
+    if (found == connections_.end()) return CONNECT_E_NOCONNECTION;
+    // Released last: that may run code of the host's, which may re-enter here.
+    const ComPtr<IUnknown> gone = std::move(found->sink);
+    connections_.erase(found);
+    return S_OK;
+  });
 }
 
 STDMETHODIMP ConnectionPoint::EnumConnections(IEnumConnections** enumerator) {
@@ -75,10 +79,10 @@ STDMETHODIMP ConnectionPoint::EnumConnections(IEnumConnections** enumerator) {
   });
 }
 
-void RaiseEvent(const ConnectionPoint& events, DISPID id, std::span<VARIANT> arguments) {
+void ConnectionPoints::Raise(DISPID id, std::span<VARIANT> arguments) const {
   std::vector<VARIANT> reversed(arguments.rbegin(), arguments.rend());
   DISPPARAMS parameters = {reversed.data(), nullptr, static_cast<UINT>(reversed.size()), 0};
-  for (const ComPtr<IUnknown>& sink : events.Sinks()) {
+  for (const ComPtr<IUnknown>& sink : events_.Sinks()) {
     // Not asked for IDispatch: an object that listens to several controls has one for each.
     auto* const dispatch = static_cast<IDispatch*>(sink.Get());
     Variant ignored;
@@ -87,9 +91,42 @@ void RaiseEvent(const ConnectionPoint& events, DISPID id, std::span<VARIANT> arg
   }
 }
 
-void NotifyChanged(const ConnectionPoint& listeners, DISPID property) {
-  for (const ComPtr<IUnknown>& sink : listeners.Sinks())
+void ConnectionPoints::NotifyChanged(DISPID property) const {
+  for (const ComPtr<IUnknown>& sink : propertyListeners_.Sinks())
     static_cast<IPropertyNotifySink*>(sink.Get())->OnChanged(property);
+}
+
+STDMETHODIMP ConnectionPoints::EnumConnectionPoints(IEnumConnectionPoints** enumerator) {
+  if (!enumerator) return E_POINTER;
+  *enumerator = nullptr;
+  return Entered([&] {
+    *enumerator =
+        new ComEnumerator<IEnumConnectionPoints, IConnectionPoint*>({&events_, &propertyListeners_});
+    return S_OK;
+  });
+}
+
+STDMETHODIMP ConnectionPoints::FindConnectionPoint(REFIID interfaceId, IConnectionPoint** point) {
+  if (!point) return E_POINTER;
+  *point = nullptr;
+  if (interfaceId == eventInterface_) *point = &events_;
+  if (interfaceId == IID_IPropertyNotifySink) *point = &propertyListeners_;
+  if (!*point) return CONNECT_E_NOCONNECTION;
+  AddRef();
+  return S_OK;
+}
+
+STDMETHODIMP ConnectionPoints::GetClassInfo(ITypeInfo** info) {
+  if (!info) return E_POINTER;
+  *info = module::TypeInfo(hooks_.ClassId()).Detach();
+  return *info ? S_OK : TYPE_E_CANTLOADLIBRARY;
+}
+
+STDMETHODIMP ConnectionPoints::GetGUID(DWORD kind, GUID* guid) {
+  if (!guid) return E_POINTER;
+  if (kind != GUIDKIND_DEFAULT_SOURCE_DISP_IID) return E_INVALIDARG;
+  *guid = eventInterface_;
+  return S_OK;
 }
 
 }  // namespace tarnwick

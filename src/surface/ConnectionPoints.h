@@ -1,16 +1,13 @@
-// The two things that a control's container listens to: the control's own events, and changes of its
-// properties.
+// What a control's container listens to: the control's own events, and changes of its properties.
 #pragma once
 
 #include <olectl.h>
 
-#include <array>
-#include <memory>
 #include <span>
 #include <vector>
 
 #include "platform/windows/ComPtr.h"
-#include "surface/Automation.h"
+#include "surface/ControlPart.h"
 
 namespace tarnwick {
 
@@ -48,12 +45,37 @@ class ConnectionPoint final : public IConnectionPoint {
   DWORD lastCookie_ = 0;
 };
 
-// Raises event `id` at all sinks. `arguments` are in the order of the declaration; the caller keeps owning
-// them, and sees what the sinks changed through references. A sink's failure does not keep the others from
-// being called.
-void RaiseEvent(const ConnectionPoint& events, DISPID id, std::span<VARIANT> arguments);
+// The connection points of a control.
+class ConnectionPoints final : public ControlPart<IConnectionPointContainer, IProvideClassInfo2> {
+ public:
+  // `events` is the interface of the control's events.
+  ConnectionPoints(OleControlHooks& hooks, REFIID events)
+      : ControlPart(hooks), eventInterface_(events), events_(*this, events) {}
 
-// Tells the listeners of property changes that `property` has changed.
-void NotifyChanged(const ConnectionPoint& listeners, DISPID property);
+  ConnectionPoint& Events() { return events_; }
+  ConnectionPoint& PropertyListeners() { return propertyListeners_; }
+
+  // Raises event `id` at all sinks, whose code may release the control inside. `arguments` are in the order
+  // of the declaration; the caller keeps owning them, and sees what the sinks changed through references. A
+  // sink's failure does not keep the others from being called. Throws std::bad_alloc.
+  void Raise(DISPID id, std::span<VARIANT> arguments) const;
+
+  // Notifies the listeners, whose code may release the control inside, that `property` has changed. Throws
+  // std::bad_alloc.
+  void NotifyChanged(DISPID property) const;
+
+  // IConnectionPointContainer
+  STDMETHODIMP EnumConnectionPoints(IEnumConnectionPoints** enumerator) override;
+  STDMETHODIMP FindConnectionPoint(REFIID interfaceId, IConnectionPoint** point) override;
+
+  // IProvideClassInfo2
+  STDMETHODIMP GetClassInfo(ITypeInfo** info) override;
+  STDMETHODIMP GetGUID(DWORD kind, GUID* guid) override;
+
+ private:
+  const IID eventInterface_;
+  ConnectionPoint events_;
+  ConnectionPoint propertyListeners_{*this, IID_IPropertyNotifySink};
+};
 
 }  // namespace tarnwick
