@@ -50,12 +50,16 @@ STDMETHODIMP CFileUploadObject::put_UploadObject(_CUpload* value) {
 }
 
 STDMETHODIMP CFileUploadObject::putref_UploadObject(_CUpload* value) {
-  ComPtr<CUploadObject> object = CUploadObject::From(value);
-  // Records are made by the library only.
-  if (value && !object) return DISP_E_TYPEMISMATCH;
-  client_->SetUploadObject(object ? object->Record() : nullptr);
-  uploadObject_ = std::move(object);
-  return S_OK;
+  // The value may be an object of the host's, whose code may release the client.
+  const ComPtr<IUnknown> alive(static_cast<IDispatch*>(this));
+  return Guarded([&]() -> HRESULT {
+    ComPtr<CUploadObject> object = CUploadObject::From(value);
+    // Records are made by the library only.
+    if (value && !object) return DISP_E_TYPEMISMATCH;
+    client_->SetUploadObject(object ? object->Record() : nullptr);
+    uploadObject_ = std::move(object);
+    return S_OK;
+  });
 }
 
 STDMETHODIMP CFileUploadObject::ConnectToServer(BSTR szServer, VARIANT_BOOL* result) {

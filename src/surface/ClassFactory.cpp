@@ -55,8 +55,10 @@ class ClassFactory final : public ComObject<IClassFactory> {
     });
   }
   STDMETHODIMP LockServer(BOOL lock) override {
-    lock ? module::Hold() : module::LetGo();
-    return S_OK;
+    return Guarded([&] {
+      lock ? module::Hold() : module::LetGo();
+      return S_OK;
+    });
   }
 
  private:

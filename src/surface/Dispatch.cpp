@@ -4,7 +4,6 @@
 
 #include "platform/windows/ComPtr.h"
 #include "surface/Automation.h"
-#include "surface/Guard.h"
 
 namespace tarnwick {
 namespace {
@@ -160,47 +159,45 @@ HRESULT InvokeMember(ITypeInfo& description, void* object, DISPID member, WORD f
   // Most calls of a script read a property: there is nothing to prepare.
   if (arguments->cArgs == 0)
     return description.Invoke(object, member, flags, arguments, result, exception, argumentError);
-  return Guarded([&] {
-    const MemberDescription known(description, member, flags);
-    // Wine: the type information does not find all of the errors that are found here and below.
-    if (known.IsKnown() && arguments->cArgs > known.ParameterCount()) return DISP_E_BADPARAMCOUNT;
-    const auto refuse = [&](UINT argument, HRESULT error) {
-      if (argumentError) *argumentError = argument;
-      return error;
-    };
-    std::vector<VARIANT> values(arguments->rgvarg, arguments->rgvarg + arguments->cArgs);
-    std::vector<StandIn> standIns;
-    // References into it are taken below, so it must not move.
-    standIns.reserve(values.size());
-    for (UINT i = 0; i < values.size(); ++i) {
-      const UINT index = ParameterIndex(*arguments, i);
-      const VARTYPE type = known.ParameterType(index);
-      if ((V_VT(&values[i]) & VT_BYREF) != 0 && !V_BYREF(&values[i])) return refuse(i, E_POINTER);
-      if (type == VT_DISPATCH && MeansNoObject(values[i])) MakeNoObject(values[i]);
-      const bool omitted = IsOmitted(values[i]);
-      if (omitted && type != VT_EMPTY && type != VT_VARIANT && !known.IsOptional(index))
-        return refuse(i, DISP_E_PARAMNOTOPTIONAL);
-      if (!(type & VT_BYREF) || V_VT(&values[i]) == type) continue;
-      if (type == (VT_VARIANT | VT_BYREF)) {
-        V_VT(&values[i]) = type;
-        V_VARIANTREF(&values[i]) = &arguments->rgvarg[i];
-        continue;
-      }
-      StandIn& standIn = standIns.emplace_back();
-      const VARTYPE target = type & ~VT_BYREF;
-      const HRESULT converted =
-          omitted ? TakeDefault(known, index, target, standIn) : Convert(values[i], target, standIn);
-      if (FAILED(converted)) return refuse(i, converted);
-      MakeReference(values[i], standIn.value.Get());
+  const MemberDescription known(description, member, flags);
+  // Wine: the type information does not find all of the errors that are found here and below.
+  if (known.IsKnown() && arguments->cArgs > known.ParameterCount()) return DISP_E_BADPARAMCOUNT;
+  const auto refuse = [&](UINT argument, HRESULT error) {
+    if (argumentError) *argumentError = argument;
+    return error;
+  };
+  std::vector<VARIANT> values(arguments->rgvarg, arguments->rgvarg + arguments->cArgs);
+  std::vector<StandIn> standIns;
+  // References into it are taken below, so it must not move.
+  standIns.reserve(values.size());
+  for (UINT i = 0; i < values.size(); ++i) {
+    const UINT index = ParameterIndex(*arguments, i);
+    const VARTYPE type = known.ParameterType(index);
+    if ((V_VT(&values[i]) & VT_BYREF) != 0 && !V_BYREF(&values[i])) return refuse(i, E_POINTER);
+    if (type == VT_DISPATCH && MeansNoObject(values[i])) MakeNoObject(values[i]);
+    const bool omitted = IsOmitted(values[i]);
+    if (omitted && type != VT_EMPTY && type != VT_VARIANT && !known.IsOptional(index))
+      return refuse(i, DISP_E_PARAMNOTOPTIONAL);
+    if (!(type & VT_BYREF) || V_VT(&values[i]) == type) continue;
+    if (type == (VT_VARIANT | VT_BYREF)) {
+      V_VT(&values[i]) = type;
+      V_VARIANTREF(&values[i]) = &arguments->rgvarg[i];
+      continue;
     }
-    DISPPARAMS prepared = *arguments;
-    prepared.rgvarg = values.data();
-    const HRESULT called =
-        description.Invoke(object, member, flags, &prepared, result, exception, argumentError);
-    if (SUCCEEDED(called))
-      for (StandIn& standIn : standIns) HandBack(standIn);
-    return called;
-  });
+    StandIn& standIn = standIns.emplace_back();
+    const VARTYPE target = type & ~VT_BYREF;
+    const HRESULT converted =
+        omitted ? TakeDefault(known, index, target, standIn) : Convert(values[i], target, standIn);
+    if (FAILED(converted)) return refuse(i, converted);
+    MakeReference(values[i], standIn.value.Get());
+  }
+  DISPPARAMS prepared = *arguments;
+  prepared.rgvarg = values.data();
+  const HRESULT called =
+      description.Invoke(object, member, flags, &prepared, result, exception, argumentError);
+  if (SUCCEEDED(called))
+    for (StandIn& standIn : standIns) HandBack(standIn);
+  return called;
 }
 
 }  // namespace tarnwick

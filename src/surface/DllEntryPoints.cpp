@@ -5,6 +5,7 @@
 
 #include "controls/windows/ControlWindow.h"
 #include "surface/ClassFactory.h"
+#include "surface/Guard.h"
 #include "surface/Module.h"
 #include "surface/Registration.h"
 #include "surface/ThreadApartment.h"
@@ -32,7 +33,8 @@ STDAPI DllGetClassObject(REFCLSID classId, REFIID interfaceId, LPVOID* factory) 
 }
 
 STDAPI DllCanUnloadNow() {
-  return tarnwick::module::IsHeld() || tarnwick::ControlWindow::AnyLeft() ? S_FALSE : S_OK;
+  return tarnwick::Guarded(
+      [] { return tarnwick::module::IsHeld() || tarnwick::ControlWindow::AnyLeft() ? S_FALSE : S_OK; });
 }
 
 STDAPI DllRegisterServer() {

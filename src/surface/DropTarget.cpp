@@ -50,7 +50,8 @@ DragPoint DropTarget::PointOf(DWORD keys, POINTL screen) const {
   return at;
 }
 
-HRESULT DropTarget::Tell(const std::function<void(DropUser&)>& what) {
+template <typename What>
+HRESULT DropTarget::Notify(What&& what) noexcept {
   if (!user_) return S_OK;
   const ComPtr<IUnknown> alive(identity_);
   return Guarded([&] {
@@ -65,7 +66,7 @@ STDMETHODIMP DropTarget::DragEnter(IDataObject* data, DWORD keys, POINTL at, DWO
     // Held: the host's code may end the drag inside.
     const auto dragged = ComPtr<DataObject>::Adopt(new DataObject(*data));
     data_ = dragged;
-    return Tell([&](DropUser& user) { user.DragMoves(*dragged, *effect, PointOf(keys, at), kEnters); });
+    return Notify([&](DropUser& user) { user.DragMoves(*dragged, *effect, PointOf(keys, at), kEnters); });
   });
 }
 
@@ -73,21 +74,21 @@ STDMETHODIMP DropTarget::DragOver(DWORD keys, POINTL at, DWORD* effect) {
   if (!effect) return E_INVALIDARG;
   const ComPtr<DataObject> data = data_;
   if (!data) return E_UNEXPECTED;
-  return Tell([&](DropUser& user) { user.DragMoves(*data, *effect, PointOf(keys, at), kMoves); });
+  return Notify([&](DropUser& user) { user.DragMoves(*data, *effect, PointOf(keys, at), kMoves); });
 }
 
 STDMETHODIMP DropTarget::DragLeave() {
   const ComPtr<DataObject> data = std::move(data_);
   if (!data) return S_OK;
   DWORD none = DROPEFFECT_NONE;
-  return Tell([&](DropUser& user) { user.DragMoves(*data, none, DragPoint(), kLeaves); });
+  return Notify([&](DropUser& user) { user.DragMoves(*data, none, DragPoint(), kLeaves); });
 }
 
 STDMETHODIMP DropTarget::Drop(IDataObject*, DWORD keys, POINTL at, DWORD* effect) {
   if (!effect) return E_INVALIDARG;
   const ComPtr<DataObject> data = std::move(data_);
   if (!data) return E_UNEXPECTED;
-  return Tell([&](DropUser& user) { user.Dropped(*data, *effect, PointOf(keys, at)); });
+  return Notify([&](DropUser& user) { user.Dropped(*data, *effect, PointOf(keys, at)); });
 }
 
 DWORD RunDrag(DataObject& data, DWORD allowedEffects, const std::function<bool(DWORD)>& feedback) {

@@ -37,8 +37,9 @@ class DropTarget final : public ComObject<IDropTarget> {
 
  private:
   DragPoint PointOf(DWORD keys, POINTL screen) const;
-  // Calls the user with the control kept alive; nothing when it was revoked.
-  HRESULT Tell(const std::function<void(DropUser&)>& what);
+  // Runs what(user), which runs the host's code, with the control kept alive; nothing when it was revoked.
+  template <typename What>
+  HRESULT Notify(What&& what) noexcept;
 
   HWND window_;
   IUnknown* identity_;

@@ -5,6 +5,7 @@
 #include "surface/Automation.h"
 #include "surface/ComObject.h"
 #include "surface/Dispatch.h"
+#include "surface/Guard.h"
 #include "surface/Module.h"
 
 namespace tarnwick {
@@ -36,8 +37,10 @@ class DualObject : public ComObject<Interface> {
     if (!Description()) return TYPE_E_CANTLOADLIBRARY;
     // The host's code may run inside and release its last reference.
     const ComPtr<Interface> alive(this);
-    return InvokeMember(*Description(), static_cast<Interface*>(this), member, flags, arguments, result,
-                        exception, argumentError);
+    return Guarded([&] {
+      return InvokeMember(*Description(), static_cast<Interface*>(this), member, flags, arguments, result,
+                          exception, argumentError);
+    });
   }
 
  protected:

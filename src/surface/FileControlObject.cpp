@@ -115,12 +115,16 @@ STDMETHODIMP FileControlObject<Interface>::put_mobjFileupload(_CFileUpload* valu
 
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::putref_mobjFileupload(_CFileUpload* value) {
-  ComPtr<CFileUploadObject> object = CFileUploadObject::From(value);
-  // The control works with clients of the library only.
-  if (value && !object) return DISP_E_TYPEMISMATCH;
-  Rules().mobjFileupload = object ? object->Client() : nullptr;
-  clientObject_ = std::move(object);
-  return S_OK;
+  // The value may be an object of the host's, whose code may release the control.
+  const ComPtr<IUnknown> alive = KeptAlive();
+  return Guarded([&]() -> HRESULT {
+    ComPtr<CFileUploadObject> object = CFileUploadObject::From(value);
+    // The control works with clients of the library only.
+    if (value && !object) return DISP_E_TYPEMISMATCH;
+    Rules().mobjFileupload = object ? object->Client() : nullptr;
+    clientObject_ = std::move(object);
+    return S_OK;
+  });
 }
 
 template <typename Interface>
@@ -267,9 +271,12 @@ STDMETHODIMP FileControlObject<Interface>::get_OLEDropMode(short* value) {
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_OLEDropMode(short value) {
-  stored_.OLEDropMode = value;
-  ole_.PropertyChanged(kOleDropModeId);
-  return S_OK;
+  const ComPtr<IUnknown> alive = KeptAlive();
+  return Guarded([&] {
+    stored_.OLEDropMode = value;
+    ole_.PropertyChanged(kOleDropModeId);
+    return S_OK;
+  });
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::get_OLEDragMode(LONG* value) {
@@ -277,9 +284,12 @@ STDMETHODIMP FileControlObject<Interface>::get_OLEDragMode(LONG* value) {
 }
 template <typename Interface>
 STDMETHODIMP FileControlObject<Interface>::put_OLEDragMode(LONG value) {
-  stored_.OLEDragMode = value;
-  ole_.PropertyChanged(kOleDragModeId);
-  return S_OK;
+  const ComPtr<IUnknown> alive = KeptAlive();
+  return Guarded([&] {
+    stored_.OLEDragMode = value;
+    ole_.PropertyChanged(kOleDragModeId);
+    return S_OK;
+  });
 }
 
 // --- Listing and selection ---

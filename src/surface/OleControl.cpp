@@ -94,14 +94,15 @@ void OleControl::NotifyFocus(bool focus) {
 // --- IOleObject ---
 
 STDMETHODIMP OleControl::SetClientSite(IOleClientSite* site) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  if (!site) InPlaceDeactivate();
-  site_ = ComPtr<IOleClientSite>(site);
-  if (site_)
-    ReadAmbientValues();
-  else
-    hooks_.SiteGone();
-  return S_OK;
+  return Entered([&] {
+    if (!site) InPlaceDeactivate();
+    site_ = ComPtr<IOleClientSite>(site);
+    if (site_)
+      ReadAmbientValues();
+    else
+      hooks_.SiteGone();
+    return S_OK;
+  });
 }
 
 STDMETHODIMP OleControl::GetClientSite(IOleClientSite** site) {
@@ -111,13 +112,14 @@ STDMETHODIMP OleControl::GetClientSite(IOleClientSite** site) {
 }
 
 STDMETHODIMP OleControl::Close(DWORD saveOption) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  hooks_.Closing();
-  InPlaceDeactivate();
-  if (saveOption != OLECLOSE_NOSAVE && persistence_.HasChanges())
-    CallHeld(site_, &IOleClientSite::SaveObject);
-  CallHeld(adviseHolder_, &IOleAdviseHolder::SendOnClose);
-  return S_OK;
+  return Entered([&] {
+    hooks_.Closing();
+    InPlaceDeactivate();
+    if (saveOption != OLECLOSE_NOSAVE && persistence_.HasChanges())
+      CallHeld(site_, &IOleClientSite::SaveObject);
+    CallHeld(adviseHolder_, &IOleAdviseHolder::SendOnClose);
+    return S_OK;
+  });
 }
 
 STDMETHODIMP OleControl::GetMoniker(DWORD, DWORD, IMoniker** moniker) {
@@ -131,32 +133,33 @@ STDMETHODIMP OleControl::GetClipboardData(DWORD, IDataObject** data) {
 }
 
 STDMETHODIMP OleControl::DoVerb(LONG verb, LPMSG, IOleClientSite* site, LONG, HWND, LPCRECT) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  if (!site_ && site) SetClientSite(site);
-  switch (verb) {
-    case OLEIVERB_PRIMARY:
-    case OLEIVERB_SHOW:
-      // While a form is designed, the control takes no keyboard for being shown.
-      return Activate(userMode_);
-    case OLEIVERB_UIACTIVATE:
-      return Activate(true);
-    case OLEIVERB_INPLACEACTIVATE:
-      return Activate(false);
-    case OLEIVERB_HIDE:
-      UIDeactivate();
-      if (inPlace_) ShowWindow(hooks_.Window(), SW_HIDE);
-      return S_OK;
-    default:
-      return verb > 0 ? OLEOBJ_S_INVALIDVERB : E_NOTIMPL;
-  }
+  return Entered([&] {
+    if (!site_ && site) SetClientSite(site);
+    switch (verb) {
+      case OLEIVERB_PRIMARY:
+      case OLEIVERB_SHOW:
+        // While a form is designed, the control takes no keyboard for being shown.
+        return Activate(userMode_);
+      case OLEIVERB_UIACTIVATE:
+        return Activate(true);
+      case OLEIVERB_INPLACEACTIVATE:
+        return Activate(false);
+      case OLEIVERB_HIDE:
+        UIDeactivate();
+        if (inPlace_) ShowWindow(hooks_.Window(), SW_HIDE);
+        return S_OK;
+      default:
+        return verb > 0 ? OLEOBJ_S_INVALIDVERB : E_NOTIMPL;
+    }
+  });
 }
 
 STDMETHODIMP OleControl::EnumVerbs(IEnumOLEVERB** enumerator) {
-  return OleRegEnumVerbs(hooks_.ClassId(), enumerator);
+  return Entered([&] { return OleRegEnumVerbs(hooks_.ClassId(), enumerator); });
 }
 
 STDMETHODIMP OleControl::GetUserType(DWORD form, LPOLESTR* type) {
-  return OleRegGetUserType(hooks_.ClassId(), form, type);
+  return Entered([&] { return OleRegGetUserType(hooks_.ClassId(), form, type); });
 }
 
 STDMETHODIMP OleControl::SetExtent(DWORD aspect, SIZEL* himetric) {
@@ -169,21 +172,25 @@ STDMETHODIMP OleControl::SetExtent(DWORD aspect, SIZEL* himetric) {
 }
 
 STDMETHODIMP OleControl::Advise(IAdviseSink* sink, DWORD* cookie) {
-  if (!adviseHolder_) {
-    const HRESULT made = CreateOleAdviseHolder(adviseHolder_.Receive());
-    if (FAILED(made)) return made;
-  }
-  return CallHeld(adviseHolder_, &IOleAdviseHolder::Advise, sink, cookie);
+  return Entered([&] {
+    if (!adviseHolder_) {
+      const HRESULT made = CreateOleAdviseHolder(adviseHolder_.Receive());
+      if (FAILED(made)) return made;
+    }
+    return CallHeld(adviseHolder_, &IOleAdviseHolder::Advise, sink, cookie);
+  });
 }
 
 STDMETHODIMP OleControl::Unadvise(DWORD cookie) {
-  return adviseHolder_ ? CallHeld(adviseHolder_, &IOleAdviseHolder::Unadvise, cookie) : OLE_E_NOCONNECTION;
+  return Entered([&] {
+    return adviseHolder_ ? CallHeld(adviseHolder_, &IOleAdviseHolder::Unadvise, cookie) : OLE_E_NOCONNECTION;
+  });
 }
 
 STDMETHODIMP OleControl::EnumAdvise(IEnumSTATDATA** enumerator) {
   if (!enumerator) return E_POINTER;
   *enumerator = nullptr;
-  return adviseHolder_ ? adviseHolder_->EnumAdvise(enumerator) : S_OK;
+  return Entered([&] { return adviseHolder_ ? adviseHolder_->EnumAdvise(enumerator) : S_OK; });
 }
 
 STDMETHODIMP OleControl::GetMiscStatus(DWORD aspect, DWORD* status) {
@@ -202,10 +209,11 @@ STDMETHODIMP OleControl::GetControlInfo(CONTROLINFO* info) {
 }
 
 STDMETHODIMP OleControl::OnAmbientPropertyChange(DISPID) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  // Of a container that is gone there are none, and the control stays closed.
-  if (site_) ReadAmbientValues();
-  return S_OK;
+  return Entered([&] {
+    // Of a container that is gone there are none, and the control stays closed.
+    if (site_) ReadAmbientValues();
+    return S_OK;
+  });
 }
 
 STDMETHODIMP OleControl::FreezeEvents(BOOL freeze) {
@@ -326,43 +334,49 @@ void OleControl::Place(const RECT& position, const RECT& clip) {
 
 STDMETHODIMP OleControl::GetWindow(HWND* window) {
   if (!window) return E_POINTER;
-  *window = inPlace_ ? hooks_.Window() : nullptr;
-  return *window ? S_OK : E_FAIL;
+  return Entered([&] {
+    *window = inPlace_ ? hooks_.Window() : nullptr;
+    return *window ? S_OK : E_FAIL;
+  });
 }
 
 STDMETHODIMP OleControl::InPlaceDeactivate() {
-  if (!inPlace_) return S_OK;
-  const ComPtr<IUnknown> alive = KeptAlive();
-  UIDeactivate();
-  // The container's code may have done the rest.
-  if (!std::exchange(inPlace_, false)) return S_OK;
-  // Before more of its code runs, which may activate the control anew.
-  const ComPtr<IOleInPlaceSite> site = std::move(inPlaceSite_);
-  frame_ = {};
-  document_ = {};
-  // The window keeps what it shows, away from the container.
-  hooks_.Park();
-  NotifyFocus(false);
-  // From here on the container draws what is shown now.
-  ViewChanged();
-  site->OnInPlaceDeactivate();
-  return S_OK;
+  return Entered([&] {
+    if (!inPlace_) return S_OK;
+    UIDeactivate();
+    // The container's code may have done the rest.
+    if (!std::exchange(inPlace_, false)) return S_OK;
+    // Before more of its code runs, which may activate the control anew.
+    const ComPtr<IOleInPlaceSite> site = std::move(inPlaceSite_);
+    frame_ = {};
+    document_ = {};
+    // The window keeps what it shows, away from the container.
+    hooks_.Park();
+    NotifyFocus(false);
+    // From here on the container draws what is shown now.
+    ViewChanged();
+    site->OnInPlaceDeactivate();
+    return S_OK;
+  });
 }
 
 STDMETHODIMP OleControl::UIDeactivate() {
-  if (!uiActive_) return S_OK;
-  const ComPtr<IUnknown> alive = KeptAlive();
-  uiActive_ = false;
-  CallHeld(document_, &IOleInPlaceUIWindow::SetActiveObject, nullptr, nullptr);
-  CallHeld(frame_, &IOleInPlaceFrame::SetActiveObject, nullptr, nullptr);
-  CallHeld(inPlaceSite_, &IOleInPlaceSite::OnUIDeactivate, FALSE);
-  return S_OK;
+  return Entered([&] {
+    if (!uiActive_) return S_OK;
+    uiActive_ = false;
+    CallHeld(document_, &IOleInPlaceUIWindow::SetActiveObject, nullptr, nullptr);
+    CallHeld(frame_, &IOleInPlaceFrame::SetActiveObject, nullptr, nullptr);
+    CallHeld(inPlaceSite_, &IOleInPlaceSite::OnUIDeactivate, FALSE);
+    return S_OK;
+  });
 }
 
 STDMETHODIMP OleControl::SetObjectRects(LPCRECT position, LPCRECT clip) {
   if (!position || !clip) return E_POINTER;
-  if (inPlace_) Place(*position, *clip);
-  return S_OK;
+  return Entered([&] {
+    if (inPlace_) Place(*position, *clip);
+    return S_OK;
+  });
 }
 
 // --- IOleInPlaceActiveObject ---
@@ -380,41 +394,45 @@ HRESULT OleControl::OfferToSite(MSG& message) const {
 
 STDMETHODIMP OleControl::TranslateAccelerator(LPMSG message) {
   if (!message) return E_POINTER;
-  const ComPtr<IUnknown> alive = KeptAlive();
-  const HWND window = inPlace_ ? hooks_.Window() : nullptr;
-  if (window && message->message == WM_KEYDOWN && IsChild(window, message->hwnd)) {
-    if (message->wParam == VK_TAB && GetKeyState(VK_CONTROL) >= 0 &&
-        hooks_.MoveFocus(GetKeyState(VK_SHIFT) < 0))
-      return S_OK;
-    if (Wants(*message)) {
-      TranslateMessage(message);
-      DispatchMessageW(message);
-      return S_OK;
+  return Entered([&] {
+    const HWND window = inPlace_ ? hooks_.Window() : nullptr;
+    if (window && message->message == WM_KEYDOWN && IsChild(window, message->hwnd)) {
+      if (message->wParam == VK_TAB && GetKeyState(VK_CONTROL) >= 0 &&
+          hooks_.MoveFocus(GetKeyState(VK_SHIFT) < 0))
+        return S_OK;
+      if (Wants(*message)) {
+        TranslateMessage(message);
+        DispatchMessageW(message);
+        return S_OK;
+      }
     }
-  }
-  return OfferToSite(*message);
+    return OfferToSite(*message);
+  });
 }
 
 STDMETHODIMP OleControl::OnDocWindowActivate(BOOL activate) {
-  if (activate && uiActive_) CallHeld(frame_, &IOleInPlaceFrame::SetActiveObject, this, nullptr);
-  return S_OK;
+  return Entered([&] {
+    if (activate && uiActive_) CallHeld(frame_, &IOleInPlaceFrame::SetActiveObject, this, nullptr);
+    return S_OK;
+  });
 }
 // --- IQuickActivate ---
 
 STDMETHODIMP OleControl::QuickActivate(QACONTAINER* container, QACONTROL* control) {
   if (!container || !control) return E_POINTER;
-  const ComPtr<IUnknown> alive = KeptAlive();
-  const ULONG size = control->cbSize;
-  *control = {};
-  control->cbSize = size;
-  if (container->pClientSite) SetClientSite(container->pClientSite);
-  if (container->pAdviseSink) view_.SetAdvise(DVASPECT_CONTENT, 0, container->pAdviseSink);
-  if (container->pUnkEventSink) points_.Events().Advise(container->pUnkEventSink, &control->dwEventCookie);
-  if (container->pPropertyNotifySink)
-    points_.PropertyListeners().Advise(container->pPropertyNotifySink, &control->dwPropNotifyCookie);
-  control->dwMiscStatus = kControlMiscStatus;
-  control->dwViewStatus = VIEWSTATUS_OPAQUE;
-  return S_OK;
+  return Entered([&] {
+    const ULONG size = control->cbSize;
+    *control = {};
+    control->cbSize = size;
+    if (container->pClientSite) SetClientSite(container->pClientSite);
+    if (container->pAdviseSink) view_.SetAdvise(DVASPECT_CONTENT, 0, container->pAdviseSink);
+    if (container->pUnkEventSink) points_.Events().Advise(container->pUnkEventSink, &control->dwEventCookie);
+    if (container->pPropertyNotifySink)
+      points_.PropertyListeners().Advise(container->pPropertyNotifySink, &control->dwPropNotifyCookie);
+    control->dwMiscStatus = kControlMiscStatus;
+    control->dwViewStatus = VIEWSTATUS_OPAQUE;
+    return S_OK;
+  });
 }
 
 }  // namespace tarnwick
