@@ -7,26 +7,22 @@
 #pragma once
 
 #include "base/KeyedList.h"
-#include "surface/Automation.h"
-#include "surface/ComObject.h"
+#include "surface/LateBoundObject.h"
 
 namespace tarnwick {
 
-class CollectionObject final : public ComObject<IDispatch> {
+class CollectionObject final : public LateBoundObject<IDispatch> {
  public:
   // Adds an item without a key.
   void Append(Variant item) { items_.Add(std::move(item)); }
 
-  STDMETHODIMP GetTypeInfoCount(UINT* count) override;
-  STDMETHODIMP GetTypeInfo(UINT index, LCID locale, ITypeInfo** info) override;
-  STDMETHODIMP GetIDsOfNames(REFIID reserved, LPOLESTR* names, UINT count, LCID locale, DISPID* ids) override;
-  STDMETHODIMP Invoke(DISPID member, REFIID reserved, LCID locale, WORD flags, DISPPARAMS* arguments,
-                      VARIANT* result, EXCEPINFO* exception, UINT* argumentError) override;
-
  private:
-  // Members by identifier; they throw run-time errors, which Invoke hands to the host.
-  HRESULT Call(DISPID member, WORD flags, const DISPPARAMS& arguments, VARIANT* result);
-  void Add(const DISPPARAMS& arguments);
+  // LateBoundObject
+  std::span<const LateBoundMember> Members() const override;
+  HRESULT Call(DISPID member, const LateBoundArguments& arguments, Variant& result) override;
+  const OLECHAR* DescriptionOf(std::int32_t number) const override;
+
+  void Add(const LateBoundArguments& arguments);
   const Variant& ItemAt(const VARIANT& index) const;
   // Position that an index argument means. Throws 5 for an unknown key, 9 for a position out of range.
   std::size_t PositionOf(const VARIANT& index) const;

@@ -23,13 +23,9 @@ constexpr DISPID kGetFormat = 3;
 constexpr DISPID kClear = 4;
 constexpr DISPID kFiles = 5;
 
-struct Member {
-  const OLECHAR* name;
-  DISPID id;
-};
-constexpr std::array kMembers = {Member{L"GetData", kGetData}, Member{L"SetData", kSetData},
-                                 Member{L"GetFormat", kGetFormat}, Member{L"Clear", kClear},
-                                 Member{L"Files", kFiles}};
+constexpr std::array kMembers = {LateBoundMember{L"GetData", kGetData}, LateBoundMember{L"SetData", kSetData},
+                                 LateBoundMember{L"GetFormat", kGetFormat}, LateBoundMember{L"Clear", kClear},
+                                 LateBoundMember{L"Files", kFiles}};
 
 FORMATETC FormatOf(CLIPFORMAT format) {
   return {format, nullptr, DVASPECT_CONTENT, -1, TYMED_HGLOBAL};
@@ -101,7 +97,7 @@ bool DataObject::Has(CLIPFORMAT format) const {
          (format == CF_HDROP && !files_.empty());
 }
 
-const Text& DataObject::TheText() {
+const Text& DataObject::FetchText() {
   const std::optional<CLIPFORMAT> promised = std::exchange(promised_, std::nullopt);
   if (promised && onPromised_) onPromised_(static_cast<std::int16_t>(*promised));
   return text_;
@@ -127,12 +123,12 @@ STDMETHODIMP DataObject::GetData(FORMATETC* format, STGMEDIUM* medium) {
         medium->hGlobal = DropFilesOf(files_);
         break;
       case CF_UNICODETEXT: {
-        const Text& text = TheText();
+        const Text& text = FetchText();
         medium->hGlobal = GlobalCopy(text.c_str(), (text.size() + 1) * sizeof(char16_t));
         break;
       }
       default: {
-        const std::string ansi = AnsiFromText(TheText()).value_or(std::string());
+        const std::string ansi = AnsiFromText(FetchText()).value_or(std::string());
         medium->hGlobal = GlobalCopy(ansi.c_str(), ansi.size() + 1);
         break;
       }
@@ -180,59 +176,39 @@ STDMETHODIMP DataObject::EnumDAdvise(IEnumSTATDATA**) {
   return OLE_E_ADVISENOTSUPPORTED;
 }
 
-// --- IDispatch ---
+// --- LateBoundObject ---
 
-STDMETHODIMP DataObject::GetTypeInfoCount(UINT* count) {
-  if (!count) return E_POINTER;
-  *count = 0;
-  return S_OK;
+std::span<const LateBoundMember> DataObject::Members() const {
+  return kMembers;
 }
 
-STDMETHODIMP DataObject::GetTypeInfo(UINT, LCID, ITypeInfo** info) {
-  if (info) *info = nullptr;
-  return DISP_E_BADINDEX;
+const OLECHAR* DataObject::DescriptionOf(std::int32_t number) const {
+  return number == error::kInvalidFormat ? L"The data has no such format"
+                                         : L"The argument is of the wrong type";
 }
 
-STDMETHODIMP DataObject::GetIDsOfNames(REFIID, LPOLESTR* names, UINT count, LCID, DISPID* ids) {
-  if (!names || !ids || count == 0) return E_INVALIDARG;
-  std::fill_n(ids, count, DISPID_UNKNOWN);
-  for (const Member& member : kMembers)
-    if (lstrcmpiW(member.name, names[0]) == 0) ids[0] = member.id;
-  return ids[0] != DISPID_UNKNOWN && count == 1 ? S_OK : DISP_E_UNKNOWNNAME;
-}
-
-STDMETHODIMP DataObject::Invoke(DISPID member, REFIID, LCID, WORD, DISPPARAMS* arguments, VARIANT* result,
-                                EXCEPINFO*, UINT*) {
-  if (!arguments) return E_INVALIDARG;
-  if (result) VariantInit(result);
-  return Guarded([&] { return Call(member, *arguments, result); });
-}
-
-HRESULT DataObject::Call(DISPID member, const DISPPARAMS& arguments, VARIANT* result) {
-  // Arguments come in reverse order.
-  const auto argument = [&](UINT position) -> const VARIANT* {
-    return position < arguments.cArgs ? &arguments.rgvarg[arguments.cArgs - 1 - position] : nullptr;
+HRESULT DataObject::Call(DISPID member, const LateBoundArguments& arguments, Variant& result) {
+  const auto format = [&](UINT parameter) {
+    const VARIANT* given = arguments.At(parameter);
+    return given ? static_cast<CLIPFORMAT>(NumberFromVariant(*given)) : CLIPFORMAT{CF_TEXT};
   };
-  const auto format = [&](UINT position) {
-    return argument(position) ? static_cast<CLIPFORMAT>(NumberFromVariant(*argument(position)))
-                              : CLIPFORMAT{CF_TEXT};
-  };
-  Variant value;
   switch (member) {
     case kGetData:
       if (!Has(format(0))) throw RuntimeError(error::kInvalidFormat);
-      if (format(0) != CF_HDROP) value.Get() = VariantFromText(TheText());
+      if (format(0) != CF_HDROP) result.Get() = VariantFromText(FetchText());
       break;
-    case kSetData:
+    case kSetData: {
       if (format(1) == CF_HDROP) throw RuntimeError(error::kInvalidFormat);
+      const VARIANT* text = arguments.At(0);
       promised_.reset();
-      if (!argument(0) || V_VT(argument(0)) == VT_ERROR) promised_ = format(1);
-      text_ = promised_ ? Text() : TextFromVariant(*argument(0));
+      if (!text || V_VT(text) == VT_ERROR) promised_ = format(1);
+      text_ = promised_ ? Text() : TextFromVariant(*text);
       hasText_ = true;
       break;
+    }
     case kGetFormat:
-      V_VT(&value.Get()) = VT_BOOL;
-      V_BOOL(&value.Get()) = AutomationBoolean(Has(format(0)));
+      V_VT(&result.Get()) = VT_BOOL;
+      V_BOOL(&result.Get()) = AutomationBoolean(Has(format(0)));
       break;
     case kClear:
       text_.clear();
@@ -247,14 +223,13 @@ HRESULT DataObject::Call(DISPID member, const DISPPARAMS& arguments, VARIANT* re
         path.Get() = VariantFromText(file);
         files->Append(std::move(path));
       }
-      V_VT(&value.Get()) = VT_DISPATCH;
-      V_DISPATCH(&value.Get()) = files.Detach();
+      V_VT(&result.Get()) = VT_DISPATCH;
+      V_DISPATCH(&result.Get()) = files.Detach();
       break;
     }
     default:
       return DISP_E_MEMBERNOTFOUND;
   }
-  if (result) *result = value.Detach();
   return S_OK;
 }
 

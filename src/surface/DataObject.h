@@ -14,8 +14,7 @@
 #include "base/Text.h"
 #include "controls/ControlEvents.h"
 #include "platform/windows/ComPtr.h"
-#include "surface/Automation.h"
-#include "surface/ComObject.h"
+#include "surface/LateBoundObject.h"
 
 namespace tarnwick {
 
@@ -23,7 +22,7 @@ namespace tarnwick {
 inline constexpr std::int16_t kTextFormat = CF_TEXT;
 inline constexpr std::int16_t kFilesFormat = CF_HDROP;
 
-class DataObject final : public ComObject<IDataObject, IDispatch>, public DragData {
+class DataObject final : public LateBoundObject<IDataObject, IDispatch>, public DragData {
  public:
   // The data of a drag that begins in a control of ours: a text, and a file when its path is not empty.
   DataObject(TextView text, TextView file);
@@ -50,18 +49,15 @@ class DataObject final : public ComObject<IDataObject, IDispatch>, public DragDa
   STDMETHODIMP DUnadvise(DWORD cookie) override;
   STDMETHODIMP EnumDAdvise(IEnumSTATDATA** enumerator) override;
 
-  // IDispatch
-  STDMETHODIMP GetTypeInfoCount(UINT* count) override;
-  STDMETHODIMP GetTypeInfo(UINT index, LCID locale, ITypeInfo** info) override;
-  STDMETHODIMP GetIDsOfNames(REFIID reserved, LPOLESTR* names, UINT count, LCID locale, DISPID* ids) override;
-  STDMETHODIMP Invoke(DISPID member, REFIID reserved, LCID locale, WORD flags, DISPPARAMS* arguments,
-                      VARIANT* result, EXCEPINFO* exception, UINT* argumentError) override;
-
  private:
-  HRESULT Call(DISPID member, const DISPPARAMS& arguments, VARIANT* result);
+  // LateBoundObject
+  std::span<const LateBoundMember> Members() const override;
+  HRESULT Call(DISPID member, const LateBoundArguments& arguments, Variant& result) override;
+  const OLECHAR* DescriptionOf(std::int32_t number) const override;
+
   bool Has(CLIPFORMAT format) const;
-  // The text, which may have to be fetched first.
-  const Text& TheText();
+  // The text. One that was promised is asked of the host first, whose code runs.
+  const Text& FetchText();
 
   Text text_;
   bool hasText_ = false;

@@ -1,7 +1,7 @@
 ' A script host that is bound late: what scripts pass and get, against a running hosting server.
 ' Arguments: SERVER USER PASSWORD PRODUCT
 Option Explicit
-Dim passed, failed
+Dim passed, failed, description
 passed = 0
 failed = 0
 
@@ -36,6 +36,7 @@ Function NumberOf(statement)
       client.EmailKeyToUser product, user, "no number"
   End Select
   NumberOf = Err.Number
+  description = Err.Description
 End Function
 
 Dim arguments, server, user, password, product
@@ -94,6 +95,7 @@ Check "Add with positions", all, "abcd"
 Check "Item", list.Item(2) & list("key a") & list(4), "bad"
 Check "key in use", NumberOf(1), CLng(457)
 Check "position out of range", NumberOf(2), CLng(9)
+Check "its description", description, "There is no item at this position"
 Check "unknown key", NumberOf(3), CLng(5)
 Check "unknown member", NumberOf(4), CLng(438)
 

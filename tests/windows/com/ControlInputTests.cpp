@@ -19,7 +19,7 @@ class Dragged {
     EXPECT_EQ(V_VT(&answer), VT_BOOL);
     return V_BOOL(&answer) == VARIANT_TRUE;
   }
-  // "none" when the data refuses to give it.
+  // Or why the data refuses to give it.
   std::wstring Text() const { return TextOf(Call(object_, L"GetData", {VariantOf(kText)})); }
   void SetText(const wchar_t* text) const {
     const Bstr owned(text);
@@ -99,7 +99,7 @@ TEST(ListControl, TakesFilesThatAreDroppedOnIt) {
       return;
     }
     EXPECT_EQ(dragged.Has(kText), *V_I2REF(&arguments[6]) == 2);
-    EXPECT_EQ(dragged.Text(), dragged.Has(kText) ? L"a note" : L"none");
+    EXPECT_EQ(dragged.Text(), dragged.Has(kText) ? L"a note" : L"The data has no such format");
     dragged.SetText(L"a note");
     // The host decides what a drop here would do.
     if (*V_I2REF(&arguments[6]) == 2) effect = DROPEFFECT_NONE;

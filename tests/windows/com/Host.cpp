@@ -46,10 +46,14 @@ VARIANT Call(IDispatch* object, const wchar_t* member, std::initializer_list<VAR
   DISPID id = 0;
   DISPPARAMS parameters = {const_cast<VARIANT*>(arguments.begin()), nullptr,
                            static_cast<UINT>(arguments.size()), 0};
+  EXCEPINFO exception = {};
   if (FAILED(object->GetIDsOfNames(IID_NULL, &names, 1, LOCALE_USER_DEFAULT, &id)) ||
       FAILED(object->Invoke(id, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD | DISPATCH_PROPERTYGET,
-                            &parameters, &result, nullptr, nullptr)))
-    V_VT(&result) = VT_ERROR;
+                            &parameters, &result, &exception, nullptr))) {
+    V_VT(&result) = exception.bstrDescription ? VT_BSTR : VT_ERROR;
+    V_BSTR(&result) = exception.bstrDescription;
+    SysFreeString(exception.bstrSource);
+  }
   return result;
 }
 
