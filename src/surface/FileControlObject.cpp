@@ -447,7 +447,6 @@ HWND FileControlObject<Interface>::Window() {
   if (window && !dropTarget_)
     Done([&] {
       dropTarget_ = ComPtr<DropTarget>::Adopt(new DropTarget(window, Identity(), *this));
-      View().onEnd = [this] { StopDrops(); };
       WindowMade(window);
       ApplyLook();
     });
@@ -474,11 +473,6 @@ void FileControlObject<Interface>::ApplyLook() {
 }
 
 template <typename Interface>
-void FileControlObject<Interface>::Activated() {
-  ole_.Activated();
-}
-
-template <typename Interface>
 std::span<const PersistedProperty> FileControlObject<Interface>::Properties() const {
   return kProperties;
 }
@@ -499,8 +493,7 @@ void FileControlObject<Interface>::SetProperty(DISPID id, std::int32_t value) {
 // --- Drag and drop ---
 
 template <typename Interface>
-void FileControlObject<Interface>::RunDragOut() {
-  const ComPtr<IUnknown> alive = KeptAlive();
+void FileControlObject<Interface>::DragBegins() {
   const FileControl::DragContent content = Rules().ContentOfDrag();
   const auto data = ComPtr<DataObject>::Adopt(new DataObject(content.address, content.localFile));
   data->SetPromiseHandler([&](std::int16_t format) { Rules().OnSetData(*data, format); });

@@ -32,6 +32,7 @@ struct ControlClass {
 template <typename Interface>
 class FileControlObject : public DualObject<Interface>,
                           public ISupportErrorInfo,
+                          protected ControlWindowUser,
                           private OleControlHooks,
                           private DropUser {
  public:
@@ -116,15 +117,9 @@ class FileControlObject : public DualObject<Interface>,
   ControlParts Parts() { return {apartment_.Get(), events_, uploader_, downloader_}; }
   OleControl& Ole() { return ole_; }
   Apartment& TheApartment() { return apartment_.Get(); }
-  // For what runs code of the host's, in events and while messages are pumped: it may release the control
-  // inside.
+  // For the members in which code of the host's runs, in events and while messages are pumped: it may release
+  // the control inside. What its window and a drag tell keeps it alive without that.
   ComPtr<IUnknown> KeptAlive() { return ComPtr<IUnknown>(&Identity()); }
-  // The control got the focus, or a button went down on it.
-  void Activated();
-  void FocusLost() { ole_.LostFocus(); }
-  // The user, or the host, begins to drag the selection; returns after the drop.
-  void RunDragOut();
-
   // OleControlHooks
   IUnknown& Identity() override { return outer_ ? *outer_ : static_cast<Interface&>(*this); }
 
@@ -142,6 +137,12 @@ class FileControlObject : public DualObject<Interface>,
   };
 
   void* FindInterface(REFIID interfaceId) override;
+
+  // ControlWindowUser
+  void WindowEnds() override { StopDrops(); }
+  void Activated() override { ole_.Activated(); }
+  void FocusLeft() override { ole_.LostFocus(); }
+  void DragBegins() override;
 
   // OleControlHooks
   const CLSID& ClassId() const override { return class_.id; }

@@ -15,7 +15,9 @@ const ControlClass kClass = {CLSID_ctrlListImage, DIID___ctrlListImage, L"Tarnwi
 ctrlListImageObject::ctrlListImageObject(IUnknown* outer)
     : FileControlObject(kClass, outer),
       view_(module::Instance(), *this),
-      rules_(std::make_unique<ctrlListImage>(Parts(), view_)) {}
+      rules_(std::make_unique<ctrlListImage>(Parts(), view_)) {
+  view_.SetUser(*rules_);
+}
 
 STDMETHODIMP ctrlListImageObject::get_m_lDownloadedBytes(LONG* value) {
   return GetNumber<LONG>(rules_->m_lDownloadedBytes, value);
@@ -85,65 +87,6 @@ STDMETHODIMP ctrlListImageObject::Overlay(VARIANT* Key1, VARIANT* Key2, IPicture
     description.icon.hicon = ImageList_GetIcon(merged.Get(), 0, ILD_TRANSPARENT);
     return OleCreatePictureIndirect(&description, IID_IPictureDisp, TRUE, reinterpret_cast<void**>(result));
   });
-}
-
-// --- What the user does ---
-
-Text ctrlListImageObject::ItemText(std::size_t item, std::size_t column) const {
-  return rules_->ItemText(item, static_cast<int>(column));
-}
-
-bool ctrlListImageObject::IsGif(std::size_t item) const {
-  return rules_->PictureOf(item).small == icon::kSmallGif;
-}
-
-std::optional<std::size_t> ctrlListImageObject::FindItem(TextView prefix, std::size_t start) const {
-  return rules_->FindItem(prefix, start);
-}
-
-// Each handler keeps the control alive: the host's code runs inside.
-void ctrlListImageObject::KeyPressed(int key) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnKeyDown(key);
-}
-
-void ctrlListImageObject::EnterPressed() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnEnter();
-}
-
-void ctrlListImageObject::ButtonPressed() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  Activated();
-}
-
-void ctrlListImageObject::ButtonDone() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnMouseButton();
-}
-
-void ctrlListImageObject::Clicked() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnClick();
-}
-
-bool ctrlListImageObject::LabelEditBegins(std::size_t) {
-  return rules_->OnBeforeLabelEdit();
-}
-
-bool ctrlListImageObject::LabelEditEnds(std::size_t item, TextView text) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  return rules_->OnAfterLabelEdit(item, text);
-}
-
-void ctrlListImageObject::GotFocus() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  Activated();
-}
-
-void ctrlListImageObject::LostFocus() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  FocusLost();
 }
 
 }  // namespace tarnwick

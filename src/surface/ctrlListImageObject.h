@@ -9,7 +9,7 @@
 
 namespace tarnwick {
 
-class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, private ListViewUser {
+class ctrlListImageObject final : public FileControlObject<_ctrlListImage> {
  public:
   explicit ctrlListImageObject(IUnknown* outer);
 
@@ -32,21 +32,6 @@ class ctrlListImageObject final : public FileControlObject<_ctrlListImage>, priv
   void Draw(HDC dc, const RECT& bounds) override { view_.Draw(dc, bounds); }
   void GiveFocus() override { view_.Focus(); }
   bool MoveFocus(bool) override { return false; }
-
-  // ListViewUser
-  Text ItemText(std::size_t item, std::size_t column) const override;
-  bool IsGif(std::size_t item) const override;
-  std::optional<std::size_t> FindItem(TextView prefix, std::size_t start) const override;
-  void KeyPressed(int key) override;
-  void EnterPressed() override;
-  void ButtonPressed() override;
-  void ButtonDone() override;
-  void Clicked() override;
-  bool LabelEditBegins(std::size_t item) override;
-  bool LabelEditEnds(std::size_t item, TextView text) override;
-  void DragBegins() override { RunDragOut(); }
-  void GotFocus() override;
-  void LostFocus() override;
 
   WindowsListView view_;
   const std::unique_ptr<ctrlListImage> rules_;

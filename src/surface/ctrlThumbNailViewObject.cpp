@@ -14,7 +14,9 @@ ctrlThumbNailViewObject::ctrlThumbNailViewObject(IUnknown* outer)
     : FileControlObject(kClass, outer),
       page_(module::Instance(), *this),
       scrollHook_(TheApartment().scrollHook),
-      rules_(std::make_unique<ctrlThumbNailView>(Parts(), page_)) {}
+      rules_(std::make_unique<ctrlThumbNailView>(Parts(), page_)) {
+  page_.SetUser(*rules_);
+}
 
 STDMETHODIMP ctrlThumbNailViewObject::get_iImgNo(short* value) {
   return GetNumber<short>(rules_->iImgNo, value);
@@ -59,64 +61,6 @@ STDMETHODIMP ctrlThumbNailViewObject::Overlay(VARIANT*, VARIANT*, IPictureDisp**
   if (!result) return E_POINTER;
   *result = nullptr;
   return S_OK;
-}
-
-// Each handler keeps the control alive: the host's code runs inside.
-void ctrlThumbNailViewObject::SlotPressed(int slot, bool rightButton) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  Activated();
-  rules_->OnSlotPressed(slot, rightButton);
-}
-
-void ctrlThumbNailViewObject::BackgroundPressed(bool rightButton) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  Activated();
-  rules_->OnBackgroundPressed(rightButton);
-}
-
-void ctrlThumbNailViewObject::KeyPressed(int key) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnKeyDown(key);
-}
-
-void ctrlThumbNailViewObject::ScrollChanged(int value) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnScrollChanged(value);
-}
-
-void ctrlThumbNailViewObject::ScrollDragged(int value) {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnScrollDragged(value);
-}
-
-void ctrlThumbNailViewObject::LinkClicked() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnLinkClicked();
-}
-
-void ctrlThumbNailViewObject::SwitchViewClicked() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnSwitchView();
-}
-
-void ctrlThumbNailViewObject::EditorEntered() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnEditorEntered();
-}
-
-void ctrlThumbNailViewObject::EditorLeft() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  rules_->OnEditorLeft();
-}
-
-void ctrlThumbNailViewObject::GotFocus() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  Activated();
-}
-
-void ctrlThumbNailViewObject::LostFocus() {
-  const ComPtr<IUnknown> alive = KeptAlive();
-  FocusLost();
 }
 
 }  // namespace tarnwick

@@ -10,8 +10,7 @@
 
 namespace tarnwick {
 
-class ctrlThumbNailViewObject final : public FileControlObject<_ctrlThumbNailView>,
-                                      private ThumbnailPageUser {
+class ctrlThumbNailViewObject final : public FileControlObject<_ctrlThumbNailView> {
  public:
   explicit ctrlThumbNailViewObject(IUnknown* outer);
 
@@ -35,20 +34,6 @@ class ctrlThumbNailViewObject final : public FileControlObject<_ctrlThumbNailVie
   void Draw(HDC dc, const RECT& bounds) override { page_.Draw(dc, bounds); }
   void GiveFocus() override { page_.Focus(); }
   bool MoveFocus(bool backward) override { return page_.MoveFocus(backward); }
-
-  // ThumbnailPageUser
-  void SlotPressed(int slot, bool rightButton) override;
-  void BackgroundPressed(bool rightButton) override;
-  void KeyPressed(int key) override;
-  void ScrollChanged(int value) override;
-  void ScrollDragged(int value) override;
-  void LinkClicked() override;
-  void SwitchViewClicked() override;
-  void EditorEntered() override;
-  void EditorLeft() override;
-  void DragBegins() override { RunDragOut(); }
-  void GotFocus() override;
-  void LostFocus() override;
 
   WindowsThumbnailPage page_;
   WindowsScrollHook scrollHook_;

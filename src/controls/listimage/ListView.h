@@ -1,4 +1,4 @@
-// The seam to the list window. The rules own the items; the view asks ctrlListImage for the texts and
+// The seam to the list window. The rules own the items; the view asks its ListViewUser for the texts and
 // pictures that it draws (owner data), so that a hundred thousand files show at once.
 #pragma once
 
@@ -16,8 +16,8 @@ struct ListColumn {
   TextView title;
 };
 
-// Items count from 0. What the rules change through this interface is not reported back to them: the handlers
-// of ctrlListImage are for what the user does. No member throws. All work without a window too; a window that
+// Items count from 0. What the rules change through this interface is not reported back to them: ListViewUser
+// hears of what the user does. No member throws. All work without a window too; a window that
 // comes later shows the same state.
 class ListView : public ControlView {
  public:

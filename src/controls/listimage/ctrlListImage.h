@@ -5,16 +5,11 @@
 
 #include "controls/FileControl.h"
 #include "controls/listimage/ListView.h"
+#include "controls/listimage/ListViewUser.h"
 
 namespace tarnwick {
 
-// Entries, counted from 1, of the image lists with the large and the small pictures.
-struct ItemPicture {
-  int large = 0;
-  int small = 0;
-};
-
-class ctrlListImage final : public FileControl {
+class ctrlListImage final : public FileControl, public ListViewUser {
  public:
   ctrlListImage(const ControlParts& parts, ListView& view);
   // The next control lists from the server again.
@@ -47,28 +42,20 @@ class ctrlListImage final : public FileControl {
   // --- What the view asks ---
 
   std::size_t ItemCount() const { return items_.size(); }
-  // Columns count from 0: name, address, size. Empty outside the list.
-  Text ItemText(std::size_t index, int column) const;
-  ItemPicture PictureOf(std::size_t index) const;
-  // The first item from `start` on, then from the top, whose name starts with `prefix` in any letter case.
-  std::optional<std::size_t> FindItem(TextView prefix, std::size_t start) const;
+  Text ItemText(std::size_t index, int column) const override;
+  ItemPicture PictureOf(std::size_t index) const override;
+  std::optional<std::size_t> FindItem(TextView prefix, std::size_t start) const override;
 
   // --- What the user does ---
 
-  // A key was pressed, and the list has done with it what lists do.
-  void OnKeyDown(std::int32_t keyCode);
-  // Enter in the list, not in a label edit.
-  void OnEnter();
+  void OnKeyDown(std::int32_t keyCode) override;
+  void OnEnter() override;
   // Another item was selected in other ways than by the arrow keys or a click.
   void OnSelectionChanged();
-  void OnClick();
-  // The left or right mouse button, on an item or beside them.
-  void OnMouseButton();
-  // Whether the user may edit the label.
-  bool OnBeforeLabelEdit() const;
-  // The label edit of an item ended with a text; an edit that was cancelled is not told. True when the item
-  // has a new name now, which need not be that text.
-  bool OnAfterLabelEdit(std::size_t index, TextView newText);
+  void OnClick() override;
+  void OnMouseButton() override;
+  bool OnBeforeLabelEdit() const override;
+  bool OnAfterLabelEdit(std::size_t index, TextView newText) override;
 
  private:
   // One line of the list. The record is shared with the list of all files.

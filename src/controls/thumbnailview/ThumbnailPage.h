@@ -20,7 +20,7 @@ struct PicturePlace {
 };
 
 // Slots count from 1: top left, top right, bottom left, bottom right. What the rules change through this
-// interface is not reported back to them: the handlers of ctrlThumbNailView are for what the user does.
+// interface is not reported back to them: ThumbnailPageUser hears of what the user does.
 class ThumbnailPage : public ControlView {
  public:
   // The grid with its scroll bar, or in its place message and link. Showing the grid shows all four slots.

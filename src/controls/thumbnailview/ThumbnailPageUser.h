@@ -1,5 +1,6 @@
-// What the window of the thumbnail control tells of the user. The host's code runs inside these calls and may
-// end the control. No member throws.
+// What the window of the thumbnail control tells its rules of the user. All of it raises events or, when the
+// bar moves, fills a page, which pumps messages: the host's code runs inside, which may call the control,
+// destroy its window and release it.
 #pragma once
 
 #include "base/Text.h"
@@ -11,23 +12,19 @@ class ThumbnailPageUser {
   virtual ~ThumbnailPageUser() = default;
 
   // A mouse button went down on a slot's frame, picture or caption.
-  virtual void SlotPressed(int slot, bool rightButton) = 0;
+  virtual void OnSlotPressed(int slot, bool rightButton) = 0;
   // The same beside the slots.
-  virtual void BackgroundPressed(bool rightButton) = 0;
+  virtual void OnBackgroundPressed(bool rightButton) = 0;
   // A key in the grid, by its virtual key code.
-  virtual void KeyPressed(int key) = 0;
+  virtual void OnKeyDown(int keyCode) = 0;
   // The scroll bar has come to rest at a value; its thumb is being dragged over one.
-  virtual void ScrollChanged(int value) = 0;
-  virtual void ScrollDragged(int value) = 0;
-  virtual void LinkClicked() = 0;
-  virtual void SwitchViewClicked() = 0;
+  virtual void OnScrollChanged(int value) = 0;
+  virtual void OnScrollDragged(int value) = 0;
+  virtual void OnLinkClicked() = 0;
+  virtual void OnSwitchView() = 0;
   // Enter in the editor; Escape there, or the focus went elsewhere. The editor is shown until HideEditor.
-  virtual void EditorEntered() = 0;
-  virtual void EditorLeft() = 0;
-  // A slot's picture is dragged out.
-  virtual void DragBegins() = 0;
-  virtual void GotFocus() = 0;
-  virtual void LostFocus() = 0;
+  virtual void OnEditorEntered() = 0;
+  virtual void OnEditorLeft() = 0;
 };
 
 }  // namespace tarnwick

@@ -7,6 +7,7 @@
 
 #include "controls/FileControl.h"
 #include "controls/thumbnailview/ThumbnailPage.h"
+#include "controls/thumbnailview/ThumbnailPageUser.h"
 #include "support/CImageHeight.h"
 
 namespace tarnwick {
@@ -18,7 +19,7 @@ PicturePlace FitImage(std::int32_t height, std::int32_t width);
 // The caption for a file's name: at most 20 characters, and "&&" for each "&".
 Text FormatLabelText(TextView name);
 
-class ctrlThumbNailView final : public FileControl {
+class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
  public:
   ctrlThumbNailView(const ControlParts& parts, ThumbnailPage& page);
   // Takes the lists of all controls of the apartment along: the next one lists from the server again.
@@ -50,18 +51,16 @@ class ctrlThumbNailView final : public FileControl {
   void ValidateFileName(Text& NewString);
 
   // --- What the user does ---
-  // All of them raise events or, when the bar moves, fill a page, which pumps messages: the host may call the
-  // control inside, and may end it afterwards.
 
-  void OnSlotPressed(int slot, bool rightButton);
-  void OnBackgroundPressed(bool rightButton);
-  void OnKeyDown(int keyCode);
-  void OnScrollChanged(int value);
-  void OnScrollDragged(int value);
-  void OnLinkClicked();
-  void OnSwitchView();
-  void OnEditorEntered();
-  void OnEditorLeft();
+  void OnSlotPressed(int slot, bool rightButton) override;
+  void OnBackgroundPressed(bool rightButton) override;
+  void OnKeyDown(int keyCode) override;
+  void OnScrollChanged(int value) override;
+  void OnScrollDragged(int value) override;
+  void OnLinkClicked() override;
+  void OnSwitchView() override;
+  void OnEditorEntered() override;
+  void OnEditorLeft() override;
   void OnFilesEnter() override;
 
  private:

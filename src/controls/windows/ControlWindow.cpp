@@ -25,6 +25,9 @@ std::recursive_mutex classes;
 // windows go with the thread that made them, and take along what they hold.
 thread_local HWND parking = nullptr;
 
+// Messages of controls that the thread handles now, one inside the other.
+thread_local int handling = 0;
+
 // Ends a parked window, of the class whose name is the other parameter.
 constexpr UINT kEndParked = WM_APP;
 
@@ -68,8 +71,8 @@ int DpiOf(HWND window) {
 
 }  // namespace
 
-ControlWindow::ControlWindow(HINSTANCE module, const wchar_t* className)
-    : module_(module), className_(className), dpi_(SystemDpi()) {}
+ControlWindow::ControlWindow(HINSTANCE module, const wchar_t* className, ControlWindowUser& control)
+    : control_(control), module_(module), className_(className), dpi_(SystemDpi()) {}
 
 ControlWindow::~ControlWindow() {
   if (!window_) {
@@ -78,13 +81,13 @@ ControlWindow::~ControlWindow() {
   }
   // No message reaches the object from here on.
   SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
-  if (depth_ == 0) {
+  if (handling == 0) {
     DestroyWindow(window_);
     LeaveNothing(module_, className_);
     return;
   }
-  // The host ended the control inside one of its own messages. The windows are not done with that message
-  // yet, so they go with the next one.
+  // The host let go of the control inside one of its messages. The system's own windows may not be done with
+  // that message yet, so they go with the next one.
   Park();
   PostMessageW(parking, kEndParked, reinterpret_cast<WPARAM>(window_), reinterpret_cast<LPARAM>(className_));
 }
@@ -192,29 +195,32 @@ ControlWindow* ControlWindow::Of(HWND outer) {
   return reinterpret_cast<ControlWindow*>(GetWindowLongPtrW(outer, GWLP_USERDATA));
 }
 
-// Runs a handler, whose exceptions end here. The object may be gone afterwards.
+// Runs the handler of a message, whose exceptions end here, and keeps the control alive meanwhile. The object
+// may be gone afterwards.
 template <typename Body>
-LRESULT ControlWindow::Handle(HWND outer, Body&& body) {
-  ++depth_;
+LRESULT ControlWindow::Handle(Body&& body) {
+  ++handling;
+  ComPtr<ControlWindowUser> alive(&control_);
   const LRESULT result = ResultAsItStood(LRESULT{0}, [&](LRESULT& answer) { answer = body(); });
-  if (IsAlive(this, outer)) --depth_;
+  // Inside the message still, for what ends here.
+  alive = {};
+  --handling;
   return result;
 }
 
-void ControlWindow::TellFocusLeft(ControlWindow* self, HWND outer, UINT message, WPARAM wParam) {
+void ControlWindow::TellFocusLeft(HWND outer, UINT message, WPARAM wParam) {
   const auto to = reinterpret_cast<HWND>(wParam);
-  if (message == WM_KILLFOCUS && IsAlive(self, outer) && to != outer && !IsChild(outer, to))
-    self->FocusLeft();
+  if (message == WM_KILLFOCUS && window_ == outer && to != outer && !IsChild(outer, to)) control_.FocusLeft();
 }
 
 // What is seen beside the children, and behind the texts of labels.
-LRESULT ControlWindow::OnLook(UINT message, WPARAM wParam, LPARAM lParam) const {
+LRESULT ControlWindow::OnLook(HWND window, UINT message, WPARAM wParam, LPARAM lParam) const {
   const auto dc = reinterpret_cast<HDC>(wParam);
   const auto brush = static_cast<HBRUSH>(GetStockObject(DC_BRUSH));
   switch (message) {
     case WM_ERASEBKGND: {
       RECT client = {};
-      GetClientRect(window_, &client);
+      GetClientRect(window, &client);
       SetDCBrushColor(dc, BackColor());
       FillRect(dc, &client, brush);
       return TRUE;
@@ -225,7 +231,7 @@ LRESULT ControlWindow::OnLook(UINT message, WPARAM wParam, LPARAM lParam) const 
       SetDCBrushColor(dc, BackColor());
       return reinterpret_cast<LRESULT>(brush);
     default:
-      return DefWindowProcW(window_, message, wParam, lParam);
+      return DefWindowProcW(window, message, wParam, lParam);
   }
 }
 
@@ -238,15 +244,13 @@ LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wPa
   if (message == WM_NCDESTROY) --windows;
   ControlWindow* self = Of(window);
   if (self && message == WM_DESTROY) {
-    if (self->onEnd) self->onEnd();
+    self->control_.WindowEnds();
     SetWindowLongPtrW(window, GWLP_USERDATA, 0);
     self->window_ = nullptr;
     self->made_ = false;
-    // Handlers that still run belong to the window that is gone.
-    self->depth_ = 0;
     self->WindowGone();
   } else if (self && self->made_) {
-    return self->Handle(window, [&] {
+    return self->Handle([&] {
       if (message == WM_SETCURSOR && self->hourglass_) {
         SetCursor(PointerOf(true));
         return LRESULT{TRUE};
@@ -254,10 +258,8 @@ LRESULT CALLBACK ControlWindow::WindowProc(HWND window, UINT message, WPARAM wPa
       // Programs that follow the screen are told so; others move the control to another window.
       if (message == WM_DPICHANGED_AFTERPARENT || message == WM_WINDOWPOSCHANGED) self->FollowDpi();
       const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
-      const LRESULT result = answer                  ? *answer
-                             : IsAlive(self, window) ? self->OnLook(message, wParam, lParam)
-                                                     : DefWindowProcW(window, message, wParam, lParam);
-      TellFocusLeft(self, window, message, wParam);
+      const LRESULT result = answer ? *answer : self->OnLook(window, message, wParam, lParam);
+      self->TellFocusLeft(window, message, wParam);
       return result;
     });
   }
@@ -273,10 +275,10 @@ LRESULT CALLBACK ControlWindow::ChildProc(HWND window, UINT message, WPARAM wPar
   } else if (self && self->made_) {
     // The child's own procedure runs inside too: it may wait for more messages, and must not lose its window
     // meanwhile.
-    return self->Handle(outer, [&] {
+    return self->Handle([&] {
       const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
       const LRESULT result = answer ? *answer : DefSubclassProc(window, message, wParam, lParam);
-      TellFocusLeft(self, outer, message, wParam);
+      self->TellFocusLeft(outer, message, wParam);
       return result;
     });
   }

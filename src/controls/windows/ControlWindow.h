@@ -1,26 +1,45 @@
 // What the windows of the controls have in common: the window is made on first use and parked below a hidden
-// one while the control is in no container, it has the look that the container gives, and the host's code may
-// end the control inside any of its messages.
+// one while the control is in no container, it has the look that the container gives, and it keeps its
+// control alive while it handles a message, because the host's code runs inside.
 #pragma once
 
 #include "platform/windows/WindowsHeaders.h"
 
-#include <functional>
 #include <optional>
 #include <utility>
 
 #include "base/RuntimeError.h"
+#include "platform/windows/ComPtr.h"
 #include "platform/windows/Owner.h"
 
 namespace tarnwick {
+
+// The control that a window belongs to, as its window needs it.
+class ControlWindowUser {
+ public:
+  virtual ~ControlWindowUser() = default;
+
+  // Keep the control alive, as those of a COM object do. Release may end the control and its window.
+  virtual ULONG STDMETHODCALLTYPE AddRef() = 0;
+  virtual ULONG STDMETHODCALLTYPE Release() = 0;
+
+  // The window is about to be destroyed by anybody but its object, such as its container.
+  virtual void WindowEnds() = 0;
+
+  // The host's code runs in these: it may call the control inside, and destroy its window.
+
+  // The window or one inside it got the focus, or a button went down there.
+  virtual void Activated() = 0;
+  // The focus has left the window and all inside it.
+  virtual void FocusLeft() = 0;
+  // What is selected is dragged out. Returns after the drop, and pumps messages until then.
+  virtual void DragBegins() = 0;
+};
 
 class ControlWindow {
  public:
   ControlWindow(const ControlWindow&) = delete;
   ControlWindow& operator=(const ControlWindow&) = delete;
-
-  // Notified before the window is destroyed by anybody but this object, such as its container.
-  std::function<void()> onEnd;
 
   // The window of the whole control, made hidden and without a container on the first call; null on failure.
   HWND Window();
@@ -34,22 +53,21 @@ class ControlWindow {
   void SetLook(HFONT font, std::optional<COLORREF> text, std::optional<COLORREF> background);
 
  protected:
-  // `module` is where the window's class belongs.
-  ControlWindow(HINSTANCE module, const wchar_t* className);
+  // `module` is where the window's class belongs. `control` outlives the object.
+  ControlWindow(HINSTANCE module, const wchar_t* className, ControlWindowUser& control);
   ~ControlWindow();
 
   // Makes what is inside the window; false on failure.
   virtual bool MakeChildren() = 0;
   // The window and all inside it are gone, although the control is not.
   virtual void WindowGone() = 0;
-  // The keyboard focus has left the window and all inside it.
-  virtual void FocusLeft() = 0;
   // Font or colours are others now. Called only while there is a window.
   virtual void ApplyLook() = 0;
   // The window is on a screen of other dots per inch than `before`. ApplyLook follows.
   virtual void DpiChanged(int before) = 0;
   // A message for the window of the control or for a child of it; nullopt leaves it to that window's own
-  // procedure. The control may have ended when a call that runs code of the host returns: see IsAlive.
+  // procedure. The control lives until the message is handled. Its window may be gone, or be another one,
+  // when a call that runs the host's code returns.
   virtual std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) = 0;
 
   // A child, or a child's child, whose messages come to OnMessage too; null on failure. `name` is its text.
@@ -60,10 +78,6 @@ class ControlWindow {
 
   // The window; null when there is none yet.
   HWND Outer() const { return window_; }
-  // Whether this object is still there and has the window `outer`, after code of the host ran. The one
-  // question that may be asked of an object that is gone.
-  static bool IsAlive(const ControlWindow* object, HWND outer) { return Of(outer) == object; }
-
   // The container's, as it is: one that follows the screen gives another one there. Else the system's, as
   // large as the screen needs it.
   HFONT Font() const;
@@ -75,15 +89,17 @@ class ControlWindow {
   void ShowHourglass(bool hourglass);
   bool HasHourglass() const { return hourglass_; }
 
+  ControlWindowUser& control_;
+
  private:
   static LRESULT CALLBACK WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
   static LRESULT CALLBACK ChildProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR id,
                                     DWORD_PTR outer);
   static ControlWindow* Of(HWND outer);
   template <typename Body>
-  LRESULT Handle(HWND outer, Body&& body);
-  LRESULT OnLook(UINT message, WPARAM wParam, LPARAM lParam) const;
-  static void TellFocusLeft(ControlWindow* self, HWND outer, UINT message, WPARAM wParam);
+  LRESULT Handle(Body&& body);
+  LRESULT OnLook(HWND window, UINT message, WPARAM wParam, LPARAM lParam) const;
+  void TellFocusLeft(HWND outer, UINT message, WPARAM wParam);
   bool MakeWindow();
   void FollowDpi();
 
@@ -94,8 +110,6 @@ class ControlWindow {
   bool registered_ = false;
   // All children are there.
   bool made_ = false;
-  // Handlers of messages that run now, one inside the other.
-  int depth_ = 0;
   bool hourglass_ = false;
   int dpi_;
   HFONT font_ = nullptr;

@@ -23,8 +23,8 @@ void CopyTo(const NMLVDISPINFOW& info, const Text& text) {
 
 }  // namespace
 
-WindowsListView::WindowsListView(HINSTANCE module, ListViewUser& user)
-    : ControlWindow(module, kClassName), user_(user) {}
+WindowsListView::WindowsListView(HINSTANCE module, ControlWindowUser& control)
+    : ControlWindow(module, kClassName, control) {}
 
 bool WindowsListView::MakeChildren() {
   const INITCOMMONCONTROLSEX classes = {sizeof classes, ICC_LISTVIEW_CLASSES};
@@ -111,11 +111,11 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
       cell.left += 4;
       cell.right -= 2;
       if (row > 0 && column == 0 && smallIcons_) {
-        ImageList_Draw(smallIcons_.Get(), (user_.IsGif(row - 1) ? icon::kSmallGif : icon::kSmallJpeg) - 1, dc,
-                       cell.left, cell.top, ILD_TRANSPARENT);
+        ImageList_Draw(smallIcons_.Get(), user_->PictureOf(row - 1).small - 1, dc, cell.left, cell.top,
+                       ILD_TRANSPARENT);
         cell.left += MulDiv(18, Dpi(), 96);
       }
-      const Text text = row == 0 ? titles_[column] : user_.ItemText(row - 1, column);
+      const Text text = row == 0 ? titles_[column] : user_->ItemText(row - 1, static_cast<int>(column));
       DrawTextW(dc, WideFromText(text).c_str(), -1, &cell, kCell);
     }
   }
@@ -219,7 +219,7 @@ void WindowsListView::Focus() {
 }
 
 std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {
-  if (window == list_) return OnListMessage(message, wParam, lParam);
+  if (window == list_) return OnListMessage(window, message, wParam, lParam);
   // The label, or the editor of an item's name.
   if (window != Outer()) return std::nullopt;
   switch (message) {
@@ -227,8 +227,8 @@ std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPA
       Layout();
       return 0;
     case WM_SETFOCUS:
-      user_.GotFocus();
-      if (IsAlive(this, window) && listShown_) SetFocus(list_);
+      control_.Activated();
+      if (Outer() == window && listShown_) SetFocus(list_);
       return 0;
     case WM_NOTIFY: {
       const auto& header = *reinterpret_cast<const NMHDR*>(lParam);
@@ -246,82 +246,75 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
       auto& info = *reinterpret_cast<NMLVDISPINFOW*>(const_cast<NMHDR*>(&header));
       const auto item = static_cast<std::size_t>(info.item.iItem);
       if (info.item.iItem < 0 || item >= count_) return 0;
-      if (info.item.mask & LVIF_TEXT)
-        CopyTo(info, user_.ItemText(item, static_cast<std::size_t>(info.item.iSubItem)));
-      if (info.item.mask & LVIF_IMAGE)
-        info.item.iImage = (user_.IsGif(item) ? icon::kSmallGif : icon::kSmallJpeg) - 1;
+      if (info.item.mask & LVIF_TEXT) CopyTo(info, user_->ItemText(item, info.item.iSubItem));
+      if (info.item.mask & LVIF_IMAGE) info.item.iImage = user_->PictureOf(item).small - 1;
       return 0;
     }
     case LVN_ODFINDITEMW: {
       const auto& find = *reinterpret_cast<const NMLVFINDITEMW*>(&header);
       if (!(find.lvfi.flags & (LVFI_STRING | LVFI_PARTIAL)) || !find.lvfi.psz) return -1;
       const auto found =
-          user_.FindItem(TextFromWide(find.lvfi.psz), static_cast<std::size_t>(std::max(0, find.iStart)));
+          user_->FindItem(TextFromWide(find.lvfi.psz), static_cast<std::size_t>(std::max(0, find.iStart)));
       return found ? static_cast<LRESULT>(*found) : -1;
     }
     case LVN_BEGINLABELEDITW: {
-      const auto& info = *reinterpret_cast<const NMLVDISPINFOW*>(&header);
       // True keeps the list from editing.
-      const HWND outer = Outer();
-      if (!user_.LabelEditBegins(static_cast<std::size_t>(info.item.iItem))) return TRUE;
-      if (!IsAlive(this, outer)) return FALSE;
+      if (!user_->OnBeforeLabelEdit()) return TRUE;
       if (const HWND editor = ListView_GetEditControl(list_)) Watch(editor);
       return FALSE;
     }
     case LVN_ENDLABELEDITW: {
       const auto& info = *reinterpret_cast<const NMLVDISPINFOW*>(&header);
       if (!info.item.pszText) return FALSE;
-      return user_.LabelEditEnds(static_cast<std::size_t>(info.item.iItem), TextFromWide(info.item.pszText))
+      return user_->OnAfterLabelEdit(static_cast<std::size_t>(info.item.iItem),
+                                     TextFromWide(info.item.pszText))
                  ? TRUE
                  : FALSE;
     }
     case LVN_BEGINDRAG:
-      user_.DragBegins();
+      control_.DragBegins();
       return 0;
     case NM_CLICK:
-      user_.Clicked();
+      user_->OnClick();
       return 0;
     case NM_SETFOCUS:
-      user_.GotFocus();
+      control_.Activated();
       return 0;
     default:
       return 0;
   }
 }
 
-std::optional<LRESULT> WindowsListView::OnListMessage(UINT message, WPARAM wParam, LPARAM lParam) {
-  // The user's handlers come last, or nothing of this object is touched after them.
+std::optional<LRESULT> WindowsListView::OnListMessage(HWND list, UINT message, WPARAM wParam, LPARAM lParam) {
   switch (message) {
     case WM_LBUTTONDOWN:
     case WM_RBUTTONDOWN: {
       const HWND outer = Outer();
       ++buttons_;
-      user_.ButtonPressed();
-      if (!IsAlive(this, outer)) return std::nullopt;
-      const LRESULT result = DefSubclassProc(list_, message, wParam, lParam);
+      control_.Activated();
+      const LRESULT result = DefSubclassProc(list, message, wParam, lParam);
       // Of buttons one inside the other the first one tells, when the list has done with all.
-      if (IsAlive(this, outer) && --buttons_ == 0) user_.ButtonDone();
+      if (Outer() == outer && --buttons_ == 0) user_->OnMouseButton();
       return result;
     }
     case WM_GETDLGCODE: {
       // Of a form that handles its keys as a dialog does, Enter would press the default button.
       const auto* const key = reinterpret_cast<const MSG*>(lParam);
       const bool enter = key && key->message == WM_KEYDOWN && key->wParam == VK_RETURN;
-      return DefSubclassProc(list_, message, wParam, lParam) | (enter ? DLGC_WANTMESSAGE : 0);
+      return DefSubclassProc(list, message, wParam, lParam) | (enter ? DLGC_WANTMESSAGE : 0);
     }
     case WM_KEYDOWN: {
       if (wParam == VK_RETURN) {
-        user_.EnterPressed();
+        user_->OnEnter();
         return 0;
       }
       if (wParam == VK_F2) {
         // The list asks whether it may, as it does after a slow second click.
-        if (const auto selected = NextSelected(0)) ListView_EditLabel(list_, static_cast<int>(*selected));
+        if (const auto selected = NextSelected(0)) ListView_EditLabel(list, static_cast<int>(*selected));
         return 0;
       }
-      const HWND outer = Outer();
-      const LRESULT result = DefSubclassProc(list_, message, wParam, lParam);
-      if (IsAlive(this, outer)) user_.KeyPressed(static_cast<int>(wParam));
+      const LRESULT result = DefSubclassProc(list, message, wParam, lParam);
+      user_->OnKeyDown(static_cast<std::int32_t>(wParam));
       return result;
     }
     default:

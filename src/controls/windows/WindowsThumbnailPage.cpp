@@ -52,8 +52,8 @@ void DrawFocus(HDC dc, const RECT& area) {
 
 }  // namespace
 
-WindowsThumbnailPage::WindowsThumbnailPage(HINSTANCE module, ThumbnailPageUser& user)
-    : ControlWindow(module, kClassName), user_(user) {}
+WindowsThumbnailPage::WindowsThumbnailPage(HINSTANCE module, ControlWindowUser& control)
+    : ControlWindow(module, kClassName, control) {}
 
 // --- The windows ---
 
@@ -337,7 +337,7 @@ void WindowsThumbnailPage::OnScroll(int code, int position) {
       if (dragged == scrollValue_) break;
       scrollValue_ = dragged;
       draggedAway_ = true;
-      user_.ScrollDragged(dragged);
+      user_->OnScrollDragged(dragged);
       break;
     default:
       break;
@@ -351,7 +351,7 @@ void WindowsThumbnailPage::ScrollTo(int value) {
   if (scrollValue_ == restValue_ && !draggedAway_) return;
   draggedAway_ = false;
   restValue_ = scrollValue_;
-  user_.ScrollChanged(scrollValue_);
+  user_->OnScrollChanged(scrollValue_);
 }
 
 // --- The editor ---
@@ -410,16 +410,15 @@ std::optional<LRESULT> WindowsThumbnailPage::OnMessage(HWND window, UINT message
 }
 
 LRESULT WindowsThumbnailPage::OnFocus(HWND window, WPARAM wParam, LPARAM lParam) {
-  const HWND outer = Outer();
-  if (window == outer) {
+  if (window == Outer()) {
     SetFocus(FirstStop());
     return 0;
   }
   const LRESULT result = DefSubclassProc(window, WM_SETFOCUS, wParam, lParam);
   RefreshGrid();
   tellingFocus_ = true;
-  user_.GotFocus();
-  if (IsAlive(this, outer)) tellingFocus_ = false;
+  control_.Activated();
+  tellingFocus_ = false;
   return result;
 }
 
@@ -445,9 +444,9 @@ std::optional<LRESULT> WindowsThumbnailPage::OnOuterMessage(UINT message, WPARAM
     case WM_COMMAND:
       if (HIWORD(wParam) != BN_CLICKED) return std::nullopt;
       if (sender == linkWindow_)
-        user_.LinkClicked();
+        user_->OnLinkClicked();
       else if (sender == switchWindow_)
-        user_.SwitchViewClicked();
+        user_->OnSwitchView();
       return 0;
     case WM_DRAWITEM: {
       const auto& item = *reinterpret_cast<const DRAWITEMSTRUCT*>(lParam);
@@ -493,7 +492,7 @@ std::optional<LRESULT> WindowsThumbnailPage::OnGridMessage(HWND window, UINT mes
       if (window != gridWindow_) return std::nullopt;
       return wParam == VK_RETURN ? DLGC_WANTMESSAGE : DLGC_WANTARROWS;
     case WM_KEYDOWN:
-      user_.KeyPressed(static_cast<int>(wParam));
+      user_->OnKeyDown(static_cast<int>(wParam));
       return 0;
     default:
       return std::nullopt;
@@ -507,17 +506,19 @@ LRESULT WindowsThumbnailPage::OnPress(HWND window, UINT message, POINT at) {
   const bool right = message == WM_RBUTTONDOWN || message == WM_RBUTTONDBLCLK;
   // Ends an edit, too.
   SetFocus(FirstStop());
-  if (!IsAlive(this, outer)) return 0;
+  if (Outer() != outer) return 0;
   if (slot == 0) {
-    user_.BackgroundPressed(right);
+    control_.Activated();
+    user_->OnBackgroundPressed(right);
     return 0;
   }
-  // Before the user is told, whose code may wait until the button is up again.
+  // Before the host's code runs, which may wait until the button is up again.
   if (left && At(slot).picture && PtInRect(&At(slot).place, at)) {
     SetCapture(window);
     dragFrom_ = at;
   }
-  user_.SlotPressed(slot, right);
+  control_.Activated();
+  user_->OnSlotPressed(slot, right);
   return 0;
 }
 
@@ -526,7 +527,7 @@ LRESULT WindowsThumbnailPage::OnMove(POINT at) {
       std::abs(at.y - dragFrom_->y) <= GetSystemMetrics(SM_CYDRAG))
     return 0;
   EndDragWatch();
-  user_.DragBegins();
+  control_.DragBegins();
   return 0;
 }
 
@@ -537,11 +538,10 @@ void WindowsThumbnailPage::EndDragWatch() {
 }
 
 std::optional<LRESULT> WindowsThumbnailPage::OnEditorMessage(UINT message, WPARAM wParam, LPARAM lParam) {
-  const HWND outer = Outer();
   const auto tell = [&](void (ThumbnailPageUser::*what)()) {
     tellingEditor_ = true;
-    (user_.*what)();
-    if (IsAlive(this, outer)) tellingEditor_ = false;
+    (user_->*what)();
+    tellingEditor_ = false;
   };
   switch (message) {
     case WM_GETDLGCODE:
@@ -550,9 +550,9 @@ std::optional<LRESULT> WindowsThumbnailPage::OnEditorMessage(UINT message, WPARA
       return std::nullopt;
     case WM_KEYDOWN:
       if (wParam == VK_RETURN)
-        tell(&ThumbnailPageUser::EditorEntered);
+        tell(&ThumbnailPageUser::OnEditorEntered);
       else if (wParam == VK_ESCAPE)
-        tell(&ThumbnailPageUser::EditorLeft);
+        tell(&ThumbnailPageUser::OnEditorLeft);
       else
         return std::nullopt;
       return 0;
@@ -562,7 +562,7 @@ std::optional<LRESULT> WindowsThumbnailPage::OnEditorMessage(UINT message, WPARA
       return std::nullopt;
     case WM_KILLFOCUS: {
       const LRESULT result = DefSubclassProc(editorWindow_, message, wParam, lParam);
-      if (edited_ != 0 && !tellingEditor_) tell(&ThumbnailPageUser::EditorLeft);
+      if (edited_ != 0 && !tellingEditor_) tell(&ThumbnailPageUser::OnEditorLeft);
       return result;
     }
     default:
@@ -580,9 +580,9 @@ std::optional<LRESULT> WindowsThumbnailPage::OnButtonMessage(HWND window, UINT m
       // Buttons themselves take the space bar only.
       if (wParam != VK_RETURN) return std::nullopt;
       if (window == linkWindow_)
-        user_.LinkClicked();
+        user_->OnLinkClicked();
       else
-        user_.SwitchViewClicked();
+        user_->OnSwitchView();
       return 0;
     case WM_SETCURSOR:
       if (window != linkWindow_ || HasHourglass()) return std::nullopt;

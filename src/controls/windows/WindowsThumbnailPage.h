@@ -22,9 +22,12 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   // Size of a control that shows all of the page, in HIMETRIC.
   static constexpr SIZEL kNaturalExtent = layout::kPageHimetric;
 
-  // `module` is where the window's class belongs. `user` outlives the window. The thread has initialised COM,
-  // which reads the pictures.
-  WindowsThumbnailPage(HINSTANCE module, ThumbnailPageUser& user);
+  // `module` is where the window's class belongs. `control` outlives the object. The thread has initialised
+  // COM, which reads the pictures.
+  WindowsThumbnailPage(HINSTANCE module, ControlWindowUser& control);
+
+  // Before the window is made; `user` takes part until the object ends.
+  void SetUser(ThumbnailPageUser& user) { user_ = &user; }
 
   // Draws the page as the window would show it, into `bounds` in pixels of the screen, which `dc` may map to
   // others.
@@ -50,7 +53,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   bool HasFocus() const override;
   void Focus() override;
   void SetHourglass(bool hourglass) override { ShowHourglass(hourglass); }
-  void StartDrag() override { user_.DragBegins(); }
+  void StartDrag() override { control_.DragBegins(); }
 
  private:
   struct Slot {
@@ -68,7 +71,6 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   enum class Content { kNothing, kGrid, kEmptyAccount };
 
   bool MakeChildren() override;
-  void FocusLeft() override { user_.LostFocus(); }
   void WindowGone() override;
   void ApplyLook() override;
   void DpiChanged(int before) override;
@@ -103,7 +105,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   int Pixels(int twips) const { return layout::Pixels(twips, Dpi()); }
   RECT Pixels(const layout::TwipRect& area) const { return layout::Pixels(area, Dpi()); }
 
-  ThumbnailPageUser& user_;
+  ThumbnailPageUser* user_ = nullptr;
   std::array<Slot, kSlotCount> slots_;
   Content content_ = Content::kNothing;
   Text message_;
@@ -128,7 +130,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   HWND editorWindow_ = nullptr;
   // The slot whose name is edited, or 0.
   int edited_ = 0;
-  // The user is being told of the focus, or of the end of the edit: what follows from that is no news.
+  // The control is being told of the focus, or of the end of the edit: what follows from that is no news.
   bool tellingFocus_ = false;
   bool tellingEditor_ = false;
   // Where the button went down on a picture that may be dragged out.
