@@ -577,16 +577,20 @@ TEST_F(ThumbnailPageTest, MayEndInsideAnyOfItsEvents) {
     SCOPED_TRACE(each.event);
     if (!page_) Make();
     const HWND window = page_->Window();
+    const std::weak_ptr<WindowsThumbnailPage> page = page_;
     if (std::string(each.event) == "left" || std::string(each.event) == "entered") page_->ShowEditor(1, u"a");
     user_.Take();
     user_.on = [&](const std::string& what) {
       if (what != each.event) return;
       user_.on = {};
       page_.reset();
+      EXPECT_FALSE(page.expired()) << "gone in its own message";
     };
     each.cause();
     user_.on = {};
     EXPECT_EQ(page_, nullptr);
+    EXPECT_TRUE(page.expired()) << "still there after it";
+    EXPECT_TRUE(IsWindow(window)) << "the system's windows are not done with the message";
     EXPECT_FALSE(IsWindowVisible(window));
     Pump();
     EXPECT_FALSE(IsWindow(window));
