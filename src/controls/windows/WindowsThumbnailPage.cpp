@@ -30,9 +30,6 @@ constexpr COLORREF kCaptionPaper = RGB(255, 255, 255);
 constexpr UINT kCaptionFormat = DT_CENTER | DT_WORDBREAK | DT_EDITCONTROL | DT_END_ELLIPSIS;
 constexpr UINT kLinkFormat = DT_CENTER | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
 
-// Pictures in a row, and on a page.
-constexpr int kStep = 2;
-
 void Fill(HDC dc, const RECT& area, COLORREF color) {
   SetDCBrushColor(dc, color);
   FillRect(dc, &area, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
@@ -80,7 +77,7 @@ bool WindowsThumbnailPage::MakeChildren() {
     ApplyCaption(slot);
   }
   PlaceChildren();
-  ApplyScroll();
+  scrollBar_.SetWindow(scrollWindow_);
   ApplyContent();
   return true;
 }
@@ -108,6 +105,7 @@ void WindowsThumbnailPage::DpiChanged(int) {
 void WindowsThumbnailPage::WindowGone() {
   gridWindow_ = scrollWindow_ = messageWindow_ = linkWindow_ = switchWindow_ = editorWindow_ = nullptr;
   for (Slot& slot : slots_) slot.window = nullptr;
+  scrollBar_.SetWindow(nullptr);
   edited_ = 0;
   tellingFocus_ = tellingEditor_ = false;
   dragFrom_.reset();
@@ -276,84 +274,6 @@ void WindowsThumbnailPage::SetSelected(int slot, bool selected) {
   if (selected) NotifyWinEvent(EVENT_OBJECT_SELECTION, changed.window, OBJID_CLIENT, CHILDID_SELF);
 }
 
-// --- The scroll bar ---
-
-void WindowsThumbnailPage::SetScrollRange(int max) {
-  scrollMax_ = std::max(0, max);
-  SetScrollValue(scrollValue_);
-}
-
-void WindowsThumbnailPage::EnableScroll(bool enabled) {
-  scrollEnabled_ = enabled;
-  ApplyScroll();
-}
-
-void WindowsThumbnailPage::SetScrollValue(int value) {
-  scrollValue_ = restValue_ = std::clamp(value, 0, scrollMax_);
-  ApplyScroll();
-}
-
-void WindowsThumbnailPage::ApplyScroll() const {
-  if (!scrollWindow_) return;
-  SCROLLINFO info = {};
-  info.cbSize = sizeof info;
-  info.fMask = SIF_RANGE | SIF_PAGE | SIF_POS;
-  // The thumb is as long as a page, so the range is as long as all pictures.
-  info.nMax = scrollMax_ + kSlotCount - 1;
-  info.nPage = kSlotCount;
-  info.nPos = scrollValue_;
-  SetScrollInfo(scrollWindow_, SB_CTL, &info, TRUE);
-  EnableWindow(scrollWindow_, scrollEnabled_);
-}
-
-void WindowsThumbnailPage::OnScroll(int code, int position) {
-  // The message carries 16 bits of the position; the bar knows them all.
-  SCROLLINFO info = {};
-  info.cbSize = sizeof info;
-  info.fMask = SIF_TRACKPOS;
-  if (GetScrollInfo(scrollWindow_, SB_CTL, &info) && (info.nTrackPos & 0xFFFF) == position)
-    position = info.nTrackPos;
-  // Between two rows the thumb stands for the upper one, so that no picture changes its column.
-  const int dragged = std::clamp(position - position % kStep, 0, scrollMax_);
-  switch (code) {
-    case SB_LINEUP:
-    case SB_PAGEUP:
-      ScrollTo(scrollValue_ - kStep);
-      break;
-    case SB_LINEDOWN:
-    case SB_PAGEDOWN:
-      ScrollTo(scrollValue_ + kStep);
-      break;
-    case SB_TOP:
-      ScrollTo(0);
-      break;
-    case SB_BOTTOM:
-      ScrollTo(scrollMax_);
-      break;
-    case SB_THUMBPOSITION:
-      ScrollTo(dragged);
-      break;
-    case SB_THUMBTRACK:
-      if (dragged == scrollValue_) break;
-      scrollValue_ = dragged;
-      draggedAway_ = true;
-      user_->OnScrollDragged(dragged);
-      break;
-    default:
-      break;
-  }
-}
-
-void WindowsThumbnailPage::ScrollTo(int value) {
-  scrollValue_ = std::clamp(value, 0, scrollMax_);
-  ApplyScroll();
-  // Let go where it was, it has shown other pages meanwhile.
-  if (scrollValue_ == restValue_ && !draggedAway_) return;
-  draggedAway_ = false;
-  restValue_ = scrollValue_;
-  user_->OnScrollChanged(scrollValue_);
-}
-
 // --- The editor ---
 
 void WindowsThumbnailPage::PlaceEditor() const {
@@ -429,17 +349,13 @@ std::optional<LRESULT> WindowsThumbnailPage::OnOuterMessage(UINT message, WPARAM
     case WM_RBUTTONDOWN:
     case WM_MBUTTONDOWN:
       return OnPress(Outer(), message, {});
-    case WM_MOUSEWHEEL: {
-      if (content_ != Content::kGrid || !scrollEnabled_) return std::nullopt;
-      wheelRest_ += GET_WHEEL_DELTA_WPARAM(wParam);
-      const int notches = wheelRest_ / WHEEL_DELTA;
-      wheelRest_ -= notches * WHEEL_DELTA;
-      ScrollTo(scrollValue_ - notches * kStep);
+    case WM_MOUSEWHEEL:
+      if (content_ != Content::kGrid || !scrollBar_.IsEnabled()) return std::nullopt;
+      scrollBar_.OnWheel(GET_WHEEL_DELTA_WPARAM(wParam), *user_);
       return 0;
-    }
     case WM_VSCROLL:
       if (sender != scrollWindow_) return std::nullopt;
-      OnScroll(LOWORD(wParam), HIWORD(wParam));
+      scrollBar_.OnScroll(LOWORD(wParam), HIWORD(wParam), *user_);
       return 0;
     case WM_COMMAND:
       if (HIWORD(wParam) != BN_CLICKED) return std::nullopt;
@@ -669,23 +585,6 @@ void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
   if (focus) DrawFocus(dc, area);
 }
 
-void WindowsThumbnailPage::DrawScrollBar(HDC dc, const RECT& area) const {
-  FillRect(dc, &area, GetSysColorBrush(COLOR_SCROLLBAR));
-  const UINT state = scrollEnabled_ ? 0 : DFCS_INACTIVE;
-  RECT up = area;
-  RECT down = area;
-  up.bottom = up.top + (area.right - area.left);
-  down.top = down.bottom - (area.right - area.left);
-  DrawFrameControl(dc, &up, DFC_SCROLL, DFCS_SCROLLUP | state);
-  DrawFrameControl(dc, &down, DFC_SCROLL, DFCS_SCROLLDOWN | state);
-  if (!scrollEnabled_) return;
-  const int track = down.top - up.bottom;
-  const int all = scrollMax_ + kSlotCount;
-  RECT thumb = {area.left, up.bottom + MulDiv(track, scrollValue_, all), area.right, 0};
-  thumb.bottom = thumb.top + std::max(Pixels(120), MulDiv(track, kSlotCount, all));
-  DrawFrameControl(dc, &thumb, DFC_BUTTON, DFCS_BUTTONPUSH);
-}
-
 void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) const {
   const SavedDcOwner saved = SaveStateOf(dc);
   IntersectClipRect(dc, bounds.left, bounds.top, bounds.right, bounds.bottom);
@@ -698,7 +597,7 @@ void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) const {
   if (content_ == Content::kGrid) {
     for (std::size_t slot = 0; slot < kSlotCount; ++slot)
       if (slots_[slot].shown) DrawSlot(dc, placed(kFrames[slot]), slots_[slot], false);
-    DrawScrollBar(dc, placed(layout::kScrollBar));
+    scrollBar_.Draw(dc, placed(layout::kScrollBar), Pixels(120));
   } else if (content_ == Content::kEmptyAccount) {
     RECT message = placed(layout::kMessage);
     SetTextColor(dc, TextColor());

@@ -11,6 +11,7 @@
 #include "controls/thumbnailview/ThumbnailPage.h"
 #include "controls/thumbnailview/ThumbnailPageUser.h"
 #include "controls/windows/ControlWindow.h"
+#include "controls/windows/PageScrollBar.h"
 #include "controls/windows/PictureLoader.h"
 #include "controls/windows/ThumbnailLayout.h"
 #include "platform/windows/Owner.h"
@@ -43,10 +44,10 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void SetCaption(int slot, TextView caption) override;
   bool SetPicture(int slot, TextView path, const PicturePlace& place) override;
   void SetSelected(int slot, bool selected) override;
-  void SetScrollRange(int max) override;
-  void EnableScroll(bool enabled) override;
-  void SetScrollValue(int value) override;
-  int ScrollValue() const override { return scrollValue_; }
+  void SetScrollRange(int max) override { scrollBar_.SetRange(max); }
+  void EnableScroll(bool enabled) override { scrollBar_.Enable(enabled); }
+  void SetScrollValue(int value) override { scrollBar_.SetValue(value); }
+  int ScrollValue() const override { return scrollBar_.Value(); }
   void ShowEditor(int slot, TextView name) override;
   void HideEditor() override;
   Text EditorText() const override;
@@ -82,8 +83,6 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   LRESULT OnFocus(HWND window, WPARAM wParam, LPARAM lParam);
   LRESULT OnPress(HWND window, UINT message, POINT at);
   LRESULT OnMove(POINT at);
-  void OnScroll(int code, int position);
-  void ScrollTo(int value);
   void EndDragWatch();
 
   Slot& At(int slot) { return slots_[static_cast<std::size_t>(slot) - 1]; }
@@ -94,14 +93,12 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void PlaceEditor() const;
   void ApplyContent() const;
   void ApplyCaption(int slot);
-  void ApplyScroll() const;
   void ApplyTexts() const;
   void RefreshGrid() const;
   void Paint(HWND window) const;
   void DrawSlot(HDC dc, const RECT& frame, const Slot& slot, bool focus) const;
   void DrawCaption(HDC dc, RECT area, const Slot& slot) const;
   void DrawLink(HDC dc, RECT area, bool focus) const;
-  void DrawScrollBar(HDC dc, const RECT& area) const;
   int Pixels(int twips) const { return layout::Pixels(twips, Dpi()); }
   RECT Pixels(const layout::TwipRect& area) const { return layout::Pixels(area, Dpi()); }
 
@@ -111,16 +108,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   Text message_;
   Text link_;
   FontOwner linkFont_;
-
-  int scrollMax_ = 0;
-  int scrollValue_ = 0;
-  // Where the bar was at rest last; differs from the value while the thumb is dragged.
-  int restValue_ = 0;
-  // A drag of the thumb has shown another page since.
-  bool draggedAway_ = false;
-  bool scrollEnabled_ = true;
-  // What is left of the wheel's turn, less than a notch.
-  int wheelRest_ = 0;
+  PageScrollBar scrollBar_;
 
   HWND gridWindow_ = nullptr;
   HWND scrollWindow_ = nullptr;
