@@ -3,6 +3,7 @@
 #include <atomic>
 #include <mutex>
 
+#include "controls/windows/Drawing.h"
 #include "platform/windows/CommonControls.h"
 #include "platform/windows/SystemDpi.h"
 
@@ -216,20 +217,18 @@ void ControlWindow::TellFocusLeft(HWND outer, UINT message, WPARAM wParam) {
 // What is seen beside the children, and behind the texts of labels.
 LRESULT ControlWindow::OnLook(HWND window, UINT message, WPARAM wParam, LPARAM lParam) const {
   const auto dc = reinterpret_cast<HDC>(wParam);
-  const auto brush = static_cast<HBRUSH>(GetStockObject(DC_BRUSH));
   switch (message) {
     case WM_ERASEBKGND: {
       RECT client = {};
       GetClientRect(window, &client);
-      SetDCBrushColor(dc, BackColor());
-      FillRect(dc, &client, brush);
+      Fill(dc, client, BackColor());
       return TRUE;
     }
     case WM_CTLCOLORSTATIC:
       SetTextColor(dc, TextColor());
       SetBkColor(dc, BackColor());
       SetDCBrushColor(dc, BackColor());
-      return reinterpret_cast<LRESULT>(brush);
+      return reinterpret_cast<LRESULT>(GetStockObject(DC_BRUSH));
     default:
       return DefWindowProcW(window, message, wParam, lParam);
   }

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <array>
 
+#include "controls/windows/Drawing.h"
+
 namespace tarnwick {
 namespace {
 
@@ -21,11 +23,6 @@ struct Band {
 };
 constexpr Band kGif = {L"GIF", kGifBand};
 constexpr Band kJpeg = {L"JPG", kJpegBand};
-
-void Fill(HDC dc, const RECT& area, COLORREF color) {
-  const BrushOwner brush(CreateSolidBrush(color));
-  FillRect(dc, &area, brush.Get());
-}
 
 // A page that fills most of a square of `size` pixels, with a band across it.
 void DrawPage(HDC dc, int left, int size, const Band* band) {

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <string>
 
+#include "controls/windows/Drawing.h"
 #include "platform/windows/AnsiText.h"
 
 namespace tarnwick {
@@ -85,8 +86,7 @@ void WindowsListView::Layout() const {
 
 void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
   const SelectionOwner font = SelectInto(dc, Font());
-  SetDCBrushColor(dc, BackColor());
-  FillRect(dc, &bounds, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
+  Fill(dc, bounds, BackColor());
   SetTextColor(dc, TextColor());
   SetBkMode(dc, TRANSPARENT);
   TEXTMETRICW metrics = {};

@@ -4,6 +4,7 @@
 #include <string>
 
 #include "base/RuntimeError.h"
+#include "controls/windows/Drawing.h"
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/CommonControls.h"
 
@@ -22,29 +23,23 @@ constexpr wchar_t kSlotName[] = L"Picture ";
 constexpr wchar_t kSwitchText[] = L"List view";
 
 constexpr COLORREF kLinkColor = RGB(0, 0, 255);
-constexpr COLORREF kCaptionColor = RGB(0, 0, 0x40);
-constexpr COLORREF kSelectedCaptionColor = RGB(255, 255, 255);
-constexpr COLORREF kCaptionPaper = RGB(255, 255, 255);
 
-// Up to the lines that fit, names without blanks included.
-constexpr UINT kCaptionFormat = DT_CENTER | DT_WORDBREAK | DT_EDITCONTROL | DT_END_ELLIPSIS;
 constexpr UINT kLinkFormat = DT_CENTER | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
 
-void Fill(HDC dc, const RECT& area, COLORREF color) {
-  SetDCBrushColor(dc, color);
-  FillRect(dc, &area, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
+// The painting of a window, from its beginning to its end.
+struct Painting {
+  HWND window;
+  PAINTSTRUCT paint;
+  bool operator==(const Painting& other) const { return window == other.window; }
+};
+void EndPainting(const Painting& held) {
+  EndPaint(held.window, &held.paint);
 }
-
-RECT Moved(RECT area, LONG x, LONG y) {
-  OffsetRect(&area, x, y);
-  return area;
-}
-
-void DrawFocus(HDC dc, const RECT& area) {
-  // The dots take these colours.
-  SetTextColor(dc, RGB(0, 0, 0));
-  SetBkColor(dc, RGB(255, 255, 255));
-  DrawFocusRect(dc, &area);
+using PaintingOwner = Owner<Painting, EndPainting>;
+PaintingOwner Paint(HWND window) {
+  Painting begun = {window, {}};
+  BeginPaint(window, &begun.paint);
+  return PaintingOwner(begun);
 }
 
 }  // namespace
@@ -379,7 +374,7 @@ std::optional<LRESULT> WindowsThumbnailPage::OnGridMessage(HWND window, UINT mes
   const POINT at = {static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))};
   switch (message) {
     case WM_PAINT:
-      Paint(window);
+      PaintGrid(window);
       return 0;
     case WM_ERASEBKGND:
       return TRUE;
@@ -512,68 +507,19 @@ std::optional<LRESULT> WindowsThumbnailPage::OnButtonMessage(HWND window, UINT m
 // --- Drawing ---
 
 // Everything of a window in memory first, so that nothing flickers.
-void WindowsThumbnailPage::Paint(HWND window) const {
-  PAINTSTRUCT paint = {};
-  const HDC screen = BeginPaint(window, &paint);
+void WindowsThumbnailPage::PaintGrid(HWND window) const {
+  const PaintingOwner painting = Paint(window);
+  const HDC screen = painting.Get().paint.hdc;
   const int slot = SlotOf(window);
-  if (slot == 0) {
-    Fill(screen, paint.rcPaint, BackColor());
-  } else {
-    RECT client = {};
-    GetClientRect(window, &client);
-    const MemoryDcOwner memory(CreateCompatibleDC(screen));
-    const BitmapOwner bitmap(CreateCompatibleBitmap(screen, client.right, client.bottom));
-    const SelectionOwner picture = SelectInto(memory.Get(), bitmap.Get());
-    DrawSlot(memory.Get(), client, slots_[static_cast<std::size_t>(slot) - 1], GetFocus() == gridWindow_);
-    BitBlt(screen, 0, 0, client.right, client.bottom, memory.Get(), 0, 0, SRCCOPY);
-  }
-  EndPaint(window, &paint);
-}
-
-void WindowsThumbnailPage::DrawSlot(HDC dc, const RECT& frame, const Slot& slot, bool focus) const {
-  const auto placed = [&](const RECT& area) { return Moved(area, frame.left, frame.top); };
-  Fill(dc, frame, BackColor());
-  FrameRect(dc, &frame, GetSysColorBrush(COLOR_BTNSHADOW));
-  if (slot.selected) {
-    RECT ring = placed(Pixels(layout::kMarker));
-    Fill(dc, ring, GetSysColor(COLOR_HIGHLIGHT));
-    InflateRect(&ring, -Pixels(layout::kMarkerWidth), -Pixels(layout::kMarkerWidth));
-    Fill(dc, ring, BackColor());
-  }
-  if (slot.picture) {
-    const RECT place = placed(slot.place);
-    const MemoryDcOwner memory(CreateCompatibleDC(nullptr));
-    const SelectionOwner picture = SelectInto(memory.Get(), slot.picture.Get());
-    BITMAP bitmap = {};
-    GetObjectW(slot.picture.Get(), sizeof bitmap, &bitmap);
-    // One to one on the screen, as a rule; a printer may map pixels to many.
-    SetStretchBltMode(dc, HALFTONE);
-    SetBrushOrgEx(dc, 0, 0, nullptr);
-    StretchBlt(dc, place.left, place.top, place.right - place.left, place.bottom - place.top, memory.Get(), 0,
-               0, bitmap.bmWidth, bitmap.bmHeight, SRCCOPY);
-  }
-  DrawCaption(dc, placed(Pixels(kCaption)), slot);
-  if (slot.selected && focus) {
-    RECT dots = frame;
-    InflateRect(&dots, -Pixels(45), -Pixels(45));
-    DrawFocus(dc, dots);
-  }
-}
-
-void WindowsThumbnailPage::DrawCaption(HDC dc, RECT area, const Slot& slot) const {
-  if (slot.caption.empty()) return;
-  const std::wstring text = WideFromText(slot.caption);
-  const SelectionOwner font = SelectInto(dc, Font());
-  InflateRect(&area, -Pixels(15), -Pixels(15));
-  RECT lines = area;
-  DrawTextW(dc, text.c_str(), -1, &lines, kCaptionFormat | DT_CALCRECT);
-  area.bottom = std::min(area.bottom, lines.bottom);
-  RECT paper = area;
-  InflateRect(&paper, Pixels(15), Pixels(15));
-  Fill(dc, paper, slot.selected ? GetSysColor(COLOR_HIGHLIGHT) : kCaptionPaper);
-  SetTextColor(dc, slot.selected ? kSelectedCaptionColor : kCaptionColor);
-  SetBkMode(dc, TRANSPARENT);
-  DrawTextW(dc, text.c_str(), -1, &area, kCaptionFormat);
+  if (slot == 0) return Fill(screen, painting.Get().paint.rcPaint, BackColor());
+  RECT client = {};
+  GetClientRect(window, &client);
+  const MemoryDcOwner memory(CreateCompatibleDC(screen));
+  const BitmapOwner bitmap(CreateCompatibleBitmap(screen, client.right, client.bottom));
+  const SelectionOwner picture = SelectInto(memory.Get(), bitmap.Get());
+  DrawTile(memory.Get(), client, slots_[static_cast<std::size_t>(slot) - 1], Style(),
+           GetFocus() == gridWindow_);
+  BitBlt(screen, 0, 0, client.right, client.bottom, memory.Get(), 0, 0, SRCCOPY);
 }
 
 void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
@@ -596,7 +542,7 @@ void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) const {
   SetBkMode(dc, TRANSPARENT);
   if (content_ == Content::kGrid) {
     for (std::size_t slot = 0; slot < kSlotCount; ++slot)
-      if (slots_[slot].shown) DrawSlot(dc, placed(kFrames[slot]), slots_[slot], false);
+      if (slots_[slot].shown) DrawTile(dc, placed(kFrames[slot]), slots_[slot], Style(), false);
     scrollBar_.Draw(dc, placed(layout::kScrollBar), Pixels(120));
   } else if (content_ == Content::kEmptyAccount) {
     RECT message = placed(layout::kMessage);

@@ -14,6 +14,7 @@
 #include "controls/windows/PageScrollBar.h"
 #include "controls/windows/PictureLoader.h"
 #include "controls/windows/ThumbnailLayout.h"
+#include "controls/windows/ThumbnailTile.h"
 #include "platform/windows/Owner.h"
 
 namespace tarnwick {
@@ -57,17 +58,12 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void StartDrag() override { control_.DragBegins(); }
 
  private:
-  struct Slot {
+  struct Slot : ThumbnailTile {
     HWND window = nullptr;
-    Text caption;
     // Where the picture comes from and goes to.
     std::wstring path;
     PicturePlace twips;
-    // As large as it is shown, at `place` in the frame; empty when there is none.
-    BitmapOwner picture;
-    RECT place = {};
     bool shown = true;
-    bool selected = false;
   };
   enum class Content { kNothing, kGrid, kEmptyAccount };
 
@@ -95,9 +91,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void ApplyCaption(int slot);
   void ApplyTexts() const;
   void RefreshGrid() const;
-  void Paint(HWND window) const;
-  void DrawSlot(HDC dc, const RECT& frame, const Slot& slot, bool focus) const;
-  void DrawCaption(HDC dc, RECT area, const Slot& slot) const;
+  void PaintGrid(HWND window) const;
+  TileStyle Style() const { return {Dpi(), Font(), BackColor()}; }
   void DrawLink(HDC dc, RECT area, bool focus) const;
   int Pixels(int twips) const { return layout::Pixels(twips, Dpi()); }
   RECT Pixels(const layout::TwipRect& area) const { return layout::Pixels(area, Dpi()); }

@@ -1,0 +1,29 @@
+// What a slot of the thumbnails looks like: a frame with a picture and its caption.
+#pragma once
+
+#include "platform/windows/WindowsHeaders.h"
+
+#include "base/Text.h"
+#include "platform/windows/Owner.h"
+
+namespace tarnwick {
+
+struct ThumbnailTile {
+  Text caption;
+  // As large as it is shown, at `place` in the frame; empty when there is none.
+  BitmapOwner picture;
+  RECT place = {};
+  bool selected = false;
+};
+
+// What all tiles of a page have in common.
+struct TileStyle {
+  int dpi;
+  HFONT font;
+  COLORREF background;
+};
+
+// `focus` marks the selected tile as the one that the keyboard is for.
+void DrawTile(HDC dc, const RECT& frame, const ThumbnailTile& tile, const TileStyle& style, bool focus);
+
+}  // namespace tarnwick
