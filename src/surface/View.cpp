@@ -21,19 +21,6 @@ constexpr std::array kFormats = {
 
 using MetafileOwner = Owner<HENHMETAFILE, DeleteEnhMetaFile>;
 
-// Restores a device context as it was.
-class SavedDc {
- public:
-  explicit SavedDc(HDC dc) : dc_(dc), saved_(SaveDC(dc)) {}
-  ~SavedDc() { RestoreDC(dc_, saved_); }
-  SavedDc(const SavedDc&) = delete;
-  SavedDc& operator=(const SavedDc&) = delete;
-
- private:
-  const HDC dc_;
-  const int saved_;
-};
-
 // The screen, as what a metafile measures itself against.
 class Reference {
  public:
@@ -107,7 +94,7 @@ STDMETHODIMP View::Draw(DWORD aspect, LONG, void*, DVTARGETDEVICE*, HDC, HDC dc,
         SIZE{MulDiv(extent_.cx, dpi, kHimetricPerInch), MulDiv(extent_.cy, dpi, kHimetricPerInch)});
     POINT corners[2] = {{bounds->left, bounds->top}, {bounds->right, bounds->bottom}};
     LPtoDP(dc, corners, 2);
-    const SavedDc saved(dc);
+    const SavedDcOwner saved = SaveStateOf(dc);
     SetMapMode(dc, MM_ANISOTROPIC);
     SetWindowOrgEx(dc, 0, 0, nullptr);
     SetWindowExtEx(dc, size.cx, size.cy, nullptr);
