@@ -8,10 +8,8 @@
 namespace tarnwick {
 namespace {
 
-constexpr DISPID kOleDropModeId = 34;
-constexpr DISPID kOleDragModeId = 35;
-constexpr std::array kProperties = {PersistedProperty{L"OLEDropMode", kOleDropModeId, VT_I2},
-                                    PersistedProperty{L"OLEDragMode", kOleDragModeId, VT_I4}};
+constexpr std::array kProperties = {PersistedProperty{L"OLEDropMode", DISPID_OLEDropMode, VT_I2},
+                                    PersistedProperty{L"OLEDragMode", DISPID_OLEDragMode, VT_I4}};
 
 }  // namespace
 
@@ -274,7 +272,7 @@ STDMETHODIMP FileControlObject<Interface>::put_OLEDropMode(short value) {
   const ComPtr<IUnknown> alive = KeptAlive();
   return Guarded([&] {
     stored_.OLEDropMode = value;
-    ole_.PropertyChanged(kOleDropModeId);
+    ole_.PropertyChanged(DISPID_OLEDropMode);
     return S_OK;
   });
 }
@@ -287,7 +285,7 @@ STDMETHODIMP FileControlObject<Interface>::put_OLEDragMode(LONG value) {
   const ComPtr<IUnknown> alive = KeptAlive();
   return Guarded([&] {
     stored_.OLEDragMode = value;
-    ole_.PropertyChanged(kOleDragModeId);
+    ole_.PropertyChanged(DISPID_OLEDragMode);
     return S_OK;
   });
 }
@@ -479,12 +477,12 @@ std::span<const PersistedProperty> FileControlObject<Interface>::Properties() co
 
 template <typename Interface>
 std::int32_t FileControlObject<Interface>::GetProperty(DISPID id) const {
-  return id == kOleDropModeId ? stored_.OLEDropMode : stored_.OLEDragMode;
+  return id == DISPID_OLEDropMode ? stored_.OLEDropMode : stored_.OLEDragMode;
 }
 
 template <typename Interface>
 void FileControlObject<Interface>::SetProperty(DISPID id, std::int32_t value) {
-  if (id == kOleDropModeId)
+  if (id == DISPID_OLEDropMode)
     stored_.OLEDropMode = static_cast<std::int16_t>(value);
   else
     stored_.OLEDragMode = value;

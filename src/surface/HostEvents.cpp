@@ -4,24 +4,10 @@
 
 #include "surface/DataObject.h"
 #include "surface/Guard.h"
+#include "surface/TypeLibrary.h"
 
 namespace tarnwick {
 namespace {
-
-// Numbers of the events in the type library.
-enum EventNumber : DISPID {
-  kFileManagerEvent = 1,
-  kOLEStartDrag,
-  kOLESetData,
-  kOLEGiveFeedback,
-  kOLEDragOver,
-  kOLEDragDrop,
-  kOLECompleteDrag,
-  kStateChanged,
-  kDownloadProgress,
-  kUploadProgress,
-  kReplyMessage,
-};
 
 template <typename Value>
 VARIANT ReferenceTo(VARTYPE type, Value& value) {
@@ -58,7 +44,7 @@ void HostEvents::FileManagerEvent(std::int16_t code, TextView description) {
     Variant text;
     text.Get() = VariantFromText(description);
     std::array arguments = {ReferenceTo(VT_VARIANT, number.Get()), ReferenceTo(VT_BSTR, V_BSTR(&text.Get()))};
-    ole_.Raise(kFileManagerEvent, arguments);
+    ole_.Raise(DISPID_FileManagerEvent, arguments);
   });
 }
 
@@ -66,21 +52,21 @@ void HostEvents::OLEStartDrag(DragData& data, std::int32_t& allowedEffects) {
   ObjectReference object(data);
   LONG effects = allowedEffects;
   std::array arguments = {object.Argument(), ReferenceTo(VT_I4, effects)};
-  ole_.Raise(kOLEStartDrag, arguments);
+  ole_.Raise(DISPID_OLEStartDrag, arguments);
   allowedEffects = effects;
 }
 
 void HostEvents::OLESetData(DragData& data, std::int16_t format) {
   ObjectReference object(data);
   std::array arguments = {object.Argument(), ReferenceTo(VT_I2, format)};
-  ole_.Raise(kOLESetData, arguments);
+  ole_.Raise(DISPID_OLESetData, arguments);
 }
 
 void HostEvents::OLEGiveFeedback(std::int32_t& effect, bool& defaultCursors) {
   LONG shown = effect;
   VARIANT_BOOL cursors = AutomationBoolean(defaultCursors);
   std::array arguments = {ReferenceTo(VT_I4, shown), ReferenceTo(VT_BOOL, cursors)};
-  ole_.Raise(kOLEGiveFeedback, arguments);
+  ole_.Raise(DISPID_OLEGiveFeedback, arguments);
   effect = shown;
   defaultCursors = cursors != VARIANT_FALSE;
 }
@@ -96,7 +82,7 @@ void HostEvents::OLEDragOver(DragData& data, std::int32_t& effect, const DragPoi
                           ReferenceTo(VT_R4, point.x),
                           ReferenceTo(VT_R4, point.y),
                           ReferenceTo(VT_I2, state)};
-  ole_.Raise(kOLEDragOver, arguments);
+  ole_.Raise(DISPID_OLEDragOver, arguments);
   effect = wanted;
 }
 
@@ -110,7 +96,7 @@ void HostEvents::OLEDragDrop(DragData& data, std::int32_t& effect, const DragPoi
                           ReferenceTo(VT_I2, point.shift),
                           ReferenceTo(VT_R4, point.x),
                           ReferenceTo(VT_R4, point.y)};
-  ole_.Raise(kOLEDragDrop, arguments);
+  ole_.Raise(DISPID_OLEDragDrop, arguments);
   effect = wanted;
 }
 
@@ -121,19 +107,19 @@ void HostEvents::RaiseNumber(DISPID event, std::int32_t number) {
 }
 
 void HostEvents::OLECompleteDrag(std::int32_t effect) {
-  RaiseNumber(kOLECompleteDrag, effect);
+  RaiseNumber(DISPID_OLECompleteDrag, effect);
 }
 
 void HostEvents::StateChanged(ConnectionState state) {
-  RaiseNumber(kStateChanged, static_cast<std::int32_t>(state));
+  RaiseNumber(DISPID_StateChanged, static_cast<std::int32_t>(state));
 }
 
 void HostEvents::DownloadProgress(std::int32_t lBytes) {
-  RaiseNumber(kDownloadProgress, lBytes);
+  RaiseNumber(DISPID_DownloadProgress, lBytes);
 }
 
 void HostEvents::UploadProgress(std::int32_t lBytes) {
-  RaiseNumber(kUploadProgress, lBytes);
+  RaiseNumber(DISPID_UploadProgress, lBytes);
 }
 
 void HostEvents::ReplyMessage(TextView sMessage) {
@@ -141,7 +127,7 @@ void HostEvents::ReplyMessage(TextView sMessage) {
     Variant text;
     text.Get() = VariantFromText(sMessage);
     std::array arguments = {text.Get()};
-    ole_.Raise(kReplyMessage, arguments);
+    ole_.Raise(DISPID_ReplyMessage, arguments);
   });
 }
 

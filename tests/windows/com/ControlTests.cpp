@@ -8,8 +8,6 @@
 namespace tarnwick::test {
 namespace {
 
-constexpr DISPID kDropModeId = 34;
-
 // Where both controls are alike.
 template <typename AnyForm>
 class AnyControl : public testing::Test {};
@@ -26,7 +24,7 @@ TYPED_TEST(AnyControl, KeepsItsPropertiesWithTheForm) {
     ASSERT_EQ(form.control->QueryInterface(IID_IPersistStreamInit, stream.ReceiveVoid()), S_OK);
     EXPECT_EQ(stream->IsDirty(), S_FALSE);
     form.control->put_OLEDropMode(1);
-    EXPECT_EQ(form.container->changed, std::vector<DISPID>{kDropModeId});
+    EXPECT_EQ(form.container->changed, std::vector<DISPID>{DISPID_OLEDropMode});
     EXPECT_EQ(stream->IsDirty(), S_OK);
     form.control->put_OLEDragMode(70000);
     EXPECT_EQ(persist->Save(bag.Get(), TRUE, FALSE), S_OK);

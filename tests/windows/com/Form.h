@@ -24,15 +24,6 @@ namespace tarnwick::test {
 using demo::ControlContainer;
 using demo::PropertyBag;
 
-// Events of the control by their numbers.
-inline constexpr DISPID kFileManagerEvent = 1;
-inline constexpr DISPID kOLEStartDrag = 2;
-inline constexpr DISPID kOLESetData = 3;
-inline constexpr DISPID kOLEGiveFeedback = 4;
-inline constexpr DISPID kOLEDragOver = 5;
-inline constexpr DISPID kOLEDragDrop = 6;
-inline constexpr DISPID kOLECompleteDrag = 7;
-
 // nullopt when there is no such file.
 inline std::optional<std::string> Contents(const std::wstring& path) {
   const HANDLE handle =
@@ -111,7 +102,7 @@ class ControlForm {
 
   ControlForm(REFCLSID classId, ControlContainer::WayIn wayIn, IPropertyBag* bag) {
     container->onEvent = [this](DISPID event, std::vector<VARIANT>& arguments) {
-      if (event != kFileManagerEvent) {
+      if (event != DISPID_FileManagerEvent) {
         if (onOther) onOther(event, arguments);
         return;
       }

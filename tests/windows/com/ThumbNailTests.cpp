@@ -422,8 +422,8 @@ TEST(ThumbNailControl, HasItsOwnMembers) {
   EXPECT_EQ(form.events, Lines{L"1031 "});
   std::wstring told;
   form.onOther = [&](DISPID event, std::vector<VARIANT>&) {
-    if (event == kOLEStartDrag) keybd_event(VK_ESCAPE, 0, 0, 0);
-    if (event == kOLEStartDrag || event == kOLECompleteDrag) told += std::to_wstring(event);
+    if (event == DISPID_OLEStartDrag) keybd_event(VK_ESCAPE, 0, 0, 0);
+    if (event == DISPID_OLEStartDrag || event == DISPID_OLECompleteDrag) told += std::to_wstring(event);
   };
   EXPECT_EQ(form.control->OLEDrag(), S_OK);
   keybd_event(VK_ESCAPE, 0, KEYEVENTF_KEYUP, 0);
