@@ -63,7 +63,8 @@ inline TextView ViewOf(BSTR* text) {
 void AssignChanged(BSTR* target, TextView text);
 
 // The text, number or Boolean that `value` means, by the automation's own conversion; an omitted argument is
-// an empty text. Throws run-time error 13 when there is none.
+// an empty text. Runs the host's code when the value is an object of the host's. Throws run-time error 13
+// when there is none.
 Text TextFromVariant(const VARIANT& value);
 std::int32_t NumberFromVariant(const VARIANT& value);
 bool BooleanFromVariant(const VARIANT& value);

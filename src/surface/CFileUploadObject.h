@@ -21,7 +21,8 @@ class CFileUploadObject final : public DualObject<_CFileUpload> {
 
   const std::shared_ptr<CFileUpload>& Client() const { return client_; }
 
-  // The object behind an interface that a host hands in; null when it is not one of ours.
+  // The object behind an interface that a host hands in; null when it is not one of ours. Runs the code of
+  // the host's own object.
   static ComPtr<CFileUploadObject> From(IUnknown* object);
 
   STDMETHODIMP get_HTTPServer(BSTR* value) override;

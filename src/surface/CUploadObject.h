@@ -16,7 +16,8 @@ class CUploadObject final : public DualObject<_CUpload> {
 
   const std::shared_ptr<CUpload>& Record() const { return record_; }
 
-  // The object behind an interface that a host hands in; null when it is not one of ours.
+  // The object behind an interface that a host hands in; null when it is not one of ours. Runs the code of
+  // the host's own object.
   static ComPtr<CUploadObject> From(IUnknown* object);
 
   STDMETHODIMP get_FileName(BSTR* value) override;

@@ -24,7 +24,8 @@ class CollectionObject final : public LateBoundObject<IDispatch> {
 
   void Add(const LateBoundArguments& arguments);
   const Variant& ItemAt(const VARIANT& index) const;
-  // Position that an index argument means. Throws 5 for an unknown key, 9 for a position out of range.
+  // Position that an index argument means, whose object may run the host's code. Throws 5 for an unknown key,
+  // 9 for a position out of range.
   std::size_t PositionOf(const VARIANT& index) const;
 
   KeyedList<Variant> items_;

@@ -14,7 +14,7 @@
 
 namespace tarnwick {
 
-// How an enumerator keeps and hands out an element: Keep makes it the enumerator's, Free ends that.
+// How an enumerator keeps and hands out an element: Keep makes it the enumerator's own, Free releases it.
 inline void Keep(VARIANT& value) {
   Variant copy(value);
   value = copy.Detach();

@@ -28,8 +28,8 @@ class ComObject : public First, public Rest... {
   STDMETHODIMP_(ULONG) Release() override {
     const ULONG left = --references_;
     if (left != 0) return left;
-    // Whoever counts the object once more while it ends must not end it again.
-    references_ = kEnding;
+    // Whoever references the object once more while it is destroyed must not destroy it again.
+    references_ = kDestroying;
     delete this;
     return 0;
   }
@@ -47,7 +47,7 @@ class ComObject : public First, public Rest... {
   }
 
  private:
-  static constexpr ULONG kEnding = 1UL << 30;
+  static constexpr ULONG kDestroying = 1UL << 30;
   std::atomic<ULONG> references_{1};
 };
 

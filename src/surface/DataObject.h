@@ -26,7 +26,7 @@ class DataObject final : public LateBoundObject<IDataObject, IDispatch>, public 
  public:
   // The data of a drag that begins in a control of ours: a text, and a file when its path is not empty.
   DataObject(TextView text, TextView file);
-  // The data of a drag that comes from elsewhere, read when the object is made.
+  // The data of a drag that comes from elsewhere, read when the object is made; that runs the source's code.
   explicit DataObject(IDataObject& foreign);
 
   // Who supplies a text that a host promised (SetData without a value) once a target asks for it: the handler

@@ -12,8 +12,8 @@
 
 namespace tarnwick {
 
-// What a drag over a window and a drop onto it are told to. Effects are those of OLE; `state` is 0 when the
-// drag enters, 1 when it leaves, 2 while it moves.
+// Is notified of a drag over a window and a drop onto it, and runs the host's code then. Effects are those of
+// OLE; `state` is 0 when the drag enters, 1 when it leaves, 2 while it moves.
 class DropUser {
  public:
   virtual ~DropUser() = default;
@@ -27,7 +27,7 @@ class DropTarget final : public ComObject<IDropTarget> {
   // Registers for `window`; `identity` is kept alive while `user` is called.
   DropTarget(HWND window, IUnknown& identity, DropUser& user);
 
-  // From here on nothing is told any more.
+  // From here on nothing is notified any more.
   void Revoke();
 
   STDMETHODIMP DragEnter(IDataObject* data, DWORD keys, POINTL at, DWORD* effect) override;
@@ -49,7 +49,8 @@ class DropTarget final : public ComObject<IDropTarget> {
 
 // Runs a drag of `data` that begins with a button pressed, until the drop; the effect of it, DROPEFFECT_NONE
 // when it was cancelled. `feedback` may change the effect that is shown, and says whether the system's
-// pointers are used.
+// pointers are used. Pumps messages, and runs the code of `feedback` and of whatever target is below the
+// pointer.
 DWORD RunDrag(DataObject& data, DWORD allowedEffects, const std::function<bool(DWORD effect)>& feedback);
 
 }  // namespace tarnwick

@@ -76,7 +76,7 @@ STDMETHODIMP FileControlObject<Interface>::InterfaceSupportsErrorInfo(REFIID int
 }
 
 template <typename Interface>
-HRESULT FileControlObject<Interface>::Fail(const wchar_t* description, std::int32_t number) const {
+HRESULT FileControlObject<Interface>::ReportError(const wchar_t* description, std::int32_t number) const {
   ComPtr<ICreateErrorInfo> made;
   ComPtr<IErrorInfo> info;
   if (SUCCEEDED(CreateErrorInfo(made.Receive()))) {
@@ -303,9 +303,9 @@ STDMETHODIMP FileControlObject<Interface>::Init(BSTR* szFileFilter, VARIANT_BOOL
       ole_.ViewChanged();
       return S_OK;
     } catch (const RuntimeError& failure) {
-      return Fail(failure.Number() == init_error::kNoClient ? L"The control has no service client"
-                                                            : L"The service did not list the files",
-                  failure.Number());
+      return ReportError(failure.Number() == init_error::kNoClient ? L"The control has no service client"
+                                                                   : L"The service did not list the files",
+                         failure.Number());
     }
   });
 }
@@ -439,9 +439,9 @@ STDMETHODIMP FileControlObject<Interface>::OLEDrag() {
 
 template <typename Interface>
 HWND FileControlObject<Interface>::Window() {
-  const HWND window = View().Window();
-  // A host that did not initialise OLE has a control without drops. A container may end the window, which OLE
-  // has to hear of, and ask for another.
+  const HWND window = TheWindow().Window();
+  // A host that did not initialise OLE has a control without drops. A container may destroy the window, of
+  // which OLE is notified, and ask for another.
   if (window && !dropTarget_)
     Done([&] {
       dropTarget_ = ComPtr<DropTarget>::Adopt(new DropTarget(window, Identity(), *this));
@@ -466,8 +466,8 @@ void FileControlObject<Interface>::ApplyLook() {
   if (ambientFont && FAILED(ambientFont->get_hFont(&font))) font = nullptr;
   // One colour of a container makes no legible pair with one of the system's.
   const bool colours = ambient_.hasForeColor && ambient_.hasBackColor;
-  View().SetLook(font, colours ? std::optional(ambient_.foreColor) : std::nullopt,
-                 colours ? std::optional(ambient_.backColor) : std::nullopt);
+  TheWindow().SetLook(font, colours ? std::optional(ambient_.foreColor) : std::nullopt,
+                      colours ? std::optional(ambient_.backColor) : std::nullopt);
 }
 
 template <typename Interface>

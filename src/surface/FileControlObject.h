@@ -109,7 +109,7 @@ class FileControlObject : public DualObject<Interface>,
   void StopDrops();
 
   virtual FileControl& Rules() = 0;
-  virtual ControlWindow& View() = 0;
+  virtual ControlWindow& TheWindow() = 0;
   // The window is new, or another one than before.
   virtual void WindowMade(HWND) {}
 
@@ -147,8 +147,8 @@ class FileControlObject : public DualObject<Interface>,
   // OleControlHooks
   const CLSID& ClassId() const override { return class_.id; }
   HWND Window() override;
-  void Park() override { View().Park(); }
-  std::optional<SIZE> SizeOnOtherScreen() override { return View().SizeOnOtherScreen(); }
+  void Park() override { TheWindow().Park(); }
+  std::optional<SIZE> SizeOnOtherScreen() override { return TheWindow().SizeOnOtherScreen(); }
   void AmbientChanged(const AmbientValues& values) override;
   void Closing() override { Rules().EndTransfer(); }
   void SiteGone() override { Rules().Close(); }
@@ -160,9 +160,10 @@ class FileControlObject : public DualObject<Interface>,
   void DragMoves(DataObject& data, DWORD& effect, const DragPoint& at, std::int16_t state) override;
   void Dropped(DataObject& data, DWORD& effect, const DragPoint& at) override;
 
+  // A font of the container's may be the host's own code, which runs here.
   void ApplyLook();
-  // Raises an automation error with a description.
-  HRESULT Fail(const wchar_t* description, std::int32_t number) const;
+  // Leaves error information with this description for the host; the result of the call that failed.
+  HRESULT ReportError(const wchar_t* description, std::int32_t number) const;
 
   IUnknown* const outer_;
   Part part_{*this};

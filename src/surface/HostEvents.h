@@ -1,4 +1,5 @@
-// The events of a control on their way to the host.
+// The events of a control on their way to the host. Each runs the host's code, which may re-enter the control
+// or release it; whoever raises one keeps the control alive.
 #pragma once
 
 #include "controls/ControlEvents.h"

@@ -21,19 +21,6 @@ constexpr std::array kFormats = {
 
 using MetafileOwner = Owner<HENHMETAFILE, DeleteEnhMetaFile>;
 
-// The screen, as what a metafile measures itself against.
-class Reference {
- public:
-  Reference() = default;
-  ~Reference() { ReleaseDC(nullptr, dc_); }
-  Reference(const Reference&) = delete;
-  Reference& operator=(const Reference&) = delete;
-  HDC Get() const { return dc_; }
-
- private:
-  const HDC dc_ = GetDC(nullptr);
-};
-
 // Empty when there is no memory.
 MetafileOwner PictureOf(View& view, const SIZEL& himetric, HDC reference) {
   const RECT frame = {0, 0, himetric.cx, himetric.cy};
@@ -144,15 +131,16 @@ STDMETHODIMP View::GetData(FORMATETC* format, STGMEDIUM* medium) {
   if (known != S_OK) return known;
   return Entered([&] {
     const SIZEL extent = extent_;
-    const Reference reference;
-    MetafileOwner picture = PictureOf(*this, extent, reference.Get());
+    // The screen is what a metafile measures itself against.
+    const WindowDcOwner screen = DcOf(nullptr);
+    MetafileOwner picture = PictureOf(*this, extent, screen.Get().dc);
     if (!picture) return E_OUTOFMEMORY;
     if (format->cfFormat == CF_ENHMETAFILE) {
       medium->tymed = TYMED_ENHMF;
       medium->hEnhMetaFile = picture.Detach();
       return S_OK;
     }
-    medium->hMetaFilePict = OldPictureOf(picture, extent, reference.Get());
+    medium->hMetaFilePict = OldPictureOf(picture, extent, screen.Get().dc);
     if (!medium->hMetaFilePict) return E_OUTOFMEMORY;
     medium->tymed = TYMED_MFPICT;
     return S_OK;

@@ -1,4 +1,4 @@
-// What a control looks like: drawn by its container, as data, and for those that want to hear when it
+// What a control looks like: drawn by its container, as data, and with notifications when it
 // changes.
 #pragma once
 

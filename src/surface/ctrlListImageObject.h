@@ -26,7 +26,7 @@ class ctrlListImageObject final : public FileControlObject<_ctrlListImage> {
 
   // FileControlObject
   FileControl& Rules() override { return *rules_; }
-  ControlWindow& View() override { return view_; }
+  ControlWindow& TheWindow() override { return view_; }
 
   // OleControlHooks
   void Draw(HDC dc, const RECT& bounds) override { view_.Draw(dc, bounds); }

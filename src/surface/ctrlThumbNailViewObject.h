@@ -27,7 +27,7 @@ class ctrlThumbNailViewObject final : public FileControlObject<_ctrlThumbNailVie
 
   // FileControlObject
   FileControl& Rules() override { return *rules_; }
-  ControlWindow& View() override { return page_; }
+  ControlWindow& TheWindow() override { return page_; }
   void WindowMade(HWND window) override { scrollHook_.Install(window); }
 
   // OleControlHooks
