@@ -3,6 +3,7 @@
 #include <new>
 
 #include "base/RuntimeError.h"
+#include "platform/windows/ComPtr.h"
 
 namespace tarnwick {
 namespace {
@@ -27,11 +28,10 @@ Variant::Variant(const VARIANT& source) {
 
 Variant::Variant(IUnknown* object) noexcept {
   VariantInit(&value_);
-  IDispatch* dispatch = nullptr;
-  if (object && SUCCEEDED(object->QueryInterface(IID_IDispatch, reinterpret_cast<void**>(&dispatch)))) {
-    V_VT(&value_) = VT_DISPATCH;
-    V_DISPATCH(&value_) = dispatch;
-  }
+  ComPtr<IDispatch> dispatch;
+  if (!object || FAILED(object->QueryInterface(IID_IDispatch, dispatch.ReceiveVoid()))) return;
+  V_VT(&value_) = VT_DISPATCH;
+  V_DISPATCH(&value_) = dispatch.Detach();
 }
 
 BSTR NewBstr(TextView text) {

@@ -11,9 +11,9 @@ CFileUploadObject::CFileUploadObject(std::shared_ptr<CFileUpload> client) : clie
 
 ComPtr<CFileUploadObject> CFileUploadObject::From(IUnknown* object) {
   // As with records: the class's own identifier leads back to the object.
-  void* self = nullptr;
-  if (!object || FAILED(object->QueryInterface(CLSID_CFileUpload, &self))) return {};
-  return ComPtr<CFileUploadObject>::Adopt(static_cast<CFileUploadObject*>(self));
+  ComPtr<CFileUploadObject> self;
+  if (object) object->QueryInterface(CLSID_CFileUpload, self.ReceiveVoid());
+  return self;
 }
 
 void* CFileUploadObject::FindInterface(REFIID interfaceId) {

@@ -6,9 +6,9 @@ namespace tarnwick {
 
 ComPtr<CUploadObject> CUploadObject::From(IUnknown* object) {
   // The class's own identifier serves as a private interface that leads back to the object.
-  void* self = nullptr;
-  if (!object || FAILED(object->QueryInterface(CLSID_CUpload, &self))) return {};
-  return ComPtr<CUploadObject>::Adopt(static_cast<CUploadObject*>(self));
+  ComPtr<CUploadObject> self;
+  if (object) object->QueryInterface(CLSID_CUpload, self.ReceiveVoid());
+  return self;
 }
 
 void* CUploadObject::FindInterface(REFIID interfaceId) {

@@ -17,22 +17,13 @@ VARIANT ReferenceTo(VARTYPE type, Value& value) {
   return reference;
 }
 
-// An object for a by-reference parameter: what the host puts in its place is released like the object itself.
-class ObjectReference {
- public:
-  explicit ObjectReference(DragData& data) : object_(static_cast<DataObject&>(data).Dispatch()) {
-    object_->AddRef();
-  }
-  ~ObjectReference() {
-    if (object_) object_->Release();
-  }
-  ObjectReference(const ObjectReference&) = delete;
-  ObjectReference& operator=(const ObjectReference&) = delete;
-  VARIANT Argument() { return ReferenceTo(VT_DISPATCH, object_); }
-
- private:
-  IDispatch* object_;
-};
+// The data as a by-reference argument: what the host puts in its place is released like the object itself.
+Variant Owned(DragData& data) {
+  return Variant(static_cast<DataObject&>(data).Dispatch());
+}
+VARIANT ObjectReference(Variant& owned) {
+  return ReferenceTo(VT_DISPATCH, V_DISPATCH(&owned.Get()));
+}
 
 }  // namespace
 
@@ -49,16 +40,16 @@ void HostEvents::FileManagerEvent(std::int16_t code, TextView description) {
 }
 
 void HostEvents::OLEStartDrag(DragData& data, std::int32_t& allowedEffects) {
-  ObjectReference object(data);
+  Variant object = Owned(data);
   LONG effects = allowedEffects;
-  std::array arguments = {object.Argument(), ReferenceTo(VT_I4, effects)};
+  std::array arguments = {ObjectReference(object), ReferenceTo(VT_I4, effects)};
   ole_.Raise(DISPID_OLEStartDrag, arguments);
   allowedEffects = effects;
 }
 
 void HostEvents::OLESetData(DragData& data, std::int16_t format) {
-  ObjectReference object(data);
-  std::array arguments = {object.Argument(), ReferenceTo(VT_I2, format)};
+  Variant object = Owned(data);
+  std::array arguments = {ObjectReference(object), ReferenceTo(VT_I2, format)};
   ole_.Raise(DISPID_OLESetData, arguments);
 }
 
@@ -72,30 +63,24 @@ void HostEvents::OLEGiveFeedback(std::int32_t& effect, bool& defaultCursors) {
 }
 
 void HostEvents::OLEDragOver(DragData& data, std::int32_t& effect, const DragPoint& at, std::int16_t state) {
-  ObjectReference object(data);
+  Variant object = Owned(data);
   LONG wanted = effect;
   DragPoint point = at;
-  std::array arguments = {object.Argument(),
-                          ReferenceTo(VT_I4, wanted),
-                          ReferenceTo(VT_I2, point.button),
-                          ReferenceTo(VT_I2, point.shift),
-                          ReferenceTo(VT_R4, point.x),
-                          ReferenceTo(VT_R4, point.y),
+  std::array arguments = {ObjectReference(object),          ReferenceTo(VT_I4, wanted),
+                          ReferenceTo(VT_I2, point.button), ReferenceTo(VT_I2, point.shift),
+                          ReferenceTo(VT_R4, point.x),      ReferenceTo(VT_R4, point.y),
                           ReferenceTo(VT_I2, state)};
   ole_.Raise(DISPID_OLEDragOver, arguments);
   effect = wanted;
 }
 
 void HostEvents::OLEDragDrop(DragData& data, std::int32_t& effect, const DragPoint& at) {
-  ObjectReference object(data);
+  Variant object = Owned(data);
   LONG wanted = effect;
   DragPoint point = at;
-  std::array arguments = {object.Argument(),
-                          ReferenceTo(VT_I4, wanted),
-                          ReferenceTo(VT_I2, point.button),
-                          ReferenceTo(VT_I2, point.shift),
-                          ReferenceTo(VT_R4, point.x),
-                          ReferenceTo(VT_R4, point.y)};
+  std::array arguments = {ObjectReference(object),          ReferenceTo(VT_I4, wanted),
+                          ReferenceTo(VT_I2, point.button), ReferenceTo(VT_I2, point.shift),
+                          ReferenceTo(VT_R4, point.x),      ReferenceTo(VT_R4, point.y)};
   ole_.Raise(DISPID_OLEDragDrop, arguments);
   effect = wanted;
 }
