@@ -3,28 +3,26 @@
 #include <utility>
 
 #include "base/RuntimeError.h"
-#include "platform/windows/Owner.h"
 
 namespace tarnwick {
 
 MessageWindow::MessageWindow(Handler handler) : handler_(std::move(handler)) {}
 
 HWND MessageWindow::Get() {
-  if (window_) return window_;
+  if (window_) return window_.Get();
   // A class of the system's, so that none of ours has to go with the library.
-  window_ = CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
-  if (!window_) return nullptr;
-  ++ownedObjects;
-  SetWindowLongPtrW(window_, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(this));
-  SetWindowLongPtrW(window_, GWLP_WNDPROC, reinterpret_cast<LONG_PTR>(WindowProc));
-  return window_;
+  const HWND window =
+      CreateWindowExW(0, L"STATIC", L"", 0, 0, 0, 0, 0, HWND_MESSAGE, nullptr, nullptr, nullptr);
+  if (!window) return nullptr;
+  window_ = Owner<HWND, DestroyWindow>(window);
+  SetWindowLongPtrW(window, GWLP_USERDATA, reinterpret_cast<LONG_PTR>(this));
+  SetWindowLongPtrW(window, GWLP_WNDPROC, reinterpret_cast<LONG_PTR>(WindowProc));
+  return window;
 }
 
 MessageWindow::~MessageWindow() {
-  if (!window_) return;
-  SetWindowLongPtrW(window_, GWLP_USERDATA, 0);
-  DestroyWindow(window_);
-  --ownedObjects;
+  // The last messages, which come while it is destroyed, are not for the handler.
+  if (window_) SetWindowLongPtrW(window_.Get(), GWLP_USERDATA, 0);
 }
 
 LRESULT CALLBACK MessageWindow::WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {

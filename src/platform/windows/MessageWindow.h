@@ -1,9 +1,9 @@
 // A window that is never shown and only takes messages, for what tells its events that way.
 #pragma once
 
-#include "platform/windows/WindowsHeaders.h"
-
 #include <functional>
+
+#include "platform/windows/Owner.h"
 
 namespace tarnwick {
 
@@ -24,7 +24,7 @@ class MessageWindow {
   static LRESULT CALLBACK WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
 
   Handler handler_;
-  HWND window_ = nullptr;
+  Owner<HWND, DestroyWindow> window_;
 };
 
 }  // namespace tarnwick

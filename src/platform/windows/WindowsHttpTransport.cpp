@@ -114,10 +114,8 @@ void CALLBACK OnTold(HINTERNET, DWORD_PTR context, DWORD status, void* informati
 
 // Takes over a text that the system has allocated.
 std::wstring Taken(wchar_t* text) {
-  if (!text) return {};
-  std::wstring taken(text);
-  GlobalFree(text);
-  return taken;
+  const Owner<wchar_t*, GlobalFree> taken(text);
+  return taken ? std::wstring(text) : std::wstring();
 }
 
 // A session of the system's for one post, which costs little: so a change of the user's proxy settings counts

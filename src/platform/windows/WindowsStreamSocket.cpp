@@ -28,13 +28,12 @@ WindowsStreamSocket::WindowsStreamSocket()
     : window_(
           [this](UINT message, WPARAM wParam, LPARAM lParam) { return OnMessage(message, wParam, lParam); }) {
   WSADATA data = {};
-  started_ = WSAStartup(MAKEWORD(2, 2), &data) == 0;
+  started_ = SocketsOwner(WSAStartup(MAKEWORD(2, 2), &data) == 0);
 }
 
 WindowsStreamSocket::~WindowsStreamSocket() {
   events_ = nullptr;
   Close();
-  if (started_) WSACleanup();
 }
 
 void WindowsStreamSocket::Close() {
@@ -45,8 +44,7 @@ void WindowsStreamSocket::Close() {
   }
   lookup_ = nullptr;
   pending_.clear();
-  if (socket_ != INVALID_SOCKET) closesocket(socket_);
-  socket_ = INVALID_SOCKET;
+  socket_ = {};
   sent_ = false;
   connection_ = (connection_ + 1) % kConnections;
 }
@@ -71,15 +69,15 @@ void WindowsStreamSocket::Connect(TextView host, std::uint16_t port) {
 }
 
 void WindowsStreamSocket::ConnectTo(std::uint32_t address) {
-  socket_ = socket(AF_INET, SOCK_STREAM, IPPROTO_TCP);
-  if (socket_ == INVALID_SOCKET || WSAAsyncSelect(socket_, window_.Get(), MessageOf(Tells::kNetworkEvent),
-                                                  FD_CONNECT | FD_READ | FD_WRITE | FD_CLOSE) != 0)
+  socket_ = SocketOwner(socket(AF_INET, SOCK_STREAM, IPPROTO_TCP));
+  if (!socket_ || WSAAsyncSelect(socket_.Get(), window_.Get(), MessageOf(Tells::kNetworkEvent),
+                                 FD_CONNECT | FD_READ | FD_WRITE | FD_CLOSE) != 0)
     return TellError(WSAGetLastError());
   sockaddr_in peer = {};
   peer.sin_family = AF_INET;
   peer.sin_port = htons(port_);
   peer.sin_addr.s_addr = address;
-  if (connect(socket_, reinterpret_cast<const sockaddr*>(&peer), sizeof peer) != 0 &&
+  if (connect(socket_.Get(), reinterpret_cast<const sockaddr*>(&peer), sizeof peer) != 0 &&
       WSAGetLastError() != WSAEWOULDBLOCK)
     TellError(WSAGetLastError());
 }
@@ -87,8 +85,8 @@ void WindowsStreamSocket::ConnectTo(std::uint32_t address) {
 void WindowsStreamSocket::Send(std::string_view bytes) {
   pending_.append(bytes);
   while (!pending_.empty()) {
-    const int count =
-        send(socket_, pending_.data(), static_cast<int>(std::min<std::size_t>(pending_.size(), 1U << 30)), 0);
+    const int count = send(socket_.Get(), pending_.data(),
+                           static_cast<int>(std::min<std::size_t>(pending_.size(), 1U << 30)), 0);
     // What cannot go now goes when the socket tells that it may.
     if (count <= 0) return;
     pending_.erase(0, static_cast<std::size_t>(count));
@@ -100,7 +98,7 @@ void WindowsStreamSocket::Send(std::string_view bytes) {
 std::size_t WindowsStreamSocket::Read(std::span<char> room) {
   const int most = static_cast<int>(std::min<std::size_t>(room.size(), std::numeric_limits<int>::max()));
   read_ = true;
-  const int count = recv(socket_, room.data(), most, 0);
+  const int count = recv(socket_.Get(), room.data(), most, 0);
   return count > 0 ? static_cast<std::size_t>(count) : 0;
 }
 
@@ -166,12 +164,12 @@ void WindowsStreamSocket::OnClose() {
   while (connection == connection_) {
     // What arrived before the close is still to be read; a reset may follow even now.
     char next = 0;
-    const int left = recv(socket_, &next, 1, MSG_PEEK);
+    const int left = recv(socket_.Get(), &next, 1, MSG_PEEK);
     if (left < 0 && WSAGetLastError() != WSAEWOULDBLOCK) return events_->OnSocketError(WSAGetLastError());
     if (left <= 0) {
       // Whoever was reset cannot send any more, not even nothing, but whose peer has closed in an orderly way
       // can. A reset does not always arrive as an error.
-      if (send(socket_, &next, 0, 0) != 0) return events_->OnSocketError(WSAECONNRESET);
+      if (send(socket_.Get(), &next, 0, 0) != 0) return events_->OnSocketError(WSAECONNRESET);
       return events_->OnClosedByPeer();
     }
     read_ = false;

@@ -7,8 +7,17 @@
 
 #include "platform/StreamSocket.h"
 #include "platform/windows/MessageWindow.h"
+#include "platform/windows/Owner.h"
 
 namespace tarnwick {
+
+using SocketOwner = Owner<SOCKET, closesocket, INVALID_SOCKET>;
+
+inline void EndSockets(bool) {
+  WSACleanup();
+}
+// Holds true while the system's sockets are started.
+using SocketsOwner = Owner<bool, EndSockets, false>;
 
 // A non-blocking Winsock socket that tells its events as window messages, so that a wait for them uses no
 // processor time.
@@ -38,8 +47,10 @@ class WindowsStreamSocket : public StreamSocket {
   // Whether the connection is still the same afterwards.
   bool TellSent();
 
+  // Ends after the socket.
+  SocketsOwner started_;
   SocketEvents* events_ = nullptr;
-  SOCKET socket_ = INVALID_SOCKET;
+  SocketOwner socket_;
   // Counts the connections, so that messages of one that was closed can be told.
   UINT connection_ = 0;
   // Of the look-up that runs; null when none does.
@@ -49,7 +60,6 @@ class WindowsStreamSocket : public StreamSocket {
   std::string pending_;
   // Bytes have left that the user was not told of.
   bool sent_ = false;
-  bool started_ = false;
   // Whether something was read since it was set back.
   bool read_ = false;
   MessageWindow window_;
