@@ -60,6 +60,10 @@ using Sums = std::array<std::uint64_t, 4>;
 // along each side the unit is one part of (source pixels x target pixels), in which both kinds of pixels have
 // whole borders. A target pixel then weighs (source width x source height) in all, so that a sum of 64
 // megapixels, with colours times opacity, is far below 64 bits.
+//
+// Measured for 4,000 x 3,000 pixels to 160 x 120 under Wine 8: 68 ms, and 465 ms for the same result by the
+// box filter of stb_image_resize. Wine's own scalers (StretchBlt with HALFTONE, 99 ms; the imaging component,
+// 41 to 116 ms by mode) take one source pixel for each of the target and drop the others.
 class Averager {
  public:
   // `pixels` has room for the target.
