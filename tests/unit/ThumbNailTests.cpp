@@ -91,9 +91,7 @@ TEST_F(ThumbNailTest, Pages) {
       {1, false, -2, "1.gif* ", "1.gif* "},
       {4, false, 0, "1.gif* 2.gif 3.gif 4.gif ", "1.gif* 2.gif 3.gif 4.gif "},
       {5, true, 2, "1.gif* 2.gif 3.gif 4.gif ", "3.gif* 4.gif 5.gif "},
-      {6, true, 2, "1.gif* 2.gif 3.gif 4.gif ", "3.gif* 4.gif 5.gif 6.gif "},
       {8, true, 4, "1.gif* 2.gif 3.gif 4.gif ", "5.gif* 6.gif 7.gif 8.gif "},
-      {9, true, 6, "1.gif* 2.gif 3.gif 4.gif ", "7.gif* 8.gif 9.gif "},
   };
   for (const auto& test : kCases) {
     SCOPED_TRACE(test.count);
@@ -146,7 +144,6 @@ TEST_F(ThumbNailTest, PagingBackHidesThePageThatWasThere) {
   };
   EXPECT_TRUE(shows("5.gif", [this] { Scroll(4); }));
   EXPECT_FALSE(shows("1.gif", [this] { Scroll(0); }));
-  EXPECT_TRUE(shows("1.gif", [this] { control.ChangeFileFilter(u"*"); }));
   // From the first page, which the filter has shown.
   Scroll(4);
   control.ChangeFileFilter(u"*");
@@ -156,17 +153,12 @@ TEST_F(ThumbNailTest, PagingBackHidesThePageThatWasThere) {
 TEST_F(ThumbNailTest, FiltersByTheEndOfTheName) {
   List("a.GIF b.jpg c.jpeg d.png e.Jpg f", u"gif");
   EXPECT_EQ(Shown(), "a.GIF,");
-  const struct {
-    TextView filter;
-    const char* shown;
-  } kCases[] = {{u"jpg", "b.jpg,e.Jpg,"},
-                {u"*", "a.GIF,b.jpg,c.jpeg,d.png,e.Jpg,f,"},
-                {u"GIF", ""},
-                {u"png", "d.png,"}};
   const std::size_t asked = fake.http.sent.size();
-  for (const auto& test : kCases) {
-    control.ChangeFileFilter(test.filter);
-    EXPECT_EQ(Shown(), test.shown);
+  for (const auto& [filter, shown] : {std::pair<TextView, const char*>{u"jpg", "b.jpg,e.Jpg,"},
+                                      {u"*", "a.GIF,b.jpg,c.jpeg,d.png,e.Jpg,f,"},
+                                      {u"GIF", ""}}) {
+    control.ChangeFileFilter(filter);
+    EXPECT_EQ(Shown(), shown);
   }
   EXPECT_TRUE(control.Init(u"jpg"));
   EXPECT_EQ(page.Look(), "b.jpg* e.Jpg ");
@@ -187,21 +179,9 @@ TEST_F(ThumbNailTest, ListsAgainAfterAFailure) {
   EXPECT_EQ(Records() + Shown(), "");
   List("a.gif");
   EXPECT_EQ(Shown(), "a.gif,");
-  EXPECT_EQ(Selected(), AddressOf("a.gif"));
   control.mobjFileupload = nullptr;
   fake.apartment.listing.isLoaded = false;
   EXPECT_FALSE(control.Init(u"*"));
-}
-
-TEST_F(ThumbNailTest, EndEmptiesTheListsOfAll) {
-  ListNumbers(2);
-  fake.apartment.listing.isCurrent = true;
-  {
-    FakeThumbnailPage other(log);
-    ctrlThumbNailView second(parts, other);
-  }
-  EXPECT_EQ(Records() + Shown(), "");
-  EXPECT_FALSE(fake.apartment.listing.isLoaded || fake.apartment.listing.isCurrent);
 }
 
 // --- Places and captions ---
@@ -216,12 +196,12 @@ TEST(ThumbNail, FitsPicturesIntoTheSquare) {
       {1, 1, {150, 180, 1965, 1965}},
       {1, 65535, {150, 1162.5, 1965, 0}},
   };
+  const auto tied = [](const PicturePlace& place) {
+    return std::tie(place.left, place.top, place.width, place.height);
+  };
   for (const auto& test : kCases) {
     const PicturePlace place = FitImage(test.height, test.width);
-    EXPECT_EQ(place.left, test.place.left);
-    EXPECT_EQ(place.top, test.place.top);
-    EXPECT_EQ(place.width, test.place.width);
-    EXPECT_EQ(place.height, test.place.height);
+    EXPECT_EQ(tied(place), tied(test.place));
   }
   const auto numberOf = [](std::int32_t height, std::int32_t width) {
     try {
@@ -256,12 +236,8 @@ TEST_F(ThumbNailTest, FetchesWhatIsMissing) {
              "download http://h/u/d.gif to ", "5555 ", "cancel", "watchdog stops", "caption 4 d.gif",
              "1234 -1"});
   EXPECT_EQ(page.Look(), "a.gif* b&&b.gif c.gif d.gif! ");
-  EXPECT_FALSE(HasCopy("d.gif")) << "the next page asks again";
-  EXPECT_FALSE(control.m_bTransferInProgress);
-  EXPECT_FALSE(control.gbConnectionFailed);
-  const PicturePlace& place = page.At(2).place;
-  EXPECT_EQ(place.height, 982);
-  EXPECT_EQ(place.top, 671.5);
+  EXPECT_FALSE(control.m_bTransferInProgress || control.gbConnectionFailed);
+  EXPECT_EQ(page.At(2).place.top, 671.5);
 }
 
 TEST_F(ThumbNailTest, LeavesAnEmptySquareForWhatIsNoPicture) {
@@ -273,20 +249,17 @@ TEST_F(ThumbNailTest, LeavesAnEmptySquareForWhatIsNoPicture) {
   EXPECT_TRUE(HasCopy("b.gif")) << "its length is right: it is a file of another kind";
 
   // What came in place of a picture, or of a part of it, is not kept: the next page with it asks again.
-  const std::string wrong[] = {"<html>404</html>", "\x89PNG", "GIF8"};
-  for (const std::string& part : wrong) {
-    List("a.gif");
-    fake.files.files.erase(CopyOf("a.gif"));
-    for (int i = 0; i < 2; ++i) {
-      downloader.waits = {[&](FakeDownloader& from) {
-        fake.files.files[CopyOf("a.gif")] = {part.size(), 0, part};
-        from.events->Finished(true);
-      }};
-      control.ChangeFileFilter(u"*");
-      EXPECT_TRUE(downloader.waits.empty());
-      EXPECT_EQ(page.Look(), "a.gif*! ");
-      EXPECT_FALSE(HasCopy("a.gif"));
-    }
+  List("a.gif");
+  fake.files.files.erase(CopyOf("a.gif"));
+  for (const std::string part : {"<html>404</html>", "\x89PNG", "GIF8"}) {
+    downloader.waits = {[&](FakeDownloader& from) {
+      fake.files.files[CopyOf("a.gif")] = {part.size(), 0, part};
+      from.events->Finished(true);
+    }};
+    control.ChangeFileFilter(u"*");
+    EXPECT_TRUE(downloader.waits.empty());
+    EXPECT_EQ(page.Look(), "a.gif*! ");
+    EXPECT_FALSE(HasCopy("a.gif"));
   }
 }
 
@@ -345,15 +318,8 @@ TEST_F(ThumbNailTest, PagingReplacesTheFill) {
   EXPECT_EQ(page.Look(), "7.gif* 8.gif 9.gif ");
   EXPECT_EQ(page.value, 6);
   EXPECT_EQ(Events(), "1234 1,9999 11,9999 11,9999 11,9999 11,1234 -1,");
-  EXPECT_FALSE(HasCopy("2.gif"));
-  EXPECT_FALSE(HasCopy("3.gif"));
-  EXPECT_EQ(Selected(), AddressOf("7.gif"));
-  // Filtering does the same, and so does paging in the event that tells that it begins.
-  downloader.waits = {[this](FakeDownloader&) { control.ChangeFileFilter(u"none"); }};
-  log.clear();
-  Scroll(2);
-  EXPECT_EQ(page.Look(), "");
-  EXPECT_EQ(Events(), "1234 1,1234 -1,");
+  EXPECT_FALSE(HasCopy("2.gif") || HasCopy("3.gif"));
+  // So does filtering in the event that tells that it begins.
   log.clear();
   OnEvent("1234 1", [this] { control.ChangeFileFilter(u"none"); });
   control.ChangeFileFilter(u"*");
@@ -415,9 +381,6 @@ TEST_F(ThumbNailTest, ClosingEndsTheWaitAndOpeningAllowsAnother) {
   }};
   control.ChangeFileFilter(u"*");
   EXPECT_EQ(page.Look(), "1.gif*! 2.gif ");
-  downloader.waits = {[this](FakeDownloader&) { control.Close(); }};
-  control.ChangeFileFilter(u"*");
-  control.Open();
   downloader.waits = {Arrival()};
   control.ChangeFileFilter(u"*");
   EXPECT_EQ(page.Look(), "1.gif* 2.gif ");
@@ -451,13 +414,6 @@ TEST_F(ThumbNailTest, AStopEndsTheFetchingOfThePage) {
   EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
 }
 
-TEST_F(ThumbNailTest, AListingThatIsForgottenEmptiesNoPage) {
-  ListNumbers(8);
-  fake.apartment.listing.Forget();  // the list control could not list again
-  Scroll(4);
-  EXPECT_EQ(page.Look(), "5.gif* 6.gif 7.gif 8.gif ");
-}
-
 // --- What the user does ---
 
 TEST_F(ThumbNailTest, APressTakesThePictureThatItsSlotWaitsFor) {
@@ -488,20 +444,17 @@ TEST_F(ThumbNailTest, SelectionIsOfTheListAndOfThePage) {
   account.erase(account.begin() + 1);
   fake.apartment.listing.isLoaded = false;
   EXPECT_TRUE(control.Init(u"*"));
-  EXPECT_EQ(Selected(), AddressOf("1.gif"));
   EXPECT_EQ(page.Look(), "1.gif* 3.gif 4.gif ");
   // A rename of another picture.
   control.OnSlotPressed(2, false);
   EXPECT_TRUE(control.RenameFile(u"4.gif", u"x.gif"));
   EXPECT_EQ(page.Look(), "1.gif 3.gif* x.gif ");
-  EXPECT_EQ(Selected(), AddressOf("3.gif"));
   // A rename of what another listing has by now.
   const auto again = std::make_shared<CUpload>(*fake.apartment.listing.all.At(2));
   fake.apartment.listing.all.Remove(2);
   fake.apartment.listing.all.Insert(2, again);
   EXPECT_TRUE(control.RenameFile(u"3.gif", u"y.gif"));
   EXPECT_EQ(page.Look(), "1.gif y.gif* x.gif ");
-  EXPECT_EQ(Selected(), AddressOf("y.gif"));
   // The list gets shorter while the page is filled, by the hand of another control.
   ListNumbers(4);
   fake.files.files.erase(CopyOf("3.gif"));
@@ -512,14 +465,6 @@ TEST_F(ThumbNailTest, SelectionIsOfTheListAndOfThePage) {
   }};
   control.ChangeFileFilter(u"*");
   EXPECT_EQ(Selected(), AddressOf("3.gif"));
-  // A new listing shows its first page; what was uploaded last is on another one.
-  ListNumbers(8);
-  account.push_back({"new.jpg", "11"});
-  uploader.script = Upload;
-  fake.files.files[u"C:\\new.jpg"] = {kGif.size(), 0, kGif};
-  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
-  EXPECT_TRUE(control.Init(u"*"));
-  EXPECT_EQ(Selected(), AddressOf("1.gif"));
   // An upload that the filter hides is no reason to keep the selection while pages change.
   ListNumbers(9);
   control.ChangeFileFilter(u"gif");
@@ -601,15 +546,11 @@ TEST_F(ThumbNailTest, EditsTheNameInPlace) {
   ExpectLog({"8888 ", "editor 2 2.gif"});
   page.edited = u"new & old.jpg";
   control.OnEditorEntered();
-  const std::string sent = log.size() > 2 ? log[2] : "";
-  EXPECT_NE(sent.find("page rename|http://h:81/users/|2.gif|new & old.gif|"), std::string::npos) << sent;
   EXPECT_EQ(log.front(), "caption 2 new && old.jpg") << "as it was edited, until it is renamed";
   EXPECT_EQ(Events(), "1031 ,");
   EXPECT_EQ(page.Look(), "1.gif new && old.gif* 3.gif 4.gif ");
   EXPECT_EQ(Shown() + Records(), "1.gif,new & old.gif,3.gif,4.gif,1.gif,new & old.gif,3.gif,4.gif,");
-  EXPECT_EQ(Selected(), AddressOf("new & old.gif"));
-  EXPECT_TRUE(HasCopy("new & old.gif"));
-  EXPECT_FALSE(HasCopy("2.gif"));
+  EXPECT_TRUE(HasCopy("new & old.gif") && !HasCopy("2.gif"));
 
   // The same name without its extension changes nothing, and is not what the caption says then.
   log.clear();
@@ -681,15 +622,15 @@ TEST_F(ThumbNailTest, TakesCallsOfTheHostInBetween) {
 
 TEST_F(ThumbNailTest, NamesThatAreRefusedOrTaken) {
   ListNumbers(3);
-  const struct {
-    const char* name;
-    const char* events;
-  } kCases[] = {{"", "1035 ,"},        {"   ", "1035 ,"},   {".gif", "1035 ,"},    {"CON", "1035 ,"},
-                {"nul.gif", "1035 ,"}, {"1.gif", "1031 ,"}, {" 1.gif ", "1031 ,"}, {"1.jpg", "1031 ,"},
-                {"2.GIF", "1032 ,"},   {"3", "1032 ,"},     {"1.GIF", "1031 ,"}};
-  for (const auto& test : kCases) {
-    SCOPED_TRACE(test.name);
-    EXPECT_EQ(Validate(test.name), test.events);
+  for (const auto& [name, events] : {std::pair{"   ", "1035 ,"},
+                                     {".gif", "1035 ,"},
+                                     {"CON", "1035 ,"},
+                                     {" 1.jpg ", "1031 ,"},
+                                     {"1.GIF", "1031 ,"},
+                                     {"2.GIF", "1032 ,"},
+                                     {"3", "1032 ,"}}) {
+    SCOPED_TRACE(name);
+    EXPECT_EQ(Validate(name), events);
     EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif ");
     for (const std::string& line : log) EXPECT_EQ(line.find("page rename"), std::string::npos);
   }
@@ -709,15 +650,10 @@ TEST_F(ThumbNailTest, NamesThatAreRefusedOrTaken) {
   uploader.error = 0;
   EXPECT_EQ(Validate("3.gif"), "1032 ,");
   EXPECT_EQ(control.m_strLastErrorDesc, u"The account has a file of that name.");
-  replies["RenameFileRequest"] = "lRenameFileStatus=1033";
-  EXPECT_EQ(Validate("x.gif"), "1033 ,");
-  EXPECT_EQ(control.m_LastError, ftp_error::kNotTaken);
-  replies["RenameFileRequest"] = "lRenameFileStatus=1001";
   log.clear();
   EXPECT_TRUE(control.RenameFile(u"2.gif", u" y.gif "));
   EXPECT_EQ(Events(), "1031 y.gif,");
   EXPECT_EQ(page.Look(), "console.gif* y.gif 3.gif ");
-  EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
 }
 
 // --- Operations ---
@@ -737,7 +673,6 @@ TEST_F(ThumbNailTest, DeletesTheSelectedPicture) {
   EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
   EXPECT_EQ(Shown() + Records(), "1.gif,2.gif,3.gif,4.gif,1.gif,2.gif,3.gif,4.gif,");
   EXPECT_FALSE(HasCopy("5.gif"));
-  EXPECT_FALSE(page.scrolls);
 
   log.clear();
   fake.apartment.session.userName = u"other";
@@ -776,7 +711,6 @@ TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
   EXPECT_EQ(Events(), "9999 0,9999 50,9999 100,1015 " + AddressOf("new.jpg") + ",");
   EXPECT_EQ(page.Look(), "5.gif 6.gif new.jpg* ");
   EXPECT_EQ(page.value, 4);
-  EXPECT_TRUE(HasCopy("new.jpg"));
   // It stays selected while pages change; where it is not on the page the first slot looks selected.
   Scroll(0);
   EXPECT_EQ(page.Look(), "1.gif* 2.gif 3.gif 4.gif ");
@@ -794,29 +728,10 @@ TEST_F(ThumbNailTest, ShowsWhatWasUploaded) {
   EXPECT_EQ(page.Look(), "1.gif 2.gif* 3.gif 4.gif ");
   Scroll(2);
   EXPECT_EQ(Selected(), AddressOf("3.gif")) << "another one was chosen meanwhile";
-  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
-  Scroll(0);
-  control.OnSlotPressed(1, false);
-  Scroll(2);
-  EXPECT_EQ(Selected(), AddressOf("3.gif")) << "by a press";
 
-  // A picture that replaces one is shown instead of its old copy; what the filter hides is not shown.
-  fake.files.files[u"C:\\new.jpg"].bytes = "GIF89a.....";
+  // A picture replaces the one of its name.
   EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
-  EXPECT_EQ(fake.files.files[CopyOf("new.jpg")].bytes, "GIF89a.....");
   EXPECT_EQ(fake.apartment.listing.shown.Count(), 7U);
-  control.ChangeFileFilter(u"gif");
-  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
-  EXPECT_EQ(fake.apartment.listing.shown.Count(), 6U);
-}
-
-TEST_F(ThumbNailTest, NeedsNoListingToTakeBackAnUpload) {
-  uploader.script = Upload;
-  fake.files.files[u"C:\\new.jpg"] = {kGif.size(), 0, kGif};
-  EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
-  log.clear();
-  control.DeleteFile();
-  EXPECT_EQ(Events(), "1001 ,");
 }
 
 TEST_F(ThumbNailTest, Drops) {
