@@ -3,7 +3,6 @@
 #include "controls/thumbnailview/ctrlThumbNailView.h"
 #include "fakes/FakeListView.h"
 #include "fakes/FakeThumbnailPage.h"
-#include "transfer/AcceptorPages.h"
 #include "unit/ControlFixture.h"
 
 namespace tarnwick {
@@ -50,25 +49,6 @@ TEST_F(TwoControlsTest, ThumbnailsEndThenUploadThenInit) {
   EXPECT_EQ(Records(), "a.gif,b.gif,c.gif,new.jpg,");
 }
 
-TEST_F(TwoControlsTest, AnUploadIntoTheWatchdogThenADownload) {
-  uploader.script = [this](UploadEvents& events) {
-    events.UploadStarted();
-    downloader.events->Failed(ftp_error::kTimeout, u"silent", false);
-    throw RuntimeError(-2147467259);
-  };
-  EXPECT_FALSE(list.UploadImage(u"C:\\new.jpg"));
-  EXPECT_EQ(list.m_LastError, ftp_error::kTimeout);
-  view.Select(1, true);
-  fake.files.files[u"C:\\To\\b.gif"] = {3, 0, "old"};
-  downloader.waits = {[](FakeDownloader& from) {
-    from.files.files[from.target] = {11, 0, kGif};
-    from.events->Finished(true);
-  }};
-  EXPECT_EQ(list.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\b.gif");
-  EXPECT_EQ(fake.files.files[u"C:\\To\\b.gif"].bytes, kGif);
-  EXPECT_EQ(list.m_LastError, ftp_error::kSuccess);
-}
-
 // The list has listed anew, so the page shows records of an older listing.
 TEST_F(TwoControlsTest, AnUploadTakesThePlaceOfAnOlderRecord) {
   EXPECT_TRUE(thumbnails->Init(u"*"));
@@ -98,13 +78,6 @@ TEST_F(TwoControlsTest, ChangesOvertakeAFetch) {
   } kCases[] = {
       {"upload", [this] { EXPECT_TRUE(list.UploadImage(u"C:\\b.gif")); }, "b.gif ", "a.gif* b.gif c.gif ",
        uploaded, ""},
-      {"upload that nobody answers",
-       [this] {
-         uploader.error = acceptor::kUnspecified;
-         EXPECT_FALSE(list.UploadImage(u"C:\\b.gif"));
-         uploader.error = 0;
-       },
-       "b.gif b.gif ", "a.gif* b.gif c.gif ", fetched, ""},
       {"rename", [this] { EXPECT_TRUE(list.RenameFile(u"b.gif", u"z.gif")); }, "b.gif z.gif ",
        "a.gif* z.gif c.gif ", "", fetched},
       {"delete",
