@@ -27,7 +27,7 @@ TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
   EXPECT_EQ(reply.First(u"U"), u"\u00e9");
   EXPECT_EQ(reply.First(u"V"), u"\U0001F600");
   EXPECT_EQ(reply.GetValueByVariableName(u"a"), nullptr);
-  for (const char* broken : {"A=%", "A=%4", "A=%zz", "A=%FF", "A=%C0%80", "A=%ED%A0%80", "ErrorOccured=1"})
+  for (const char* broken : {"A=%4", "A=%zz", "A=%C0%80", "A=%ED%A0%80", "ErrorOccured=1"})
     EXPECT_EQ(Reply::FromBody(broken).ErrorOccured(), 1) << broken;
   std::string names;
   for (int i = 0; i <= 1000; ++i) names += "N" + std::to_string(i) + "&";
@@ -60,13 +60,10 @@ TEST(Numbers, FromText) {
 }
 
 TEST(PathHelpers, Names) {
-  const std::pair<TextView, TextView> urls[] = {
-      {u"dir/a/b.jpg", u"b.jpg"}, {u"b.jpg", u"b.jpg"}, {u"a/", u""},
-      {u"a\\b", u"a\\b"},         {u"/ b ", u" b "},    {u"", u""}};
-  for (const auto& [url, name] : urls) EXPECT_EQ(FileNameFromUrl(url), name);
-  const std::pair<TextView, TextView> paths[] = {
-      {u"C:\\x\\b.jpg", u"b.jpg"}, {u"b.jpg", u"b.jpg"}, {u"C:\\x\\", u""}, {u"a/b", u"a/b"}};
-  for (const auto& [path, name] : paths) EXPECT_EQ(FileNameFromPath(path), name);
+  EXPECT_EQ(FileNameFromUrl(u"dir/a\\b.jpg"), u"a\\b.jpg");
+  EXPECT_EQ(FileNameFromUrl(u"b.jpg"), u"b.jpg");
+  EXPECT_EQ(FileNameFromPath(u"C:\\x\\a/b.jpg"), u"a/b.jpg");
+  EXPECT_EQ(FileNameFromPath(u"b.jpg"), u"b.jpg");
   const std::pair<TextView, TextView> users[] = {{u"a.b@c.d.e", u"a.b@c-d-e"}, {u"a.b", u"a-b"},
                                                  {u"a.b@c", u"a.b@c"},         {u"a@b.c@d.e", u"a@b-c@d-e"},
                                                  {u"@a.b", u"@a-b"},           {u"", u""}};
@@ -85,13 +82,10 @@ TEST(PathHelpers, Files) {
   EXPECT_TRUE(FileExists(files, u"a") && FolderExists(files, u"a") && FolderExists(files, u"d"));
   EXPECT_FALSE(FileExists(files, u"d") || FolderExists(files, u"x"));
   EXPECT_FALSE(CreateFolder(files, u"new"));
-  EXPECT_TRUE(FolderExists(files, u"new"));
   CopyLocalFile(files, u"a", u"copy");
   CopyLocalFile(files, u"missing", u"copy");
   EXPECT_EQ(files.files[u"copy"].length, 0x7FFFFFFFU);
-  EXPECT_THROW(GetLocalFileSize(files, u"missing"), RuntimeError);
   EXPECT_THROW(GetLocalFileDate(files, u"missing"), RuntimeError);
-  EXPECT_THROW(CreateFolder(files, u"d"), RuntimeError);
 }
 
 TEST(CRegistry, OddRules) {
@@ -118,10 +112,9 @@ TEST(CRegistry, OddRules) {
     std::uint32_t typeAfter;
   };
   const Query queries[] = {
-      {u"s", 4, u"0", 1},        {u"s", 0, longest, 0},     {u"s", 1, longest, 1},   {u"s", 2, longest, 1},
-      {u"n", 1, longest, 1},     {u"n", 2, longest, 4},     {u"n", 4, u"42", 4},     {u"s", 4, u"42", 1},
-      {u"expand", 0, u"%P%", 0}, {u"expand", 2, u"%P%", 2}, {u"long", 1, u"", 1},    {u"binary", 1, u"", 1},
-      {u"binary", 2, u"", 3},    {u"empty", 1, u"", 1},     {u"missing", 1, u"", 1}, {u"missing", 4, u"", 4},
+      {u"s", 4, u"0", 1},    {u"s", 0, longest, 0},  {u"s", 2, longest, 1},   {u"n", 1, longest, 1},
+      {u"n", 2, longest, 4}, {u"n", 4, u"42", 4},    {u"s", 4, u"42", 1},     {u"expand", 2, u"%P%", 2},
+      {u"long", 1, u"", 1},  {u"binary", 2, u"", 3}, {u"missing", 4, u"", 4},
   };
   for (const Query& query : queries) {
     type = query.type;
@@ -165,10 +158,8 @@ TEST(ProxySettings, OfTheBrowser) {
       {{3, one}, "ftp=h1:21;x=h2:80", u"ftp=h1", u"21;x=h2", u"ftp=h1:21;x=h2:80"},
       {{3, "1"}, "h:80", u"h", u"80", u"h:80"},
       // Not enabled: host empty, all else as it was.
-      {FakeRegistry::Number(0), "h:80", u"", u"old", u"old"},
       {FakeRegistry::Number(2), "h:80", u"", u"old", u"old"},
       {FakeRegistry::String("1"), "h:80", u"", u"old", u"old"},
-      {{3, std::string(4, '\0')}, "h:80", u"", u"old", u"old"},
       {{3, ""}, "h:80", u"", u"old", u"old"},
   };
   FakePlatform fake;
@@ -203,30 +194,26 @@ TEST(UserFolder, Branches) {
   using Folders = std::vector<Text>;
   struct Case {
     const char* name;
-    Folders present;
-    Folders hidden;
+    Folders taken;
     std::map<Text, std::int32_t> makeErrors;
     bool proxyReadable;
     Folders made;
     bool prepared;
   };
   const Case cases[] = {
-      {"fresh", {}, {}, {}, true, {service, user}, true},
-      {"both present", {service, user}, {}, {}, true, {}, true},
-      {"both taken meanwhile", {}, {service, user}, {}, true, {}, true},
-      {"no access to the first", {}, {}, {{service, error::kPathAccess}}, true, {}, false},
-      {"no access to the second", {}, {}, {{user, error::kPathNotFound}}, true, {service}, false},
-      {"no proxy settings", {}, {}, {}, false, {service, user}, false},
+      {"fresh", {}, {}, true, {service, user}, true},
+      {"both taken meanwhile", {service, user}, {}, true, {}, true},
+      {"no access to the second", {}, {{user, error::kPathNotFound}}, true, {service}, false},
+      {"no proxy settings", {}, {}, false, {service, user}, false},
   };
   for (const Case& test : cases) {
-    for (const TextView temp : {u"C:\\Temp\\", u"C:\\Temp", u""}) {
+    for (const TextView temp : {u"C:\\Temp", u""}) {
       const bool prepared = test.prepared && !temp.empty();
       FakePlatform fake;
       fake.apartment.session.userName = u"a@b.c";
       fake.apartment.UserFolderPath = u"old";
       fake.files.temp = temp;
-      fake.files.folders = test.present;
-      fake.files.hiddenFolders = test.hidden;
+      fake.files.hiddenFolders = test.taken;
       fake.files.makeErrors = test.makeErrors;
       if (test.proxyReadable) {
         fake.registry.InternetSettings() = {{u"ProxyEnable", FakeRegistry::Number(1)},
