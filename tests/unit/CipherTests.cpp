@@ -11,14 +11,9 @@ constexpr TextView kAlphabet = u"ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstu
 // Worked out apart from the code.
 TEST(Cipher, KnownVectors) {
   const std::pair<TextView, TextView> vectors[] = {
-      {u"", u""},
       {u"/ \\:&\u00e9\u4e2d", u""},
-      {u"A", u"r"},
-      {u"0", u"z"},
-      {u"a b/c", u"GM#"},
       {u"s 3+t#", u"$k2k"},
       {u"UserValidate", u"l_-7S$0$LM@A"},
-      {u"Maplewoodfen", u"tR5$Jq77LHJ9"},
       {kAlphabet, u"mmc3nXagNUTdaaQqbLOUBIHROOEeP_CI7*$FCC0SD58*u21#88xG9sv2ipoyvvl@wgjpW"},
   };
   for (const auto& [plain, cipher] : vectors) {
