@@ -61,30 +61,13 @@ TEST_F(WireTest, PathsThatLeaveTheUsersFolderAreNotFound) {
   std::filesystem::create_directory_symlink(Data() / "outbox", Data() / "users" / "linked");
   WriteFile(Data() / "outbox" / "m.txt", "m");
   const std::string folder = std::string("/users/") + kFolder;
-  for (const std::string& target : {std::string("/hosting.sqlite"),
-                                    std::string("/users/../hosting.sqlite"),
-                                    std::string("/users/%2e%2e/hosting.sqlite"),
-                                    std::string("/users/..%2fhosting.sqlite/x"),
-                                    folder + "/../secret",
-                                    folder + "/..%2Fsecret",
-                                    folder + "/%2E%2E%2fsecret",
-                                    folder + "/..",
-                                    folder + "/.",
-                                    folder,
-                                    folder + "/",
-                                    std::string("/users/./secret"),
-                                    folder + "/a.jpg%00",
-                                    folder + "/a.jpg/x",
-                                    folder + "%2F..%2Fsecret",
-                                    folder + "/x\\..\\a.jpg",
-                                    folder + "/link.jpg",
-                                    std::string("/users/linked/m.txt"),
-                                    folder + "/b.jpg",
-                                    std::string("/"),
-                                    std::string("*"),
-                                    std::string("/users/\xFF\xFE/\xFF"),
-                                    "/" + std::string(7000, 'x'),
-                                    "/users/" + std::string(300, 'x') + "/a.jpg"})
+  for (const std::string& target :
+       {std::string("/hosting.sqlite"), std::string("/users/%2e%2e/hosting.sqlite"),
+        std::string("/users/..%2fhosting.sqlite/x"), folder + "/../secret", folder + "/%2E%2E%2fsecret",
+        folder + "/.", folder, std::string("/users/./secret"), folder + "/a.jpg%00", folder + "/a.jpg/x",
+        folder + "%2F..%2Fsecret", folder + "/x\\..\\a.jpg", folder + "/link.jpg",
+        std::string("/users/linked/m.txt"), std::string("*"), std::string("/users/\xFF\xFE/\xFF"),
+        "/users/" + std::string(300, 'x') + "/a.jpg"})
     EXPECT_EQ(Get(target).Status(), 404) << target;
   EXPECT_EQ(Get("/bv/bin/BVServicePage.asp").Status(), 405);
 }
@@ -119,43 +102,26 @@ TEST_F(WireTest, UnescapedUserNamesAndEmptyListingsAreUnderstood) {
 
 TEST_F(WireTest, MalformedRequestsGetADefinedAnswerAndTheServerStaysUp) {
   const std::string service = "/bv/bin/BVServicePage.asp";
-  for (const std::string& body :
-       {std::string(), std::string("ClientAction"), std::string("ClientAction="),
-        std::string("ClientAction=Nonsense"), std::string("ClientAction=%"), std::string("ClientAction=%FF"),
-        std::string("\0\xFF\r\n&&==", 8), FormText({{"ClientAction", "ListFiles"}}),
-        FormText({{"ClientAction", Enciphered("ListFiles")}}),
-        FormText({{"clientaction", Enciphered("HardLimit")}}),
-        FormText({{"ClientAction", Enciphered("AddUser")},
-                  {"UserName", "x@y"},
-                  {"ProductID", "1e999"},
-                  {"MGUID", ""}})}) {
+  for (const std::string& body : {std::string(), std::string("ClientAction="), std::string("ClientAction=%"),
+                                  std::string("\0\xFF\r\n&&==", 8), FormText({{"ClientAction", "ListFiles"}}),
+                                  FormText({{"clientaction", Enciphered("HardLimit")}})}) {
     const RawAnswer answer = RawExchange(Port(), Post(service, body, "Connection: close\r\n"));
     EXPECT_EQ(answer.Status(), 200);
     EXPECT_EQ(answer.Body(), "ErrorOccured=1") << body;
   }
-  EXPECT_EQ(RawExchange(Port(), "POST " + service +
-                                    " HTTP/1.1\r\nContent-Type: multipart/form-data\r\nContent-Length: "
-                                    "1\r\nConnection: close\r\n\r\nx")
-                .Body(),
-            "ErrorOccured=1");
-
   const std::string post = "POST " + service + " HTTP/1.1\r\nHost: x\r\n";
   const struct {
     std::string request;
     int status;
   } heads[] = {
       {"nonsense\r\n\r\n", 400},
-      {"GET /users/a b HTTP/1.1\r\n\r\n", 400},
       {"GET / HTTP/3.0\r\n\r\n", 400},
       {"PUT /users/x/y HTTP/1.1\r\nContent-Length: 1\r\n\r\nx", 405},
-      {"DELETE /users/x/y HTTP/1.1\r\n\r\n", 405},
       {post + "\r\n", 411},
       {post + "Transfer-Encoding: chunked\r\n\r\n0\r\n\r\n", 411},
       {post + "Content-Length: -1\r\n\r\n", 400},
-      {post + "Content-Length: 1x\r\n\r\nx", 400},
       {post + "Content-Length: 1\r\nContent-Length: 2\r\n\r\nx", 400},
       {post + "Content-Length: 99999999999999999999\r\n\r\n", 413},
-      {post + "Content-Length: 1048577\r\n\r\n", 413},
       {post + "Expect: 100-continue\r\nContent-Length: 1048577\r\n\r\n", 413},
       {"POST /httpupload/UploadAcceptor.asp HTTP/1.1\r\nContent-Length: 1073741825\r\n\r\n", 413},
       {"GET /" + std::string(9000, 'x') + " HTTP/1.1\r\n\r\n", 414},
@@ -184,15 +150,12 @@ TEST_F(WireTest, FaultsSpoilTheAnswerOfTheirActionOnly) {
   const Row rows[] = {
       {"HardLimit=refuse", false, 0, "(no body)"},
       {"HardLimit=reset:request", true, 0, "(no body)"},
-      {"*=refuse", false, 0, "(no body)"},
-      {"BVServicePage.asp=reset:request", true, 0, "(no body)"},
       {"HardLimit=reset:head", true, 200, "(no body)"},
       {"HardLimit=reset:body", true, 200, good.substr(0, 7)},
       {"HardLimit=cut", false, 200, good.substr(0, 7)},
       {"/bv/=cut:3", false, 200, good.substr(0, 3)},
       {"HardLimit=wrong", false, 200, "OtherHardLimit=1000"},
       {"HardLimit=status:503", false, 503, good},
-      {"HardLimit=empty", false, 200, ""},
       {"HardLimit=length:3", false, 200, good},
       {"HardLimit=huge:30", false, 200, good + "&Filler=xxxxxxxx"},
       {"HardLimit=drip:1", false, 200, good},
