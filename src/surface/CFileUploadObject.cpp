@@ -50,8 +50,7 @@ STDMETHODIMP CFileUploadObject::put_UploadObject(_CUpload* value) {
 }
 
 STDMETHODIMP CFileUploadObject::putref_UploadObject(_CUpload* value) {
-  // The value may be an object of the host's, whose code may release the client.
-  const ComPtr<IUnknown> alive(static_cast<IDispatch*>(this));
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Guarded([&]() -> HRESULT {
     ComPtr<CUploadObject> object = CUploadObject::From(value);
     // Records are made by the library only.
@@ -99,8 +98,7 @@ STDMETHODIMP CFileUploadObject::EnCodeString(BSTR szString, BSTR* result) {
 // --- Files ---
 
 STDMETHODIMP CFileUploadObject::ListFilesForUser(IDispatch** colFiles, VARIANT_BOOL* result) {
-  // The collection is the host's, and may release the client.
-  const ComPtr<IUnknown> alive(static_cast<IDispatch*>(this));
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredBoolean(result, [&] {
     // A current list is the answer itself: nothing is asked and the collection is left alone.
     if (client_->ListIsCurrent()) return true;
@@ -187,6 +185,7 @@ STDMETHODIMP CFileUploadObject::DownloadFile(BSTR szServerFileName, BSTR szLocal
 }
 
 STDMETHODIMP CFileUploadObject::AbortFileTransfer(VARIANT* bAbortStatus, VARIANT* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredVariant(result, [&] {
     if (bAbortStatus) client_->AbortFileTransfer(BooleanFromVariant(*bAbortStatus));
     return VARIANT{};
@@ -196,18 +195,21 @@ STDMETHODIMP CFileUploadObject::AbortFileTransfer(VARIANT* bAbortStatus, VARIANT
 // --- Accounts ---
 
 STDMETHODIMP CFileUploadObject::AddUser(BSTR ProductID, BSTR Username, VARIANT GUID, BSTR* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredText(
       result, [&] { return client_->AddUser(ViewOf(ProductID), ViewOf(Username), TextFromVariant(GUID)); });
 }
 
 STDMETHODIMP CFileUploadObject::DeleteUser(BSTR ProductID, BSTR Username, VARIANT Password, VARIANT_BOOL,
                                            LONG* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Answered(result, 0, [&] {
     *result = client_->DeleteUser(ViewOf(ProductID), ViewOf(Username), TextFromVariant(Password));
   });
 }
 
 STDMETHODIMP CFileUploadObject::IsValidUserID(VARIANT Username, VARIANT ProductID, VARIANT_BOOL* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return AnsweredBoolean(
       result, [&] { return client_->IsValidUserID(TextFromVariant(Username), TextFromVariant(ProductID)); });
 }
@@ -239,10 +241,12 @@ STDMETHODIMP CFileUploadObject::ActivateAccount(BSTR szProductID, BSTR szUserNam
 }
 
 STDMETHODIMP CFileUploadObject::GetHardLimit(VARIANT szProductID, LONG* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Answered(result, 0, [&] { *result = client_->GetHardLimit(TextFromVariant(szProductID)); });
 }
 
 STDMETHODIMP CFileUploadObject::GetSoftLimit(VARIANT szProductID, LONG* result) {
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Answered(result, 0, [&] { *result = client_->GetSoftLimit(TextFromVariant(szProductID)); });
 }
 
@@ -262,8 +266,7 @@ STDMETHODIMP CFileUploadObject::GetCurrentDateTimeFromServer(BSTR* result) {
 
 STDMETHODIMP CFileUploadObject::GetAccountDetailsForMGUID(BSTR MGUID, BSTR Username, BSTR ProductID,
                                                           IDispatch** col, LONG* result) {
-  // The collection is the host's, and may release the client.
-  const ComPtr<IUnknown> alive(static_cast<IDispatch*>(this));
+  const ComPtr<IUnknown> alive = KeptAlive();
   return Answered(result, 0, [&] {
     if (!col) return;
     const HostCollection collection(col);

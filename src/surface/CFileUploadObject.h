@@ -25,6 +25,8 @@ class CFileUploadObject final : public DualObject<_CFileUpload> {
   // the host's own object.
   static ComPtr<CFileUploadObject> From(IUnknown* object);
 
+  // None of the members pumps messages. Those that take a collection, an object or a VARIANT run the host's
+  // code, and keep the client alive.
   STDMETHODIMP get_HTTPServer(BSTR* value) override;
   STDMETHODIMP put_HTTPServer(BSTR value) override;
   STDMETHODIMP get_UploadObject(_CUpload** value) override;
@@ -75,6 +77,8 @@ class CFileUploadObject final : public DualObject<_CFileUpload> {
   STDMETHODIMP GetPremiumBaseAccountSize(BSTR Username, LONG* result) override;
 
  private:
+  // For what runs the host's code, which may release the client inside.
+  ComPtr<IUnknown> KeptAlive() { return ComPtr<IUnknown>(static_cast<IDispatch*>(this)); }
   void* FindInterface(REFIID interfaceId) override;
 
   const ApartmentHold apartment_;

@@ -44,6 +44,9 @@ class FileControlObject : public DualObject<Interface>,
   STDMETHODIMP_(ULONG) Release() override;
   STDMETHODIMP InterfaceSupportsErrorInfo(REFIID interfaceId) override;
 
+  // The members of the interface that list, select, transfer, rename, delete or drag raise events or pump
+  // messages, and thus run the host's code; so do the ones that take an object or a VARIANT of the host's, or
+  // notify of a property. They keep the control alive.
   STDMETHODIMP get_mobjFileupload(_CFileUpload** value) override;
   STDMETHODIMP put_mobjFileupload(_CFileUpload* value) override;
   STDMETHODIMP putref_mobjFileupload(_CFileUpload* value) override;

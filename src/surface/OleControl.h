@@ -47,6 +47,9 @@ class OleControl final : public ControlPart<IOleObject, IOleControl, IOleInPlace
   // The focus went to a window that is not the control's.
   void LostFocus() { NotifyFocus(false); }
 
+  // The entries that set a site, activate, deactivate, close, translate a key or subscribe run the
+  // container's code, and may pump messages through it. They keep the control alive.
+
   // IOleObject
   STDMETHODIMP SetClientSite(IOleClientSite* site) override;
   STDMETHODIMP GetClientSite(IOleClientSite** site) override;
