@@ -9,7 +9,8 @@ namespace {
 
 // One of the container's values; false when it does not say.
 bool Ask(const ComPtr<IOleClientSite>& asked, DISPID property, Variant& value) {
-  const ComPtr<IOleClientSite> site = asked;
+  // Held: the container may set another site inside.
+  const ComPtr<IOleClientSite> site(asked.Get());
   ComPtr<IDispatch> ambient;
   if (!site || FAILED(site->QueryInterface(IID_IDispatch, ambient.ReceiveVoid())) || !ambient) return false;
   DISPPARAMS none = {};
