@@ -42,6 +42,13 @@ std::string CheckPassword(const std::string& password) {
 std::string CheckFault(const std::string& fault) {
   return ParseFault(fault) ? "" : "wants WHERE=KIND[:ARG], not \"" + fault + "\"";
 }
+// The library would take 010 for 8 and 0x10 for 16.
+std::string CheckDecimal(const std::string& number) {
+  const bool leadingZero = number.size() > 1 && number.starts_with('0');
+  return leadingZero || number.find_first_not_of("0123456789") != std::string::npos
+             ? "wants a decimal number, not \"" + number + "\""
+             : "";
+}
 std::string CheckNotEmpty(const std::string& value) {
   return value.empty() ? "is empty" : "";
 }
@@ -58,6 +65,7 @@ Options ParseOptions(std::vector<std::string> arguments) {
   const auto number = [&](const std::string& name, auto& value, std::int64_t most, const std::string& what) {
     return app.add_option(name, value, what)
         ->type_name("N")
+        ->check(CheckDecimal)
         ->check(CLI::Range(std::int64_t{0}, most).description(""))
         ->capture_default_str();
   };

@@ -273,9 +273,9 @@ TEST(OptionsTest, BadOptionsAreToldApartFromGoodOnes) {
   EXPECT_NE(ParseOptions({"--help"}).help.find("--data"), std::string::npos);
   for (const Arguments& bad :
        {Arguments{}, Arguments{"--data"}, Arguments{"--data", "d", "--port", "65536"},
-        Arguments{"--data", "d", "--port", "x"}, Arguments{"--data", "d", "--prot", "1"},
-        Arguments{"--data", "d", "file"}, Arguments{"--data", "d", "--seed-user", "u"},
-        Arguments{"--data", "d", "--seed-password", "p"},
+        Arguments{"--data", "d", "--port", "x"}, Arguments{"--data", "d", "--port", "010"},
+        Arguments{"--data", "d", "--prot", "1"}, Arguments{"--data", "d", "file"},
+        Arguments{"--data", "d", "--seed-user", "u"}, Arguments{"--data", "d", "--seed-password", "p"},
         Arguments{"--data", "d", "--seed-user", "a#b", "--seed-password", "p"},
         Arguments{"--data", "d", "--seed-user", "u", "--seed-password", "!"},
         Arguments{"--data", "d", "--seed-user", "u", "--seed-password", "p", "--seed-pictures", "/nowhere"}})
