@@ -94,18 +94,23 @@ struct FakeSocket : StreamSocket {
   explicit FakeSocket(Transcript& itsLog) : log(itsLog) {}
   Transcript& log;
   SocketEvents* events = nullptr;
+  std::string sent;
   std::string waiting;
 
   void Arrives(std::string_view bytes) {
-    waiting = bytes;
-    events->OnReadable();
+    for (waiting = bytes; !waiting.empty();) {
+      const std::size_t before = waiting.size();
+      events->OnReadable();
+      if (waiting.size() == before) return;
+    }
   }
   void SetEvents(SocketEvents* sink) override { events = sink; }
   void Connect(TextView host, std::uint16_t port) override {
     log.push_back("connect " + Utf8FromText(host) + ":" + std::to_string(port));
   }
   void Send(std::string_view bytes) override {
-    log.push_back("send " + std::string(bytes.substr(0, bytes.find('\r'))));
+    sent = bytes;
+    log.push_back("send " + sent.substr(0, sent.find('\r')));
   }
   std::size_t Read(std::span<char> room) override {
     const std::size_t count = waiting.copy(room.data(), room.size());

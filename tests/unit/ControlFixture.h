@@ -14,6 +14,8 @@
 
 namespace tarnwick {
 
+inline const std::string kGif("GIF89a\x90\x01\xC8\x00\xF7", 11);  // 400 by 200
+
 class ControlTest : public testing::Test {
  protected:
   struct File {
@@ -55,6 +57,8 @@ class ControlTest : public testing::Test {
                "&FileSize=" + file.size + "&FileDate=today";
     return reply;
   }
+  // Where the control keeps the file's copy.
+  static Text CopyOf(const std::string& name) { return u"C:\\Temp\\bv\\u@x\\" + *TextFromUtf8(name); }
   static std::string AddressOf(const std::string& name) { return "http://h/u/" + name; }
   std::string Records() const {
     std::string names;
@@ -68,6 +72,12 @@ class ControlTest : public testing::Test {
     for (const std::string& line : log)
       if (std::isdigit(static_cast<unsigned char>(line[0])) != 0) events += line + ",";
     return events;
+  }
+  // What the host hears while the action runs.
+  std::string Heard(const std::function<void()>& action) {
+    log.clear();
+    action();
+    return Events();
   }
   void OnEvent(const std::string& event, const std::function<void()>& action) {
     host.onEvent = [event, action](const std::string& raised) {

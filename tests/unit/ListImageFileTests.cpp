@@ -312,31 +312,6 @@ TEST_F(ListImageUpload, LocalCopyHasTheBytesThatWereSent) {
   }
 }
 
-TEST_F(ListImageUpload, HostActsWhileItRuns) {
-  // In any event the host may take the client away, list again, or end the control.
-  for (const char* event : {"9999 0", "9999 100", "state 9", "uploaded 768", "1015 http://h/u/new.jpg"}) {
-    SCOPED_TRACE(event);
-    List({{"a.jpg", "1"}});
-    bool second = true;
-    std::int32_t secondError = 0;
-    OnEvent(event, [&] {
-      if (control.m_bTransferInProgress) second = control.UploadImage(u"C:\\new.jpg");
-      secondError = control.m_LastError;
-      control.ChangeFileFilter(u"gif");
-      control.mobjFileupload.reset();
-    });
-    EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
-    EXPECT_EQ(Records(), "a.jpg,new.jpg,");
-    if (std::string_view(event) != "1015 http://h/u/new.jpg") {
-      EXPECT_FALSE(second);
-      EXPECT_EQ(secondError, ftp_error::kTransferInProgress);
-    }
-    EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
-    host.onEvent = nullptr;
-    control.mobjFileupload = std::make_shared<CFileUpload>(fake.apartment);
-  }
-}
-
 TEST_F(ListImageUpload, NextOneStartsFromTheLastEvent) {
   List({});
   fake.files.files[u"C:\\two.jpg"] = {1, 0};
@@ -519,9 +494,7 @@ TEST_F(ListImageTest, RenameTranscript) {
 
 TEST_F(ListImageTest, RenameOutcomes) {
   const auto rename = [&] {
-    log.clear();
-    EXPECT_FALSE(control.RenameFile(u"a.jpg", u"b.jpg"));
-    EXPECT_EQ(Events(), "1033 ,");
+    EXPECT_EQ(Heard([&] { EXPECT_FALSE(control.RenameFile(u"a.jpg", u"b.jpg")); }), "1033 ,");
     EXPECT_EQ(Names() + Records(), "a.jpg,a.jpg,");
     return log.size();
   };
@@ -677,9 +650,7 @@ TEST_F(ListImageDownload, Failures) {
   constexpr std::uint32_t kReadOnly = 1;
   fake.files.files[u"C:\\To\\a.jpg"] = {3, kReadOnly, "old"};
   control.m_LastError = 0;
-  log.clear();
-  EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
-  EXPECT_EQ(Events(), "5555 ,");
+  EXPECT_EQ(Heard([&] { EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg"); }), "5555 ,");
   EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
   EXPECT_EQ(fake.files.files[u"C:\\To\\a.jpg"].bytes, "old");
   // The host gives up before: nothing is attempted, nor is it when the address is none.
@@ -718,12 +689,16 @@ TEST_F(ListImageDownload, Failures) {
   EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
 }
 
+// In any event the host may try another transfer, list anew, or take the client away.
 TEST_F(ListImageDownload, OneTransferAtATime) {
-  List({{"a.jpg", "1"}, {"b.jpg", "1"}});
-  view.Select(0, true);
-  fake.files.files[u"C:\\new.jpg"] = {1, 0};
-  for (const char* event : {"state 0", "9999 20", "state 10"}) {
+  uploader.script = Upload;
+  fake.files.files[u"C:\\new.jpg"] = {1536, 0};
+  const std::pair<bool, const char*> kCases[] = {{false, "9999 0"}, {false, "9999 100"}, {false, "state 9"},
+                                                 {true, "state 0"}, {true, "9999 20"},   {true, "state 10"}};
+  for (const auto& [downloads, event] : kCases) {
     SCOPED_TRACE(event);
+    List({{"a.jpg", "1"}, {"b.jpg", "1"}});
+    view.Select(0, true);
     Succeed();
     fake.files.files.erase(u"C:\\To\\a.jpg");
     bool acted = false;
@@ -741,13 +716,18 @@ TEST_F(ListImageDownload, OneTransferAtATime) {
       control.ChangeFileFilter(u"gif");
       control.mobjFileupload.reset();
     });
-    EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
+    if (downloads) {
+      EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg");
+    } else {
+      EXPECT_TRUE(control.UploadImage(u"C:\\new.jpg"));
+    }
     EXPECT_TRUE(acted);
-    EXPECT_TRUE(fake.files.files.contains(u"C:\\To\\a.jpg"));
+    EXPECT_EQ(control.m_LastError, ftp_error::kSuccess);
+    EXPECT_EQ(Records(), downloads ? "a.jpg,c.jpg," : "a.jpg,c.jpg,new.jpg,");
+    EXPECT_EQ(fake.files.files.contains(u"C:\\To\\a.jpg"), downloads);
     host.onEvent = nullptr;
     control.mobjFileupload = std::make_shared<CFileUpload>(fake.apartment);
     control.ChangeFileFilter(u"*");
-    view.Select(0, true);
   }
 }
 

@@ -1,6 +1,8 @@
 // The driver of the downloader with a scripted socket, timer and file system, and what hosts do in events.
 #include <gtest/gtest.h>
 
+#include <chrono>
+
 #include "fakes/FakeTransfers.h"
 #include "transfer/PictureDownloader.h"
 
@@ -50,9 +52,9 @@ struct DriverTest : testing::Test {
   std::unique_ptr<PictureDownloader> downloader =
       std::make_unique<PictureDownloader>(fake.apartment, socket, watchdog);
 
-  void Start(TextView target = kTarget) {
+  void Start(TextView target = kTarget, TextView url = kUrl) {
     log.clear();
-    downloader->Start(kUrl, target);
+    downloader->Start(url, target);
   }
   std::string Saved(TextView path) {
     const auto found = fake.files.files.find(Text(path));
@@ -89,6 +91,84 @@ TEST_F(DriverTest, TellsADownloadInOrderAndWritesBothFiles) {
   socket.events->OnClosedByPeer();
   EXPECT_EQ(Saved(kTarget), "abc");
   EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "xyz");
+}
+
+TEST_F(DriverTest, AsksTheServerOrTheProxyForTheAddress) {
+  const std::string rest =
+      "\r\nConnection: close\r\nAccept: */*\r\n"
+      "User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n\r\n";
+  Start(kTarget, u"http://h:8080/users/a@b/my \u00e9.jpg");
+  EXPECT_EQ(log[0], "connect h:8080");
+  socket.events->OnConnected();
+  EXPECT_EQ(socket.sent, "GET /users/a@b/my%20\xC3\xA9.jpg HTTP/1.1\r\nHost: h:8080" + rest);
+  downloader->Cancel();
+  fake.apartment.proxy = {u"proxy", u"3128", u""};
+  Start(kTarget, u"h:81/a b.jpg");
+  EXPECT_EQ(log[0], "connect proxy:3128");
+  socket.events->OnConnected();
+  EXPECT_EQ(socket.sent, "GET http://h:81/a%20b.jpg HTTP/1.1\r\nHost: proxy" + rest);
+}
+
+TEST_F(DriverTest, FindsTheHeaderAcrossAnySplit) {
+  const std::string reply = "HTTP/1.0 200\r\nA: b\r\nContent-Length: 99999999999\r\n\r\nbody\r\n\r\nmore";
+  for (std::size_t first = 0; first <= reply.size(); ++first)
+    for (std::size_t second = first; second <= reply.size(); ++second) {
+      fake.files.files.clear();
+      Start();
+      socket.events->OnConnected();
+      socket.Arrives(reply.substr(0, first));
+      socket.Arrives(reply.substr(first, second - first));
+      socket.Arrives(reply.substr(second));
+      socket.events->OnClosedByPeer();
+      ASSERT_EQ(Saved(kTarget), "body\r\n\r\nmore") << first << " " << second;
+    }
+}
+
+// Byte by byte, and with as many beginnings of the empty line as fit: whoever searched all again for each
+// arrival would still be at it.
+TEST_F(DriverTest, LooksAtEachByteOfTheHeaderOnce) {
+  std::string header;
+  while (header.size() < 300'000) header += "\r\n\rx";
+  Start();
+  socket.events->OnConnected();
+  const auto begin = std::chrono::steady_clock::now();
+  for (const char byte : header) socket.Arrives({&byte, 1});
+  EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
+  socket.Arrives("\r\n\r\nbody");
+  socket.events->OnClosedByPeer();
+  EXPECT_EQ(Saved(kTarget), "body");
+}
+
+TEST_F(DriverTest, FailsAsALostConnectionDoes) {
+  for (const TextView bad : {u"http://h/a\r\nb.jpg", u"http://h/CON.jpg", u"http://h/", u"h",
+                             u"http://h:0/a.jpg", u"http://h/a%.", u"/a.jpg", u"http://h/a:b"}) {
+    Start(kTarget, bad);
+    EXPECT_EQ(log, (Transcript{"close", "failed 45 told"})) << Utf8FromText(bad);
+  }
+  for (const TextView port : {u"", u"65536"}) {
+    fake.apartment.proxy = {u"proxy", Text(port), u""};
+    Start();
+    EXPECT_EQ(log, (Transcript{"close", "failed 45 told"})) << Utf8FromText(port);
+  }
+  fake.apartment.proxy = {};
+  Start();
+  socket.Arrives("HTTP");
+  socket.events->OnClosedByPeer();
+  EXPECT_EQ(log.back(), "failed 5");
+  // Nothing of it is told later.
+  log.clear();
+  socket.Arrives("late");
+  socket.events->OnConnected();
+  socket.events->OnSocketError(10054);
+  EXPECT_EQ(log, Transcript());
+
+  Start();
+  const std::string piece(kMostReplyBytes / 16, 'x');
+  socket.Arrives("HTTP/1.1 200\r\nContent-Length: 2147483647\r\n\r\n");
+  for (int i = 0; i < 15; ++i) socket.Arrives(piece);
+  EXPECT_TRUE(log.back().starts_with("received"));
+  socket.Arrives(piece);
+  EXPECT_EQ(log.back(), "failed 45 told");
 }
 
 // Hosts pump messages in their handlers, so whatever the socket has to tell may be told there.

@@ -1,171 +1,14 @@
 #include <gtest/gtest.h>
 
-#include <chrono>
 #include <sstream>
 
 #include "fakes/FakePlatform.h"
 #include "transfer/AcceptorPages.h"
 #include "transfer/FileNameGuard.h"
-#include "transfer/SocketDownloader.h"
 #include "transfer/UploadObject.h"
 
 namespace tarnwick {
 namespace {
-
-// Writes down what the machine wants, a word each.
-struct Actions : DownloadActions {
-  std::string log;
-  std::string body;
-  void Connect(TextView host, std::uint16_t port) override {
-    log += "connect " + Utf8FromText(host) + " " + std::to_string(port) + ";";
-  }
-  void Send(std::string_view bytes) override { log += "send " + std::string(bytes) + ";"; }
-  void CloseSocket() override { log += "close;"; }
-  void RestartWatchdog() override { log += "w+;"; }
-  void StopWatchdog() override { log += "w-;"; }
-  bool WriteFile(TextView path, TextView explicitPath, std::string_view bytes) override {
-    log += "write " + Utf8FromText(path) + " " + Utf8FromText(explicitPath) + ";";
-    body = bytes;
-    return true;
-  }
-  void Received(std::int32_t bytes) override { log += std::to_string(bytes) + ";"; }
-  void HeaderFound(std::string_view line, std::int32_t bytes) override {
-    log += "reply " + std::string(line) + " " + std::to_string(bytes) + ";";
-  }
-  void Finished(bool) override { log += "finished;"; }
-  void Failed(DownloadFailure, bool told) override { log += told ? "failed told;" : "failed;"; }
-};
-
-struct DownloaderTest : testing::Test {
-  Actions actions;
-  SocketDownloader machine{actions};
-
-  void Start(TextView url, TextView proxyHost = {}, TextView proxyPort = {}) {
-    actions.log.clear();
-    machine.StartDownload(url, u"C:\\t", u"", proxyHost, proxyPort);
-  }
-  void Data(std::string_view bytes) {
-    while (!bytes.empty()) {
-      const std::span<char> room = machine.Room(bytes.size());
-      if (room.empty()) return;
-      machine.OnArrived(bytes.copy(room.data(), room.size()));
-      bytes.remove_prefix(room.size());
-    }
-  }
-};
-
-TEST_F(DownloaderTest, FetchesAFile) {
-  machine.StartDownload(u"http://h:8080/users/a@b/my \u00e9.jpg", u"C:\\t", u"D:\\x.jpg", u"", u"");
-  machine.OnConnected();
-  machine.OnSent();
-  Data("HTTP/1.1 404 Nope\r\nContent-Length: 3\r\n\r\nab");
-  Data("c");
-  machine.OnClosedByPeer();
-  machine.OnClosedByPeer();
-  EXPECT_EQ(actions.log,
-            "w+;connect h 8080;send GET /users/a@b/my%20\xC3\xA9.jpg HTTP/1.1\r\nHost: h:8080\r\nConnection: "
-            "close\r\n"
-            "Accept: */*\r\nUser-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n\r\n;w+;"
-            "42;w+;reply HTTP/1.1 404 Nope 2;3;w+;close;w-;write C:\\t\\my \xC3\xA9.jpg D:\\x.jpg;finished;");
-  EXPECT_EQ(actions.body, "abc");
-  EXPECT_EQ(machine.ContentLength(), 3);
-  Start(u"h/a.gif");
-  EXPECT_EQ(machine.ContentLength(), 0);
-}
-
-TEST_F(DownloaderTest, FindsTheHeaderAcrossAnySplit) {
-  const std::string reply = "HTTP/1.0 200\r\nA: b\r\nContent-Length: 99999999999\r\n\r\nbody\r\n\r\nmore";
-  for (std::size_t first = 0; first <= reply.size(); ++first)
-    for (std::size_t second = first; second <= reply.size(); ++second) {
-      Start(u"h/a.gif");
-      machine.OnConnected();
-      Data(reply.substr(0, first));
-      Data(reply.substr(first, second - first));
-      Data(reply.substr(second));
-      machine.OnClosedByPeer();
-      ASSERT_EQ(actions.body, "body\r\n\r\nmore") << first << " " << second;
-      ASSERT_EQ(machine.ContentLength(), 0);
-    }
-  Start(u"h/a.gif");
-  Data("A\r\nContent-Length: 3x\r\nContent-Length: 4\r\n\r\n");
-  EXPECT_EQ(machine.ContentLength(), 0);
-}
-
-// Byte by byte, and with as many beginnings of the empty line as fit: whoever searched all again for each
-// arrival would still be at it.
-TEST_F(DownloaderTest, LooksAtEachByteOfTheHeaderOnce) {
-  std::string header;
-  while (header.size() < 300'000) header += "\r\n\rx";
-  Start(u"h/a.gif");
-  machine.OnConnected();
-  const auto begin = std::chrono::steady_clock::now();
-  for (const char byte : header) Data({&byte, 1});
-  EXPECT_LT(std::chrono::steady_clock::now() - begin, std::chrono::seconds(2));
-  Data("\r\n\r\nbody");
-  machine.OnClosedByPeer();
-  EXPECT_EQ(actions.body, "body");
-}
-
-TEST_F(DownloaderTest, FailsBeyondItsBound) {
-  Start(u"h/a.gif");
-  machine.OnConnected();
-  const std::string piece(kMostReplyBytes / 16, 'x');
-  Data("HTTP/1.1 200\r\nContent-Length: 2147483647\r\n\r\n");
-  for (int i = 0; i < 15; ++i) Data(piece);
-  EXPECT_TRUE(machine.IsRunning());
-  actions.log.clear();
-  Data(piece);
-  EXPECT_EQ(actions.log, "close;w-;failed told;");
-}
-
-TEST_F(DownloaderTest, FailsAsALostConnectionDoes) {
-  const std::string atOnce = "w+;close;w-;failed told;";
-  for (const TextView bad : {u"http://h/a\r\nb.jpg", u"http://h/CON.jpg", u"http://h/", u"h",
-                             u"http://h:0/a.jpg", u"http://h/a%.", u"/a.jpg", u"http://h/a:b"}) {
-    Start(bad);
-    EXPECT_EQ(actions.log, atOnce) << Utf8FromText(bad);
-  }
-  for (const TextView port : {u"", u"65536"}) {
-    Start(u"h/a.jpg", u"proxy", port);
-    EXPECT_EQ(actions.log, atOnce) << Utf8FromText(port);
-  }
-  actions.log.clear();
-  machine.StartDownload(u"h/a.jpg", u"", u"", u"", u"");
-  EXPECT_EQ(actions.log, atOnce);
-
-  const struct {
-    const char* name;
-    std::function<void()> happens;
-    const char* log;
-  } rows[] = {
-      {"closed without a byte", [&] { machine.OnClosedByPeer(); }, "close;w-;failed told;"},
-      {"closed in the header", [&] { Data("HTTP"), machine.OnClosedByPeer(); }, "4;w+;close;w-;failed;"},
-      {"reset", [&] { Data("A\r\n\r\nx"), machine.OnSocketError(); }, "6;w+;reply A 1;close;w-;failed told;"},
-      {"silence", [&] { machine.OnWatchdog(); }, "w-;failed;"},
-      {"cancelled", [&] { machine.Cancel(); }, "close;w-;"},
-  };
-  for (const auto& row : rows) {
-    Start(u"h/a.jpg");
-    actions.log.clear();
-    row.happens();
-    EXPECT_EQ(actions.log, row.log) << row.name;
-    actions.log.clear();
-    Data("late");
-    machine.OnConnected();
-    machine.OnSocketError();
-    machine.OnWatchdog();
-    EXPECT_EQ(actions.log, "") << row.name;
-  }
-}
-
-TEST_F(DownloaderTest, AsksTheProxyForTheWholeAddress) {
-  Start(u"h:81/a b.jpg", u"proxy", u"3128");
-  machine.OnConnected();
-  EXPECT_EQ(actions.log.substr(0, actions.log.find("\r\nConn")),
-            "w+;connect proxy 3128;send GET http://h:81/a%20b.jpg HTTP/1.1\r\nHost: proxy");
-  Start(u"");
-  EXPECT_EQ(actions.log, "");
-}
 
 TEST(FileNameGuard, AcceptsAndRefuses) {
   for (const TextView good :
@@ -223,14 +66,11 @@ TEST(UploadObject, SendsTheFileAndTellsItsProgress) {
     }
     return std::to_string(error) + " " + events.log;
   };
-  const std::string begin = "initializing;connecting;started;0 0;";
-  const std::string good = upload("ErrorNumber=0");
-  EXPECT_EQ(good.substr(0, 2 + begin.size()), "0 " + begin);
-  EXPECT_NE(good.find(";100 20;server;upload complete;complete;"), std::string::npos) << good;
-  EXPECT_NE(upload("ErrorNumber=-2147220891").find("server;upload complete;complete;"), std::string::npos);
-  EXPECT_EQ(upload("ErrorNumber=-2147220891").substr(0, 11), "-2147220891");
+  EXPECT_EQ(upload("ErrorNumber=0"),
+            "0 initializing;connecting;started;0 0;100 20;server;upload complete;complete;");
+  const std::string same = upload("ErrorNumber=-2147220891");
+  EXPECT_TRUE(same.starts_with("-2147220891 ") && same.ends_with("server;upload complete;complete;")) << same;
   EXPECT_EQ(upload("ErrorNumber=-2147220881").find("upload complete"), std::string::npos);
-  EXPECT_EQ(upload(nullptr).substr(0, 11), "-2147467259");
 
   const auto& sent = fake.http.sent[0];
   EXPECT_EQ(sent.target, "/httpupload/UploadAcceptor.asp");
@@ -306,15 +146,11 @@ TEST(UploadObject, TellsRisingPercentsInPiecesOfAnySize) {
       Uploads events;
       uploader.UploadFile(u"C:\\\u00e9.jpg", u"http://h/users/", u"/p", 0, u"u", u"p", u"g", events);
 
-      std::istringstream log(events.log);
-      std::vector<std::string> told;
-      for (std::string event; std::getline(log, event, ';');) told.push_back(event);
-      ASSERT_GE(told.size(), 8U) << events.log;
-      EXPECT_EQ(told[2], "started");
-      EXPECT_EQ(told[3], "0 0");
-      EXPECT_EQ(told[told.size() - 4], "100 " + std::to_string(length));
-      for (std::size_t i = 4; i + 3 < told.size(); ++i)
-        EXPECT_LT(std::stoi(told[i - 1]), std::stoi(told[i])) << events.log;
+      std::istringstream log(events.log.substr(events.log.find("0 0;") + 4));
+      int last = 0;
+      for (int percent = 0, sent = 0; log >> percent >> sent; last = percent, log.ignore())
+        EXPECT_LT(last, percent);
+      EXPECT_EQ(last, 100) << events.log;
       const std::string& body = http.sent[0].body;
       EXPECT_NE(body.find("filename=\"\xC3\xA9.jpg\"\r\nContent-Type: application/octet-stream\r\n\r\n" +
                           bytes + "\r\n--"),

@@ -8,8 +8,6 @@
 namespace tarnwick {
 namespace {
 
-const std::string kGif("GIF89a\x90\x01\xC8\x00\xF7", 11);
-
 class TwoControlsTest : public ControlTest {
  protected:
   TwoControlsTest() {
@@ -22,8 +20,6 @@ class TwoControlsTest : public ControlTest {
     fake.files.files[u"C:\\new.jpg"] = {kGif.size(), 0, "GIF89a-new-"};
     log.clear();
   }
-  static Text CopyOf(const std::string& name) { return u"C:\\Temp\\bv\\u@x\\" + *TextFromUtf8(name); }
-
   FakeListView view{log};
   ctrlListImage list{parts, view};
   // A control has transfer components of its own.
