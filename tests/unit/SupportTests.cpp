@@ -7,7 +7,6 @@
 #include "session/UserFolder.h"
 #include "support/CRegistry.h"
 #include "support/PathHelpers.h"
-#include "support/RegistryValues.h"
 #include "transfer/HttpAddress.h"
 #include "transfer/Reply.h"
 
@@ -125,23 +124,6 @@ TEST(CRegistry, OddRules) {
   const int opened = registry.opened;
   for (std::uint32_t other : {3U, 5U, 0xFFFFFFFFU}) EXPECT_EQ(reader.getRegSetting(u"s", u"C", other), u"");
   EXPECT_EQ(registry.opened, opened);
-}
-
-TEST(RegistryValues, OfPathsThatNameTheirHive) {
-  FakeRegistry registry;
-  registry.keys[u"A"] = {{u"s", FakeRegistry::String("text")},
-                         {u"binary", {3, std::string("\1\0z", 3)}},
-                         {u"short", {4, "ab"}},
-                         {u"list", {7, "ab"}}};
-  const RegistryValues values(registry, u"\\HKEY_CURRENT_USER\\A");
-  EXPECT_EQ(values.Get(u"s").text, u"text");
-  EXPECT_EQ(values.Get(u"binary").text, Text(u"\1\0z", 3));
-  EXPECT_EQ(values.Get(u"short").number, 0x6261U);
-  EXPECT_EQ(values.Get(u"list").text, u"");
-  EXPECT_THROW(values.Get(u"missing"), RuntimeError);
-  for (const TextView path :
-       {u"", u"HKEY_CURRENT_USER\\A", u"\\HKEY_CURRENT_USER", u"\\HKEY_NONE\\A", u"\\HKEY_USERS\\A"})
-    EXPECT_THROW(RegistryValues(registry, path), RuntimeError) << Utf8FromText(path);
 }
 
 TEST(ProxySettings, OfTheBrowser) {
