@@ -52,8 +52,6 @@ TEST_F(AcceptorTest, FilesAreUploadedReplacedRenamedAndDeleted) {
   EXPECT_EQ(Client().Rename("a b.jpg", "b+b.jpg"), kStored);
   EXPECT_EQ(Client().CheckedListing(), (Files{{"b+b.jpg", bytes}, {"bl\xC3\xBCte.gif", ""}}));
   EXPECT_EQ(Client().Delete("a b.jpg"), kNotThere);
-  EXPECT_EQ(Client().Delete("b+b.jpg"), kStored);
-  EXPECT_EQ(Client().CheckedListing(), (Files{{"bl\xC3\xBCte.gif", ""}}));
 }
 
 TEST_F(AcceptorTest, NamesAreRefusedThatNoClientCouldKeep) {
@@ -75,7 +73,6 @@ TEST_F(AcceptorTest, NamesThatDifferInLetterCaseOnlyAreTaken) {
   EXPECT_EQ(Client().Upload("\xC3\xA4HRE.jpg", "3"), kName);
   EXPECT_EQ(Client().Rename("b.jpg", "\xC3\xA4hre.JPG"), kName);
   EXPECT_EQ(Client().Rename("b.jpg", "B.jpg"), kStored);  // not another file's
-  EXPECT_EQ(Client().Rename("B.jpg", "B.jpg"), kStored);
   EXPECT_EQ(Client().CheckedListing(), (Files{{"\xC3\x84hre.jpg", "1"}, {"B.jpg", "2"}}));
 }
 
@@ -104,8 +101,6 @@ TEST_F(AcceptorTest, MalformedRequestsAreRefusedAndChangeNothing) {
   EXPECT_EQ(PostUpload(UploadBody({fields.begin(), fields.end() - 1}, "a.jpg", "1")), 400);
   EXPECT_EQ(PostUpload(good, "multipart/form-data; boundary=other"), 400);
   EXPECT_EQ(PostUpload(good, kFormType), 400);
-  EXPECT_EQ(PostUpload("------b0undary\r\nContent-Disposition: form-data; name=\"" + longLine + "\"\r\n\r\n"),
-            400);
   EXPECT_EQ(PostUpload(UploadBody({{"UsersBaseUrl", longLine}}, "a.jpg", "1")), 400);
   EXPECT_EQ(PostUpload(UploadBody(fields, "\xFF.jpg", "1")), 400);
 
@@ -115,9 +110,6 @@ TEST_F(AcceptorTest, MalformedRequestsAreRefusedAndChangeNothing) {
   };
   EXPECT_EQ(form("DeleteAcceptor.asp", "UsersBaseUrl=u&FileName=%FF&User=u&Password=p&ProductID=x"), 400);
   EXPECT_EQ(form("RenameAcceptor.asp", "UsersBaseUrl=u&OldFileName=a&User=u&Password=p&ProductID=x"), 400);
-  EXPECT_EQ(
-      form("CreateFolderAcceptor.asp", "UsersBaseUrl=u&Folder=f&Action=6&User=u&Password=p&ProductID=x"),
-      400);
   EXPECT_EQ(form("DeleteAcceptor.asp", std::string((1 << 20) + 1, 'a')), 413);
   EXPECT_EQ(form("OtherAcceptor.asp", ""), 404);
   Client().Http().set_compress(true);
