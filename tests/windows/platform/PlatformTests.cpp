@@ -48,8 +48,8 @@ class RegistryTest : public testing::Test {
   void Set(const wchar_t* name, DWORD type, const void* data, std::size_t size) {
     RegSetValueExW(key_, name, 0, type, static_cast<const BYTE*>(data), static_cast<DWORD>(size));
   }
-  void SetText(const wchar_t* name, const std::wstring& text, bool terminated = true) {
-    Set(name, REG_SZ, text.c_str(), (text.size() + (terminated ? 1 : 0)) * sizeof(wchar_t));
+  void SetText(const wchar_t* name, const std::wstring& text) {
+    Set(name, REG_SZ, text.c_str(), (text.size() + 1) * sizeof(wchar_t));
   }
 
   HKEY key_ = nullptr;
@@ -60,7 +60,6 @@ TEST_F(RegistryTest, QueriesAsTheSystemDoes) {
   const DWORD number = 42;
   SetText(L"longest", std::wstring(254, L'x') + L"\u00FC");
   SetText(L"too long", std::wstring(256, L'x'));
-  SetText(L"open", L"abc", false);
   SetText(L"", L"default");
   Set(L"number", REG_DWORD, &number, sizeof number);
   Set(L"binary", REG_BINARY, "\1\2\3", 3);
@@ -86,29 +85,15 @@ TEST_F(RegistryTest, QueriesAsTheSystemDoes) {
   std::uint8_t data[256] = "????";
   std::uint32_t type = 0;
   std::uint32_t size = 0;
-  // The system ends the text; whether it counts the terminator as well depends on its version.
-  EXPECT_EQ(key->Query(u"open", type, data, size), kRegistrySuccess);
-  EXPECT_STREQ(reinterpret_cast<const char*>(data), "abc");
   for (TextView missing : {u"missing", u"\u65E5"})
     EXPECT_EQ(key->Query(missing, type, data, size), DWORD{ERROR_FILE_NOT_FOUND});
+
+  EXPECT_EQ(registry_.Open(kHiveCurrentUser, Text(kKey) + u"\\none", key), DWORD{ERROR_FILE_NOT_FOUND});
+  EXPECT_EQ(registry_.Open(kHiveLocalMachine, u"Software", key), kRegistrySuccess);
 
   CRegistry settings(registry_);
   settings.setBaseRegKey(kHiveCurrentUser, u"Software");
   EXPECT_EQ(settings.getRegSetting(u"longest", kKey.substr(9), type = 1), Text(254, u'x') + u"\u00FC");
-  EXPECT_EQ(settings.getRegSetting(u"too long", kKey.substr(9), type = 1), u"");
-  EXPECT_EQ(settings.getRegSetting(u"number", kKey.substr(9), type = 4), u"42");
-}
-
-TEST_F(RegistryTest, DoesNotOpenWhatIsNotThere) {
-  std::unique_ptr<RegistryKey> key;
-  EXPECT_EQ(registry_.Open(kHiveCurrentUser, Text(kKey) + u"\\none", key), DWORD{ERROR_FILE_NOT_FOUND});
-  EXPECT_EQ(registry_.Open(kHiveCurrentUser, u"\u65E5", key), DWORD{ERROR_FILE_NOT_FOUND});
-  EXPECT_NE(registry_.Open(0, kKey, key), kRegistrySuccess);
-  EXPECT_FALSE(key);
-  EXPECT_EQ(registry_.Open(kHiveLocalMachine, u"Software", key), kRegistrySuccess);
-  EXPECT_EQ(ownedObjects, 1);
-  key.reset();
-  EXPECT_EQ(ownedObjects, 0);
 }
 
 class FilesTest : public testing::Test {
@@ -198,11 +183,9 @@ TEST_F(FilesTest, ListsWhatIsNeitherHiddenNorSystem) {
   const struct {
     Text pattern;
     bool file, withFolders;
-  } kCases[] = {{In(u"*.jpg"), true, true},   {In(u"a.jpg"), false, false},   {In(u"a*.jpg"), false, false},
-                {In(u"*.gif"), false, false}, {In(u"c.gif"), false, false},   {In(u"B.JPG"), true, true},
-                {In(u"none"), false, false},  {In(u"none\\x"), false, false}, {In(u"folder"), false, true},
-                {In(u"fold?r"), false, true}, {In(u"folder\\"), false, true}, {In(u""), true, true},
-                {Text(), false, false}};
+  } kCases[] = {{In(u"*.jpg"), true, true},     {In(u"a.jpg"), false, false},   {In(u"*.gif"), false, false},
+                {In(u"B.JPG"), true, true},     {In(u"none\\x"), false, false}, {In(u"fold?r"), false, true},
+                {In(u"folder\\"), false, true}, {In(u""), true, true},          {Text(), false, false}};
   for (const auto& item : kCases) {
     EXPECT_EQ(files_.Exists(item.pattern, false), item.file) << Utf8FromText(item.pattern);
     EXPECT_EQ(files_.Exists(item.pattern, true), item.withFolders) << Utf8FromText(item.pattern);
@@ -211,7 +194,6 @@ TEST_F(FilesTest, ListsWhatIsNeitherHiddenNorSystem) {
   EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"b.jpg")); }), 58);
   EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"none\\x")); }), 76);
   EXPECT_EQ(ErrorOf([&] { files_.MakeFolder(In(u"a?")); }), 75);
-  EXPECT_EQ(ownedObjects, 0);
 }
 
 TEST_F(FilesTest, CopiesWholeOrNotAtAll) {
@@ -227,8 +209,7 @@ TEST_F(FilesTest, CopiesWholeOrNotAtAll) {
     TextView source, destination;
     std::int32_t error;
     const char* content;
-  } kCases[] = {{u"source", u"\u65E5", 0, "new"},       {u"source", u"\u65E5", 0, "new"},
-                {u"none", u"old", 53, "old"},           {u"folder", u"old", 75, "old"},
+  } kCases[] = {{u"source", u"\u65E5", 0, "new"},       {u"folder", u"old", 75, "old"},
                 {u"source", u"old", 0, "new"},          {u"source", u"locked", 75, "old"},
                 {u"source", u"held", 75, "old"},        {u"source", u"folder", 75, nullptr},
                 {u"source", u"none\\file", 75, nullptr}};
@@ -288,8 +269,6 @@ TEST_F(FilesTest, RemovesWhatEndedProcessesLeft) {
                 {held, false, true},
                 {ended + u"-01-1.tmp", false, true},
                 {ended + u"-1-1.tmp.tmp", false, true},
-                {ended + u"-1.tmp", false, true},
-                {u"TWK" + ended.substr(3) + u"-1-3.tmp", false, true},
                 {inner, false, true}};
   files_.MakeFolder(In(folder));
   const FILETIME old{0, 0x01C00000};
@@ -312,7 +291,6 @@ TEST_F(FilesTest, RemovesWhatEndedProcessesLeft) {
   EXPECT_FALSE(files_.Exists(In(inner), false)) << "the first write in a folder removes them, too";
   DeleteFileW(WideFromText(In(inner)).c_str());
   for (const HANDLE handle : {writer.hThread, writer.hProcess}) CloseHandle(handle);
-  EXPECT_EQ(ownedObjects, 0);
 }
 
 TEST_F(FilesTest, ReadsABeginningAndCreatesWhatIsMissing) {
@@ -326,16 +304,10 @@ TEST_F(FilesTest, ReadsABeginningAndCreatesWhatIsMissing) {
   EXPECT_EQ(files_.Length(In(u"\u65E5.jpg")), 0U);
   HANDLE held = CreateFileW(WideFromText(In(u"\u65E5.jpg")).c_str(), GENERIC_READ, 0, nullptr, OPEN_EXISTING,
                             0, nullptr);
-  const std::pair<Text, std::int32_t> failures[] = {{In(u"\u65E5.jpg"), 75},
-                                                    {folder_, 75},
-                                                    {In(u"a?"), 75},
-                                                    {In(Text(u"a\0", 2)), 75},
-                                                    {In(u"none\\a"), 76}};
-  for (const auto& failure : failures)
-    EXPECT_EQ(ErrorOf([&] { files_.ReadBeginning(failure.first, room); }), failure.second)
-        << Utf8FromText(failure.first);
+  for (const Text& name : {In(u"\u65E5.jpg"), folder_, In(Text(u"a\0", 2))})
+    EXPECT_EQ(ErrorOf([&] { files_.ReadBeginning(name, room); }), 75) << Utf8FromText(name);
+  EXPECT_EQ(ErrorOf([&] { files_.ReadBeginning(In(u"none\\a"), room); }), 76);
   CloseHandle(held);
-  EXPECT_EQ(ownedObjects, 0);
 }
 
 TEST(WindowsStringResources, ReadsOwnAndLoadedStrings) {
@@ -353,9 +325,6 @@ TEST(WindowsStringResources, ReadsOwnAndLoadedStrings) {
     EXPECT_EQ(string(3), u"");
   }
   for (TextView path : {u"", u"C:\\none.dll", u"C:\\\u65E5.dll"}) EXPECT_FALSE(strings.Load(path));
-  EXPECT_EQ(ownedObjects, 1);
-  library.reset();
-  EXPECT_EQ(ownedObjects, 0);
 }
 
 int handled = 0;
@@ -396,17 +365,7 @@ TEST(WindowsMessagePump, HandlesWhatWaitsAndPutsQuitBack) {
   PostMessageW(window, WM_APP, 0, 0);
   pump.Yield();
   repeats = false;
-  pump.Yield();
   DestroyWindow(window);
-}
-
-TEST(WindowsPlatform, GivesAllOfThem) {
-  WindowsPlatform platform(GetModuleHandleW(nullptr));
-  const Platform view = platform.View();
-  EXPECT_FALSE(view.strings.OwnString(1).empty());
-  EXPECT_TRUE(view.files.TempPath().ends_with(u'\\'));
-  EXPECT_FALSE(view.internet.Open(u"\u65E5"));
-  EXPECT_TRUE(view.internet.Open(u"FileUploadClient"));
 }
 
 }  // namespace
