@@ -3,15 +3,16 @@
 
 #include <gtest/gtest.h>
 #include <objbase.h>
-#include <wincodec.h>
 
 #include <algorithm>
 #include <cstdint>
+#include <fstream>
+#include <iterator>
 #include <string>
 #include <utility>
 #include <vector>
 
-#include "platform/windows/ComPtr.h"
+#include "platform/windows/Owner.h"
 
 namespace tarnwick {
 namespace {
@@ -69,56 +70,10 @@ Bytes Bmp(const Picture& picture) {
   return bytes;
 }
 
-// What Windows makes of the picture in `container`'s format. A GIF has its pixels' first eight colours.
-Bytes Encoded(const Picture& picture, const GUID& container) {
-  ComPtr<IWICImagingFactory> factory;
-  ComPtr<IStream> stream;
-  ComPtr<IWICBitmapEncoder> encoder;
-  ComPtr<IWICBitmapFrameEncode> frame;
-  EXPECT_EQ(S_OK, CoCreateInstance(CLSID_WICImagingFactory, nullptr, CLSCTX_INPROC_SERVER,
-                                   __uuidof(IWICImagingFactory), factory.ReceiveVoid()));
-  EXPECT_EQ(S_OK, CreateStreamOnHGlobal(nullptr, TRUE, stream.Receive()));
-  EXPECT_EQ(S_OK, factory->CreateEncoder(container, nullptr, encoder.Receive()));
-  EXPECT_EQ(S_OK, encoder->Initialize(stream.Get(), WICBitmapEncoderNoCache));
-  EXPECT_EQ(S_OK, encoder->CreateNewFrame(frame.Receive(), nullptr));
-  EXPECT_EQ(S_OK, frame->Initialize(nullptr));
-  EXPECT_EQ(S_OK, frame->SetSize(static_cast<UINT>(picture.width), static_cast<UINT>(picture.height)));
-  WICPixelFormatGUID format = GUID_WICPixelFormat32bppBGRA;
-  std::size_t pixelBytes = 4;
-  Bytes data;
-  if (container == GUID_ContainerFormatGif) {
-    format = GUID_WICPixelFormat8bppIndexed;
-    pixelBytes = 1;
-    Pixels colors(picture.pixels.begin(),
-                  picture.pixels.begin() + std::min<std::ptrdiff_t>(8, std::ssize(picture.pixels)));
-    for (const std::uint32_t pixel : picture.pixels)
-      data.push_back(static_cast<std::uint8_t>(std::ranges::find(colors, pixel) - colors.begin()));
-    ComPtr<IWICPalette> palette;
-    EXPECT_EQ(S_OK, factory->CreatePalette(palette.Receive()));
-    EXPECT_EQ(S_OK, palette->InitializeCustom(colors.data(), static_cast<UINT>(colors.size())));
-    EXPECT_EQ(S_OK, frame->SetPalette(palette.Get()));
-  } else if (container == GUID_ContainerFormatJpeg) {
-    format = GUID_WICPixelFormat24bppBGR;
-    pixelBytes = 3;
-    for (const std::uint32_t pixel : picture.pixels) Append(data, pixel, 3);
-  } else {
-    for (const std::uint32_t pixel : picture.pixels) Append(data, pixel, 4);
-  }
-  const WICPixelFormatGUID wanted = format;
-  EXPECT_EQ(S_OK, frame->SetPixelFormat(&format));
-  EXPECT_TRUE(format == wanted);
-  EXPECT_EQ(S_OK, frame->WritePixels(static_cast<UINT>(picture.height),
-                                     static_cast<UINT>(static_cast<std::size_t>(picture.width) * pixelBytes),
-                                     static_cast<UINT>(data.size()), data.data()));
-  EXPECT_EQ(S_OK, frame->Commit());
-  EXPECT_EQ(S_OK, encoder->Commit());
-
-  STATSTG facts = {};
-  EXPECT_EQ(S_OK, stream->Stat(&facts, STATFLAG_NONAME));
-  Bytes bytes(static_cast<std::size_t>(facts.cbSize.QuadPart));
-  EXPECT_EQ(S_OK, stream->Seek({}, STREAM_SEEK_SET, nullptr));
-  EXPECT_EQ(S_OK, stream->Read(bytes.data(), static_cast<ULONG>(bytes.size()), nullptr));
-  return bytes;
+// Of the demo pictures.
+Bytes FileOf(const std::string& name) {
+  std::ifstream file("demo/pictures/" + name, std::ios::binary);
+  return {std::istreambuf_iterator<char>(file), {}};
 }
 
 class PictureLoaderTest : public testing::Test {
@@ -183,8 +138,8 @@ TEST_F(PictureLoaderTest, EachPixelIsTheAverageOfWhatItCovers) {
   struct Row {
     int width, height, shownWidth, shownHeight;
   };
-  for (const Row row : {Row{5, 5, 5, 5}, Row{8, 6, 4, 2}, Row{7, 5, 3, 2}, Row{61, 1, 1, 1}, Row{3, 50, 2, 7},
-                        Row{2, 2, 5, 3}, Row{1, 4, 3, 3}, Row{100, 90, 13, 89}}) {
+  for (const Row row :
+       {Row{8, 6, 4, 2}, Row{7, 5, 3, 2}, Row{61, 1, 1, 1}, Row{2, 2, 5, 3}, Row{100, 90, 13, 89}}) {
     const Picture picture = Colours(row.width, row.height);
     EXPECT_EQ(Averages(picture, row.shownWidth, row.shownHeight),
               Shown(Bmp(picture), row.shownWidth, row.shownHeight))
@@ -193,28 +148,28 @@ TEST_F(PictureLoaderTest, EachPixelIsTheAverageOfWhatItCovers) {
 }
 
 TEST_F(PictureLoaderTest, EachFormatIsToldByItsBytes) {
-  const Picture eight = Colours(4, 2);
-  EXPECT_EQ(eight.pixels, Shown(Encoded(eight, GUID_ContainerFormatPng), 4, 2));
-  EXPECT_EQ(eight.pixels, Shown(Encoded(eight, GUID_ContainerFormatGif), 4, 2));
-  EXPECT_EQ(eight.pixels, Shown(Bmp(eight), 4, 2));
-
-  // A JPEG's colours are near.
-  const Picture plain = {40, 30, Pixels(1200, 0xFFC83250)};
-  const Pixels shown = Shown(Encoded(plain, GUID_ContainerFormatJpeg), 3, 2);
-  ASSERT_EQ(6U, shown.size());
-  for (const std::uint32_t pixel : shown)
+  const Picture picture = Colours(4, 2);
+  EXPECT_EQ(picture.pixels, Shown(Bmp(picture), 4, 2));
+  // The average of all pixels, as another program tells it.
+  for (const auto& [name, average] :
+       {std::pair{"deep-field.png", 0x121312}, {"wizard.gif", 0xD6D6DF}, {"coffee.jpg", 0x9E5533}}) {
+    const Pixels shown = Shown(FileOf(name), 1, 1);
+    ASSERT_EQ(1U, shown.size()) << name;
     for (const int shift : {0, 8, 16})
-      EXPECT_NEAR(0xC83250 >> shift & 0xFF, static_cast<int>(pixel >> shift & 0xFF), 3);
+      EXPECT_NEAR(average >> shift & 0xFF, static_cast<int>(shown[0] >> shift & 0xFF), 2) << name;
+  }
 }
 
 TEST_F(PictureLoaderTest, TheBackgroundShowsThrough) {
-  // What is not seen, seen half and seen; then a hidden and a seen one in one, without the hidden one's
-  // colour.
-  const Picture picture = {3, 1, {0x00FFFFFF, 0x80000000, 0xFF102030}};
-  const Bytes png = Encoded(picture, GUID_ContainerFormatPng);
+  // What is not seen, seen half and seen; then all in one, without the hidden one's colour, which is white.
+  const Bytes png = {0x89, 0x50, 0x4E, 0x47, 0x0D, 0x0A, 0x1A, 0x0A, 0,    0,    0,    0x0D, 0x49,
+                     0x48, 0x44, 0x52, 0,    0,    0,    3,    0,    0,    0,    1,    8,    6,
+                     0,    0,    0,    0x1B, 0xE0, 0x14, 0xB4, 0,    0,    0,    0x14, 0x49, 0x44,
+                     0x41, 0x54, 0x78, 0xDA, 0x63, 0xF8, 0xFF, 0xFF, 0x3F, 3,    0x10, 0x34, 8,
+                     0x28, 0x18, 0xFC, 7,    0,    0x25, 0x6B, 4,    0xDD, 0xCC, 0x11, 0xA8, 0x62,
+                     0,    0,    0,    0,    0x49, 0x45, 0x4E, 0x44, 0xAE, 0x42, 0x60, 0x82};
   EXPECT_EQ((Pixels{kShownBackground, 0xFF204060, 0xFF102030}), Shown(png, 3, 1));
-  const Picture two = {2, 1, {0x00FFFFFF, 0xFF000000}};
-  EXPECT_EQ((Pixels{0xFF204060}), Shown(Encoded(two, GUID_ContainerFormatPng), 1, 1));
+  EXPECT_EQ((Pixels{0xFF254B70}), Shown(png, 1, 1));
 
   // A GIF of 4 x 4 whose first picture is the 2 x 2 at (1, 1): red, the transparent colour, and twice red. A
   // further picture is not shown.
@@ -230,21 +185,17 @@ TEST_F(PictureLoaderTest, TheBackgroundShowsThrough) {
 }
 
 TEST_F(PictureLoaderTest, ABrokenFileIsNotShown) {
-  const Picture picture = Colours(4, 2);
-  const Picture large = Colours(64, 64);
-  const std::pair<const char*, Bytes> files[] = {
-      {"PNG", Encoded(large, GUID_ContainerFormatPng)},
-      {"GIF", Encoded(picture, GUID_ContainerFormatGif)},
-      {"JPEG", Encoded(large, GUID_ContainerFormatJpeg)},
-      {"BMP", Bmp(large)},
-  };
+  const std::pair<const char*, Bytes> files[] = {{"PNG", FileOf("horse.png")},
+                                                 {"GIF", FileOf("wizard.gif")},
+                                                 {"JPEG", FileOf("rose.jpg")},
+                                                 {"BMP", Bmp(Colours(64, 64))}};
   for (const auto& [name, bytes] : files) {
     EXPECT_FALSE(Shown(bytes, 2, 2).empty()) << name;
-    for (const std::size_t length :
-         {bytes.size() / 2, bytes.size() * 9 / 10, std::size_t{30}, std::size_t{3}})
-      EXPECT_TRUE(
-          Shown(Bytes(bytes.begin(), bytes.begin() + static_cast<std::ptrdiff_t>(length)), 2, 2).empty())
-          << name << " cut after " << length << " of " << bytes.size();
+    Bytes cut = bytes;
+    for (const std::size_t length : {bytes.size() * 9 / 10, bytes.size() / 2, std::size_t{3}}) {
+      cut.resize(length);
+      EXPECT_TRUE(Shown(cut, 2, 2).empty()) << name << " cut after " << length << " of " << bytes.size();
+    }
     Bytes noise = bytes;
     for (std::size_t i = 12; i < noise.size(); ++i) noise[i] = static_cast<std::uint8_t>(i * 77);
     EXPECT_TRUE(Shown(noise, 2, 2).empty()) << name << " with noise";
@@ -253,12 +204,9 @@ TEST_F(PictureLoaderTest, ABrokenFileIsNotShown) {
   EXPECT_TRUE(Shown(Bytes(200, 'x'), 2, 2).empty());
 
   Write(files[0].second);
-  for (const SIZE size : {SIZE{0, 2}, SIZE{2, 0}, SIZE{-1, 2}, SIZE{20'000, 1}})
-    EXPECT_TRUE(ShownFile(size.cx, size.cy).empty());
+  for (const int width : {0, -1, 20'000}) EXPECT_TRUE(ShownFile(width, 1).empty());
   const std::wstring file = std::exchange(path_, path_ + std::wstring(1, L'\0'));
   EXPECT_TRUE(ShownFile(2, 2).empty()) << "a name with NUL";
-  path_ = file + L".none";
-  EXPECT_TRUE(ShownFile(2, 2).empty()) << "no file";
   path_ = L"C:\\windows";
   EXPECT_TRUE(ShownFile(2, 2).empty()) << "a folder";
   path_ = file;
@@ -275,12 +223,10 @@ TEST_F(PictureLoaderTest, AFileThatClaimsTooMuchIsNotShown) {
     int bytes;
     bool bigEndian;
   };
-  const Picture picture = Colours(4, 2);
-  for (const Row& row :
-       {Row{"PNG", Encoded(picture, GUID_ContainerFormatPng), {'I', 'H', 'D', 'R'}, 4, 8, 4, true},
-        Row{"GIF", Encoded(picture, GUID_ContainerFormatGif), {'G', 'I', 'F'}, 6, 8, 2, false},
-        Row{"JPEG", Encoded(picture, GUID_ContainerFormatJpeg), {0xFF, 0xC0}, 7, 5, 2, true},
-        Row{"BMP", Bmp(picture), {'B', 'M'}, 18, 22, 4, false}}) {
+  for (const Row& row : {Row{"PNG", FileOf("horse.png"), {'I', 'H', 'D', 'R'}, 4, 8, 4, true},
+                         Row{"GIF", FileOf("wizard.gif"), {'G', 'I', 'F'}, 6, 8, 2, false},
+                         Row{"JPEG", FileOf("rose.jpg"), {0xFF, 0xC0}, 7, 5, 2, true},
+                         Row{"BMP", Bmp(Colours(4, 2)), {'B', 'M'}, 18, 22, 4, false}}) {
     Bytes bytes = row.file;
     EXPECT_FALSE(Shown(bytes, 2, 2).empty()) << row.name;
     const auto mark = static_cast<std::size_t>(
@@ -294,11 +240,6 @@ TEST_F(PictureLoaderTest, AFileThatClaimsTooMuchIsNotShown) {
     put(row.width, 8001);
     put(row.height, 8000);
     EXPECT_TRUE(Shown(bytes, 2, 2).empty()) << row.name;
-    if (row.bytes < 4) continue;
-    // 2 to the power of 32 pixels: none in 32 bits.
-    put(row.width, 0x10000);
-    put(row.height, 0x10000);
-    EXPECT_TRUE(Shown(bytes, 2, 2).empty()) << row.name << " at 65536 x 65536";
   }
 }
 
