@@ -1,6 +1,5 @@
 // The controls in a full container of our own, in the system's, and in none.
 #include <set>
-#include <thread>
 
 #include "Form.h"
 #include "platform/windows/SystemDpi.h"
@@ -18,10 +17,8 @@ TYPED_TEST(AnyControl, KeepsItsPropertiesWithTheForm) {
   const auto bag = ComPtr<PropertyBag>::Adopt(new PropertyBag);
   for (const auto wayIn : {ControlContainer::WayIn::kSteps, ControlContainer::WayIn::kQuickActivate}) {
     TypeParam form(wayIn);
-    ComPtr<IPersistPropertyBag> persist;
-    ComPtr<IPersistStreamInit> stream;
-    ASSERT_EQ(form.control->QueryInterface(IID_IPersistPropertyBag, persist.ReceiveVoid()), S_OK);
-    ASSERT_EQ(form.control->QueryInterface(IID_IPersistStreamInit, stream.ReceiveVoid()), S_OK);
+    auto persist = As<IPersistPropertyBag>(*form.control);
+    auto stream = As<IPersistStreamInit>(*form.control);
     EXPECT_EQ(stream->IsDirty(), S_FALSE);
     form.control->put_OLEDropMode(1);
     EXPECT_EQ(form.container->changed, std::vector<DISPID>{DISPID_OLEDropMode});
@@ -59,10 +56,7 @@ TYPED_TEST(AnyControl, KeepsItsPropertiesWithTheForm) {
 }
 
 TEST(ListControl, WorksWithoutAWindow) {
-  ComPtr<_ctrlListImage> list;
-  ASSERT_EQ(CoCreateInstance(CLSID_ctrlListImage, nullptr, CLSCTX_INPROC_SERVER, __uuidof(_ctrlListImage),
-                             list.ReceiveVoid()),
-            S_OK);
+  const auto list = NewControl<_ctrlListImage>(CLSID_ctrlListImage);
   Bstr all(L"*");
   BSTR filter = all;
   VARIANT_BOOL done = VARIANT_FALSE;
@@ -74,13 +68,8 @@ TEST(ListControl, WorksWithoutAWindow) {
   info->GetDescription(description.Receive());
   EXPECT_EQ(description.Text(), L"The control has no service client");
 
-  const ComPtr<_CFileUpload> client = LoggedOnClient();
-  EXPECT_EQ(list->putref_mobjFileupload(client.Get()), S_OK);
-  ComPtr<_CFileUpload> same;
-  list->get_mobjFileupload(same.Receive());
-  EXPECT_EQ(same.Get(), client.Get());
-  EXPECT_EQ(list->Init(&filter, &done), S_OK);
-  EXPECT_TRUE(done);
+  EXPECT_EQ(list->putref_mobjFileupload(LoggedOnClient().Get()), S_OK);
+  EXPECT_TRUE(Init(*list, L"*"));
   VARIANT names = {};
   EXPECT_EQ(list->GetFileNames(&names), S_OK);
   ASSERT_EQ(V_VT(&names), VT_ARRAY | VT_VARIANT);
@@ -88,50 +77,6 @@ TEST(ListControl, WorksWithoutAWindow) {
   SafeArrayGetUBound(V_ARRAY(&names), 1, &last);
   EXPECT_EQ(last, -1);
   VariantClear(&names);
-
-  // Drawn for a form that is not running.
-  ComPtr<IViewObject2> view;
-  ASSERT_EQ(list->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
-  const Pixels drawn = Drawn(320, 240, [&](HDC dc) {
-    const RECT whole = {0, 0, 320, 240};
-    FillRect(dc, &whole, GetSysColorBrush(COLOR_WINDOW));
-    const RECTL bounds = {0, 0, 320, 240};
-    EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
-              S_OK);
-  });
-  const COLORREF window = GetSysColor(COLOR_WINDOW);
-  const std::uint32_t paper = RGB(GetBValue(window), GetGValue(window), GetRValue(window));
-  // Below the heads of the columns.
-  EXPECT_GT(drawn.end() - drawn.begin() - 320 * 30 - std::count(drawn.begin() + 320 * 30, drawn.end(), paper),
-            400);
-}
-
-TEST(ListControl, ShowsTheAccountInItsContainer) {
-  Form form;
-  form.LogOn(TheServer().name);
-  ASSERT_TRUE(form.Init(L"*"));
-  form.Show();
-  EXPECT_EQ(GetParent(form.Window()), form.frame);
-  form.container->SetBounds({5, 6, 205, 106});
-  RECT client = {};
-  GetClientRect(form.ListWindow(), &client);
-  EXPECT_LE(client.right, 200);
-  EXPECT_GT(client.right, 150);
-  const auto count = SendMessageW(form.ListWindow(), LVM_GETITEMCOUNT, 0, 0);
-  EXPECT_GT(count, 2);
-
-  EXPECT_EQ(form.Select(L"coffee.jpg"), L"coffee.jpg");
-  form.events.clear();
-  form.Press(VK_DOWN);
-  form.Press(VK_RETURN);
-  const std::wstring base = L"http://" + TheServer().name + L"/users/anna.berg@example-org/";
-  EXPECT_EQ(form.events, (std::vector<std::wstring>{L"1015 " + base + L"deep-field.png", L"1024 "}));
-
-  Bstr gif(L"GIF");
-  form.list->ChangeFileFilter(gif);
-  EXPECT_LT(SendMessageW(form.ListWindow(), LVM_GETITEMCOUNT, 0, 0), count);
-  EXPECT_FALSE(form.Init(L"GIF") && SendMessageW(form.ListWindow(), LVM_GETITEMCOUNT, 0, 0) > 0);
-  EXPECT_TRUE(form.container->IsUiActive());
 }
 
 TEST(ListControl, FollowsItsContainer) {
@@ -167,21 +112,18 @@ TEST(ListControl, FollowsItsContainer) {
 
   // 1 inch is 2540 HIMETRIC and, on this screen, 96 pixels.
   form.container->SetBounds({10, 20, 10 + 96, 20 + 192});
-  ComPtr<IOleObject> object;
-  ComPtr<IViewObject2> view;
-  ASSERT_EQ(form.list->QueryInterface(IID_IOleObject, object.ReceiveVoid()), S_OK);
-  ASSERT_EQ(form.list->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
+  RECT client = {};
+  GetClientRect(form.ListWindow(), &client);
+  EXPECT_TRUE(client.right > 80 && client.right <= 96) << client.right;
+  auto object = As<IOleObject>(*form.list);
   SIZEL extent = {};
   EXPECT_EQ(object->GetExtent(DVASPECT_CONTENT, &extent), S_OK);
   EXPECT_TRUE(extent.cx == 2540 && extent.cy == 5080) << extent.cx << " " << extent.cy;
-  extent = {};
-  EXPECT_EQ(view->GetExtent(DVASPECT_CONTENT, -1, nullptr, &extent), S_OK);
-  EXPECT_TRUE(extent.cx == 2540 && extent.cy == 5080) << extent.cx << " " << extent.cy;
   EXPECT_EQ(object->GetExtent(DVASPECT_ICON, &extent), DV_E_DVASPECT);
+  object = {};
 
   // A frozen control tells nothing until it is thawed as often.
-  ComPtr<IOleControl> control;
-  ASSERT_EQ(form.list->QueryInterface(IID_IOleControl, control.ReceiveVoid()), S_OK);
+  ComPtr<IOleControl> control = As<IOleControl>(*form.list);
   control->FreezeEvents(TRUE);
   control->FreezeEvents(TRUE);
   control->FreezeEvents(FALSE);
@@ -189,98 +131,13 @@ TEST(ListControl, FollowsItsContainer) {
   EXPECT_TRUE(form.events.empty());
   control->FreezeEvents(FALSE);
   form.Press(VK_RETURN);
-  EXPECT_EQ(form.events, std::vector<std::wstring>{L"1024 "});
-}
-
-TEST(ListControl, UploadsDownloadsRenamesAndDeletes) {
-  Form form;
-  form.LogOn(TheServer().name);
-  ASSERT_TRUE(form.Init(L"*"));
-  const std::string bytes(300'000, '\x7F');
-  std::ofstream("control test.jpg", std::ios::binary) << bytes;
-  VARIANT_BOOL done = VARIANT_FALSE;
-  form.list->UploadImage(Bstr(L".\\control test.jpg"), &done);
-  EXPECT_TRUE(done);
-  DeleteFileW(L"control test.jpg");
-
-  ASSERT_EQ(form.Select(L"control test.jpg"), L"control test.jpg");
-  Bstr oldName(L"control test.jpg");
-  Bstr newName(L" renamed test.jpg ");
-  BSTR from = oldName;
-  BSTR to = newName;
-  form.events.clear();
-  form.list->RenameFile(&from, &to, &done);
-  EXPECT_EQ(form.events, std::vector<std::wstring>{L"1031 renamed test.jpg"});
-
-  ASSERT_EQ(form.Select(L"renamed test.jpg"), L"renamed test.jpg");
-  Bstr local;
-  form.list->DownLoadFileFromServer(Bstr(L".\\"), local.Receive());
-  EXPECT_EQ(local.Text(), L".\\renamed test.jpg");
-  EXPECT_EQ(Contents(local.Text()), bytes);
-  DeleteFileW(local);
-
-  form.events.clear();
-  form.list->DeleteFile();
-  EXPECT_NE(std::find(form.events.begin(), form.events.end(), L"1001 "), form.events.end());
-  EXPECT_NE(form.Select(L"renamed test.jpg"), L"renamed test.jpg");
-}
-
-// Two threads with a control each, at the same time: each has a session, a listing and a filter of its own.
-TEST(ListControl, TwoApartmentsWorkAtOnce) {
-  struct Apartment {
-    const wchar_t* filter;
-    const wchar_t* shown;
-    const wchar_t* hidden;
-    int right = 0;
-  } apartments[] = {{L"gif", L"wizard.gif", L"rose.jpg"}, {L"jpg", L"rose.jpg", L"wizard.gif"}};
-  std::vector<std::thread> threads;
-  for (Apartment& apartment : apartments)
-    threads.emplace_back([&apartment] {
-      OleInitialize(nullptr);
-      {
-        ComPtr<_ctrlListImage> list;
-        CoCreateInstance(CLSID_ctrlListImage, nullptr, CLSCTX_INPROC_SERVER, __uuidof(_ctrlListImage),
-                         list.ReceiveVoid());
-        list->putref_mobjFileupload(LoggedOnClient().Get());
-        const auto selects = [&](const wchar_t* name) {
-          Bstr text(name);
-          BSTR given = text;
-          VARIANT ignored = {};
-          list->UploadedFileSetFocus(&given, &ignored);
-          Bstr selected;
-          list->SelectedFileName(selected.Receive());
-          return selected.Text() == name;
-        };
-        for (int i = 0; i < 20; ++i) {
-          Bstr text(apartment.filter);
-          BSTR given = text;
-          VARIANT_BOOL done = VARIANT_FALSE;
-          list->Init(&given, &done);
-          apartment.right += done && selects(apartment.shown) && !selects(apartment.hidden) ? 1 : 0;
-        }
-      }
-      OleUninitialize();
-    });
-  for (std::thread& thread : threads) thread.join();
-  for (const Apartment& apartment : apartments) EXPECT_EQ(apartment.right, 20) << apartment.filter;
+  EXPECT_EQ(form.events, Lines{L"1024 "});
 }
 
 // A host without a container, which lets go of the control in the first event.
-class ReleasingSink final : public IDispatch {
- public:
+struct ReleasingSink final : HostObject {
   IUnknown* object = nullptr;
   ULONG left = 0;
-  ULONG references = 1;
-  STDMETHODIMP QueryInterface(REFIID, void** found) override {
-    *found = this;
-    AddRef();
-    return S_OK;
-  }
-  STDMETHODIMP_(ULONG) AddRef() override { return ++references; }
-  STDMETHODIMP_(ULONG) Release() override { return --references; }
-  STDMETHODIMP GetTypeInfoCount(UINT*) override { return E_NOTIMPL; }
-  STDMETHODIMP GetTypeInfo(UINT, LCID, ITypeInfo**) override { return E_NOTIMPL; }
-  STDMETHODIMP GetIDsOfNames(REFIID, LPOLESTR*, UINT, LCID, DISPID*) override { return E_NOTIMPL; }
   STDMETHODIMP Invoke(DISPID, REFIID, LCID, WORD, DISPPARAMS*, VARIANT*, EXCEPINFO*, UINT*) override {
     if (IUnknown* const last = std::exchange(object, nullptr)) left = last->Release();
     return S_OK;
@@ -288,30 +145,18 @@ class ReleasingSink final : public IDispatch {
 };
 
 TYPED_TEST(AnyControl, MayBeReleasedInAnEventOfItsWait) {
-  CLSID classId = {};
-  ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
-  typename TypeParam::Control control;
-  ASSERT_EQ(CoCreateInstance(classId, nullptr, CLSCTX_INPROC_SERVER, TypeParam::InterfaceId(),
-                             control.ReceiveVoid()),
-            S_OK);
+  auto control = NewControl<typename TypeParam::Members>(TypeParam::ClassId());
   control->putref_mobjFileupload(LoggedOnClient().Get());
-  Bstr text(L"*");
-  BSTR given = text;
-  VARIANT_BOOL done = VARIANT_FALSE;
-  ASSERT_EQ(control->Init(&given, &done), S_OK);
-  Bstr file(L"rose.jpg");
-  given = file;
-  VARIANT ignored = {};
-  EXPECT_EQ(control->UploadedFileSetFocus(&given, &ignored), S_OK);
+  EXPECT_TRUE(Init(*control, L"*"));
+  Select(*control, L"rose.jpg");
   ReleasingSink sink;
-  {
-    ComPtr<IConnectionPointContainer> points;
-    ComPtr<IConnectionPoint> point;
-    ASSERT_EQ(control->QueryInterface(IID_IConnectionPointContainer, points.ReceiveVoid()), S_OK);
-    ASSERT_EQ(points->FindConnectionPoint(TypeParam::EventsId(), point.Receive()), S_OK);
-    DWORD cookie = 0;
-    ASSERT_EQ(point->Advise(&sink, &cookie), S_OK);
-  }
+  ComPtr<IConnectionPoint> point;
+  DWORD cookie = 0;
+  ASSERT_EQ(
+      As<IConnectionPointContainer>(*control)->FindConnectionPoint(TypeParam::EventsId(), point.Receive()),
+      S_OK);
+  ASSERT_EQ(point->Advise(&sink, &cookie), S_OK);
+  point = {};
   auto* const called = control.Detach();
   sink.object = called;
   Bstr local;
@@ -369,10 +214,7 @@ struct OldBag final : IPropertyBag {
 
 TYPED_TEST(AnyControl, TakesTheDefaultForAKeptValueThatItCannotHold) {
   TypeParam form;
-  ComPtr<IPersistPropertyBag> bagged;
-  ComPtr<IPersistStreamInit> streamed;
-  ASSERT_EQ(form.control->QueryInterface(IID_IPersistPropertyBag, bagged.ReceiveVoid()), S_OK);
-  ASSERT_EQ(form.control->QueryInterface(IID_IPersistStreamInit, streamed.ReceiveVoid()), S_OK);
+  const auto bagged = As<IPersistPropertyBag>(*form.control);
   const auto modes = [&] {
     SHORT drop = 0;
     LONG drag = 0;
@@ -390,7 +232,6 @@ TYPED_TEST(AnyControl, TakesTheDefaultForAKeptValueThatItCannotHold) {
     return value;
   };
   SAFEARRAY* const array = SafeArrayCreateVector(VT_I4, 0, 2);
-  const auto nothing = [](VARIANT&) {};
   const struct {
     VARIANT kept;
     Modes modes;
@@ -398,18 +239,13 @@ TYPED_TEST(AnyControl, TakesTheDefaultForAKeptValueThatItCannotHold) {
       {VariantOf(word), {0, 0}},
       {VariantOf(digit), {1, 1}},
       {VariantOf(-32768L), {-32768, -32768}},
-      {VariantOf(32768L), {0, 32768}},
       {VariantOf(-40000L), {0, -40000}},
-      {of(VT_R8, [](VARIANT& value) { V_R8(&value) = 1.5; }), {2, 2}},
       {of(VT_R8, [](VARIANT& value) { V_R8(&value) = 3e9; }), {0, 0}},
       {of(VT_BOOL, [](VARIANT& value) { V_BOOL(&value) = VARIANT_TRUE; }), {-1, -1}},
-      {of(VT_ERROR, [](VARIANT& value) { V_ERROR(&value) = DISP_E_PARAMNOTFOUND; }), {0, 0}},
       {of(VT_ARRAY | VT_I4, [&](VARIANT& value) { V_ARRAY(&value) = array; }), {0, 0}},
       // Without a value of its own.
       {of(VT_DISPATCH, [&](VARIANT& value) { V_DISPATCH(&value) = form.container.Get(); }), {0, 0}},
-      {of(VT_DISPATCH, nothing), {0, 0}},
-      {of(VT_NULL, nothing), {0, 0}},
-      {of(VT_EMPTY, nothing), {0, 0}},
+      {of(VT_NULL, [](VARIANT&) {}), {0, 0}},
   };
   OldBag bag;
   for (const auto& row : rows) {
@@ -419,15 +255,6 @@ TYPED_TEST(AnyControl, TakesTheDefaultForAKeptValueThatItCannotHold) {
     bag.value = row.kept;
     EXPECT_EQ(bagged->Load(&bag, nullptr), S_OK);
     EXPECT_EQ(modes(), row.modes);
-    if (V_VT(&row.kept) != VT_I4) continue;
-    const LONG kept[] = {1, V_I4(&row.kept), V_I4(&row.kept)};
-    ComPtr<IStream> memory;
-    CreateStreamOnHGlobal(nullptr, TRUE, memory.Receive());
-    memory->Write(kept, sizeof kept, nullptr);
-    memory->Seek({}, STREAM_SEEK_SET, nullptr);
-    form.control->put_OLEDropMode(9);
-    EXPECT_EQ(streamed->Load(memory.Get()), S_OK);
-    EXPECT_EQ(modes(), row.modes);
   }
   SafeArrayDestroy(array);
 }
@@ -435,15 +262,12 @@ TYPED_TEST(AnyControl, TakesTheDefaultForAKeptValueThatItCannotHold) {
 // An interface of the control that holds no reference to it.
 template <typename Interface>
 Interface& Uncounted(IUnknown& control) {
-  ComPtr<Interface> found;
-  EXPECT_EQ(control.QueryInterface(__uuidof(Interface), found.ReceiveVoid()), S_OK);
-  return *found;
+  return *As<Interface>(control);
 }
 
 // Whatever the control is in the middle of, the container may let go of it for good in each call that this
 // brings, with all that there is to say or without a word.
 TYPED_TEST(AnyControl, MayBeReleasedInsideACallOfItsContainer) {
-  using Calls = std::vector<std::string>;
   struct Place {
     ControlContainer& container;
     ViewSink& sink;
@@ -451,25 +275,21 @@ TYPED_TEST(AnyControl, MayBeReleasedInsideACallOfItsContainer) {
   };
   const struct {
     void (*enter)(IUnknown& control, const Place& place);
-    Calls calls;
+    std::size_t calls;  // of its container, of different kinds
   } rows[] = {
       {[](IUnknown& control, const Place&) { Uncounted<IOleObject>(control).Close(OLECLOSE_SAVEIFDIRTY); },
-       {"SetActiveObject", "OnUIDeactivate", "OnFocus", "OnDataChange", "OnViewChange", "Release",
-        "OnInPlaceDeactivate", "SaveObject", "OnClose"}},
-      {[](IUnknown& control, const Place&) { Uncounted<IOleObject>(control).SetClientSite(nullptr); },
-       {"SetActiveObject", "OnUIDeactivate", "OnFocus", "OnDataChange", "OnViewChange", "Release",
-        "OnInPlaceDeactivate"}},
+       9},
+      {[](IUnknown& control, const Place&) { Uncounted<IOleObject>(control).SetClientSite(nullptr); }, 7},
       {[](IUnknown& control, const Place&) {
          Uncounted<IOleObject>(control).DoVerb(OLEIVERB_HIDE, nullptr, nullptr, 0, nullptr, nullptr);
        },
-       {"SetActiveObject", "OnUIDeactivate"}},
+       2},
       {[](IUnknown& control, const Place& place) {
          Uncounted<IOleInPlaceObject>(control).InPlaceDeactivate();
          if (place.container.Control())
            Uncounted<IOleObject>(control).DoVerb(OLEIVERB_UIACTIVATE, nullptr, nullptr, 0, nullptr, nullptr);
        },
-       {"SetActiveObject", "OnUIDeactivate", "OnFocus", "OnDataChange", "OnViewChange", "Release",
-        "OnInPlaceDeactivate", "OnInPlaceActivate", "OnUIActivate", "ShowObject"}},
+       10},
       {[](IUnknown& control, const Place& place) {
          QACONTAINER container = {};
          container.cbSize = sizeof container;
@@ -479,20 +299,20 @@ TYPED_TEST(AnyControl, MayBeReleasedInsideACallOfItsContainer) {
          QACONTROL answer = {};
          Uncounted<IQuickActivate>(control).QuickActivate(&container, &answer);
        },
-       {"Ambient", "OnDataChange", "OnViewChange", "Release"}},
+       4},
       {[](IUnknown& control, const Place& place) {
          Uncounted<IViewObject2>(control).SetAdvise(DVASPECT_CONTENT, ADVF_PRIMEFIRST, &place.sink);
        },
-       {"Release", "OnDataChange", "OnViewChange"}},
+       3},
       {[](IUnknown& control, const Place& place) {
          Uncounted<IPersistPropertyBag>(control).Save(&place.bag, TRUE, TRUE);
          if (place.container.Control()) Uncounted<IPersistPropertyBag>(control).Load(&place.bag, nullptr);
        },
-       {"Write", "Read"}},
+       2},
   };
   for (const auto& row : rows) {
     // First it is only seen what calls there are.
-    Calls calls;
+    std::vector<std::string> calls;
     for (std::size_t turn = 0; turn <= 2 * calls.size(); ++turn) {
       const std::string wanted = turn == 0 ? "" : calls[(turn - 1) / 2];
       SCOPED_TRACE(testing::Message() << &row - rows << " " << turn << " " << wanted);
@@ -531,37 +351,36 @@ TYPED_TEST(AnyControl, MayBeReleasedInsideACallOfItsContainer) {
       form.container->onCall = sink.onCall = bag.onCall = dataSink.onCall = [](const char*) {};
       EXPECT_EQ(IsWindow(window), !left);
     }
-    EXPECT_EQ(calls, row.calls);
+    EXPECT_EQ(calls.size(), row.calls) << testing::PrintToString(calls);
   }
 }
 
 // A container that shows a picture of the control only, as a form in design does, or a report.
 TYPED_TEST(AnyControl, DrawsItselfWithoutAWindowOfTheContainer) {
-  CLSID classId = {};
-  ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
-  ComPtr<IViewObject2> view;
-  ASSERT_EQ(CoCreateInstance(classId, nullptr, CLSCTX_INPROC_SERVER, IID_IViewObject2, view.ReceiveVoid()),
-            S_OK);
+  TypeParam form;
+  form.Open(L"*");
+  const auto view = As<IViewObject2>(*form.control);
   constexpr std::uint32_t kBefore = RGB(255, 0, 255);
-  const Pixels drawn = Drawn(100, 80, [&](HDC dc) {
-    const RECT all = {0, 0, 100, 80};
+  const Pixels drawn = Drawn(320, 240, [&](HDC dc) {
+    const RECT all = {0, 0, 320, 240};
     SetDCBrushColor(dc, kBefore);
     FillRect(dc, &all, static_cast<HBRUSH>(GetStockObject(DC_BRUSH)));
-    const RECTL bounds = {10, 10, 90, 70};
+    const RECTL bounds = {10, 10, 310, 230};
     EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
               S_OK);
     EXPECT_EQ(view->Draw(DVASPECT_ICON, -1, nullptr, nullptr, nullptr, dc, &bounds, nullptr, nullptr, 0),
               DV_E_DVASPECT);
   });
-  EXPECT_NE(drawn[60 * 100 + 50], kBefore);
-  EXPECT_EQ(drawn[5 * 100 + 5], kBefore) << "drawn beside its place";
+  // Below the heads of the columns there are names, or pictures.
+  const std::uint32_t paper = drawn[225 * 320 + 300];
+  EXPECT_NE(paper, kBefore);
+  EXPECT_GT(std::count_if(drawn.begin() + 320 * 40, drawn.end(),
+                          [&](std::uint32_t pixel) { return pixel != paper && pixel != kBefore; }),
+            400);
+  EXPECT_EQ(drawn[5 * 320 + 5], kBefore) << "drawn beside its place";
 
   // What changes the look is told.
-  TypeParam form;
-  form.LogOn(TheServer().name);
   ViewSink sink;
-  view = {};
-  ASSERT_EQ(form.control->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
   EXPECT_EQ(view->SetAdvise(DVASPECT_CONTENT, 0, &sink), S_OK);
   ASSERT_TRUE(form.Init(L"*"));
   EXPECT_EQ(std::exchange(sink.changes, 0), 1);
@@ -573,7 +392,6 @@ TYPED_TEST(AnyControl, DrawsItselfWithoutAWindowOfTheContainer) {
   form.control->RenameFile(&given, &given, &done);
   EXPECT_EQ(std::exchange(sink.changes, 0), 1);
   EXPECT_EQ(view->SetAdvise(DVASPECT_CONTENT, 0, nullptr), S_OK);
-  view = {};
 }
 
 TYPED_TEST(AnyControl, IsShownHiddenMovedAndDesigned) {
@@ -592,16 +410,6 @@ TYPED_TEST(AnyControl, IsShownHiddenMovedAndDesigned) {
   EXPECT_FALSE(IsWindowVisible(window));
   EXPECT_EQ(form.container->Do(OLEIVERB_SHOW), S_OK);
   EXPECT_TRUE(IsWindowVisible(form.Window()));
-
-  // The form moves to another window of the host's.
-  const HWND other =
-      CreateWindowExW(0, L"STATIC", L"other", WS_POPUP, 0, 0, 500, 400, nullptr, nullptr, nullptr, nullptr);
-  SetParent(form.frame, other);
-  EXPECT_EQ(GetParent(form.Window()), form.frame);
-  EXPECT_EQ(form.container->Do(OLEIVERB_UIACTIVATE), S_OK);
-  EXPECT_TRUE(form.container->IsUiActive());
-  SetParent(form.frame, nullptr);
-  DestroyWindow(other);
 
   // While it is designed, the form has the mouse and the keyboard.
   TypeParam designed;
@@ -634,17 +442,12 @@ TYPED_TEST(AnyControl, TakesTheContainersAnswerToItsActivation) {
 // Listens to two controls, so that what it answers to depends on the interface that it is asked for.
 class TwoSinks final : public IUnknown {
  public:
-  struct Sink final : IDispatch {
+  struct Sink final : HostObject {
     TwoSinks* owner = nullptr;
     int calls = 0;
     STDMETHODIMP QueryInterface(REFIID id, void** object) override {
       return owner->QueryInterface(id, object);
     }
-    STDMETHODIMP_(ULONG) AddRef() override { return 2; }
-    STDMETHODIMP_(ULONG) Release() override { return 1; }
-    STDMETHODIMP GetTypeInfoCount(UINT*) override { return E_NOTIMPL; }
-    STDMETHODIMP GetTypeInfo(UINT, LCID, ITypeInfo**) override { return E_NOTIMPL; }
-    STDMETHODIMP GetIDsOfNames(REFIID, LPOLESTR*, UINT, LCID, DISPID*) override { return E_NOTIMPL; }
     STDMETHODIMP Invoke(DISPID, REFIID, LCID, WORD, DISPPARAMS*, VARIANT*, EXCEPINFO*, UINT*) override {
       ++calls;
       return S_OK;
@@ -670,8 +473,7 @@ class TwoSinks final : public IUnknown {
 TYPED_TEST(AnyControl, TellsTheInterfaceThatASinkOffers) {
   TypeParam form;
   TwoSinks sink(TypeParam::EventsId());
-  ComPtr<IConnectionPointContainer> points;
-  ASSERT_EQ(form.control->QueryInterface(IID_IConnectionPointContainer, points.ReceiveVoid()), S_OK);
+  ComPtr<IConnectionPointContainer> points = As<IConnectionPointContainer>(*form.control);
   ComPtr<IConnectionPoint> point;
   ASSERT_EQ(points->FindConnectionPoint(TypeParam::EventsId(), point.Receive()), S_OK);
   DWORD cookie = 0;
@@ -691,57 +493,48 @@ TYPED_TEST(AnyControl, TellsTheInterfaceThatASinkOffers) {
       points->FindConnectionPoint(isList ? DIID___ctrlThumbNailView : DIID___ctrlListImage, point.Receive()),
       S_OK);
   // As a host's designer sees them.
-  ComPtr<IProvideClassInfo> provider;
   ComPtr<ITypeInfo> itsClass;
   TYPEATTR* attributes = nullptr;
-  ASSERT_EQ(form.control->QueryInterface(IID_IProvideClassInfo, provider.ReceiveVoid()), S_OK);
-  ASSERT_EQ(provider->GetClassInfo(itsClass.Receive()), S_OK);
+  ASSERT_EQ(As<IProvideClassInfo>(*form.control)->GetClassInfo(itsClass.Receive()), S_OK);
   ASSERT_EQ(itsClass->GetTypeAttr(&attributes), S_OK);
-  EXPECT_EQ(attributes->guid, isList ? CLSID_ctrlListImage : CLSID_ctrlThumbNailView);
+  EXPECT_EQ(attributes->guid, TypeParam::ClassId());
   itsClass->ReleaseTypeAttr(attributes);
 }
 
 // What both controls answer about files, each late bound, with the last argument first.
 TYPED_TEST(AnyControl, AnswersAboutNamesAndFiles) {
   TypeParam form;
-  form.LogOn(TheServer().name);
-  ASSERT_TRUE(form.Init(L"jpg"));
-  const auto call = [&](const wchar_t* member, std::initializer_list<VARIANT> arguments) {
-    return Call(form.control.Get(), member, arguments);
+  form.Open(L"jpg");
+  const auto truth = [&](const wchar_t* member, std::initializer_list<VARIANT> arguments) {
+    const VARIANT answer = Call(form.control.Get(), member, arguments);
+    return V_VT(&answer) == VT_BOOL ? V_BOOL(&answer) : 9;
   };
-  const auto truth = [](const VARIANT& answer) { return V_VT(&answer) == VT_BOOL ? V_BOOL(&answer) : 9; };
   const auto reference = [](VARTYPE type, void* to) {
     VARIANT value = {};
     V_VT(&value) = static_cast<VARTYPE>(VT_BYREF | type);
     V_BYREF(&value) = to;
     return value;
   };
-  for (VARIANT_BOOL enabled : {VARIANT_TRUE, VARIANT_FALSE}) {
-    const VARIANT_BOOL expected = enabled;
-    EXPECT_EQ(truth(call(L"EnableRename", {reference(VT_BOOL, &enabled)})), expected);
-  }
+  VARIANT_BOOL enabled = VARIANT_TRUE;
+  EXPECT_EQ(truth(L"EnableRename", {reference(VT_BOOL, &enabled)}), VARIANT_TRUE);
   const Bstr valid(L"b c.jpg");
-  EXPECT_EQ(truth(call(L"IsFileNameValid", {VariantOf(valid)})), VARIANT_TRUE);
+  EXPECT_EQ(truth(L"IsFileNameValid", {VariantOf(valid)}), VARIANT_TRUE);
   BSTR name = SysAllocString(L"a.gif");
   const Bstr extension(L".jpg");
   BSTR itsExtension = extension;
-  EXPECT_EQ(
-      truth(call(L"CheckFileExtension", {reference(VT_BSTR, &itsExtension), reference(VT_BSTR, &name)})),
-      VARIANT_TRUE);
+  EXPECT_EQ(truth(L"CheckFileExtension", {reference(VT_BSTR, &itsExtension), reference(VT_BSTR, &name)}),
+            VARIANT_TRUE);
   EXPECT_STREQ(name, L"a.jpg");
   SysFreeString(name);
   const Bstr taken(L"COFFEE.jpg");
-  EXPECT_EQ(truth(call(L"CheckIfFileDoesNotExist", {VariantOf(taken)})), VARIANT_FALSE);
-  EXPECT_EQ(truth(call(L"CheckIfFileDoesNotExist", {VariantOf(valid)})), VARIANT_TRUE);
+  EXPECT_EQ(truth(L"CheckIfFileDoesNotExist", {VariantOf(taken)}), VARIANT_FALSE);
+  EXPECT_EQ(truth(L"CheckIfFileDoesNotExist", {VariantOf(valid)}), VARIANT_TRUE);
   ComPtr<IDispatch> files;
   const Bstr coffee(L"coffee.jpg");
-  call(L"GetFileDetails", {reference(VT_DISPATCH, files.Receive()), VariantOf(coffee)});
-  ASSERT_TRUE(files);
-  VARIANT record = Call(files.Get(), L"Item", {VariantOf(LONG{1})});
-  VARIANT found = Call(V_DISPATCH(&record), L"FileName", {});
-  EXPECT_STREQ(V_BSTR(&found), coffee);
-  VariantClear(&found);
-  VariantClear(&record);
+  Call(form.control.Get(), L"GetFileDetails", {reference(VT_DISPATCH, files.Receive()), VariantOf(coffee)});
+  EXPECT_EQ(Told(files.Get(), L"Count"), L"1");
+  Select(*form.control, coffee);
+  EXPECT_EQ(Told(form.control.Get(), L"GetSelectedFilesHttpPath"), Address(L"coffee.jpg"));
 }
 
 // A container's addition to a control, and the control as a part of it.
@@ -777,21 +570,15 @@ class Whole final : public IUnknown {
 };
 
 TYPED_TEST(AnyControl, CanBePartOfAnotherObject) {
-  CLSID classId = {};
-  ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
   ComPtr<IUnknown> refused;
   bool ended = false;
   auto whole = ComPtr<Whole>::Adopt(new Whole(ended));
-  EXPECT_EQ(
-      CoCreateInstance(classId, whole.Get(), CLSCTX_INPROC_SERVER, IID_IDispatch, refused.ReceiveVoid()),
-      CLASS_E_NOAGGREGATION);
-  ASSERT_EQ(whole->Make(classId), S_OK);
-  ComPtr<IDispatch> control;
-  ComPtr<IUnknown> identity;
-  ASSERT_EQ(whole->QueryInterface(IID_IDispatch, control.ReceiveVoid()), S_OK);
-  ASSERT_EQ(control->QueryInterface(IID_IUnknown, identity.ReceiveVoid()), S_OK);
-  EXPECT_EQ(identity.Get(), static_cast<IUnknown*>(whole.Get()));
-  identity = {};
+  EXPECT_EQ(CoCreateInstance(TypeParam::ClassId(), whole.Get(), CLSCTX_INPROC_SERVER, IID_IDispatch,
+                             refused.ReceiveVoid()),
+            CLASS_E_NOAGGREGATION);
+  ASSERT_EQ(whole->Make(TypeParam::ClassId()), S_OK);
+  auto control = As<IDispatch>(*whole);
+  EXPECT_EQ(As<IUnknown>(*control).Get(), static_cast<IUnknown*>(whole.Get()));
 
   TypeParam form;
   const auto container = ComPtr<ControlContainer>::Adopt(new ControlContainer(form.frame));
@@ -815,17 +602,14 @@ TYPED_TEST(AnyControl, CanBePartOfAnotherObject) {
 
 // With what the system offers for documents.
 TYPED_TEST(AnyControl, CanBeKeptInADocument) {
-  CLSID classId = {};
-  ASSERT_EQ(CLSIDFromProgID(TypeParam::kProgId, &classId), S_OK);
   ComPtr<IStorage> storage;
   constexpr DWORD kMode = STGM_CREATE | STGM_READWRITE | STGM_SHARE_EXCLUSIVE | STGM_DELETEONRELEASE;
   ASSERT_EQ(StgCreateDocfile(nullptr, kMode, 0, storage.Receive()), S_OK);
   ComPtr<IPersistStorage> object;
-  ASSERT_EQ(OleCreate(classId, IID_IPersistStorage, OLERENDER_NONE, nullptr, nullptr, storage.Get(),
-                      object.ReceiveVoid()),
+  ASSERT_EQ(OleCreate(TypeParam::ClassId(), IID_IPersistStorage, OLERENDER_NONE, nullptr, nullptr,
+                      storage.Get(), object.ReceiveVoid()),
             S_OK);
-  typename TypeParam::Control control;
-  ASSERT_EQ(object->QueryInterface(TypeParam::InterfaceId(), control.ReceiveVoid()), S_OK);
+  auto control = As<typename TypeParam::Members>(*object);
   control->put_OLEDropMode(2);
   EXPECT_EQ(object->IsDirty(), S_OK);
   EXPECT_EQ(OleSave(object.Get(), storage.Get(), TRUE), S_OK);
@@ -836,16 +620,13 @@ TYPED_TEST(AnyControl, CanBeKeptInADocument) {
 
   ComPtr<IDataObject> data;
   ASSERT_EQ(OleLoad(storage.Get(), IID_IDataObject, nullptr, data.ReceiveVoid()), S_OK);
-  ASSERT_EQ(data->QueryInterface(TypeParam::InterfaceId(), control.ReceiveVoid()), S_OK);
+  control = As<typename TypeParam::Members>(*data);
   short mode = 0;
   control->get_OLEDropMode(&mode);
   EXPECT_EQ(mode, 2);
 
   const ComPtr<_CFileUpload> client = LoggedOnClient();
-  Bstr filter(L"gif");
-  BSTR given = filter;
-  VARIANT_BOOL done = VARIANT_FALSE;
-  ASSERT_EQ(control->Init(&given, &done), S_OK);
+  EXPECT_TRUE(Init(*control, L"gif"));
   // What it looks like, as data.
   ComPtr<IEnumFORMATETC> formats;
   ASSERT_EQ(data->EnumFormatEtc(DATADIR_GET, formats.Receive()), S_OK);
@@ -890,8 +671,7 @@ std::vector<HWND> StopsOf(const ThumbForm& form) {
 
 TYPED_TEST(AnyControl, IsPartOfTheTabOrderOfItsForm) {
   TypeParam form;
-  form.LogOn(TheServer().name);
-  ASSERT_TRUE(form.Init(L"*"));
+  form.Open(L"*");
   const HWND button = CreateWindowExW(0, L"BUTTON", L"other", WS_CHILD | WS_VISIBLE | WS_TABSTOP, 0, 0, 9, 9,
                                       form.frame, nullptr, nullptr, nullptr);
   ShowWindow(form.frame, SW_SHOWNOACTIVATE);
@@ -916,6 +696,76 @@ TYPED_TEST(AnyControl, IsPartOfTheTabOrderOfItsForm) {
   }
 }
 
+HWND EditorOf(const Form& form) {
+  return reinterpret_cast<HWND>(SendMessageW(form.ListWindow(), LVM_GETEDITCONTROL, 0, 0));
+}
+HWND EditorOf(const ThumbForm& form) {
+  return IsWindowVisible(form.Editor()) ? form.Editor() : nullptr;
+}
+
+TYPED_TEST(AnyControl, UploadsRenamesInPlaceAndDeletes) {
+  TypeParam form;
+  form.Show();
+  form.Open(L"jpg");
+  CopyFileW(L"demo\\pictures\\rose.jpg", L"label test.jpg", FALSE);
+  ASSERT_TRUE(form.Upload(L".\\label test.jpg"));
+  DeleteFileW(L"label test.jpg");
+  const struct {
+    const wchar_t* typed;
+    WPARAM key;           // that ends it
+    const wchar_t* code;  // of the event
+    const wchar_t* name;  // afterwards
+  } rows[] = {
+      {L"other.jpg", VK_ESCAPE, L"", L"label test.jpg"},
+      {L"a#b.jpg", VK_RETURN, L"1034", L"label test.jpg"},
+      {L"l\u00E4bel & two.gif", VK_RETURN, L"1031", L"l\u00E4bel & two.jpg"},
+  };
+  // While a name is edited all keys are the editor's.
+  int offers = 0;
+  form.container->onKey = [&](const MSG& message, DWORD) {
+    offers += message.message == WM_KEYDOWN && message.wParam != VK_F2 ? 1 : 0;
+    return false;
+  };
+  form.Press(VK_F2);
+  EXPECT_EQ(EditorOf(form), nullptr) << "it is not allowed";
+  form.control->put_bRenameEnabled(VARIANT_TRUE);
+  for (const auto& row : rows) {
+    SCOPED_TRACE(testing::Message() << row.typed);
+    form.Press(VK_F2);
+    const HWND editor = EditorOf(form);
+    ASSERT_NE(editor, nullptr);
+    // The form may activate the control once more.
+    EXPECT_EQ(form.container->Do(OLEIVERB_UIACTIVATE), S_OK);
+    EXPECT_EQ(GetFocus(), editor);
+    form.events.clear();
+    // All of the name is selected.
+    form.Press(VK_DELETE, editor);
+    EXPECT_EQ(TextOf(editor), L"");
+    for (const wchar_t* letter = row.typed; *letter; ++letter)
+      SendMessageW(editor, WM_CHAR, static_cast<WPARAM>(*letter), 0);
+    form.Press(row.key, editor);
+    form.Pump();
+    EXPECT_EQ(EditorOf(form), nullptr);
+    EXPECT_EQ(form.events.empty() ? L"" : form.events.at(0).substr(0, 4), row.code);
+    EXPECT_EQ(form.Selected(), row.name);
+  }
+  EXPECT_EQ(offers, 0);
+  // The focus leaves the control from the editor, too.
+  form.Press(VK_F2);
+  EXPECT_TRUE(form.container->HasFocus());
+  SetFocus(form.frame);
+  EXPECT_FALSE(form.container->HasFocus());
+  EXPECT_EQ(EditorOf(form), nullptr);
+  // The server has it under the new name.
+  form.Open(L"jpg");
+  EXPECT_EQ(form.Select(rows[2].name), rows[2].name);
+  form.events.clear();
+  form.control->DeleteFile();
+  EXPECT_EQ(std::count(form.events.begin(), form.events.end(), L"1001 "), 1);
+  form.Open(L"jpg");
+  EXPECT_NE(form.Select(rows[2].name), rows[2].name);
+}
+
 int MeasureOf(const Form& form) {
   return static_cast<int>(SendMessageW(form.ListWindow(), LVM_GETCOLUMNWIDTH, 0, 0));
 }
@@ -938,8 +788,7 @@ TYPED_TEST(AnyControl, FollowsTheScreenOfItsWindow) {
   const auto draw = [&](ControlContainer& container) {
     container.SetBounds({0, 0, kSize, kSize});
     EXPECT_EQ(container.Do(OLEIVERB_UIACTIVATE), S_OK);
-    ComPtr<IViewObject2> view;
-    EXPECT_EQ(container.Control()->QueryInterface(IID_IViewObject2, view.ReceiveVoid()), S_OK);
+    const auto view = As<IViewObject2>(*container.Control());
     return Drawn(kSize, kSize, [&](HDC dc) {
       constexpr RECTL kAll = {0, 0, kSize, kSize};
       EXPECT_EQ(view->Draw(DVASPECT_CONTENT, -1, nullptr, nullptr, nullptr, dc, &kAll, nullptr, nullptr, 0),
@@ -957,9 +806,8 @@ TYPED_TEST(AnyControl, FollowsTheScreenOfItsWindow) {
 
   set(kSystemAware);
   TypeParam form;
-  form.LogOn(TheServer().name);
   form.Show();
-  ASSERT_TRUE(form.Init(L"*"));
+  form.Open(L"*");
   const Pixels fine = draw(*form.container);
   EXPECT_FALSE(fine == expected);
   EXPECT_NEAR(MeasureOf(form), MulDiv(measure, dpi, 96), 1);
@@ -996,20 +844,15 @@ TYPED_TEST(AnyControl, LivesInTheSystemsContainers) {
     ShowWindow(window, SW_SHOWNOACTIVATE);
     ComPtr<IUnknown> control;
     ASSERT_EQ(get(window, control.Receive()), S_OK);
-    typename TypeParam::Control members;
-    EXPECT_EQ(control->QueryInterface(TypeParam::InterfaceId(), members.ReceiveVoid()), S_OK);
-    ComPtr<IOleWindow> oleWindow;
+    EXPECT_TRUE(As<typename TypeParam::Members>(*control));
     HWND inner = nullptr;
-    EXPECT_EQ(control->QueryInterface(IID_IOleWindow, oleWindow.ReceiveVoid()), S_OK);
-    EXPECT_EQ(oleWindow->GetWindow(&inner), S_OK);
+    EXPECT_EQ(As<IOleWindow>(*control)->GetWindow(&inner), S_OK);
     EXPECT_TRUE(IsChild(window, inner));
     MoveWindow(window, 0, 0, 200, 150, TRUE);
     RECT place = {};
     GetClientRect(inner, &place);
     EXPECT_EQ(place.right, 200);
     EXPECT_EQ(place.bottom, 150);
-    members = {};
-    oleWindow = {};
     control = {};
     DestroyWindow(window);
     EXPECT_FALSE(IsWindow(inner));

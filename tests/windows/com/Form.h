@@ -83,6 +83,31 @@ inline ComPtr<IDataObject> FilesFromOutside(HWND window, const std::vector<std::
   return data;
 }
 
+// Calls of a control by the slots that it has in either interface.
+template <typename Interface>
+bool Init(Interface& control, const wchar_t* filter) {
+  const Bstr text(filter);
+  BSTR given = text;
+  VARIANT_BOOL done = VARIANT_FALSE;
+  return SUCCEEDED(control.Init(&given, &done)) && done;
+}
+template <typename Interface>
+void Select(Interface& control, const wchar_t* name) {
+  const Bstr text(name);
+  BSTR given = text;
+  VARIANT ignored = {};
+  EXPECT_EQ(control.UploadedFileSetFocus(&given, &ignored), S_OK);
+}
+
+template <typename Interface>
+ComPtr<Interface> NewControl(REFCLSID classId, IUnknown* outer = nullptr) {
+  ComPtr<Interface> control;
+  EXPECT_EQ(
+      CoCreateInstance(classId, outer, CLSCTX_INPROC_SERVER, __uuidof(Interface), control.ReceiveVoid()),
+      S_OK);
+  return control;
+}
+
 // `Interface` is the control's.
 template <typename Interface>
 class ControlForm {
@@ -90,9 +115,8 @@ class ControlForm {
   HWND frame = CreateWindowExW(WS_EX_CONTROLPARENT, L"STATIC", L"form", WS_POPUP, 0, 0, 400, 300, nullptr,
                                nullptr, nullptr, nullptr);
   ComPtr<ControlContainer> container = ComPtr<ControlContainer>::Adopt(new ControlContainer(frame));
-  using Control = ComPtr<Interface>;
-  static const IID& InterfaceId() { return __uuidof(Interface); }
-  Control control;
+  using Members = Interface;
+  ComPtr<Interface> control;
   // FileManagerEvents as "CODE TEXT", and the byte counts of those that tell progress.
   std::vector<std::wstring> events;
   std::vector<int> progress;
@@ -115,7 +139,7 @@ class ControlForm {
       if (onEvent) onEvent(code);
     };
     EXPECT_EQ(container->Create(classId, wayIn, bag), S_OK);
-    EXPECT_EQ(container->Control()->QueryInterface(__uuidof(Interface), control.ReceiveVoid()), S_OK);
+    control = As<Interface>(*container->Control());
   }
   ~ControlForm() {
     control = {};
@@ -137,20 +161,23 @@ class ControlForm {
     client->LogonAs(Bstr(server.product), Bstr(server.user), Bstr(server.password), Bstr(L""), &done);
     ASSERT_TRUE(done);
   }
-  bool Init(const wchar_t* filter) {
-    Bstr text(filter);
-    BSTR given = text;
+  bool Init(const wchar_t* filter) { return test::Init(*control, filter); }
+  void Open(const wchar_t* filter, const std::wstring& serverName = TheServer().name) {
+    LogOn(serverName);
+    EXPECT_TRUE(Init(filter));
+  }
+  bool Upload(const std::wstring& path) {
     VARIANT_BOOL done = VARIANT_FALSE;
-    return SUCCEEDED(control->Init(&given, &done)) && done;
+    control->UploadImage(Bstr(path), &done);
+    return done != VARIANT_FALSE;
   }
   void Show() {
     ShowWindow(frame, SW_SHOWNOACTIVATE);
     EXPECT_EQ(container->Do(OLEIVERB_UIACTIVATE), S_OK);
   }
   HWND Window() const {
-    ComPtr<IOleWindow> window;
     HWND outer = nullptr;
-    if (SUCCEEDED(control->QueryInterface(IID_IOleWindow, window.ReceiveVoid()))) window->GetWindow(&outer);
+    As<IOleWindow>(*control)->GetWindow(&outer);
     return outer;
   }
   // As the message loop of a host handles a message of a window on the form. True when the control or its
@@ -166,10 +193,7 @@ class ControlForm {
     while (PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) Handle(message);
   }
   std::wstring Select(const wchar_t* name) {
-    Bstr text(name);
-    BSTR given = text;
-    VARIANT ignored = {};
-    control->UploadedFileSetFocus(&given, &ignored);
+    test::Select(*control, name);
     return Selected();
   }
   std::wstring Selected() const {
@@ -182,11 +206,12 @@ class ControlForm {
 class Form : public ControlForm<_ctrlListImage> {
  public:
   static constexpr wchar_t kProgId[] = L"Tarnwick.ctrlListImage";
+  static const CLSID& ClassId() { return CLSID_ctrlListImage; }
   static const IID& EventsId() { return __uuidof(__ctrlListImage); }
-  const Control& list = control;
+  const ComPtr<_ctrlListImage>& list = control;
 
   explicit Form(ControlContainer::WayIn wayIn = ControlContainer::WayIn::kSteps, IPropertyBag* bag = nullptr)
-      : ControlForm(CLSID_ctrlListImage, wayIn, bag) {}
+      : ControlForm(ClassId(), wayIn, bag) {}
   HWND ListWindow() const { return FindWindowExW(Window(), nullptr, WC_LISTVIEWW, nullptr); }
   using ControlForm::Press;
   bool Press(WPARAM key) { return Press(key, ListWindow()); }
@@ -223,6 +248,7 @@ inline std::wstring TextOf(HWND window) {
 class ThumbForm : public ControlForm<_ctrlThumbNailView> {
  public:
   static constexpr wchar_t kProgId[] = L"Tarnwick.ctrlThumbNailView";
+  static const CLSID& ClassId() { return CLSID_ctrlThumbNailView; }
   static const IID& EventsId() { return __uuidof(__ctrlThumbNailView); }
   // A little more than the whole page.
   static constexpr int kWidth = 350;
@@ -230,7 +256,7 @@ class ThumbForm : public ControlForm<_ctrlThumbNailView> {
 
   explicit ThumbForm(ControlContainer::WayIn wayIn = ControlContainer::WayIn::kSteps,
                      IPropertyBag* bag = nullptr)
-      : ControlForm(CLSID_ctrlThumbNailView, wayIn, bag) {
+      : ControlForm(ClassId(), wayIn, bag) {
     SetWindowPos(frame, nullptr, 0, 0, 400, 440, SWP_NOZORDER | SWP_NOACTIVATE);
     container->SetBounds({10, 10, 10 + kWidth, 10 + kHeight});
   }

@@ -18,6 +18,20 @@ std::wstring Variable(const wchar_t* name) {
   return value;
 }
 
+// After each test the library holds no object and no window.
+class NothingIsLeft : public testing::EmptyTestEventListener {
+  void OnTestEnd(const testing::TestInfo&) override {
+    if (!LoadedLibrary()) return;
+    // The window of a control that ended inside one of its messages goes with the next one.
+    for (MSG message; PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE);) DispatchMessageW(&message);
+    EXPECT_EQ(Exported<CanUnloadNow>("DllCanUnloadNow")(), S_OK);
+    // A class goes with its last window.
+    WNDCLASSEXW left = {};
+    left.cbSize = sizeof left;
+    for (const wchar_t* name : kWindowClasses) EXPECT_FALSE(GetClassInfoExW(LoadedLibrary(), name, &left));
+  }
+};
+
 }  // namespace
 
 const Server& TheServer() {
@@ -57,10 +71,34 @@ VARIANT Call(IDispatch* object, const wchar_t* member, std::initializer_list<VAR
   return result;
 }
 
+ComPtr<IDispatch> Object(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments) {
+  const VARIANT result = Call(object, member, arguments);
+  return V_VT(&result) == VT_DISPATCH ? ComPtr<IDispatch>::Adopt(V_DISPATCH(&result)) : ComPtr<IDispatch>();
+}
+
+std::wstring Told(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments) {
+  VARIANT result = Call(object, member, arguments);
+  const std::wstring text = TextOf(result);
+  VariantClear(&result);
+  return text;
+}
+
+std::wstring TextOf(const VARIANT& value) {
+  if (V_VT(&value) == VT_ERROR) return L"error";
+  if (V_VT(&value) == VT_DISPATCH) return V_DISPATCH(&value) ? L"object" : L"nothing";
+  if ((V_VT(&value) & VT_ARRAY) != 0) return L"array";
+  VARIANT text = {};
+  if (FAILED(VariantChangeType(&text, const_cast<VARIANT*>(&value), 0, VT_BSTR))) return L"?";
+  std::wstring shown = V_BSTR(&text) ? V_BSTR(&text) : L"";
+  VariantClear(&text);
+  return shown;
+}
+
 }  // namespace tarnwick::test
 
 int main(int count, char** arguments) {
   testing::InitGoogleTest(&count, arguments);
+  testing::UnitTest::GetInstance()->listeners().Append(new tarnwick::test::NothingIsLeft);
   // With OLE, so that controls can take drops.
   OleInitialize(nullptr);
   const int result = RUN_ALL_TESTS();

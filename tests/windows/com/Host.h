@@ -4,6 +4,7 @@
 #include "platform/windows/ComPtr.h"
 #include "surface/TypeLibrary.h"
 
+#include <gtest/gtest.h>
 #include <oleauto.h>
 
 #include <initializer_list>
@@ -57,6 +58,49 @@ inline VARIANT VariantOf(LONG number) {
   return value;
 }
 
+// A further interface of the object.
+template <typename Interface>
+ComPtr<Interface> As(IUnknown& object) {
+  ComPtr<Interface> found;
+  EXPECT_EQ(object.QueryInterface(__uuidof(Interface), found.ReceiveVoid()), S_OK);
+  return found;
+}
+
+// An object of the host's, whose members a test may want to do something.
+struct HostObject : IDispatch {
+  ULONG references = 1;
+  STDMETHODIMP QueryInterface(REFIID id, void** object) override {
+    *object = id == IID_IUnknown || id == IID_IDispatch ? this : nullptr;
+    if (!*object) return E_NOINTERFACE;
+    AddRef();
+    return S_OK;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return ++references; }
+  STDMETHODIMP_(ULONG) Release() override { return --references; }
+  STDMETHODIMP GetTypeInfoCount(UINT*) override { return E_NOTIMPL; }
+  STDMETHODIMP GetTypeInfo(UINT, LCID, ITypeInfo**) override { return E_NOTIMPL; }
+  STDMETHODIMP GetIDsOfNames(REFIID, LPOLESTR*, UINT, LCID, DISPID* ids) override {
+    *ids = 7;
+    return S_OK;
+  }
+  STDMETHODIMP Invoke(DISPID, REFIID, LCID, WORD, DISPPARAMS*, VARIANT*, EXCEPINFO*, UINT*) override = 0;
+};
+
+using GetClassObject = HRESULT(STDAPICALLTYPE*)(REFCLSID, REFIID, void**);
+using CanUnloadNow = HRESULT(STDAPICALLTYPE*)();
+
+// The registered library, when something has loaded it.
+inline HMODULE LoadedLibrary() {
+  return GetModuleHandleW(L"Tarnwick.ocx");
+}
+template <typename Function>
+Function Exported(const char* name) {
+  return reinterpret_cast<Function>(reinterpret_cast<void*>(GetProcAddress(LoadedLibrary(), name)));
+}
+
+// Names of the windows of both controls.
+inline constexpr const wchar_t* kWindowClasses[] = {L"TarnwickListImage", L"TarnwickThumbNailView"};
+
 // A new client; null when the library is not registered.
 inline ComPtr<_CFileUpload> NewClient() {
   ComPtr<_CFileUpload> client;
@@ -68,11 +112,14 @@ inline ComPtr<_CFileUpload> NewClient() {
 // A client that is logged on to the account.
 ComPtr<_CFileUpload> LoggedOnClient();
 
-// Late-bound call of a member, with the last argument first; when it fails, the description of the error, or
-// VT_ERROR.
-VARIANT Call(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments);
-inline VARIANT Get(IDispatch* object, const wchar_t* member, const VARIANT* argument = nullptr) {
-  return argument ? Call(object, member, {*argument}) : Call(object, member, {});
-}
+// Late-bound call of a member, with the last argument first; VT_ERROR when it fails.
+VARIANT Call(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments = {});
+// The same for a member whose result is an object, and as text.
+ComPtr<IDispatch> Object(IDispatch* object, const wchar_t* member,
+                         std::initializer_list<VARIANT> arguments = {});
+std::wstring Told(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments = {});
+
+// "object", "nothing" and "array" for what has no text, "error" for VT_ERROR.
+std::wstring TextOf(const VARIANT& value);
 
 }  // namespace tarnwick::test

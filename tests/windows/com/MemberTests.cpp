@@ -8,8 +8,7 @@
 #include <string>
 #include <vector>
 
-#include "../library/TestLibrary.h"
-#include "Host.h"
+#include "Members.h"
 
 namespace tarnwick::test {
 namespace {
@@ -20,165 +19,66 @@ constexpr wchar_t kText[] = L"127.0.0.1:1";
 // An argument as both ways need it, in the storage of a caller.
 class Argument {
  public:
-  explicit Argument(VARTYPE type, USHORT flags) : type_(type), flags_(flags) {
-    VariantInit(&value_);
-    VariantInit(&variant_);
-    if ((flags & PARAMFLAG_FRETVAL) != 0) return;
-    if (type == VT_BSTR) V_BSTR(&value_) = SysAllocString(kText);
-    if (type == VT_VARIANT) variant_ = VariantOf(SysAllocString(kText));
+  explicit Argument(const Parameter& parameter) : parameter_(parameter) {
+    if (Type() != VT_VARIANT) V_VT(&value_) = Type();
+    if (!IsResult() && (Type() == VT_BSTR || Type() == VT_VARIANT)) value_ = VariantOf(SysAllocString(kText));
   }
-  ~Argument() {
-    if (type_ == VT_BSTR) SysFreeString(V_BSTR(&value_));
-    if (type_ == VT_DISPATCH && V_DISPATCH(&value_)) V_DISPATCH(&value_)->Release();
-    VariantClear(&variant_);
-  }
+  ~Argument() { VariantClear(&value_); }
   Argument(const Argument&) = delete;
   Argument& operator=(const Argument&) = delete;
 
-  void Set(VARIANT given) {
-    if (type_ == VT_VARIANT) {
-      VariantCopy(&variant_, &given);
-    } else if (type_ == VT_BSTR) {
-      SysReAllocString(&V_BSTR(&value_), V_BSTR(&given));
-    } else {
-      value_ = given;
-      if (type_ == VT_DISPATCH) V_DISPATCH(&value_)->AddRef();
-    }
+  // What the text means as a value of the argument's type.
+  void Set(const wchar_t* text) {
+    const Bstr owned(text);
+    VARIANT source = VariantOf(owned);
+    EXPECT_EQ(VariantChangeType(&value_, &source, 0, Type() == VT_VARIANT ? VARTYPE{VT_BSTR} : Type()), S_OK);
   }
-  bool IsResult() const { return (flags_ & PARAMFLAG_FRETVAL) != 0; }
-  bool IsReference() const { return (flags_ & PARAMFLAG_FOUT) != 0; }
-  bool IsOptional() const { return (flags_ & PARAMFLAG_FOPT) != 0; }
-  VARTYPE Type() const { return type_; }
+  void Set(IDispatch* object) { V_DISPATCH(&value_) = ComPtr<IDispatch>(object).Detach(); }
+  bool IsResult() const { return parameter_.Is(PARAMFLAG_FRETVAL); }
+  bool IsReference() const { return parameter_.Is(PARAMFLAG_FOUT); }
+  bool IsOptional() const { return parameter_.Is(PARAMFLAG_FOPT); }
+  VARTYPE Type() const { return parameter_.type; }
 
   // For a call by the slot.
-  VARTYPE SlotType() const { return IsReference() ? VT_PTR_SIZED : type_; }
+  VARTYPE SlotType() const { return IsReference() ? kPointer : Type(); }
   VARIANT* SlotValue() {
-    if (!IsReference()) return type_ == VT_VARIANT ? &variant_ : &value_;
-    slot_ = value_;
     V_BYREF(&slot_) = Storage();
-    return &slot_;
+    return IsReference() ? &slot_ : &value_;
   }
   // For a call by name. The argument stays the owner.
   VARIANT NameValue() {
+    if (!IsReference()) return value_;
     VARIANT given;
-    if (!IsReference()) {
-      given = type_ == VT_VARIANT ? variant_ : value_;
-      if (type_ != VT_VARIANT) V_VT(&given) = type_;
-      return given;
-    }
-    V_VT(&given) = static_cast<VARTYPE>(VT_BYREF | type_);
+    V_VT(&given) = static_cast<VARTYPE>(VT_BYREF | Type());
     V_BYREF(&given) = Storage();
     return given;
   }
-  // What is in the storage of a result, as text.
-  std::wstring Shown() {
-    if (type_ == VT_DISPATCH) return V_DISPATCH(&value_) ? L"object" : L"nothing";
-    VARIANT held = type_ == VT_VARIANT ? variant_ : value_;
-    if (type_ != VT_VARIANT) V_VT(&held) = type_;
-    return TextOf(held);
-  }
-  static std::wstring TextOf(const VARIANT& held) {
-    if (V_VT(&held) == VT_DISPATCH) return V_DISPATCH(&held) ? L"object" : L"nothing";
-    if ((V_VT(&held) & VT_ARRAY) != 0) return L"array";
-    VARIANT text;
-    VariantInit(&text);
-    VARIANT source = held;
-    if (FAILED(VariantChangeType(&text, &source, 0, VT_BSTR))) return L"?";
-    std::wstring shown = V_BSTR(&text) ? V_BSTR(&text) : L"";
-    VariantClear(&text);
-    return shown;
-  }
+  // What is in the storage of a result.
+  std::wstring Shown() const { return TextOf(value_); }
 
  private:
-#ifdef _WIN64
-  static constexpr VARTYPE VT_PTR_SIZED = VT_I8;
-#else
-  static constexpr VARTYPE VT_PTR_SIZED = VT_I4;
-#endif
-  void* Storage() {
-    return type_ == VT_VARIANT ? static_cast<void*>(&variant_) : &V_NONE(&value_);
-  }
+  static constexpr VARTYPE kPointer = sizeof(void*) == 8 ? VT_I8 : VT_I4;
+  void* Storage() { return Type() == VT_VARIANT ? static_cast<void*>(&value_) : &V_NONE(&value_); }
 
-  VARTYPE type_;
-  USHORT flags_;
-  VARIANT value_;
-  VARIANT variant_;
-  VARIANT slot_;
+  const Parameter& parameter_;
+  VARIANT value_ = {};
+  VARIANT slot_ = {};
 };
-
-struct Member {
-  std::wstring name;
-  DISPID id = 0;
-  INVOKEKIND kind = INVOKE_FUNC;
-  short offset = 0;  // of its slot
-  std::vector<std::pair<VARTYPE, USHORT>> parameters;
-  std::vector<std::wstring> parameterNames;
-};
-
-// Interfaces are objects, enumerations are numbers.
-VARTYPE TypeOf(ITypeInfo& type, const TYPEDESC& described) {
-  if (described.vt == VT_PTR) return VT_DISPATCH;
-  if (described.vt != VT_USERDEFINED) return described.vt;
-  ComPtr<ITypeInfo> other;
-  TYPEATTR* attributes = nullptr;
-  type.GetRefTypeInfo(described.hreftype, other.Receive());
-  other->GetTypeAttr(&attributes);
-  const TYPEKIND kind = attributes->typekind;
-  other->ReleaseTypeAttr(attributes);
-  return kind == TKIND_ENUM || kind == TKIND_ALIAS ? VARTYPE{VT_I4} : VARTYPE{VT_DISPATCH};
-}
-
-std::vector<Member> MembersOf(IDispatch& object) {
-  ComPtr<ITypeInfo> shown;
-  ComPtr<ITypeInfo> slots;
-  HREFTYPE handle = 0;
-  EXPECT_EQ(object.GetTypeInfo(0, 0, shown.Receive()), S_OK);
-  EXPECT_EQ(shown->GetRefTypeOfImplType(static_cast<UINT>(-1), &handle), S_OK);
-  EXPECT_EQ(shown->GetRefTypeInfo(handle, slots.Receive()), S_OK);
-  TYPEATTR* attributes = nullptr;
-  slots->GetTypeAttr(&attributes);
-  const int count = attributes->cFuncs;
-  slots->ReleaseTypeAttr(attributes);
-  std::vector<Member> members;
-  for (int i = 0; i < count; ++i) {
-    FUNCDESC* function = nullptr;
-    slots->GetFuncDesc(static_cast<UINT>(i), &function);
-    BSTR names[10] = {};
-    UINT nameCount = 0;
-    slots->GetNames(function->memid, names, 10, &nameCount);
-    Member member;
-    member.name = names[0];
-    member.id = function->memid;
-    member.kind = function->invkind;
-    member.offset = function->oVft;
-    for (int k = 0; k < function->cParams; ++k) {
-      const ELEMDESC& parameter = function->lprgelemdescParam[k];
-      const USHORT flags = parameter.paramdesc.wParamFlags;
-      const bool reference = (flags & PARAMFLAG_FOUT) != 0;
-      member.parameters.emplace_back(TypeOf(*slots, reference ? *parameter.tdesc.lptdesc : parameter.tdesc),
-                                     flags);
-      if (static_cast<UINT>(k) + 1 < nameCount) member.parameterNames.emplace_back(names[k + 1]);
-    }
-    for (const BSTR name : names) SysFreeString(name);
-    slots->ReleaseFuncDesc(function);
-    members.push_back(std::move(member));
-  }
-  return members;
-}
 
 // One call of a member with arguments of its own.
 class MemberCall {
  public:
   MemberCall(IDispatch& object, const Member& member) : object_(object), member_(member) {
-    for (const auto& [type, flags] : member.parameters)
-      arguments_.push_back(std::make_unique<Argument>(type, flags));
+    for (const Parameter& parameter : member.parameters)
+      arguments_.push_back(std::make_unique<Argument>(parameter));
     given_ = arguments_.size() - (HasResult() ? 1 : 0);
   }
 
   bool HasResult() const { return !arguments_.empty() && arguments_.back()->IsResult(); }
   std::size_t Given() const { return given_; }
   const Argument& At(std::size_t index) const { return *arguments_[index]; }
-  MemberCall& Giving(const VARIANT& value) {
+  template <typename Value>
+  MemberCall& Giving(Value value) {
     arguments_[0]->Set(value);
     return *this;
   }
@@ -208,15 +108,14 @@ class MemberCall {
     for (std::size_t i = given_; i-- > 0;) values.push_back(arguments_[i]->NameValue());
     if (change) change(values);
     DISPID named = DISPID_PROPERTYPUT;
-    const bool put = (member_.kind & (INVOKE_PROPERTYPUT | INVOKE_PROPERTYPUTREF)) != 0;
-    return Invoke(values, put ? &named : nullptr, put ? 1 : 0);
+    return Invoke(values, member_.IsPut() ? &named : nullptr, member_.IsPut() ? 1 : 0);
   }
 
   // Each argument with its name, the first one first.
   HRESULT ByNamesOfArguments() {
     std::vector<LPOLESTR> names = {const_cast<LPOLESTR>(member_.name.c_str())};
-    for (const std::wstring& name : member_.parameterNames)
-      names.push_back(const_cast<LPOLESTR>(name.c_str()));
+    for (const Parameter& parameter : member_.parameters)
+      names.push_back(const_cast<LPOLESTR>(parameter.name.c_str()));
     names.resize(given_ + 1);
     std::vector<DISPID> ids(names.size());
     EXPECT_EQ(object_.GetIDsOfNames(IID_NULL, names.data(), static_cast<UINT>(names.size()), 0, ids.data()),
@@ -245,7 +144,7 @@ class MemberCall {
     SysFreeString(exception.bstrSource);
     SysFreeString(exception.bstrDescription);
     SysFreeString(exception.bstrHelpFile);
-    shown_ = SUCCEEDED(called) && HasResult() ? Argument::TextOf(result) : L"";
+    shown_ = SUCCEEDED(called) && HasResult() ? TextOf(result) : L"";
     VariantClear(&result);
     return called == DISP_E_EXCEPTION ? exception.scode : called;
   }
@@ -264,27 +163,24 @@ ComPtr<IDispatch> NewObject(REFCLSID classId) {
   return object;
 }
 
-ComPtr<IDispatch> NewRecord() {
-  const ComPtr<_CFileUpload> client = NewClient();
-  ComPtr<_CUpload> record;
-  if (client) client->get_UploadObject(record.Receive());
-  return ComPtr<IDispatch>(record.Get());
-}
-
 struct Subject {
   const char* name;
-  ComPtr<IDispatch> (*make)(const TestLibrary& library);
+  ComPtr<IDispatch> (*make)();
 };
 
 class Members : public testing::TestWithParam<Subject> {
  protected:
-  TestLibrary library_;
-  ComPtr<IDispatch> object_ = GetParam().make(library_);
+  std::vector<Member> Everything() const {
+    ComPtr<ITypeInfo> type;
+    EXPECT_EQ(object_->GetTypeInfo(0, 0, type.Receive()), S_OK);
+    return MembersOf(*type);
+  }
+
+  ComPtr<IDispatch> object_ = GetParam().make();
 };
 
 TEST_P(Members, DoTheSameBySlotByNameAndWithNamedArguments) {
-  ASSERT_TRUE(object_);
-  for (const Member& member : MembersOf(*object_)) {
+  for (const Member& member : Everything()) {
     SCOPED_TRACE(std::string(member.name.begin(), member.name.end()));
     MemberCall slot(*object_, member);
     const HRESULT answer = slot.BySlot();
@@ -302,60 +198,41 @@ TEST_P(Members, DoTheSameBySlotByNameAndWithNamedArguments) {
 
 // Written on one way, a property is read on the other. A truth is left as false: one ends the next transfer.
 TEST_P(Members, KeepWhatTheyAreGivenOnBothWays) {
-  ASSERT_TRUE(object_);
-  const Bstr text(L"one \u00FC");
-  const Bstr empty;
-  const auto of = [](VARTYPE type, auto set) {
-    VARIANT value = {};
-    V_VT(&value) = type;
-    set(value);
-    return value;
+  const std::map<VARTYPE, std::pair<const wchar_t*, const wchar_t*>> pairs = {
+      {VT_BSTR, {L"one \u00FC", L""}},  {VT_I2, {L"-5", L"300"}},        {VT_I4, {L"70000", L"-1"}},
+      {VT_R8, {L"2.5", L"3000000000"}}, {VT_VARIANT, {L"\u00FC", L"2"}}, {VT_BOOL, {L"-1", L"0"}},
   };
-  const auto number = [&](short value) { return of(VT_I2, [=](VARIANT& held) { V_I2(&held) = value; }); };
-  const auto real = [&](double value) { return of(VT_R8, [=](VARIANT& held) { V_R8(&held) = value; }); };
-  const auto truth = [&](VARIANT_BOOL value) {
-    return of(VT_BOOL, [=](VARIANT& held) { V_BOOL(&held) = value; });
-  };
-  const std::map<VARTYPE, std::pair<VARIANT, VARIANT>> pairs = {
-      {VT_BSTR, {VariantOf(text), VariantOf(empty)}}, {VT_I2, {number(-5), number(300)}},
-      {VT_I4, {VariantOf(70'000L), VariantOf(-1L)}},  {VT_R8, {real(2.5), real(3e9)}},
-      {VT_VARIANT, {VariantOf(text), real(12.5)}},    {VT_BOOL, {truth(VARIANT_TRUE), truth(VARIANT_FALSE)}},
-  };
-  const ComPtr<IDispatch> owners[] = {GetParam().make(library_), GetParam().make(library_)};
+  const ComPtr<IDispatch> owners[] = {GetParam().make(), GetParam().make()};
   std::map<DISPID, Member> readers;
-  for (const Member& member : MembersOf(*object_)) {
+  for (const Member& member : Everything()) {
     if (member.kind == INVOKE_PROPERTYGET) readers[member.id] = member;
-    if ((member.kind & (INVOKE_PROPERTYPUT | INVOKE_PROPERTYPUTREF)) == 0) continue;
+    if (!member.IsPut()) continue;
     SCOPED_TRACE(std::string(member.name.begin(), member.name.end()));
-    const VARTYPE type = member.parameters[0].first;
-    if (type == VT_DISPATCH) {
+    if (member.parameters[0].type == VT_DISPATCH) {
       for (const ComPtr<IDispatch>& owner : owners) {
-        VARIANT given = Get(owner.Get(), member.name.c_str());
-        ASSERT_EQ(V_VT(&given), VT_DISPATCH);
+        const ComPtr<IDispatch> given = Object(owner.Get(), member.name.c_str());
+        ASSERT_TRUE(given);
         MemberCall put(*object_, member);
-        EXPECT_EQ(&owner == owners ? put.Giving(given).BySlot() : put.Giving(given).ByName(), S_OK);
-        VARIANT read = Get(object_.Get(), member.name.c_str());
-        EXPECT_EQ(V_DISPATCH(&read), V_DISPATCH(&given));
-        VariantClear(&read);
-        VariantClear(&given);
+        put.Giving(given.Get());
+        EXPECT_EQ(&owner == owners ? put.BySlot() : put.ByName(), S_OK);
+        EXPECT_EQ(Object(object_.Get(), member.name.c_str()).Get(), given.Get());
       }
       continue;
     }
-    const auto& [first, second] = pairs.at(type);
+    const auto& [first, second] = pairs.at(member.parameters[0].type);
     MemberCall read(*object_, readers.at(member.id));
     EXPECT_EQ(MemberCall(*object_, member).Giving(first).BySlot(), S_OK);
     EXPECT_EQ(read.ByName(), S_OK);
-    EXPECT_EQ(read.Shown(), Argument::TextOf(first));
+    EXPECT_EQ(read.Shown(), first);
     EXPECT_EQ(MemberCall(*object_, member).Giving(second).ByName(), S_OK);
     EXPECT_EQ(read.BySlot(), S_OK);
-    EXPECT_EQ(read.Shown(), Argument::TextOf(second));
+    EXPECT_EQ(read.Shown(), second);
   }
 }
 
 // A null pointer for a result is refused; one for a parameter is refused or stands for nothing.
 TEST_P(Members, TakeNullPointersWithoutHarm) {
-  ASSERT_TRUE(object_);
-  for (const Member& member : MembersOf(*object_)) {
+  for (const Member& member : Everything()) {
     SCOPED_TRACE(std::string(member.name.begin(), member.name.end()));
     const HRESULT usual = MemberCall(*object_, member).BySlot();
     for (std::size_t i = 0; i < member.parameters.size(); ++i) {
@@ -378,12 +255,11 @@ TEST_P(Members, TakeNullPointersWithoutHarm) {
 }
 
 TEST_P(Members, RefuseArgumentsOfOtherTypesAndNumbers) {
-  ASSERT_TRUE(object_);
   SAFEARRAY* const array = SafeArrayCreateVector(VT_I4, 0, 1);
   VARIANT wrong;
   V_VT(&wrong) = VT_ARRAY | VT_I4;
   V_ARRAY(&wrong) = array;
-  for (const Member& member : MembersOf(*object_)) {
+  for (const Member& member : Everything()) {
     SCOPED_TRACE(std::string(member.name.begin(), member.name.end()));
     MemberCall call(*object_, member);
     for (std::size_t i = 0; i < call.Given(); ++i) {
@@ -415,18 +291,11 @@ TEST_P(Members, RefuseArgumentsOfOtherTypesAndNumbers) {
 
 INSTANTIATE_TEST_SUITE_P(
     Of, Members,
-    testing::Values(
-        Subject{"CFileUpload", [](const TestLibrary&) { return NewObject(CLSID_CFileUpload); }},
-        Subject{"CUpload", [](const TestLibrary&) { return NewRecord(); }},
-        Subject{"CBVAccount", [](const TestLibrary&) { return NewObject(CLSID_CBVAccount); }},
-        Subject{"CRegistry",
-                [](const TestLibrary& library) {
-                  ComPtr<IDispatch> registry;
-                  library.Get<MakeRegistry>("MakeRegistry")(registry.Receive());
-                  return registry;
-                }},
-        Subject{"ctrlListImage", [](const TestLibrary&) { return NewObject(CLSID_ctrlListImage); }},
-        Subject{"ctrlThumbNailView", [](const TestLibrary&) { return NewObject(CLSID_ctrlThumbNailView); }}),
+    testing::Values(Subject{"CFileUpload", [] { return NewObject(CLSID_CFileUpload); }},
+                    Subject{"CUpload", [] { return Object(NewClient().Get(), L"UploadObject"); }},
+                    Subject{"CBVAccount", [] { return NewObject(CLSID_CBVAccount); }},
+                    Subject{"ctrlListImage", [] { return NewObject(CLSID_ctrlListImage); }},
+                    Subject{"ctrlThumbNailView", [] { return NewObject(CLSID_ctrlThumbNailView); }}),
     [](const testing::TestParamInfo<Subject>& subject) { return subject.param.name; });
 
 }  // namespace

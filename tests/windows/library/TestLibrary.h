@@ -16,8 +16,6 @@ struct Held {
   bool operator==(const Held&) const = default;
 };
 
-// MakeRegistry: a CRegistry, which the library makes for no host.
-using MakeRegistry = HRESULT(STDMETHODCALLTYPE*)(IDispatch** registry);
 // CountHeld
 using CountHeld = void(STDMETHODCALLTYPE*)(Held* held);
 
