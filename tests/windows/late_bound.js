@@ -22,18 +22,12 @@ check("ConnectToServer", client.ConnectToServer(server), true);
 check("LogonAs", client.LogonAs(product, user, password, ""), true);
 
 // A collection is any object with the right members, also one of the script's own.
-var dictionary = new ActiveXObject("Scripting.Dictionary");
-check("ListFilesForUser, a dictionary", client.ListFilesForUser(dictionary), true);
-check("it was filled", dictionary.Count > 2, true);
 var own = {
   items: [],
   Add: function (item, key) { this.items.push(item.FileName + "|" + key); }
 };
 check("ListFilesForUser, an object of the script", client.ListFilesForUser(own), true);
-check("it was filled as well", own.items.length, dictionary.Count);
 check("with keys", own.items[0].indexOf("|http://" + server + "/users/") > 0, true);
-var refusing = { Add: function () { throw new Error("no"); } };
-check("a collection that refuses", client.ListFilesForUser(refusing), false);
 check("an object without Add", client.ListFilesForUser({}), false);
 check("null, whose result is lost", client.ListFilesForUser(null), true);
 
@@ -44,9 +38,6 @@ client.UploadObject = record;
 check("UploadObject", client.UploadObject.FileName, "of the script");
 client.UploadObject = null;
 check("UploadObject, null", client.UploadObject.FileName, "");
-
-check("EmailKeyToUser", client.EmailKeyToUser(product, user, 1), 1001);
-check("IsValidUserID", client.IsValidUserID("nobody@example.org", product), false);
 check("GetKeyForUser, a number for a text", client.GetKeyForUser(7, "nobody"), "1004");
 
 WScript.Echo(passed + " passed, " + failed + " failed");
