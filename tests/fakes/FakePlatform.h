@@ -218,7 +218,6 @@ struct FakeInternet : Internet {
   bool opens = true;
   bool connects = true;
   bool changesDirectory = true;
-  bool fetches = true;
   bool takesCommands = true;
   std::optional<Text> directory = u"/";
 
@@ -235,7 +234,7 @@ struct FakeInternet : Internet {
     }
     bool GetFile(TextView server, TextView local) override {
       owner.calls.push_back(u"get " + Text(server) + u" " + Text(local));
-      return owner.fetches;
+      return true;
     }
     bool Command(TextView command) override {
       owner.calls.emplace_back(command);

@@ -64,8 +64,6 @@ struct FakeDownloader : Downloader {
   Text target;
   // What happens while a wait sleeps, one entry a wait. A wait without one would never end.
   std::deque<std::function<void(FakeDownloader&)>> waits;
-  // An entry: the watchdog runs out.
-  static void Silence(FakeDownloader& from) { from.events->Failed(58, u"timeout", false); }
 
   void Wait() override {
     if (waits.empty() || !events) {
