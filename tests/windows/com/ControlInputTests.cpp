@@ -59,15 +59,15 @@ TEST(ListControl, TakesFilesThatAreDroppedOnIt) {
   form.onOther = [&](DISPID event, Arguments& arguments) {
     const Dragged dragged(arguments[0]);
     told += std::to_wstring(event) +
-            (event == kOLEDragOver ? std::to_wstring(*V_I2REF(&arguments[6])) : L"") + L" ";
+            (event == DISPID_OLEDragOver ? std::to_wstring(*V_I2REF(&arguments[6])) : L"") + L" ";
     LONG& effect = *V_I4REF(&arguments[1]);
-    if (event == kOLEDragOver && *V_I2REF(&arguments[6]) == 1) return;
+    if (event == DISPID_OLEDragOver && *V_I2REF(&arguments[6]) == 1) return;
     EXPECT_EQ(effect, DROPEFFECT_COPY);
     EXPECT_EQ(*V_I2REF(&arguments[2]), 1);
     EXPECT_EQ(*V_I2REF(&arguments[3]), 2);
     EXPECT_EQ(*V_R4REF(&arguments[4]), 30.0F);
     EXPECT_EQ(*V_R4REF(&arguments[5]), 40.0F);
-    if (event == kOLEDragDrop && empties) {
+    if (event == DISPID_OLEDragDrop && empties) {
       dragged.Clear();
       EXPECT_FALSE(dragged.Has(kFiles));
       EXPECT_TRUE(dragged.Files().empty());
@@ -75,7 +75,7 @@ TEST(ListControl, TakesFilesThatAreDroppedOnIt) {
     }
     EXPECT_EQ(dragged.Files(), files);
     EXPECT_TRUE(dragged.Has(kFiles));
-    if (event == kOLEDragDrop) {
+    if (event == DISPID_OLEDragDrop) {
       // What was set while the drag was over the list.
       EXPECT_EQ(dragged.Text(), L"a note");
       return;
@@ -192,7 +192,7 @@ TEST(ListControl, DragsItsOwnFile) {
     bool isOver = false;
     form.onOther = [&](DISPID event, Arguments& arguments) {
       switch (event) {
-        case kOLEStartDrag: {
+        case DISPID_OLEStartDrag: {
           told += L"start ";
           const Dragged dragged(arguments[0]);
           EXPECT_EQ(dragged.Text(), address);
@@ -205,16 +205,16 @@ TEST(ListControl, DragsItsOwnFile) {
           *V_I4REF(&arguments[1]) = line.allowed;
           break;
         }
-        case kOLEGiveFeedback:
+        case DISPID_OLEGiveFeedback:
           EXPECT_EQ(*V_I4REF(&arguments[0]), line.allowed);
           EXPECT_EQ(*V_BOOLREF(&arguments[1]), VARIANT_TRUE);
           break;
-        case kOLESetData:
+        case DISPID_OLESetData:
           told += L"set ";
           EXPECT_EQ(*V_I2REF(&arguments[1]), kText);
           Dragged(arguments[0]).SetText(L"kept");
           break;
-        case kOLEDragOver:
+        case DISPID_OLEDragOver:
           if (!line.promises) {
             EXPECT_EQ(Dragged(arguments[0]).Text(), address);
           }
@@ -222,13 +222,13 @@ TEST(ListControl, DragsItsOwnFile) {
           told += L"over ";
           Mouse(MOUSEEVENTF_LEFTUP);
           break;
-        case kOLEDragDrop:
+        case DISPID_OLEDragDrop:
           if (line.promises) {
             EXPECT_EQ(Dragged(arguments[0]).Text(), L"kept");
           }
           told += L"drop ";
           break;
-        case kOLECompleteDrag:
+        case DISPID_OLECompleteDrag:
           told += L"complete:" + std::to_wstring(*V_I4REF(&arguments[0])) + L" ";
           break;
         default:

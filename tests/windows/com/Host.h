@@ -112,7 +112,8 @@ inline ComPtr<_CFileUpload> NewClient() {
 // A client that is logged on to the account.
 ComPtr<_CFileUpload> LoggedOnClient();
 
-// Late-bound call of a member, with the last argument first; VT_ERROR when it fails.
+// Late-bound call of a member, with the last argument first; when it fails, the description of the error, or
+// VT_ERROR.
 VARIANT Call(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments = {});
 // The same for a member whose result is an object, and as text.
 ComPtr<IDispatch> Object(IDispatch* object, const wchar_t* member,
