@@ -38,8 +38,7 @@ class EventSink final : public IDispatch {
   STDMETHODIMP GetIDsOfNames(REFIID, LPOLESTR*, UINT, LCID, DISPID*) override { return E_NOTIMPL; }
   STDMETHODIMP Invoke(DISPID event, REFIID, LCID, WORD, DISPPARAMS* arguments, VARIANT*, EXCEPINFO*,
                       UINT*) override {
-    constexpr DISPID kFileManagerEvent = 1;
-    if (event != kFileManagerEvent || arguments->cArgs != 2) return S_OK;
+    if (event != DISPID_FileManagerEvent || arguments->cArgs != 2) return S_OK;
     // Arguments come last first: the description, then the code.
     const BSTR description = *V_BSTRREF(&arguments->rgvarg[0]);
     std::wprintf(L"event %d %ls\n", V_I2(V_VARIANTREF(&arguments->rgvarg[1])),

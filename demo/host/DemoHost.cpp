@@ -299,8 +299,8 @@ int DemoHost::Progress() const {
 }
 
 void DemoHost::OnEvent(DISPID event, const std::vector<VARIANT>& arguments) {
-  if (event != 1) {
-    if (event == 8) Log(L"StateChanged " + std::to_wstring(*V_I4REF(&arguments[0])));
+  if (event != DISPID_FileManagerEvent) {
+    if (event == DISPID_StateChanged) Log(L"StateChanged " + std::to_wstring(*V_I4REF(&arguments[0])));
     return;
   }
   const int code = V_I2(V_VARIANTREF(&arguments[0]));

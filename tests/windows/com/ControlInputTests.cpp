@@ -15,7 +15,7 @@ class Dragged {
   explicit Dragged(const VARIANT& argument) : object_(*V_DISPATCHREF(&argument)) {}
 
   bool Has(LONG format) const { return Told(object_, L"GetFormat", {VariantOf(format)}) == L"-1"; }
-  // "error" when the data refuses to give it.
+  // Or why the data refuses to give it.
   std::wstring Text() const { return Told(object_, L"GetData", {VariantOf(kText)}); }
   void SetText(const wchar_t* text) const {
     const Bstr owned(text);
@@ -81,7 +81,7 @@ TEST(ListControl, TakesFilesThatAreDroppedOnIt) {
       return;
     }
     EXPECT_EQ(dragged.Has(kText), *V_I2REF(&arguments[6]) == 2);
-    EXPECT_EQ(dragged.Text(), dragged.Has(kText) ? L"a note" : L"error");
+    EXPECT_EQ(dragged.Text(), dragged.Has(kText) ? L"a note" : L"The data has no such format");
     dragged.SetText(L"a note");
     // The host decides what a drop here would do.
     if (*V_I2REF(&arguments[6]) == 2) effect = DROPEFFECT_NONE;
