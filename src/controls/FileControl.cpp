@@ -100,7 +100,7 @@ void FileControl::Fail(std::int32_t ftpError, TextView description) {
   if (operation_) operation_->Fail(ftpError, description);
 }
 
-bool FileControl::MayTransfer() {
+bool FileControl::CheckTransferAllowed() {
   if (transferRuns_) {
     Fail(ftp_error::kTransferInProgress, u"A transfer is in progress.");
   } else if (closed_) {
@@ -114,7 +114,7 @@ std::shared_ptr<CFileUpload> FileControl::Client() {
   return mobjFileupload;
 }
 
-bool FileControl::MayChangeShown() {
+bool FileControl::CheckShownChangeable() {
   if (ShowsOtherAccount()) Fail(ftp_error::kNotLoggedOn, u"The files are those of another user.");
   return !ShowsOtherAccount();
 }
@@ -175,7 +175,7 @@ void FileControl::GetFileDetails(TextView FileName,
 bool FileControl::UploadImage(TextView szLocalPath) {
   return ResultAsItStood(false, [&](bool& uploaded) {
     Operation operation(*this);
-    if (!MayTransfer()) return;
+    if (!CheckTransferAllowed()) return;
     const Text path(szLocalPath);
     const Hourglass pointer(*this);
     const std::shared_ptr<CFileUpload> client = Client();
@@ -457,7 +457,7 @@ bool FileControl::IsFileNameValid(TextView szFileName) {
   });
 }
 
-bool FileControl::IsEditedNameValid(TextView name) {
+bool FileControl::CheckEditedName(TextView name) {
   Operation operation(*this);
   if (!IsNameAllowed(name)) operation.Fail(ftp_error::kNameNotAllowed, u"The file's name is not allowed.");
   return IsFileNameValid(name);
@@ -490,7 +490,7 @@ bool FileControl::EnableRename(bool bEnableRename) {
 Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
   return ResultAsItStood(Text(), [&](Text& local) {
     const Operation operation(*this);
-    if (!MayTransfer() || !Client() || !CFileUpload::CanDownLoadFile()) return;
+    if (!CheckTransferAllowed() || !Client() || !CFileUpload::CanDownLoadFile()) return;
     const FileRecord selected = SelectedRecord();
     if (!selected) return Fail(ftp_error::kUnavailable, u"No file is selected.");
     const Text name = selected->FileName;
@@ -616,7 +616,7 @@ void FileControl::OnDrop(DragData& data, const std::vector<Text>& files, std::in
   // The host may clear the data in an event of the walk.
   const std::vector<Text> walked(files.begin(), files.end());
   for (const Text& path : walked) {
-    if (StopsDrop()) break;
+    if (TakeStopOfDrop()) break;
     Raise(event::kFileDrop, path);
   }
   Raise(event::kFileDrop);

@@ -176,8 +176,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   virtual void DroppedNoFiles(bool own) = 0;
   // A transfer that the host started is over.
   virtual void TransferEnded() {}
-  // Whether the walk through dropped files ends here.
-  virtual bool StopsDrop() { return false; }
+  // Whether the walk through dropped files ends here; uses up what told it to.
+  virtual bool TakeStopOfDrop() { return false; }
 
   // --- For the controls ---
 
@@ -211,12 +211,12 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Notes why what was told to stop has no result.
   void FailStopped();
   // Whether a transfer may start now; else the reason is noted.
-  bool MayTransfer();
+  bool CheckTransferAllowed();
   // The client; null, with the reason noted, when there is none.
   std::shared_ptr<CFileUpload> Client();
   // Whether what is shown may be changed; else, when another user has been logged on since, the reason is
   // noted.
-  bool MayChangeShown();
+  bool CheckShownChangeable();
   // Adds the account's files to the list of all files; false, with that list empty, when the service did not
   // tell them all or there is no client.
   bool ListAccount();
@@ -232,7 +232,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Deletes a file by its page and the service, and its local copy. Whether the service took it out.
   bool DeleteOnServer(CFileUpload& client, const CUpload& file);
   // What IsFileNameValid says of a name that the user typed; a refusal is the outcome of the rename.
-  bool IsEditedNameValid(TextView name);
+  bool CheckEditedName(TextView name);
   // Renames a file on the server and wherever it is known here, without an event.
   bool Rename(const Text& oldName, const Text& newName);
   bool RenameRuns() const { return renameInProgress_; }

@@ -210,14 +210,14 @@ bool ctrlListImage::OnAfterLabelEdit(std::size_t index, TextView newText) {
     if (!bRenameEnabled || index >= items_.size()) return;
     if (ShowsOtherAccount()) {
       const Operation operation(*this);
-      MayChangeShown();
+      CheckShownChangeable();
       return Raise(event::kRenameFailed);
     }
     const Text oldName = items_[index].record->FileName;
     Text newName(newText);
     // An emptied or untouched label means that the user changed his mind.
     if (Trim(newName).empty() || newName == oldName) return;
-    if (!IsEditedNameValid(newName)) return;
+    if (!CheckEditedName(newName)) return;
     CheckFileExtension(newName, ExtensionOf(oldName));
     if (Trim(newName) != oldName) renamed = RenameFile(oldName, newName);
   });

@@ -42,7 +42,7 @@ void ctrlListImage::DeleteFile() {
     const Operation operation(*this);
     const Hourglass pointer(*this);
     if (!Selected()) Fail(ftp_error::kUnavailable, u"No file is selected.");
-    if (items_.empty() || !Client() || !MayChangeShown()) return;
+    if (items_.empty() || !Client() || !CheckShownChangeable()) return;
     if (!CFileUpload::CanDeleteFile()) {
       Fail(ftp_error::kNotAllowed, u"The account may not delete files.");
       return Raise(event::kNotAllowed);

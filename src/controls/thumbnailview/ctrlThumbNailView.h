@@ -71,7 +71,7 @@ class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
                    const Text& newName) override;
   void TransferEnded() override;
   void DroppedNoFiles(bool own) override;
-  bool StopsDrop() override;
+  bool TakeStopOfDrop() override;
 
   bool List();
   // Fills the list of shown files through `filter` and shows its first page.

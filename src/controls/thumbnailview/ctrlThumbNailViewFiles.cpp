@@ -124,7 +124,7 @@ void ctrlThumbNailView::DeleteFile() {
     }
     const FileRecord record = SlotOf(selectedPath_) != 0 ? SelectedRecord() : nullptr;
     if (!record) Fail(ftp_error::kUnavailable, u"No file on the page is selected.");
-    if (!record || !MayChangeShown()) return Raise(event::kNotSelected);
+    if (!record || !CheckShownChangeable()) return Raise(event::kNotSelected);
     deleteRuns_ = true;
     const bool deleted = ResultAsItStood(false, [&](bool& gone) {
       gone = DeleteOnServer(*client, *record);
@@ -193,7 +193,7 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
       return keepName(event::kNameUnfit);
     }
     if (oldName.empty()) Fail(ftp_error::kUnavailable, u"No file is selected.");
-    if (oldName.empty() || !MayChangeShown()) return keepName(event::kRenameFailed);
+    if (oldName.empty() || !CheckShownChangeable()) return keepName(event::kRenameFailed);
     CheckFileExtension(NewString, ExtensionOf(oldName));
     // The caption may show what was typed, such as the name without its extension.
     if (NewString == oldName) return keepName(event::kRenamed);
@@ -262,7 +262,7 @@ void ctrlThumbNailView::OnEditorEntered() {
   Text name = page_.EditorText();
   // Hiding the editor takes the focus from it, which would end the editing.
   const Text oldName = std::exchange(editedName_, Text());
-  const bool valid = IsEditedNameValid(name);
+  const bool valid = CheckEditedName(name);
   SetCaptionOf(oldName, valid ? name : oldName);
   page_.HideEditor();
   page_.Focus();
@@ -284,7 +284,7 @@ void ctrlThumbNailView::DroppedNoFiles(bool) {
   Raise(event::kOwnDrop);
 }
 
-bool ctrlThumbNailView::StopsDrop() {
+bool ctrlThumbNailView::TakeStopOfDrop() {
   return std::exchange(apartment_.abortTransfer, false);
 }
 
