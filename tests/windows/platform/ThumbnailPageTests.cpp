@@ -202,30 +202,6 @@ class ThumbnailPageTest : public testing::Test {
 
 // --- What it shows ---
 
-TEST(ThumbnailLayout, FitsAtEveryResolution) {
-  for (const int dpi : {96, 120, 144, 168, 192}) {
-    SCOPED_TRACE(dpi);
-    const auto pixels = [&](const layout::TwipRect& area) { return layout::Pixels(area, dpi); };
-    const RECT page = pixels(layout::kPage);
-    EXPECT_EQ(MulDiv(WindowsThumbnailPage::kNaturalExtent.cx, dpi, 2540), page.right);
-    EXPECT_EQ(MulDiv(WindowsThumbnailPage::kNaturalExtent.cy, dpi, 2540), page.bottom);
-
-    const std::vector<RECT> apart = {pixels(layout::kFrames[0]), pixels(layout::kFrames[1]),
-                                     pixels(layout::kFrames[2]), pixels(layout::kFrames[3]),
-                                     pixels(layout::kScrollBar), pixels(layout::kButton)};
-    for (std::size_t i = 0; i < apart.size(); ++i) {
-      EXPECT_TRUE(Inside(apart[i], page)) << i;
-      for (std::size_t k = 0; k < i; ++k) EXPECT_FALSE(Overlap(apart[i], apart[k])) << i << " and " << k;
-    }
-    const RECT frame = {0, 0, apart[0].right - apart[0].left, apart[0].bottom - apart[0].top};
-    const RECT picture = pixels(layout::kPicture);
-    EXPECT_TRUE(Inside(picture, pixels(layout::kMarker)));
-    EXPECT_TRUE(Inside(pixels(layout::kMarker), frame));
-    EXPECT_TRUE(Inside(pixels(layout::kCaption), frame));
-    EXPECT_FALSE(Overlap(pixels(layout::kCaption), pixels(layout::kMarker)));
-  }
-}
-
 TEST_F(ThumbnailPageTest, WindowsStandAsLaidOutAndHaveNames) {
   const auto expectFit = [&](HWND parent) {
     const std::vector<HWND> children = ChildrenOf(parent);
@@ -242,6 +218,9 @@ TEST_F(ThumbnailPageTest, WindowsStandAsLaidOutAndHaveNames) {
       }
     }
   };
+  const RECT page = layout::Pixels(layout::kPage, SystemDpi());
+  EXPECT_EQ(MulDiv(WindowsThumbnailPage::kNaturalExtent.cx, SystemDpi(), 2540), page.right);
+  EXPECT_EQ(MulDiv(WindowsThumbnailPage::kNaturalExtent.cy, SystemDpi(), 2540), page.bottom);
   EXPECT_FALSE(NameOf(page_->Window()).empty());
   expectFit(page_->Window());
   expectFit(Grid());
