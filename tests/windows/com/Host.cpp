@@ -78,7 +78,7 @@ ComPtr<IDispatch> Object(IDispatch* object, const wchar_t* member, std::initiali
 
 std::wstring Told(IDispatch* object, const wchar_t* member, std::initializer_list<VARIANT> arguments) {
   VARIANT result = Call(object, member, arguments);
-  const std::wstring text = TextOf(result);
+  std::wstring text = TextOf(result);
   VariantClear(&result);
   return text;
 }
