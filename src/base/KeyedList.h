@@ -18,7 +18,6 @@ template <typename Item>
 class KeyedList {
  public:
   std::size_t Count() const { return entries_.size(); }
-  bool IsEmpty() const { return entries_.empty(); }
 
   // Appends. Throws run-time error 457 when the key is in use; the list is then unchanged.
   void Add(Item item, TextView key = {}) { Insert(Count() + 1, std::move(item), key); }

@@ -6,8 +6,8 @@
 
 namespace tarnwick {
 
-// Puts small letters in the place of capital ones, whatever the user's language, each unit by itself. Where
-// the system cannot, the letters stay.
+// Converts the units to lower case, each by itself and independent of the user's locale. Where the system
+// cannot, they stay as they are.
 void MakeLowerCase(std::span<char16_t> units) noexcept;
 
 }  // namespace tarnwick

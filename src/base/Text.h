@@ -25,8 +25,8 @@ Text TextFromLatin1(std::string_view bytes);
 // `text` without leading and trailing blanks (U+0020 only).
 TextView Trim(TextView text);
 
-// The small letter of a capital one, as the system knows it, whatever the user's language; every other
-// character stays, as does all beyond U+FFFF.
+// Lower case, one letter for one, independent of the user's locale. What has none stays, and so do characters
+// beyond U+FFFF.
 char16_t LowerCase(char16_t unit);
 Text LowerCase(TextView text);
 

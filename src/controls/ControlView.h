@@ -8,13 +8,14 @@ class ControlView {
  public:
   virtual ~ControlView() = default;
 
-  // The keyboard focus.
+  // Gives the control the keyboard focus. Runs the code of the window that had it, and the host's.
   virtual void Focus() = 0;
 
   // The hourglass over the control, or the default pointer.
   virtual void SetHourglass(bool hourglass) = 0;
 
-  // Starts a drag of the selection, as if the user did.
+  // Drags the selection out, as if the user did. Returns after the drop, pumps messages until then, and
+  // raises events.
   virtual void StartDrag() = 0;
 };
 

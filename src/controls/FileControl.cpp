@@ -147,7 +147,7 @@ Text FileControl::SelectedFileName() const {
   return record ? record->FileName : Text();
 }
 
-Text FileControl::SelectedKey() const {
+Text FileControl::SelectedAddress() const {
   const auto record = SelectedRecord();
   return record ? record->FilePath : Text();
 }

@@ -99,10 +99,10 @@ class FileControl : private UploadEvents, private DownloadEvents {
 
   // Fetches the selected file. `szLocalFilePath` is the folder to put it in, or, when the file's name is a
   // number, the file to write. Returns the path of the file, whether or not it could be fetched; empty when
-  // nothing could be attempted. Pumps messages until the end of the transfer.
+  // nothing could be attempted. Pumps messages until the end of the transfer, and raises events.
   Text DownLoadFileFromServer(TextView szLocalFilePath);
 
-  // Whether the name holds none of \ / : * ? " < > | # %.
+  // Whether the name holds none of \ / : * ? " < > | # %. Raises event::kNameRefused when it does.
   bool IsFileNameValid(TextView szFileName);
 
   // Gives the new name the extension `szOriExt` (with its dot; letter case counts) in place of its own. True.
@@ -113,6 +113,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
 
   // Allows or forbids renaming in place and returns the argument.
   bool EnableRename(bool bEnableRename);
+  // Drags the selected file out. Pumps messages until the drop, and raises events.
   void OLEDrag() { controlView_.StartDrag(); }
 
   // Ends the transfer that runs, at once where it waits: a download leaves no file, an upload whose last byte
@@ -165,6 +166,7 @@ class FileControl : private UploadEvents, private DownloadEvents {
 
   // Record of the (first) selected file; null when there is none.
   virtual FileRecord SelectedRecord() const = 0;
+  // Whether a file of that name is shown, in any letter case.
   virtual bool ShowsFile(TextView name) const = 0;
   // The record is new in the list of all files, or, when an upload replaced a file, has new values.
   virtual void ShowUploaded(const FileRecord& record) = 0;
@@ -184,8 +186,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // `description` is none of the texts that the host can change in the event.
   void Raise(std::int16_t code, TextView description = {}) { events_.FileManagerEvent(code, description); }
   // Address of the (first) selected file, empty when there is none.
-  Text SelectedKey() const;
-  void RaiseCurrentItem() { Raise(event::kCurrentItem, SelectedKey()); }
+  Text SelectedAddress() const;
+  void RaiseCurrentItem() { Raise(event::kCurrentItem, SelectedAddress()); }
   void Yield() { apartment_.platform.pump.Yield(); }
   bool IsClosed() const { return closed_; }
 

@@ -1,6 +1,5 @@
 #include "session/FileList.h"
 
-#include <algorithm>
 #include <utility>
 
 #include "base/RuntimeError.h"

@@ -26,7 +26,7 @@ class FileList {
 
   // Throws run-time error 9 when `position` is not 1 to Count().
   const FileRecord& At(std::size_t position) const;
-  // Null when there is none. Other than PositionOf it does not walk through the list.
+  // Null when there is none. Costs the same whatever the length of the list is; PositionOf walks through it.
   const CUpload* Find(TextView address) const { return address.empty() ? nullptr : addresses_.Find(address); }
   // 0 when there is none.
   std::size_t PositionOf(TextView address) const;
@@ -50,8 +50,9 @@ class FileList {
   friend struct Listing;
 
   bool Holds(const CUpload& record) const;
-  // Makes the record one, or none, that is found by its address.
+  // Puts the record into the index of addresses, unless its own is empty or is there already.
   void Index(const CUpload& record);
+  // Takes it out, if it is there; its address must not change before.
   void Unindex(const CUpload& record);
 
   std::vector<FileRecord> records_;

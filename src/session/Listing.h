@@ -13,10 +13,12 @@ struct Listing {
   // What the service lists, and the part of it that the thumbnails' filter shows.
   FileList all;
   FileList shown;
+  // Of the thumbnails.
   Text filter = u"*";
-  // `all` is what the account holds, as far as anybody here knows: the list need not be asked for again.
+  // The list control has listed the account into `all`, and nothing was renamed since: its next Init need not
+  // ask the service.
   bool isCurrent = false;
-  // The same for the thumbnails.
+  // Nor need the next Init of the thumbnails. A rename leaves this flag as it is.
   bool isLoaded = false;
   // Addresses of the files whose copies were fetched again since the listing, because of their length.
   std::set<Text> copiesAskedAgain;

@@ -18,10 +18,6 @@
 
 namespace tarnwick {
 
-// Formats as hosts number them: those of the clipboard.
-inline constexpr std::int16_t kTextFormat = CF_TEXT;
-inline constexpr std::int16_t kFilesFormat = CF_HDROP;
-
 class DataObject final : public LateBoundObject<IDataObject, IDispatch>, public DragData {
  public:
   // The data of a drag that begins in a control of ours: a text, and a file when its path is not empty.

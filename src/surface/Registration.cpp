@@ -164,7 +164,7 @@ std::wstring KeyOf(const Interface& known) {
   return L"Interface\\" + GuidText(known.id);
 }
 
-// Writes what RegisterTypeLib writes, also for one user: under Wine RegisterTypeLibForUser registers for all
+// Writes what RegisterTypeLib writes, also for one user. Wine: RegisterTypeLibForUser registers for all
 // users.
 void RegisterTypeLibrary(const Classes& classes, const std::wstring& path) {
   const std::wstring version = LibraryKey() + L"\\" + kVersion;

@@ -67,12 +67,17 @@ class Downloader {
   virtual ~Downloader() = default;
   // Whether a download of `url` can be attempted; otherwise Start fails at once.
   virtual bool CanStart(TextView url) const = 0;
+  // Begins to fetch the file at `url` into the user's folder, and to `explicitTarget` first unless that is
+  // empty; ends a download that runs. Raises events, also the one of a failure, before it returns.
   virtual void Start(TextView url, TextView explicitTarget) = 0;
+  // Null: from here on nobody is told.
   virtual void SetEvents(DownloadEvents* events) = 0;
+  // Ends a download without an event.
   virtual void Cancel() = 0;
+  // The watchdog fails the transfer that runs, a download or an upload, unless it is started again in time.
   virtual void RestartWatchdog() = 0;
   virtual void StopWatchdog() = 0;
-  // Sleeps until there is a message, and handles what waits then.
+  // Sleeps until there is a message, and pumps what waits then. In it the downloader tells its events.
   virtual void Wait() = 0;
 };
 

@@ -98,7 +98,7 @@ bool ctrlThumbNailView::List() {
 void ctrlThumbNailView::ChangeFileFilter(TextView szFileFilter) {
   ResultAsItStood(0, [&](int&) {
     const Text filter(szFileFilter);
-    selectedPath_.clear();
+    selectedAddress_.clear();
     Show(filter);
   });
 }
@@ -118,8 +118,8 @@ void ctrlThumbNailView::Show(const Text& filter) {
     if (Passes(record->FileName) && !shown.Find(record->FilePath)) shown.Add(record);
   // What is selected is on the first page.
   keepSelection_ = false;
-  const std::size_t selected = shown.PositionOf(selectedPath_);
-  if (selected == 0 || selected > kSlotCount) selectedPath_.clear();
+  const std::size_t selected = shown.PositionOf(selectedAddress_);
+  if (selected == 0 || selected > kSlotCount) selectedAddress_.clear();
   // Sets the scroll bar to 0. The user may scroll while the page is filled, so it is not set once more
   // afterwards.
   SetScrollRange();
@@ -167,20 +167,20 @@ void ctrlThumbNailView::ShowPage(int first) {
 
 void ctrlThumbNailView::FillPage(int first) {
   firstIndex_ = first;
-  const Text edited = editedName_.empty() ? Text() : PathOf(editedSlot_);
+  const Text edited = editedName_.empty() ? Text() : AddressOf(editedSlot_);
   for (int slot = 1; slot <= kSlotCount; ++slot) {
     page_.ClearSlot(slot);
     const std::size_t position = static_cast<std::size_t>(first) + static_cast<std::size_t>(slot);
     const FileList& shown = listing_.shown;
-    PathOf(slot) = position <= shown.Count() ? shown.At(position)->FilePath : Text();
+    AddressOf(slot) = position <= shown.Count() ? shown.At(position)->FilePath : Text();
   }
   // A name is edited over its own picture only.
-  if (!editedName_.empty() && PathOf(editedSlot_) != edited) OnEditorLeft();
+  if (!editedName_.empty() && AddressOf(editedSlot_) != edited) OnEditorLeft();
   // While the account is not listed, nobody knows whether it is empty.
   const bool empty = listing_.all.IsEmpty() && listing_.isLoaded;
   page_.ShowGrid(!empty);
   if (empty) {
-    paths_.fill({});
+    addresses_.fill({});
     page_.EnableScroll(false);
     iImgNo = 0;
     return;
@@ -195,7 +195,7 @@ void ctrlThumbNailView::FillPage(int first) {
     const int position = first + slot;
     FileList& shown = listing_.shown;
     if (position > static_cast<int>(shown.Count())) {
-      PathOf(slot).clear();
+      AddressOf(slot).clear();
       page_.ShowSlot(slot, false);
       continue;
     }
@@ -217,7 +217,7 @@ bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
     copy = copies_.PathOf(record.FilePath);
   }
   page_.SetCaption(slot, FormatLabelText(record.FileName));
-  PathOf(slot) = record.FilePath;
+  AddressOf(slot) = record.FilePath;
   // A picture that cannot be read leaves the caption and an empty square. It may be a file of another kind,
   // or what came in place of the picture or of a part of it, for which the next page with it asks again.
   if (!copy.empty() && FileExists(files, copy) && !ShowPicture(slot, copy))
@@ -293,7 +293,7 @@ void ctrlThumbNailView::ShowItem(std::size_t position) {
 
 void ctrlThumbNailView::ShowFrom(int first, std::optional<std::size_t> position) {
   first = std::clamp(first, 0, std::max(0, SetScrollRange()));
-  selectedPath_ = listing_.shown.At(position.value_or(static_cast<std::size_t>(first) + 1))->FilePath;
+  selectedAddress_ = listing_.shown.At(position.value_or(static_cast<std::size_t>(first) + 1))->FilePath;
   // The page does not choose a selection of its own.
   selectionFirstIndex_ = first;
   firstIndex_ = first;

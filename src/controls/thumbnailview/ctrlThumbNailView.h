@@ -97,9 +97,9 @@ class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
   // Shows the page that begins at `first`, or the last one, and selects an item, its first one without one.
   void ShowFrom(int first, std::optional<std::size_t> position);
 
-  Text& PathOf(int slot) { return paths_[static_cast<std::size_t>(slot - 1)]; }
+  Text& AddressOf(int slot) { return addresses_[static_cast<std::size_t>(slot - 1)]; }
   // 0 when the picture is not on the page.
-  int SlotOf(TextView path) const;
+  int SlotOf(TextView address) const;
   void RaiseSelection();
   // Sets the caption of the slot with the picture of that name, if it is on the page.
   void SetCaptionOf(TextView name, TextView caption);
@@ -110,9 +110,9 @@ class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
   // Kept, because it holds the memory that it reads into.
   CImageHeight header_;
   // Address of the picture that each slot shows or waits for, empty for none.
-  std::array<Text, kSlotCount> paths_;
+  std::array<Text, kSlotCount> addresses_;
   // Address of the selected picture.
-  Text selectedPath_;
+  Text selectedAddress_;
   int firstIndex_ = 0;
   int selectionFirstIndex_ = 0;
   int previousScroll_ = 0;

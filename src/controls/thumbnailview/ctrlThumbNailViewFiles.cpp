@@ -17,7 +17,7 @@ constexpr int kF2Key = 113;
 constexpr int kF5Key = 116;
 
 // Equal to the address of no picture.
-constexpr TextView kNoPath = u"   ";
+constexpr TextView kNoAddress = u"   ";
 
 // Whether no file may have a name that begins like this: a dot or a blank, or the name of a device.
 bool BeginsUnfit(TextView name) {
@@ -34,14 +34,14 @@ bool BeginsUnfit(TextView name) {
 void ctrlThumbNailView::UpdateSelection() {
   ResultAsItStood(0, [&](int&) {
     const FileList& shown = listing_.shown;
-    if (Trim(selectedPath_).empty() && !shown.IsEmpty()) selectedPath_ = shown.At(1)->FilePath;
+    if (Trim(selectedAddress_).empty() && !shown.IsEmpty()) selectedAddress_ = shown.At(1)->FilePath;
     if (firstIndex_ != selectionFirstIndex_ && !keepSelection_ && !shown.IsEmpty()) {
       const auto first = static_cast<std::size_t>(page_.ScrollValue());
-      if (first < shown.Count()) selectedPath_ = shown.At(first + 1)->FilePath;
+      if (first < shown.Count()) selectedAddress_ = shown.At(first + 1)->FilePath;
       selectionFirstIndex_ = firstIndex_;
     }
-    if (selectedPath_.empty()) selectedPath_ = kNoPath;
-    int selected = SlotOf(selectedPath_);
+    if (selectedAddress_.empty()) selectedAddress_ = kNoAddress;
+    int selected = SlotOf(selectedAddress_);
     // One slot always looks selected. Where that is not the selected picture, which is on another page then,
     // nothing deletes or renames.
     if (selected == 0 && !shown.IsEmpty()) selected = 1;
@@ -56,14 +56,14 @@ void ctrlThumbNailView::FocusGrid() {
   if (!listing_.all.IsEmpty() && editedName_.empty()) page_.Focus();
 }
 
-int ctrlThumbNailView::SlotOf(TextView path) const {
-  if (Trim(path).empty()) return 0;
-  const auto slot = std::ranges::find(paths_, path);
-  return slot == paths_.end() ? 0 : static_cast<int>(slot - paths_.begin()) + 1;
+int ctrlThumbNailView::SlotOf(TextView address) const {
+  if (Trim(address).empty()) return 0;
+  const auto slot = std::ranges::find(addresses_, address);
+  return slot == addresses_.end() ? 0 : static_cast<int>(slot - addresses_.begin()) + 1;
 }
 
 FileRecord ctrlThumbNailView::SelectedRecord() const {
-  const std::size_t position = listing_.shown.PositionOf(selectedPath_);
+  const std::size_t position = listing_.shown.PositionOf(selectedAddress_);
   return position == 0 ? nullptr : listing_.shown.At(position);
 }
 
@@ -87,7 +87,7 @@ void ctrlThumbNailView::UploadedFileSetFocus(TextView szFileName) {
 
 void ctrlThumbNailView::RaiseSelection() {
   Raise(event::kClickBegins);
-  Raise(event::kCurrentItem, Text(selectedPath_));
+  Raise(event::kCurrentItem, Text(selectedAddress_));
 }
 
 // --- Operations ---
@@ -122,7 +122,7 @@ void ctrlThumbNailView::DeleteFile() {
       Fail(ftp_error::kNotAllowed, u"The account may not delete files.");
       return Raise(event::kNotAllowed);
     }
-    const FileRecord record = SlotOf(selectedPath_) != 0 ? SelectedRecord() : nullptr;
+    const FileRecord record = SlotOf(selectedAddress_) != 0 ? SelectedRecord() : nullptr;
     if (!record) Fail(ftp_error::kUnavailable, u"No file on the page is selected.");
     if (!record || !CheckShownChangeable()) return Raise(event::kNotSelected);
     deleteRuns_ = true;
@@ -136,7 +136,7 @@ void ctrlThumbNailView::DeleteFile() {
     if (IsClosed()) return;
     keepSelection_ = false;
     if (listing_.shown.IsEmpty()) {
-      selectedPath_.clear();
+      selectedAddress_.clear();
       SetScrollRange();
       ShowPage(0);
       return UpdateSelection();
@@ -156,26 +156,27 @@ void ctrlThumbNailView::ShowRenamed(const FileRecord& record, const Text& oldUrl
   // A record of an older listing is not in the list of all files.
   const Text before = renamed == record ? oldUrl : renamed->FilePath;
   if (renamed != record) listing_.GiveName(renamed, newName);
-  if (selectedPath_ == before) selectedPath_ = renamed->FilePath;
+  if (selectedAddress_ == before) selectedAddress_ = renamed->FilePath;
   for (int slot = 1; slot <= kSlotCount; ++slot) {
-    if (PathOf(slot) != before) continue;
-    PathOf(slot) = renamed->FilePath;
+    if (AddressOf(slot) != before) continue;
+    AddressOf(slot) = renamed->FilePath;
     page_.SetCaption(slot, FormatLabelText(newName));
   }
 }
 
 void ctrlThumbNailView::SetLabelText(TextView szString) {
-  if (const int slot = SlotOf(selectedPath_)) page_.SetCaption(slot, FormatLabelText(szString));
+  if (const int slot = SlotOf(selectedAddress_)) page_.SetCaption(slot, FormatLabelText(szString));
 }
 
 void ctrlThumbNailView::SetCaptionOf(TextView name, TextView caption) {
   for (int slot = 1; slot <= kSlotCount; ++slot)
-    if (FileNameFromUrl(PathOf(slot)) == name) page_.SetCaption(slot, FormatLabelText(caption));
+    if (FileNameFromUrl(AddressOf(slot)) == name) page_.SetCaption(slot, FormatLabelText(caption));
 }
 
 void ctrlThumbNailView::ValidateFileName(Text& NewString) {
   const Text edited = std::exchange(editedName_, Text());
-  if (edited.empty()) return GiveNewName(NewString, SlotOf(selectedPath_) != 0 ? SelectedFileName() : Text());
+  if (edited.empty())
+    return GiveNewName(NewString, SlotOf(selectedAddress_) != 0 ? SelectedFileName() : Text());
   page_.HideEditor();
   GiveNewName(NewString, edited);
 }
@@ -211,39 +212,40 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
 // --- What the user does ---
 
 void ctrlThumbNailView::OnSlotPressed(int slot, bool rightButton) {
-  const Text pressed = PathOf(slot);
+  const Text pressed = AddressOf(slot);
   if (pressed.empty()) return OnBackgroundPressed(rightButton);
   keepSelection_ = false;
   selectionFirstIndex_ = firstIndex_;
-  selectedPath_ = pressed;
+  selectedAddress_ = pressed;
   UpdateSelection();
   RaiseSelection();
-  if (rightButton) Raise(event::kContextMenu, Text(selectedPath_));
+  if (rightButton) Raise(event::kContextMenu, Text(selectedAddress_));
 }
 
 void ctrlThumbNailView::OnBackgroundPressed(bool rightButton) {
-  if (rightButton) Raise(event::kContextMenu, Text(selectedPath_));
+  if (rightButton) Raise(event::kContextMenu, Text(selectedAddress_));
 }
 
 void ctrlThumbNailView::OnKeyDown(int keyCode) {
   switch (keyCode) {
     case kDeleteKey:
       RaiseSelection();
-      return Raise(event::kDeleteKey, Text(selectedPath_));
+      return Raise(event::kDeleteKey, Text(selectedAddress_));
     case kF5Key:
       return Raise(event::kRefreshKey);
     case kF2Key:
       if (!bRenameEnabled) return;
       Raise(event::kRenameKey);
-      if (const FileRecord record = SelectedRecord(); record && SlotOf(selectedPath_) != 0 && !IsClosed()) {
+      if (const FileRecord record = SelectedRecord();
+          record && SlotOf(selectedAddress_) != 0 && !IsClosed()) {
         editedName_ = record->FileName;
-        editedSlot_ = SlotOf(selectedPath_);
+        editedSlot_ = SlotOf(selectedAddress_);
         page_.ShowEditor(editedSlot_, editedName_);
       }
       return;
     case kEnterKey:
       RaiseSelection();
-      return Raise(event::kClickEnds, Text(selectedPath_));
+      return Raise(event::kClickEnds, Text(selectedAddress_));
     default:
       return;
   }
@@ -277,7 +279,7 @@ void ctrlThumbNailView::OnEditorLeft() {
 // --- Drag and drop ---
 
 void ctrlThumbNailView::OnFilesEnter() {
-  Raise(event::kDragOver, Text(selectedPath_));
+  Raise(event::kDragOver, Text(selectedAddress_));
 }
 
 void ctrlThumbNailView::DroppedNoFiles(bool) {

@@ -10,8 +10,8 @@
 
 namespace tarnwick {
 
-// Number of system objects that owners of this module hold now. The system's own counters are not to be had
-// everywhere, so this is how tests and diagnostics see a leak.
+// Number of system objects that owners of this module hold now: how tests see a leak. Wine: the system's own
+// counters tell 0 always.
 inline std::atomic<std::int32_t> ownedObjects{0};
 
 // Holds a T, which Close(held) ends; a T of the value None holds nothing. None may be a number where the

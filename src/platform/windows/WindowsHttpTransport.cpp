@@ -130,8 +130,8 @@ HttpOwner OpenSession(const std::wstring& url) {
   const std::wstring script = Taken(user.lpszAutoConfigUrl);
   const std::wstring known = Taken(user.lpszProxy);
   Taken(user.lpszProxyBypass);
-  // Wine reports auto-detection as on and no proxy, whatever is set; a proxy that only the user's Internet
-  // settings name is taken as it stands there.
+  // Wine: auto-detection is reported as on, and no proxy, whatever is set. A proxy that only the user's
+  // Internet settings name is taken as it stands there.
   if ((user.fAutoDetect || !script.empty()) && (proxy.server.empty() || !known.empty())) {
     if (HttpOwner found = open(WINHTTP_ACCESS_TYPE_AUTOMATIC_PROXY, nullptr, nullptr, WINHTTP_FLAG_ASYNC))
       return found;

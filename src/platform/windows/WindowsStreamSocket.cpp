@@ -168,7 +168,7 @@ void WindowsStreamSocket::OnClose() {
     if (left < 0 && WSAGetLastError() != WSAEWOULDBLOCK) return events_->OnSocketError(WSAGetLastError());
     if (left <= 0) {
       // Whoever was reset cannot send any more, not even nothing, but whose peer has closed in an orderly way
-      // can. A reset does not always arrive as an error.
+      // can. Wine: a reset may arrive as an orderly close.
       if (send(socket_.Get(), &next, 0, 0) != 0) return events_->OnSocketError(WSAECONNRESET);
       return events_->OnClosedByPeer();
     }
