@@ -22,8 +22,8 @@ inline constexpr std::int32_t kPathAccess = 75;
 inline constexpr std::int32_t kPathNotFound = 76;
 inline constexpr std::int32_t kResourceNotFound = 326;
 inline constexpr std::int32_t kNoSuchMember = 438;
-inline constexpr std::int32_t kInvalidFormat = 461;
 inline constexpr std::int32_t kDuplicateKey = 457;
+inline constexpr std::int32_t kInvalidFormat = 461;
 }  // namespace error
 
 class RuntimeError : public std::exception {

@@ -4,7 +4,6 @@
 // Nothing throws: a copy is a convenience, and what cannot be kept is fetched again.
 #pragma once
 
-#include <cstdint>
 #include <memory>
 #include <string_view>
 

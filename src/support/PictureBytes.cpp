@@ -1,7 +1,6 @@
 #include "support/PictureBytes.h"
 
 #include <algorithm>
-#include <array>
 #include <cstring>
 #include <string_view>
 

@@ -416,6 +416,7 @@ STDMETHODIMP OleControl::OnDocWindowActivate(BOOL activate) {
     return S_OK;
   });
 }
+
 // --- IQuickActivate ---
 
 STDMETHODIMP OleControl::QuickActivate(QACONTAINER* container, QACONTROL* control) {

@@ -2,8 +2,6 @@
 
 #include <algorithm>
 
-#include "base/RuntimeError.h"
-
 namespace tarnwick {
 namespace {
 
