@@ -394,12 +394,14 @@ bool FileControl::RenameFile(TextView strOldFileName, TextView strNewFileName) {
     const Text newName(Trim(strNewFileName));
     const Hourglass pointer(*this);
     const bool nested = std::exchange(renameInProgress_, true);
-    renamed = Rename(oldName, newName);
-    if (renamed) {
-      Raise(event::kRenamed, newName);
-    } else {
-      Raise(event::kRenameFailed);
-    }
+    ResultAsItStood(0, [&](int&) {
+      renamed = Rename(oldName, newName);
+      if (renamed) {
+        Raise(event::kRenamed, newName);
+      } else {
+        Raise(event::kRenameFailed);
+      }
+    });
     renameInProgress_ = nested;
   });
 }

@@ -3,6 +3,7 @@
 
 #include <memory>
 #include <set>
+#include <utility>
 
 #include "base/Text.h"
 #include "session/FileList.h"
@@ -32,11 +33,16 @@ struct Listing {
   // change(record) changes a record that may be in both lists, in one or in none.
   template <typename ChangeRecord>
   void Change(const FileRecord& record, const ChangeRecord& change) {
+    CUpload values = *record;
+    change(values);
+    // Nothing fails from here on, so that no list loses a record.
+    all.addresses_.MakeRoom();
+    shown.addresses_.MakeRoom();
     FileList* const lists[] = {all.Holds(*record) ? &all : nullptr, shown.Holds(*record) ? &shown : nullptr};
     for (FileList* list : lists)
       if (list) list->Unindex(*record);
     // All records are made as ones that may change.
-    change(*std::const_pointer_cast<CUpload>(record));
+    *std::const_pointer_cast<CUpload>(record) = std::move(values);
     for (FileList* list : lists)
       if (list) list->Index(*record);
   }

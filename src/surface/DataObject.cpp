@@ -193,10 +193,12 @@ HRESULT DataObject::Call(DISPID member, const LateBoundArguments& arguments, Var
     return given ? static_cast<CLIPFORMAT>(NumberFromVariant(*given)) : CLIPFORMAT{CF_TEXT};
   };
   switch (member) {
-    case kGetData:
-      if (!Has(format(0))) throw RuntimeError(error::kInvalidFormat);
-      if (format(0) != CF_HDROP) result.Get() = VariantFromText(FetchText());
+    case kGetData: {
+      const CLIPFORMAT wanted = format(0);
+      if (!Has(wanted)) throw RuntimeError(error::kInvalidFormat);
+      if (wanted != CF_HDROP) result.Get() = VariantFromText(FetchText());
       break;
+    }
     case kSetData: {
       if (format(1) == CF_HDROP) throw RuntimeError(error::kInvalidFormat);
       const VARIANT* text = arguments.At(0);

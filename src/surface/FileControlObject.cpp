@@ -454,8 +454,9 @@ HWND FileControlObject<Interface>::Window() {
 template <typename Interface>
 void FileControlObject<Interface>::AmbientChanged(const AmbientValues& values) {
   ambient_ = values;
-  ApplyLook();
+  // Before the container's font is asked, inside which the container may close the control.
   Rules().Open();
+  ApplyLook();
 }
 
 template <typename Interface>

@@ -84,8 +84,13 @@ STDMETHODIMP ctrlListImageObject::Overlay(VARIANT* Key1, VARIANT* Key2, IPicture
     PICTDESC description = {};
     description.cbSizeofstruct = sizeof description;
     description.picType = PICTYPE_ICON;
-    description.icon.hicon = ImageList_GetIcon(merged.Get(), 0, ILD_TRANSPARENT);
-    return OleCreatePictureIndirect(&description, IID_IPictureDisp, TRUE, reinterpret_cast<void**>(result));
+    IconOwner icon(ImageList_GetIcon(merged.Get(), 0, ILD_TRANSPARENT));
+    description.icon.hicon = icon.Get();
+    const HRESULT made =
+        OleCreatePictureIndirect(&description, IID_IPictureDisp, TRUE, reinterpret_cast<void**>(result));
+    // The picture owns it now.
+    if (SUCCEEDED(made)) icon.Detach();
+    return made;
   });
 }
 

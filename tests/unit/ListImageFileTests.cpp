@@ -427,6 +427,8 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
          view.selected.assign(3, true);
        },
        "a.jpg,"},
+      {"logs another user on", [this](ctrlListImage&) { fake.apartment.session.userName = u"other"; },
+       "a.jpg,"},
       {"takes the client", [](ctrlListImage& list) { list.mobjFileupload.reset(); }, "a.jpg,"},
       {"closes", [](ctrlListImage& list) { list.Close(); }, "a.jpg,"},
       {"stops", [](ctrlListImage& list) { list.mobjFileupload->AbortFileTransfer(true); }, "a.jpg,"},
@@ -461,6 +463,7 @@ TEST_F(ListImageTest, HostActsWhileFilesAreDeleted) {
     }
     EXPECT_EQ(log.back(), "view pointer");
     host.onEvent = nullptr;
+    fake.apartment.session.userName = u"u@x";
   }
 }
 

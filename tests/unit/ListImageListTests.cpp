@@ -167,7 +167,11 @@ TEST_F(ListImageTest, AnswersQueries) {
   EXPECT_EQ(control.GetFileNames().size(), 2U);
   control.UploadedFileSetFocus(u"a.jpg");
   EXPECT_EQ(control.GetFileNames(), std::vector<Text>{u"a.jpg"});
-  ExpectLog({"view focus", "view focus", "view at 0"});
+  control.ListViewSetFocus();
+  control.StartLabelExit();
+  control.SetMultiSelectProperty(false);
+  ExpectLog({"view focus", "view focus", "view at 0", "view focus", "view end edit"});
+  EXPECT_FALSE(view.multiple);
 
   std::vector<std::shared_ptr<CUpload>> details;
   const auto take = [&](const std::shared_ptr<CUpload>& record) { details.push_back(record); };

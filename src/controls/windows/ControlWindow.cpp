@@ -98,7 +98,9 @@ bool ControlWindow::AnyLeft() {
 }
 
 HWND ControlWindow::Window() {
-  if (!window_ && !MakeWindow() && window_) DestroyWindow(window_);
+  // Half of a window would stay empty.
+  if (!window_ && !ResultAsItStood(false, [&](bool& made) { made = MakeWindow(); }) && window_)
+    DestroyWindow(window_);
   return window_;
 }
 

@@ -69,6 +69,7 @@ using HandleOwner = Owner<HANDLE, CloseHandle>;
 
 using FontOwner = Owner<HFONT, DeleteObject>;
 using BitmapOwner = Owner<HBITMAP, DeleteObject>;
+using IconOwner = Owner<HICON, DestroyIcon>;
 using BrushOwner = Owner<HBRUSH, DeleteObject>;
 using PenOwner = Owner<HPEN, DeleteObject>;
 using MemoryDcOwner = Owner<HDC, DeleteDC>;

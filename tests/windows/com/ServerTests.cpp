@@ -1,7 +1,7 @@
 // The in-process server itself: class objects, life times, type library.
 #include <thread>
 
-#include "Host.h"
+#include "Form.h"
 
 namespace tarnwick::test {
 namespace {
@@ -123,6 +123,40 @@ TEST(Server, EachThreadHasItsOwnSession) {
     }).join();
     EXPECT_EQ(seen, L"http://");
   }
+}
+
+// Two threads with a control each, at the same time: each has a session, a listing and a filter of its own.
+TEST(Server, ThreadsWorkAtOnce) {
+  struct Apartment {
+    const wchar_t* filter;
+    const wchar_t* shown;
+    const wchar_t* hidden;
+    int right = 0;
+  } apartments[] = {{L"gif", L"wizard.gif", L"rose.jpg"}, {L"jpg", L"rose.jpg", L"wizard.gif"}};
+  std::vector<std::thread> threads;
+  for (Apartment& apartment : apartments)
+    threads.emplace_back([&apartment] {
+      OleInitialize(nullptr);
+      {
+        const auto list = NewControl<_ctrlListImage>(CLSID_ctrlListImage);
+        list->putref_mobjFileupload(LoggedOnClient().Get());
+        const auto selects = [&](const wchar_t* name) {
+          Bstr text(name);
+          BSTR given = text;
+          VARIANT ignored = {};
+          list->UploadedFileSetFocus(&given, &ignored);
+          Bstr selected;
+          list->SelectedFileName(selected.Receive());
+          return selected.Text() == name;
+        };
+        for (int i = 0; i < 20; ++i)
+          if (Init(*list, apartment.filter) && selects(apartment.shown) && !selects(apartment.hidden))
+            ++apartment.right;
+      }
+      OleUninitialize();
+    });
+  for (std::thread& thread : threads) thread.join();
+  for (const Apartment& apartment : apartments) EXPECT_EQ(apartment.right, 20) << apartment.filter;
 }
 
 }  // namespace
