@@ -7,6 +7,7 @@
 #include <cstdint>
 #include <memory>
 #include <optional>
+#include <span>
 #include <vector>
 
 #include "platform/windows/ComPtr.h"
@@ -20,31 +21,6 @@ constexpr std::size_t kStripBytes = 256 * 1024;
 
 // Larger than any screen; keeps a line of the target small beside the picture.
 constexpr int kLongestTargetSide = 16'384;
-
-struct Bytes {
-  std::unique_ptr<std::uint8_t[]> data;
-  std::size_t size = 0;
-
-  std::span<std::uint8_t> View() const { return {data.get(), size}; }
-};
-
-// The whole file; empty when it cannot be read or is too large.
-Bytes ReadAll(const std::wstring& path) {
-  // A NUL would name another file.
-  if (path.find(L'\0') != std::wstring::npos) return {};
-  const FileOwner file(CreateFileW(path.c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_DELETE, nullptr,
-                                   OPEN_EXISTING, FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
-  LARGE_INTEGER size = {};
-  if (!file || GetFileType(file.Get()) != FILE_TYPE_DISK || !GetFileSizeEx(file.Get(), &size)) return {};
-  if (size.QuadPart <= 0 || static_cast<std::uint64_t>(size.QuadPart) > kMostPictureBytes) return {};
-  Bytes bytes = {std::make_unique_for_overwrite<std::uint8_t[]>(static_cast<std::size_t>(size.QuadPart)),
-                 static_cast<std::size_t>(size.QuadPart)};
-  DWORD count = 0;
-  if (!ReadFile(file.Get(), bytes.data.get(), static_cast<DWORD>(bytes.size), &count, nullptr)) return {};
-  // Shorter when somebody cuts it at this moment.
-  bytes.size = count;
-  return bytes;
-}
 
 // How the pixels of a source line lie in memory.
 enum class Layout { kGray, kBgr, kBgrx, kBgra };
@@ -259,8 +235,10 @@ std::optional<Source> OpenSource(IWICImagingFactory& factory, std::span<std::uin
   return Source{ComPtr<IWICBitmapSource>(converter.Get()), opaque ? Layout::kBgr : Layout::kBgra};
 }
 
-// Gives all lines of the picture to `averager`; false when one cannot be decoded.
-bool AddLines(const Source& source, const PictureFacts& facts, Averager& averager) {
+// Gives all lines of the picture to `averager`; false when one cannot be decoded, or the picture is not
+// wanted any more.
+bool AddLines(const Source& source, const PictureFacts& facts, Averager& averager,
+              const std::function<bool()>& isWanted) {
   const std::size_t stride = std::size_t{facts.width} * BytesPerPixel(source.layout);
   const auto stripLines = static_cast<std::uint32_t>(
       std::clamp<std::size_t>(kStripBytes / stride, 1, std::size_t{facts.frameHeight}));
@@ -274,7 +252,8 @@ bool AddLines(const Source& source, const PictureFacts& facts, Averager& average
     const std::uint32_t lines = std::min(stripLines, facts.frameHeight - y);
     const WICRect part = {0, static_cast<INT>(y), static_cast<INT>(facts.frameWidth),
                           static_cast<INT>(lines)};
-    if (FAILED(source.pixels->CopyPixels(&part, static_cast<UINT>(stride),
+    if (!isWanted() ||
+        FAILED(source.pixels->CopyPixels(&part, static_cast<UINT>(stride),
                                          static_cast<UINT>(lines * stride - indent), strip.data() + indent)))
       return false;
     for (std::uint32_t line = 0; line < lines; ++line) averager.Add(strip.data() + line * stride);
@@ -283,17 +262,36 @@ bool AddLines(const Source& source, const PictureFacts& facts, Averager& average
   return true;
 }
 
-BitmapOwner Load(const std::wstring& path, int width, int height, COLORREF background) {
+PictureFile Read(const std::wstring& path) {
+  // A NUL would name another file.
+  if (path.find(L'\0') != std::wstring::npos) return {};
+  const FileOwner file(CreateFileW(path.c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_DELETE, nullptr,
+                                   OPEN_EXISTING, FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
+  LARGE_INTEGER size = {};
+  if (!file || GetFileType(file.Get()) != FILE_TYPE_DISK || !GetFileSizeEx(file.Get(), &size)) return {};
+  if (size.QuadPart <= 0 || static_cast<std::uint64_t>(size.QuadPart) > kMostPictureBytes) return {};
+  const auto most = static_cast<std::size_t>(size.QuadPart);
+  PictureFile picture = {std::make_unique_for_overwrite<std::uint8_t[]>(most), most};
+  DWORD count = 0;
+  if (!ReadFile(file.Get(), picture.bytes.get(), static_cast<DWORD>(most), &count, nullptr)) return {};
+  // Shorter when somebody cuts it at this moment.
+  picture.size = count;
+  return picture;
+}
+
+BitmapOwner Decode(const PictureFile& file, int width, int height, COLORREF background,
+                   const std::function<bool()>& isWanted) {
   if (width <= 0 || height <= 0 || width > kLongestTargetSide || height > kLongestTargetSide) return {};
-  const Bytes file = ReadAll(path);
-  const std::optional<PictureFacts> facts = ReducePicture(file.View());
+  if (!file || !isWanted()) return {};
+  const std::span bytes(file.bytes.get(), file.size);
+  const std::optional<PictureFacts> facts = ReducePicture(bytes);
   if (!facts) return {};
 
   ComPtr<IWICImagingFactory> factory;
   if (FAILED(CoCreateInstance(CLSID_WICImagingFactory, nullptr, CLSCTX_INPROC_SERVER,
                               __uuidof(IWICImagingFactory), factory.ReceiveVoid())))
     return {};
-  const std::optional<Source> source = OpenSource(*factory, file.View(), *facts);
+  const std::optional<Source> source = OpenSource(*factory, bytes, *facts);
   if (!source) return {};
 
   BITMAPINFO info = {};
@@ -308,15 +306,24 @@ BitmapOwner Load(const std::wstring& path, int width, int height, COLORREF backg
   Averager averager(facts->width, facts->height, static_cast<std::uint32_t>(width),
                     static_cast<std::uint32_t>(height), source->layout, background,
                     static_cast<std::uint32_t*>(pixels));
-  if (!AddLines(*source, *facts, averager)) return {};
+  if (!AddLines(*source, *facts, averager, isWanted)) return {};
   return bitmap;
 }
 
 }  // namespace
 
-BitmapOwner LoadPicture(const std::wstring& path, int width, int height, COLORREF background) {
+PictureFile ReadPictureFile(const std::wstring& path) {
   try {
-    return Load(path, width, height, background);
+    return Read(path);
+  } catch (...) {
+    return {};
+  }
+}
+
+BitmapOwner DecodePicture(PictureFile file, int width, int height, COLORREF background,
+                          const std::function<bool()>& isWanted) {
+  try {
+    return Decode(file, width, height, background, isWanted);
   } catch (...) {
     return {};
   }
