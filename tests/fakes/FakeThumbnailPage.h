@@ -20,8 +20,6 @@ struct FakeThumbnailPage : ThumbnailPage {
     bool selected = false;
   };
   Transcript& log;
-  // Whether pictures can be read.
-  bool decodes = true;
   std::array<Slot, kSlotCount> slots;
   bool grid = false;
   std::string message;
@@ -61,7 +59,6 @@ struct FakeThumbnailPage : ThumbnailPage {
   }
   bool SetPicture(int slot, TextView path, const PicturePlace& place) override {
     log.push_back("picture " + std::to_string(slot));
-    if (!decodes) return false;
     At(slot).picture = Utf8FromText(path);
     At(slot).place = place;
     return true;

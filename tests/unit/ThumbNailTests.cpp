@@ -248,6 +248,7 @@ TEST_F(ThumbNailTest, LeavesAnEmptySquareForWhatIsNoPicture) {
   control.ChangeFileFilter(u"*");
   EXPECT_EQ(page.Look(), "b.gif*! nul.gif! ") << "the last name is not safe as a local one";
   EXPECT_EQ(Events(), "");
+  control.OnPictureUnreadable(1);
   EXPECT_TRUE(HasCopy("b.gif")) << "its length is right: it is a file of another kind";
 
   // What came in place of a picture, or of a part of it, is not kept: the next page with it asks again.
@@ -279,6 +280,9 @@ TEST_F(ThumbNailTest, FetchesACopyOfAnotherLengthOnceInAListing) {
   EXPECT_TRUE(isAsked());
   EXPECT_EQ(page.Look(), "a.gif* b.gif ") << "what cannot be fetched is shown as it is";
   EXPECT_FALSE(isAsked());
+  // Until it turns out to be no picture.
+  control.OnPictureUnreadable(1);
+  EXPECT_TRUE(isAsked());
   // What is not fetched after all is still owed: in the next listing, of a page that is replaced, or
   // filled while the host's own transfer has the socket.
   const std::function<void()> kInstead[] = {

@@ -34,8 +34,9 @@ class ThumbnailPage : public ControlView {
   virtual void ClearSlot(int slot) = 0;
   // "&&" stands for one "&", as in the caption of any label.
   virtual void SetCaption(int slot, TextView caption) = 0;
-  // Reads the file and shows it at `place`; an unreadable or absurdly large picture leaves the square
-  // empty. Whether there is a picture now.
+  // Reads the file, and shows it at `place` as soon as it is decoded, which takes no time of the caller's.
+  // False when the file cannot be read. One that turns out to be no picture, or an absurdly large one, leaves
+  // the square empty, too, and ThumbnailPageUser hears of it.
   virtual bool SetPicture(int slot, TextView path, const PicturePlace& place) = 0;
   // The look of the selected picture.
   virtual void SetSelected(int slot, bool selected) = 0;

@@ -1,6 +1,6 @@
-// What the window of the thumbnail control tells its rules of the user. All of it raises events or, when the
-// bar moves, fills a page, which pumps messages: the host's code runs inside, which may call the control,
-// destroy its window and release it.
+// What the window of the thumbnail control tells its rules. What the user does raises events or, when the bar
+// moves, fills a page, which pumps messages: the host's code runs inside, which may call the control, destroy
+// its window and release it.
 #pragma once
 
 #include "base/Text.h"
@@ -25,6 +25,9 @@ class ThumbnailPageUser {
   // Enter in the editor; Escape there, or the focus went elsewhere. The editor is shown until HideEditor.
   virtual void OnEditorEntered() = 0;
   virtual void OnEditorLeft() = 0;
+
+  // The picture that the slot waits for cannot be shown. Runs none of the host's code.
+  virtual void OnPictureUnreadable(int slot) = 0;
 };
 
 }  // namespace tarnwick

@@ -218,7 +218,7 @@ bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
   }
   page_.SetCaption(slot, FormatLabelText(record.FileName));
   AddressOf(slot) = record.FilePath;
-  // A picture that cannot be read leaves the caption and an empty square. It may be a file of another kind,
+  // A picture that cannot be shown leaves the caption and an empty square. It may be a file of another kind,
   // or what came in place of the picture or of a part of it, for which the next page with it asks again.
   if (!copy.empty() && FileExists(files, copy) && !ShowPicture(slot, copy))
     copies_.RemoveUnless(copy, record.FileSize);
@@ -256,6 +256,13 @@ bool ctrlThumbNailView::ShowPicture(int slot, const Text& copy) {
     shown = header_.ImageType() != kImageUnknown &&
             page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width()));
   });
+}
+
+// As for a picture that is refused when its page is filled.
+void ctrlThumbNailView::OnPictureUnreadable(int slot) {
+  const CUpload* record = listing_.shown.Find(AddressOf(slot));
+  if (record && !ShowsOtherAccount())
+    copies_.RemoveUnless(copies_.PathOf(record->FilePath), record->FileSize);
 }
 
 void ctrlThumbNailView::TransferEnded() {

@@ -61,6 +61,7 @@ class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
   void OnSwitchView() override;
   void OnEditorEntered() override;
   void OnEditorLeft() override;
+  void OnPictureUnreadable(int slot) override;
   void OnFilesEnter() override;
 
  private:

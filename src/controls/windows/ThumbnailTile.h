@@ -4,14 +4,14 @@
 #include "platform/windows/WindowsHeaders.h"
 
 #include "base/Text.h"
-#include "platform/windows/Owner.h"
+#include "controls/windows/PictureCache.h"
 
 namespace tarnwick {
 
 struct ThumbnailTile {
   Text caption;
-  // As large as it is shown, at `place` in the frame; empty when there is none.
-  BitmapOwner picture;
+  // As large as it is shown, at `place` in the frame; null when there is none.
+  SharedBitmap picture;
   RECT place = {};
   bool selected = false;
 };

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <string>
+#include <utility>
 
 #include "base/RuntimeError.h"
 #include "controls/windows/Drawing.h"
@@ -45,7 +46,10 @@ PaintingOwner Paint(HWND window) {
 }  // namespace
 
 WindowsThumbnailPage::WindowsThumbnailPage(HINSTANCE module, ControlWindowUser& control)
-    : ControlWindow(module, kClassName, control) {}
+    : ControlWindow(module, kClassName, control),
+      workers_(module, [this](const auto& request, BitmapOwner picture) {
+        TakePicture(request, std::move(picture));
+      }) {}
 
 // --- The windows ---
 
@@ -93,7 +97,7 @@ void WindowsThumbnailPage::PlaceChildren() const {
 void WindowsThumbnailPage::DpiChanged(int) {
   PlaceChildren();
   for (Slot& slot : slots_)
-    if (slot.picture) LoadPictureOf(slot);
+    if (slot.picture || slot.awaited) LoadPictureOf(slot);
   PlaceEditor();
 }
 
@@ -214,6 +218,7 @@ void WindowsThumbnailPage::ShowSlot(int slot, bool shown) {
 
 void WindowsThumbnailPage::ClearSlot(int slot) {
   At(slot).picture = {};
+  At(slot).awaited = {};
   SetCaption(slot, {});
 }
 
@@ -236,17 +241,22 @@ bool WindowsThumbnailPage::SetPicture(int slot, TextView path, const PicturePlac
   changed.path = WideFromText(path);
   changed.twips = place;
   changed.picture = {};
-  LoadPictureOf(changed);
-  if (changed.window) {
-    // At once: the next picture may take its time.
-    InvalidateRect(changed.window, nullptr, FALSE);
-    UpdateWindow(changed.window);
-  }
-  return static_cast<bool>(changed.picture);
+  changed.awaited = {};
+  const bool loads = LoadPictureOf(changed);
+  Redraw(changed);
+  return loads;
 }
 
-// A picture that is no longer there to be loaded again stays as it was loaded.
-void WindowsThumbnailPage::LoadPictureOf(Slot& slot) const {
+// At once: the download of the next picture may take its time.
+void WindowsThumbnailPage::Redraw(const Slot& slot) {
+  if (!slot.window) return;
+  InvalidateRect(slot.window, nullptr, FALSE);
+  UpdateWindow(slot.window);
+}
+
+// False when there is no such file. A picture that is no longer there to be loaded again stays as it was
+// loaded.
+bool WindowsThumbnailPage::LoadPictureOf(Slot& slot) {
   const auto pixels = [this](double twips) { return layout::Pixels(twips, Dpi()); };
   const PicturePlace& twips = slot.twips;
   slot.place = {pixels(twips.left), pixels(twips.top), pixels(twips.left + twips.width),
@@ -256,8 +266,39 @@ void WindowsThumbnailPage::LoadPictureOf(Slot& slot) const {
   const int height = std::max<int>(1, slot.place.bottom - slot.place.top);
   slot.place.right = slot.place.left + width;
   slot.place.bottom = slot.place.top + height;
-  if (BitmapOwner picture = LoadPicture(slot.path, width, height, BackColor()))
-    slot.picture = std::move(picture);
+
+  WIN32_FILE_ATTRIBUTE_DATA file = {};
+  if (!GetFileAttributesExW(slot.path.c_str(), GetFileExInfoStandard, &file)) return false;
+  const auto joined = [](DWORD high, DWORD low) { return std::uint64_t{high} << 32 | low; };
+  const auto request = std::make_shared<const PictureRequest>(
+      PictureRequest{slot.path, joined(file.nFileSizeHigh, file.nFileSizeLow),
+                     joined(file.ftLastWriteTime.dwHighDateTime, file.ftLastWriteTime.dwLowDateTime), width,
+                     height, BackColor()});
+  if (const SharedBitmap known = pictures_.Find(*request)) {
+    slot.picture = known;
+    slot.awaited = {};
+    return true;
+  }
+  // Read here and now, in a few milliseconds: as long as a worker had the file open, it could not be
+  // replaced, and a rename meanwhile would take it away.
+  PictureFile bytes = ReadPictureFile(slot.path);
+  if (!bytes || !workers_.Start(request, std::move(bytes))) return false;
+  slot.awaited = request;
+  return true;
+}
+
+void WindowsThumbnailPage::TakePicture(const std::shared_ptr<const PictureRequest>& request,
+                                       BitmapOwner picture) {
+  const auto slot = std::ranges::find(slots_, request, &Slot::awaited);
+  if (slot == slots_.end()) return;
+  slot->awaited = {};
+  if (picture) {
+    slot->picture = std::make_shared<const BitmapOwner>(std::move(picture));
+    pictures_.Keep(*request, slot->picture);
+    Redraw(*slot);
+  } else if (!slot->picture) {
+    user_->OnPictureUnreadable(static_cast<int>(slot - slots_.begin()) + 1);
+  }
 }
 
 void WindowsThumbnailPage::SetSelected(int slot, bool selected) {
@@ -424,7 +465,7 @@ LRESULT WindowsThumbnailPage::OnPress(HWND window, UINT message, POINT at) {
     return 0;
   }
   // Before the host's code runs, which may wait until the button is up again.
-  if (left && At(slot).picture && PtInRect(&At(slot).place, at)) {
+  if (left && (At(slot).picture || At(slot).awaited) && PtInRect(&At(slot).place, at)) {
     SetCapture(window);
     dragFrom_ = at;
   }
@@ -531,7 +572,8 @@ void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
   if (focus) DrawFocus(dc, area);
 }
 
-void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) const {
+void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) {
+  workers_.Finish();
   const SavedDcOwner saved = SaveStateOf(dc);
   IntersectClipRect(dc, bounds.left, bounds.top, bounds.right, bounds.bottom);
   Fill(dc, bounds, BackColor());

@@ -6,13 +6,15 @@
 #include "platform/windows/WindowsHeaders.h"
 
 #include <array>
+#include <memory>
 #include <optional>
 
 #include "controls/thumbnailview/ThumbnailPage.h"
 #include "controls/thumbnailview/ThumbnailPageUser.h"
 #include "controls/windows/ControlWindow.h"
 #include "controls/windows/PageScrollBar.h"
-#include "controls/windows/PictureLoader.h"
+#include "controls/windows/PictureCache.h"
+#include "controls/windows/PictureWorkers.h"
 #include "controls/windows/ThumbnailLayout.h"
 #include "controls/windows/ThumbnailTile.h"
 #include "platform/windows/Owner.h"
@@ -32,8 +34,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void SetUser(ThumbnailPageUser& user) { user_ = &user; }
 
   // Draws the page as the window would show it, into `bounds` in pixels of the screen, which `dc` may map to
-  // others.
-  void Draw(HDC dc, const RECT& bounds) const;
+  // others. Waits for the pictures, because nobody draws it again when they are there.
+  void Draw(HDC dc, const RECT& bounds);
   // Moves the keyboard focus to the next stop inside the control, or to the one before; false at the end,
   // when it is the container's turn.
   bool MoveFocus(bool backward);
@@ -63,6 +65,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
     // Where the picture comes from and goes to.
     std::wstring path;
     PicturePlace twips;
+    // The picture that a worker decodes for the slot; null when there is none.
+    std::shared_ptr<const PictureRequest> awaited;
     bool shown = true;
   };
   enum class Content { kNothing, kGrid, kEmptyAccount };
@@ -85,7 +89,9 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   int SlotOf(HWND window) const;
   HWND FirstStop() const;
   void PlaceChildren() const;
-  void LoadPictureOf(Slot& slot) const;
+  bool LoadPictureOf(Slot& slot);
+  void TakePicture(const std::shared_ptr<const PictureRequest>& request, BitmapOwner picture);
+  static void Redraw(const Slot& slot);
   void PlaceEditor() const;
   void ApplyContent() const;
   void ApplyCaption(int slot);
@@ -99,6 +105,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
 
   ThumbnailPageUser* user_ = nullptr;
   std::array<Slot, kSlotCount> slots_;
+  PictureCache pictures_;
+  PictureWorkers workers_;
   Content content_ = Content::kNothing;
   Text message_;
   Text link_;

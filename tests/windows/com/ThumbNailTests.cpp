@@ -52,17 +52,21 @@ Lines Account() {
 }
 constexpr int kSide = 131;  // of a slot's picture, at 96 dots per inch
 
-// The square of a slot's picture on the screen; empty when it shows nothing.
-Pixels Picture(const ThumbForm& form, int slot) {
-  UpdateWindow(form.Slot(slot));
-  Pixels pixels = Drawn(kSide, kSide, [&](HDC dc) {
-    const RECT square = layout::Pixels(layout::kPicture, 96);
-    const HDC window = GetDC(form.Slot(slot));
-    BitBlt(dc, 0, 0, kSide, kSide, window, square.left, square.top, SRCCOPY);
-    ReleaseDC(form.Slot(slot), window);
-  });
-  if (std::count(pixels.begin(), pixels.end(), pixels[0]) == kSide * kSide) pixels.clear();
-  return pixels;
+// The square of a slot's picture on the screen, for which it waits; empty when none comes.
+Pixels Picture(ThumbForm& form, int slot) {
+  for (int i = 0; i < 500; ++i) {
+    form.Pump();
+    UpdateWindow(form.Slot(slot));
+    Pixels pixels = Drawn(kSide, kSide, [&](HDC dc) {
+      const RECT square = layout::Pixels(layout::kPicture, 96);
+      const HDC window = GetDC(form.Slot(slot));
+      BitBlt(dc, 0, 0, kSide, kSide, window, square.left, square.top, SRCCOPY);
+      ReleaseDC(form.Slot(slot), window);
+    });
+    if (std::count(pixels.begin(), pixels.end(), pixels[0]) != kSide * kSide) return pixels;
+    Sleep(10);
+  }
+  return {};
 }
 
 void Scroll(const ThumbForm& form, int code, int position = 0) {

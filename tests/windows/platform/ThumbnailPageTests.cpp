@@ -37,6 +37,7 @@ class ScriptedUser : public ThumbnailPageUser, public ControlWindowUser {
   void OnSwitchView() override { Tell("switch"); }
   void OnEditorEntered() override { Tell("entered"); }
   void OnEditorLeft() override { Tell("left"); }
+  void OnPictureUnreadable(int slot) override { Tell("unreadable " + std::to_string(slot)); }
   void DragBegins() override { Tell("drag"); }
   void FocusLeft() override {
     if (tellsFocus) Tell("focus left");
@@ -112,13 +113,22 @@ bool Overlap(const RECT& one, const RECT& other) {
 // A picture of one colour, in the temporary folder.
 class PictureFile {
  public:
-  explicit PictureFile(COLORREF color) {
+  PictureFile(const wchar_t* name, COLORREF color) {
     wchar_t folder[MAX_PATH] = {};
     GetTempPathW(MAX_PATH, folder);
-    path_ = std::wstring(folder) + L"thumbnail-test.bmp";
+    path_ = std::wstring(folder) + name;
+    Write(color, 1);
+  }
+  ~PictureFile() { DeleteFileW(path_.c_str()); }
+  PictureFile(const PictureFile&) = delete;
+  PictureFile& operator=(const PictureFile&) = delete;
+  Text Path() const { return TextFromWide(path_); }
+
+  // A file of one pixel, whatever height it claims.
+  void Write(COLORREF color, unsigned char height) const {
     // File header, information header, one pixel of 24 bits and its padding.
-    unsigned char bytes[58] = {'B', 'M', 58, 0, 0, 0, 0, 0, 0, 0, 54, 0, 0, 0,  40,
-                               0,   0,   0,  1, 0, 0, 0, 1, 0, 0, 0,  1, 0, 24, 0};
+    unsigned char bytes[58] = {'B', 'M', 58, 0, 0, 0, 0, 0,      0, 0, 54, 0, 0, 0,  40,
+                               0,   0,   0,  1, 0, 0, 0, height, 0, 0, 0,  1, 0, 24, 0};
     bytes[54] = GetBValue(color);
     bytes[55] = GetGValue(color);
     bytes[56] = GetRValue(color);
@@ -126,10 +136,6 @@ class PictureFile {
     DWORD written = 0;
     WriteFile(file.Get(), bytes, sizeof bytes, &written, nullptr);
   }
-  ~PictureFile() { DeleteFileW(path_.c_str()); }
-  PictureFile(const PictureFile&) = delete;
-  PictureFile& operator=(const PictureFile&) = delete;
-  Text Path() const { return TextFromWide(path_); }
 
  private:
   std::wstring path_;
@@ -193,7 +199,22 @@ class ThumbnailPageTest : public testing::Test {
   }
   static LPARAM At(int x, int y) { return MAKELPARAM(x, y); }
 
-  PictureFile file_{RGB(200, 30, 90)};
+  // The middle of a slot on the screen.
+  COLORREF Seen(int slot) const {
+    const int middle = layout::Pixels(1130, SystemDpi());
+    const WindowDcOwner dc = DcOf(Slot(slot));
+    return GetPixel(dc.Get().dc, middle, middle);
+  }
+  // Lets the window live until `happened`.
+  static void Await(const std::function<bool()>& happened) {
+    for (int i = 0; i < 500 && !happened(); ++i) {
+      MsgWaitForMultipleObjects(0, nullptr, FALSE, 10, QS_ALLINPUT);
+      Pump();
+    }
+    EXPECT_TRUE(happened());
+  }
+
+  PictureFile file_{L"thumbnail-test.bmp", RGB(200, 30, 90)};
   ScriptedUser user_;
   HWND top_ = nullptr;
   HWND other_ = nullptr;
@@ -288,6 +309,46 @@ TEST_F(ThumbnailPageTest, DrawsPicturesSelectionAndCaptions) {
   EXPECT_EQ(pixel(2, 1130, 1160), window);
   SelectObject(dc, old);
   DeleteDC(dc);
+}
+
+TEST_F(ThumbnailPageTest, DrawsAPictureWhenItIsDecoded) {
+  const COLORREF window = GetSysColor(COLOR_WINDOW);
+  const COLORREF green = RGB(20, 180, 60);
+  const COLORREF blue = RGB(20, 60, 180);
+  const PictureFile other(L"thumbnail-other.bmp", green);
+  const auto show = [&](int slot) { return page_->SetPicture(slot, other.Path(), kWholeSquare); };
+  EXPECT_TRUE(show(1));
+  EXPECT_EQ(Seen(1), window) << "a message draws it, so nobody has waited for it";
+  Await([&] { return Seen(1) == green; });
+
+  // A picture that comes back is there at once, as long as its file is the same.
+  page_->ClearSlot(1);
+  show(2);
+  EXPECT_EQ(Seen(2), green);
+  other.Write(blue, 1);
+  show(2);
+  EXPECT_EQ(Seen(2), window);
+  Await([&] { return Seen(2) == blue; });
+
+  // What turns out to be no picture is told, unless its page was left by then.
+  other.Write(blue, 2);
+  for (const int slot : {3, 1}) EXPECT_TRUE(show(slot));
+  page_->SetPicture(3, file_.Path(), kWholeSquare);
+  EXPECT_EQ(user_.Take(), Told{});
+  Await([&] { return !user_.told.empty() && Seen(3) != window; });
+  EXPECT_EQ(user_.Take(), Told{"unreadable 1"});
+  EXPECT_EQ(Seen(1), window);
+}
+
+TEST_F(ThumbnailPageTest, APictureThatWasLeftIsNotDrawn) {
+  const PictureFile left(L"thumbnail-left.bmp", RGB(20, 180, 60));
+  for (const int slot : {1, 2, 4}) {
+    page_->SetPicture(slot, left.Path(), kWholeSquare);
+    page_->ClearSlot(slot);
+  }
+  page_->SetPicture(2, file_.Path(), kWholeSquare);
+  Await([&] { return Seen(2) == RGB(200, 30, 90) && Seen(3) == RGB(200, 30, 90); });
+  for (const int slot : {1, 4}) EXPECT_EQ(Seen(slot), GetSysColor(COLOR_WINDOW));
 }
 
 // --- What it tells ---
@@ -510,6 +571,8 @@ TEST_F(ThumbnailPageTest, ShowsTheSameInANewWindow) {
   EXPECT_FALSE(IsWindowVisible(Slot(3)));
   EXPECT_EQ(GetScrollPos(ScrollBar(), SB_CTL), 4);
   EXPECT_EQ(NameOf(Link()), L"Click here");
+  // Its pictures were on their way when the window ended.
+  Await([&] { return Seen(2) == RGB(200, 30, 90); });
 }
 
 // --- The scroll bar's hook ---

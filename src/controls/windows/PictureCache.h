@@ -1,0 +1,34 @@
+// Pictures as they were shown, so that a page that comes back costs nothing.
+#pragma once
+
+#include "platform/windows/WindowsHeaders.h"
+
+#include <cstddef>
+#include <list>
+#include <memory>
+
+#include "controls/windows/PictureWorkers.h"
+#include "platform/windows/Owner.h"
+
+namespace tarnwick {
+
+using SharedBitmap = std::shared_ptr<const BitmapOwner>;
+
+class PictureCache {
+ public:
+  // Null when it is not there.
+  SharedBitmap Find(const PictureRequest& request);
+  // Keeps a picture as long as there is room for it; what was not used for the longest time goes first.
+  void Keep(const PictureRequest& request, const SharedBitmap& picture);
+
+ private:
+  struct Entry {
+    PictureRequest request;
+    SharedBitmap picture;
+  };
+  // What was used last is in front. Some hundred entries at most, which are compared faster than drawn.
+  std::list<Entry> entries_;
+  std::size_t bytes_ = 0;
+};
+
+}  // namespace tarnwick

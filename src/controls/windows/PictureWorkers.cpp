@@ -1,0 +1,148 @@
+#include "controls/windows/PictureWorkers.h"
+
+#include <objbase.h>
+
+#include <algorithm>
+#include <list>
+#include <mutex>
+#include <utility>
+
+namespace tarnwick {
+namespace {
+
+constexpr UINT kDecoded = WM_APP;
+
+// What each of them decodes may take a quarter of a gigabyte.
+constexpr DWORD kMostWorkers = 4;
+
+DWORD MostWorkers() {
+  SYSTEM_INFO system = {};
+  GetSystemInfo(&system);
+  return std::clamp<DWORD>(system.dwNumberOfProcessors, 1, kMostWorkers);
+}
+
+struct Job {
+  std::weak_ptr<const PictureRequest> request;
+  PictureFile file;
+  int width;
+  int height;
+  COLORREF background;
+  BitmapOwner picture;
+};
+
+}  // namespace
+
+struct PictureWorkers::Shared {
+  // Not held while anything is decoded.
+  std::mutex lock;
+  // Jobs move from one list to the other, which takes no memory and cannot fail.
+  std::list<Job> waiting;
+  std::list<Job> decoded;
+  DWORD running = 0;
+  // Gets a message for each picture that is decoded; null when nobody takes them any more.
+  HWND window = nullptr;
+  // Set when a worker ends.
+  HandleOwner ended{CreateEventW(nullptr, FALSE, FALSE, nullptr)};
+
+  void Work();
+  static void CALLBACK Run(PTP_CALLBACK_INSTANCE instance, void* context);
+};
+
+// Decodes until nothing waits. The caller has counted itself as running.
+void PictureWorkers::Shared::Work() {
+  for (;;) {
+    std::list<Job> current;
+    {
+      const std::lock_guard guard(lock);
+      if (waiting.empty()) {
+        --running;
+        break;
+      }
+      current.splice(current.begin(), waiting, waiting.begin());
+    }
+    Job& job = current.front();
+    job.picture = DecodePicture(std::move(job.file), job.width, job.height, job.background,
+                                [&] { return !job.request.expired(); });
+    const std::lock_guard guard(lock);
+    decoded.splice(decoded.end(), current);
+    if (window) PostMessageW(window, kDecoded, 0, 0);
+  }
+  SetEvent(ended.Get());
+}
+
+void CALLBACK PictureWorkers::Shared::Run(PTP_CALLBACK_INSTANCE, void* context) {
+  const std::unique_ptr<std::shared_ptr<Shared>> shared(static_cast<std::shared_ptr<Shared>*>(context));
+  const bool com = SUCCEEDED(CoInitializeEx(nullptr, COINIT_MULTITHREADED));
+  (*shared)->Work();
+  if (com) CoUninitialize();
+}
+
+PictureWorkers::PictureWorkers(HINSTANCE module, Taker taker)
+    : module_(module),
+      taker_(std::move(taker)),
+      shared_(std::make_shared<Shared>()),
+      window_([this](UINT message, WPARAM, LPARAM) {
+        if (message != kDecoded) return false;
+        Take();
+        return true;
+      }) {}
+
+PictureWorkers::~PictureWorkers() {
+  std::list<Job> dropped;
+  const std::lock_guard guard(shared_->lock);
+  dropped.swap(shared_->waiting);
+  shared_->window = nullptr;
+}
+
+bool PictureWorkers::Start(const std::shared_ptr<const PictureRequest>& request, PictureFile file) {
+  static const DWORD mostWorkers = MostWorkers();
+  const HWND window = window_.Get();
+  if (!window) return false;
+  std::list<Job> job;
+  job.push_back({request, std::move(file), request->width, request->height, request->background, {}});
+  auto share = std::make_unique<std::shared_ptr<Shared>>(shared_);
+  const std::lock_guard guard(shared_->lock);
+  shared_->window = window;
+  if (shared_->running < mostWorkers) {
+    TP_CALLBACK_ENVIRON environment;
+    InitializeThreadpoolEnvironment(&environment);
+    SetThreadpoolCallbackRunsLong(&environment);
+    SetThreadpoolCallbackLibrary(&environment, module_);
+    if (TrySubmitThreadpoolCallback(Shared::Run, share.get(), &environment)) {
+      static_cast<void>(share.release());
+      ++shared_->running;
+    }
+    DestroyThreadpoolEnvironment(&environment);
+  }
+  if (shared_->running == 0) return false;
+  shared_->waiting.splice(shared_->waiting.end(), job);
+  return true;
+}
+
+void PictureWorkers::Finish() {
+  const auto isBusy = [this] {
+    const std::lock_guard guard(shared_->lock);
+    return shared_->running > 0;
+  };
+  if (isBusy()) {
+    {
+      const std::lock_guard guard(shared_->lock);
+      ++shared_->running;
+    }
+    shared_->Work();
+    while (isBusy()) WaitForSingleObject(shared_->ended.Get(), INFINITE);
+  }
+  Take();
+}
+
+void PictureWorkers::Take() {
+  std::list<Job> decoded;
+  {
+    const std::lock_guard guard(shared_->lock);
+    decoded.swap(shared_->decoded);
+  }
+  for (Job& job : decoded)
+    if (const auto request = job.request.lock()) taker_(request, std::move(job.picture));
+}
+
+}  // namespace tarnwick
