@@ -103,6 +103,8 @@ bool PictureWorkers::Start(const std::shared_ptr<const PictureRequest>& request,
   auto share = std::make_unique<std::shared_ptr<Shared>>(shared_);
   const std::lock_guard guard(shared_->lock);
   shared_->window = window;
+  // Whoever leafs quickly must not fill the memory.
+  shared_->waiting.remove_if([](const Job& other) { return other.request.expired(); });
   if (shared_->running < mostWorkers) {
     TP_CALLBACK_ENVIRON environment;
     InitializeThreadpoolEnvironment(&environment);

@@ -210,6 +210,9 @@ TEST_F(PictureLoaderTest, ABrokenFileIsNotShown) {
   path_ = L"C:\\windows";
   EXPECT_TRUE(ShownFile(2, 2).empty()) << "a folder";
   path_ = file;
+  int asked = 0;
+  EXPECT_FALSE(DecodePicture(ReadPictureFile(path_), 2, 2, kBackground, [&] { return ++asked < 2; }))
+      << "given up on the way";
 }
 
 // A few bytes that say how large the picture is are not believed.
