@@ -195,24 +195,76 @@ const GUID& Container(PictureFormat format) {
   return GUID_ContainerFormatBmp;
 }
 
+// The bytes of a file for a decoder. Reading fails once the picture is not wanted any more, which ends the
+// decoding: some decoders do all of it in one call. Lives on the stack, longer than the decoder.
+class FileStream final : public IStream {
+ public:
+  FileStream(std::span<const std::uint8_t> bytes, const std::function<bool()>& isWanted)
+      : bytes_(bytes), isWanted_(isWanted) {}
+
+  STDMETHODIMP QueryInterface(REFIID id, void** object) override {
+    const bool known = id == IID_IUnknown || id == IID_ISequentialStream || id == IID_IStream;
+    *object = known ? this : nullptr;
+    return known ? S_OK : E_NOINTERFACE;
+  }
+  STDMETHODIMP_(ULONG) AddRef() override { return 1; }
+  STDMETHODIMP_(ULONG) Release() override { return 1; }
+
+  STDMETHODIMP Read(void* room, ULONG most, ULONG* count) override {
+    if (!isWanted_()) return E_ABORT;
+    const std::size_t size = std::min<std::size_t>(most, bytes_.size() - at_);
+    std::copy_n(bytes_.data() + at_, size, static_cast<std::uint8_t*>(room));
+    at_ += size;
+    if (count) *count = static_cast<ULONG>(size);
+    return S_OK;
+  }
+  STDMETHODIMP Seek(LARGE_INTEGER distance, DWORD origin, ULARGE_INTEGER* position) override {
+    const std::size_t from = origin == STREAM_SEEK_CUR ? at_ : origin == STREAM_SEEK_END ? bytes_.size() : 0;
+    const std::int64_t to = static_cast<std::int64_t>(from) + distance.QuadPart;
+    if (to < 0 || to > static_cast<std::int64_t>(bytes_.size())) return STG_E_INVALIDFUNCTION;
+    at_ = static_cast<std::size_t>(to);
+    if (position) position->QuadPart = at_;
+    return S_OK;
+  }
+  STDMETHODIMP Stat(STATSTG* facts, DWORD) override {
+    *facts = {};
+    facts->type = STGTY_STREAM;
+    facts->cbSize.QuadPart = bytes_.size();
+    return S_OK;
+  }
+
+  // Nothing that reads a picture needs these.
+  STDMETHODIMP Write(const void*, ULONG, ULONG*) override { return E_NOTIMPL; }
+  STDMETHODIMP SetSize(ULARGE_INTEGER) override { return E_NOTIMPL; }
+  STDMETHODIMP CopyTo(IStream*, ULARGE_INTEGER, ULARGE_INTEGER*, ULARGE_INTEGER*) override {
+    return E_NOTIMPL;
+  }
+  STDMETHODIMP Commit(DWORD) override { return E_NOTIMPL; }
+  STDMETHODIMP Revert() override { return E_NOTIMPL; }
+  STDMETHODIMP LockRegion(ULARGE_INTEGER, ULARGE_INTEGER, DWORD) override { return E_NOTIMPL; }
+  STDMETHODIMP UnlockRegion(ULARGE_INTEGER, ULARGE_INTEGER, DWORD) override { return E_NOTIMPL; }
+  STDMETHODIMP Clone(IStream**) override { return E_NOTIMPL; }
+
+ private:
+  const std::span<const std::uint8_t> bytes_;
+  const std::function<bool()>& isWanted_;
+  std::size_t at_ = 0;
+};
+
 struct Source {
   ComPtr<IWICBitmapSource> pixels;
   Layout layout = Layout::kBgra;
 };
 
 // The first picture, in a layout that the averager knows: the decoder's own where that is one of them.
-std::optional<Source> OpenSource(IWICImagingFactory& factory, std::span<std::uint8_t> file,
-                                 const PictureFacts& facts) {
-  ComPtr<IWICStream> stream;
+std::optional<Source> OpenSource(IWICImagingFactory& factory, IStream& stream, const PictureFacts& facts) {
   ComPtr<IWICBitmapDecoder> decoder;
   ComPtr<IWICBitmapFrameDecode> frame;
   UINT width = 0;
   UINT height = 0;
   WICPixelFormatGUID format = {};
-  if (FAILED(factory.CreateStream(stream.Receive())) ||
-      FAILED(stream->InitializeFromMemory(file.data(), static_cast<DWORD>(facts.length))) ||
-      FAILED(factory.CreateDecoder(Container(facts.format), nullptr, decoder.Receive())) ||
-      FAILED(decoder->Initialize(stream.Get(), WICDecodeMetadataCacheOnDemand)) ||
+  if (FAILED(factory.CreateDecoder(Container(facts.format), nullptr, decoder.Receive())) ||
+      FAILED(decoder->Initialize(&stream, WICDecodeMetadataCacheOnDemand)) ||
       FAILED(decoder->GetFrame(0, frame.Receive())) || FAILED(frame->GetSize(&width, &height)) ||
       FAILED(frame->GetPixelFormat(&format)))
     return {};
@@ -235,10 +287,8 @@ std::optional<Source> OpenSource(IWICImagingFactory& factory, std::span<std::uin
   return Source{ComPtr<IWICBitmapSource>(converter.Get()), opaque ? Layout::kBgr : Layout::kBgra};
 }
 
-// Gives all lines of the picture to `averager`; false when one cannot be decoded, or the picture is not
-// wanted any more.
-bool AddLines(const Source& source, const PictureFacts& facts, Averager& averager,
-              const std::function<bool()>& isWanted) {
+// Gives all lines of the picture to `averager`; false when one cannot be decoded.
+bool AddLines(const Source& source, const PictureFacts& facts, Averager& averager) {
   const std::size_t stride = std::size_t{facts.width} * BytesPerPixel(source.layout);
   const auto stripLines = static_cast<std::uint32_t>(
       std::clamp<std::size_t>(kStripBytes / stride, 1, std::size_t{facts.frameHeight}));
@@ -252,8 +302,7 @@ bool AddLines(const Source& source, const PictureFacts& facts, Averager& average
     const std::uint32_t lines = std::min(stripLines, facts.frameHeight - y);
     const WICRect part = {0, static_cast<INT>(y), static_cast<INT>(facts.frameWidth),
                           static_cast<INT>(lines)};
-    if (!isWanted() ||
-        FAILED(source.pixels->CopyPixels(&part, static_cast<UINT>(stride),
+    if (FAILED(source.pixels->CopyPixels(&part, static_cast<UINT>(stride),
                                          static_cast<UINT>(lines * stride - indent), strip.data() + indent)))
       return false;
     for (std::uint32_t line = 0; line < lines; ++line) averager.Add(strip.data() + line * stride);
@@ -291,7 +340,8 @@ BitmapOwner Decode(const PictureFile& file, int width, int height, COLORREF back
   if (FAILED(CoCreateInstance(CLSID_WICImagingFactory, nullptr, CLSCTX_INPROC_SERVER,
                               __uuidof(IWICImagingFactory), factory.ReceiveVoid())))
     return {};
-  const std::optional<Source> source = OpenSource(*factory, bytes, *facts);
+  FileStream stream(bytes.first(facts->length), isWanted);
+  const std::optional<Source> source = OpenSource(*factory, stream, *facts);
   if (!source) return {};
 
   BITMAPINFO info = {};
@@ -306,7 +356,7 @@ BitmapOwner Decode(const PictureFile& file, int width, int height, COLORREF back
   Averager averager(facts->width, facts->height, static_cast<std::uint32_t>(width),
                     static_cast<std::uint32_t>(height), source->layout, background,
                     static_cast<std::uint32_t*>(pixels));
-  if (!AddLines(*source, *facts, averager, isWanted)) return {};
+  if (!AddLines(*source, *facts, averager)) return {};
   return bitmap;
 }
 
