@@ -24,12 +24,14 @@ struct Actions : DownloadActions {
   void CloseSocket() override {}
   void RestartWatchdog() override {}
   void StopWatchdog() override {}
-  bool WriteFile(TextView target, TextView, std::string_view bytes) override {
+  void BeginFile(TextView target, TextView) override { path = target; }
+  void WriteFile(std::string_view bytes) override { body += bytes; }
+  bool FinishFile(std::string_view rest) override {
     written = true;
-    path = target;
-    body = bytes;
+    body += rest;
     return true;
   }
+  void DropFile() override { body.clear(); }
   void Received(std::int32_t bytes) override {
     if (bytes < 0) std::abort();
   }
@@ -68,10 +70,11 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
     std::string_view piece = take();
     sent.append(piece);
     while (!piece.empty()) {
-      const std::span<char> room = machine.Room(piece.size());
+      const std::span<char> room = machine.Room();
       if (room.empty()) break;
-      machine.OnArrived(piece.copy(room.data(), room.size()));
-      piece.remove_prefix(room.size());
+      const std::size_t count = piece.copy(room.data(), room.size());
+      machine.OnArrived(count);
+      piece.remove_prefix(count);
     }
   }
   if (end & 1) machine.OnSocketError();

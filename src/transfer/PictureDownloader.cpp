@@ -12,11 +12,8 @@
 namespace tarnwick {
 namespace {
 
-// A host hears of each arrival.
-constexpr std::size_t kMostOfArrival = std::size_t{4} << 20;
-
-// Bytes of a file that are compared at a time.
-constexpr std::size_t kCompared = std::size_t{256} << 10;
+// Bytes of a file that are compared or copied at a time.
+constexpr std::size_t kBlock = std::size_t{256} << 10;
 
 // Winsock's numbers.
 constexpr std::int32_t kWinsockReset = 10054;
@@ -68,13 +65,22 @@ bool Holds(FileSystem& files, TextView path, std::string_view bytes) {
   return ResultAsItStood(false, [&](bool& same) {
     if (files.Length(path) != bytes.size()) return;
     const std::unique_ptr<FileReader> reader = files.Open(path);
-    std::string block(std::min(bytes.size(), kCompared), '\0');
+    std::string block(std::min(bytes.size(), kBlock), '\0');
     for (; !bytes.empty(); bytes.remove_prefix(block.size())) {
-      block.resize(std::min(bytes.size(), kCompared));
+      block.resize(std::min(bytes.size(), kBlock));
       if (reader->Read(block) != block.size() || bytes.substr(0, block.size()) != block) return;
     }
     same = true;
   });
+}
+
+// Not with the system's copy, which writes by name: what that leaves when the process is killed stays.
+void Copy(FileSystem& files, TextView from, TextView to) {
+  const std::unique_ptr<FileReader> reader = files.Open(from);
+  const std::unique_ptr<FileWriter> writer = files.Create(to);
+  std::string block(kBlock, '\0');
+  while (const std::size_t count = reader->Read(block)) writer->Write({block.data(), count});
+  writer->Commit();
 }
 
 }  // namespace
@@ -138,7 +144,7 @@ void PictureDownloader::OnConnected() {
 
 void PictureDownloader::OnReadable() {
   if (GivesUp()) return;
-  const std::span<char> room = machine_.Room(kMostOfArrival);
+  const std::span<char> room = machine_.Room();
   if (!room.empty()) machine_.OnArrived(socket_.Read(room));
 }
 
@@ -151,23 +157,45 @@ void PictureDownloader::OnSocketError(std::int32_t number) {
   machine_.OnSocketError();
 }
 
-bool PictureDownloader::WriteFile(TextView path, TextView explicitPath, std::string_view bytes) {
+void PictureDownloader::BeginFile(TextView path, TextView explicitPath) {
+  path_ = path;
+  explicitPath_ = explicitPath;
+  large_ = false;
+  writer_ = ResultAsItStood(std::unique_ptr<FileWriter>(), [&](std::unique_ptr<FileWriter>& writer) {
+    writer = apartment_.platform.files.Create(explicitPath.empty() ? path : explicitPath);
+  });
+}
+
+void PictureDownloader::WriteFile(std::string_view bytes) {
+  large_ = true;
+  const bool written = ResultAsItStood(false, [&](bool& done) {
+    if (writer_) writer_->Write(bytes);
+    done = true;
+  });
+  if (!written) writer_.reset();
+}
+
+bool PictureDownloader::FinishFile(std::string_view rest) {
+  std::unique_ptr<FileWriter> writer = std::move(writer_);
   return ResultAsItStood(false, [&](bool& written) {
+    if (!writer) return;
     FileSystem& files = apartment_.platform.files;
-    // An upload, a rename or a delete has come before these bytes, which are not the file's any more.
-    const bool overtaken = apartment_.ChangesOfCopy(path) != changes_;
-    if (!explicitPath.empty()) {
-      // The target may be the copy itself.
-      if (overtaken && (LowerCase(explicitPath) == LowerCase(path) || files.SameFile(explicitPath, path)))
-        return;
-      files.Write(explicitPath, bytes);
-      written = true;
-    }
-    if (overtaken) return;
+    // An upload, a rename or a delete has come before these bytes, which are not the file's any more. The
+    // target may be the copy itself.
+    const bool overtaken = apartment_.ChangesOfCopy(path_) != changes_;
+    if (overtaken && (explicitPath_.empty() || LowerCase(explicitPath_) == LowerCase(path_) ||
+                      files.SameFile(explicitPath_, path_)))
+      return;
+    writer->Write(rest);
+    writer->Commit();
+    // It holds the file.
+    writer.reset();
+    written = true;
+    if (overtaken || explicitPath_.empty() || explicitPath_ == path_) return;
+    if (large_) return Copy(files, explicitPath_, path_);
     // Not copied from the other one: the bytes are here. Most often the picture has been shown before, and
     // the user's folder has it.
-    if (explicitPath != path && !Holds(files, path, bytes)) files.Write(path, bytes);
-    written = true;
+    if (!Holds(files, path_, rest)) files.Write(path_, rest);
   });
 }
 

@@ -1,6 +1,9 @@
 // A control's downloader: ties the machine to a socket, the watchdog and the local files.
 #pragma once
 
+#include <memory>
+
+#include "platform/FileSystem.h"
 #include "platform/StreamSocket.h"
 #include "platform/Timer.h"
 #include "session/Apartment.h"
@@ -33,7 +36,10 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   void Connect(TextView host, std::uint16_t port) override;
   void Send(std::string_view bytes) override { socket_.Send(bytes); }
   void CloseSocket() override { socket_.Close(); }
-  bool WriteFile(TextView path, TextView explicitPath, std::string_view bytes) override;
+  void BeginFile(TextView path, TextView explicitPath) override;
+  void WriteFile(std::string_view bytes) override;
+  bool FinishFile(std::string_view rest) override;
+  void DropFile() override { writer_.reset(); }
   void Received(std::int32_t bytes) override;
   void HeaderFound(std::string_view statusLine, std::int32_t bytes) override;
   void Finished(bool written) override;
@@ -56,6 +62,13 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   std::int32_t socketError_ = 0;
   // How often the local copy that is fetched had changed before: see Apartment::copyChanges.
   std::uint32_t changes_ = 0;
+  // Where the file that is fetched goes: see DownloadActions.
+  Text path_;
+  Text explicitPath_;
+  // Of the first of them; null when it cannot be written.
+  std::unique_ptr<FileWriter> writer_;
+  // Whether a part of it was written, so that it is not in memory any more.
+  bool large_ = false;
 };
 
 }  // namespace tarnwick

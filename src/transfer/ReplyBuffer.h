@@ -1,5 +1,5 @@
-// What has arrived of a reply: bytes that are written where they stay, so that a large one is neither copied
-// nor cleared on its way.
+// What has arrived of a reply and is still wanted: bytes that are put where they stay, so that they are
+// neither copied nor cleared on their way.
 #pragma once
 
 #include <algorithm>
@@ -16,13 +16,15 @@ class ReplyBuffer {
   std::string_view Bytes() const { return {bytes_.get(), size_}; }
   std::size_t Size() const { return size_; }
 
-  // Where the next bytes go: at least one and at most `most`. Throws std::bad_alloc; what is there stays.
-  std::span<char> Room(std::size_t most) {
+  // Where the next bytes go: at least one. Throws std::bad_alloc; what is there stays.
+  std::span<char> Room() {
     if (size_ == capacity_) Reserve(std::max(kFirstRoom, 2 * capacity_));
-    return {bytes_.get() + size_, std::min(most, capacity_ - size_)};
+    return {bytes_.get() + size_, capacity_ - size_};
   }
   // So many bytes were put into the room.
   void Add(std::size_t count) { size_ += count; }
+  // Forgets the bytes and keeps the room.
+  void Clear() { size_ = 0; }
 
   // Room for so many bytes in all. Throws like Room.
   void Reserve(std::size_t capacity) {

@@ -16,6 +16,12 @@ namespace {
 constexpr TextView kScheme = u"http://";
 constexpr std::string_view kHeaderEnd = "\r\n\r\n";
 
+// Bytes from which on a piece of the body is written: what is less stays in memory until more comes.
+constexpr std::size_t kPiece = std::size_t{256} << 10;
+
+// Room for what arrives at a time, if the file is that long.
+constexpr std::size_t kMostRoom = std::size_t{1} << 20;
+
 // A request target with blanks as %20; other characters go out as their UTF-8 bytes.
 std::string TargetBytes(TextView path) {
   return Utf8FromText(ReplaceAll(path, u" ", u"%20"));
@@ -60,7 +66,7 @@ void SocketDownloader::StartDownload(TextView url, TextView folder, TextView exp
   if (url.empty()) return;
   Cancel();
   reply_ = {};
-  searched_ = bodyStart_ = 0;
+  searched_ = bodyStart_ = unwritten_ = received_ = 0;
   contentLength_ = 0;
   headerFound_ = false;
   running_ = true;
@@ -73,10 +79,15 @@ void SocketDownloader::StartDownload(TextView url, TextView folder, TextView exp
 
 void SocketDownloader::Cancel() {
   if (!running_) return;
-  running_ = false;
-  reply_ = {};
+  Stop();
   actions_.CloseSocket();
   actions_.StopWatchdog();
+}
+
+void SocketDownloader::Stop() {
+  running_ = false;
+  reply_ = {};
+  actions_.DropFile();
 }
 
 void SocketDownloader::OnConnected() {
@@ -85,12 +96,14 @@ void SocketDownloader::OnConnected() {
                 " HTTP/1.1\r\nHost: " + Utf8FromText(plan_.hostLine) +
                 "\r\nConnection: close\r\nAccept: */*\r\n"
                 "User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n\r\n");
+  // While the server works.
+  actions_.BeginFile(plan_.file, explicitTarget_);
 }
 
-std::span<char> SocketDownloader::Room(std::size_t most) {
+std::span<char> SocketDownloader::Room() {
   if (!running_) return {};
   try {
-    return reply_.Room(most);
+    return reply_.Room();
   } catch (const std::bad_alloc&) {
     // A file with a hole in it is worse than none.
     EndWith(DownloadFailure::kMemory, true);
@@ -101,7 +114,14 @@ std::span<char> SocketDownloader::Room(std::size_t most) {
 void SocketDownloader::OnArrived(std::size_t count) {
   if (!running_ || count == 0) return;
   reply_.Add(count);
-  if (reply_.Size() > kMostReplyBytes) return EndWith(DownloadFailure::kTooLong, true);
+  received_ += count;
+  if (received_ > kMostReplyBytes) return EndWith(DownloadFailure::kTooLong, true);
+  // Before the event, in which more may arrive.
+  if (headerFound_ && Unwritten().size() >= kPiece) {
+    actions_.WriteFile(Unwritten());
+    reply_.Clear();
+    unwritten_ = 0;
+  }
   actions_.Received(BodyBytes());
   // The host may have ended or replaced the download in its event.
   if (!running_) return;
@@ -117,7 +137,7 @@ std::optional<std::string> SocketDownloader::FindHeader() {
   searched_ = arrived.size();
   if (end == std::string_view::npos) return std::nullopt;
   headerFound_ = true;
-  bodyStart_ = end + kHeaderEnd.size();
+  bodyStart_ = unwritten_ = end + kHeaderEnd.size();
 
   std::string_view lines = arrived.substr(0, end);
   const std::string statusLine(lines.substr(0, lines.find("\r\n")));
@@ -129,11 +149,10 @@ std::optional<std::string> SocketDownloader::FindHeader() {
     }
     lines.remove_prefix(std::min(line.size() + 2, lines.size()));
   }
-  // Once, so that the body is not copied as it grows; what the server says is believed up to the bound. Where
-  // there is no room for all of it, there may be for what really comes.
+  // Once, so that the body is not copied as it grows. Without it there may be room for what really comes.
   ResultAsItStood(0, [&](int&) {
     if (contentLength_ > 0)
-      reply_.Reserve(bodyStart_ + std::min(static_cast<std::size_t>(contentLength_), kMostReplyBytes));
+      reply_.Reserve(bodyStart_ + std::min(static_cast<std::size_t>(contentLength_), kMostRoom));
   });
   return statusLine;
 }
@@ -143,14 +162,13 @@ void SocketDownloader::OnClosedByPeer() {
   // A host that pumps messages in the event of an arrival gets the close before the arrival was searched.
   const auto statusLine = FindHeader();
   if (!headerFound_)
-    return reply_.Size() == 0 ? EndWith(DownloadFailure::kEmpty, true)
-                              : EndWith(DownloadFailure::kCut, false);
+    return received_ == 0 ? EndWith(DownloadFailure::kEmpty, true) : EndWith(DownloadFailure::kCut, false);
   const std::int32_t bytes = BodyBytes();
   const ReplyBuffer reply = std::exchange(reply_, {});
   running_ = false;
   actions_.CloseSocket();
   actions_.StopWatchdog();
-  const bool written = actions_.WriteFile(plan_.file, explicitTarget_, reply.Bytes().substr(bodyStart_));
+  const bool written = actions_.FinishFile(reply.Bytes().substr(unwritten_));
   if (statusLine) actions_.HeaderFound(*statusLine, bytes);
   actions_.Finished(written);
 }
@@ -166,15 +184,13 @@ void SocketDownloader::OnSocketError() {
 void SocketDownloader::OnWatchdog() {
   if (!running_) return;
   // The socket stays as it is; a new download closes it.
-  running_ = false;
-  reply_ = {};
+  Stop();
   actions_.StopWatchdog();
   actions_.Failed(DownloadFailure::kSilence, false);
 }
 
 void SocketDownloader::EndWith(DownloadFailure failure, bool told) {
-  running_ = false;
-  reply_ = {};
+  Stop();
   actions_.CloseSocket();
   actions_.StopWatchdog();
   actions_.Failed(failure, told);

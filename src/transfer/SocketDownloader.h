@@ -52,9 +52,16 @@ class DownloadActions {
   virtual void CloseSocket() = 0;
   virtual void RestartWatchdog() = 0;
   virtual void StopWatchdog() = 0;
-  // Writes the bytes to `explicitPath`, unless that is empty, and to `path`, over what is there. Whether the
-  // first of them is there now.
-  virtual bool WriteFile(TextView path, TextView explicitPath, std::string_view bytes) = 0;
+  // A file begins that will be at `explicitPath`, unless that is empty, and at `path`. One that cannot be
+  // written fails at its end.
+  virtual void BeginFile(TextView path, TextView explicitPath) = 0;
+  // The next bytes of a large file.
+  virtual void WriteFile(std::string_view bytes) = 0;
+  // Writes the rest, which of a small file is all, and puts the file over what is there. Whether it is at the
+  // first of its places now.
+  virtual bool FinishFile(std::string_view rest) = 0;
+  // It is not wanted any more. There may be none.
+  virtual void DropFile() = 0;
 
   virtual void Received(std::int32_t bytes) = 0;
   // The header is whole: its first line, and the bytes behind it that have arrived.
@@ -92,9 +99,9 @@ class SocketDownloader {
   void Cancel();
 
   void OnConnected();
-  // Where the next bytes that arrive are to be put, at most `most`; empty when the download is over, which it
-  // is when there is no memory for them.
-  std::span<char> Room(std::size_t most);
+  // Where the next bytes that arrive are to be put; empty when the download is over, which it is when there
+  // is no memory for them.
+  std::span<char> Room();
   // So many bytes have arrived in the room.
   void OnArrived(std::size_t count);
   void OnClosedByPeer();
@@ -107,16 +114,24 @@ class SocketDownloader {
   std::int32_t ContentLength() const { return contentLength_; }
 
  private:
+  // It runs no more, and nothing is left of it.
+  void Stop();
   void EndWith(DownloadFailure failure, bool told);
   // The status line when the header, which was not known before, is whole.
   std::optional<std::string> FindHeader();
-  std::int32_t BodyBytes() const { return static_cast<std::int32_t>(reply_.Size() - bodyStart_); }
+  std::int32_t BodyBytes() const { return static_cast<std::int32_t>(received_ - bodyStart_); }
+  // The bytes of the body that were not handed on yet.
+  std::string_view Unwritten() const { return reply_.Bytes().substr(unwritten_); }
 
   DownloadActions& actions_;
   DownloadPlan plan_;
   Text explicitTarget_;
-  // Everything that has arrived.
+  // What has arrived: everything up to the first piece that is written, later what came after the last one.
   ReplyBuffer reply_;
+  // Where in it the bytes begin that are still to be written.
+  std::size_t unwritten_ = 0;
+  // Bytes that have arrived in all.
+  std::size_t received_ = 0;
   std::size_t searched_ = 0;
   // Where the body begins, once the header was found.
   std::size_t bodyStart_ = 0;

@@ -182,6 +182,7 @@ struct FakeFiles : FileSystem {
     void Write(std::string_view more) override {
       if (bytes.size() + more.size() > owner.mostWritten) throw RuntimeError(error::kPathAccess);
       bytes += more;
+      owner.bytesWritten += more.size();
     }
     void Commit() override { owner.files[path] = {bytes.size(), 0, bytes}; }
     FakeFiles& owner;
@@ -190,6 +191,8 @@ struct FakeFiles : FileSystem {
   };
   // Files that are being written.
   int writers = 0;
+  // All that was ever written.
+  std::size_t bytesWritten = 0;
   std::unique_ptr<FileWriter> Create(TextView path) override { return std::make_unique<Writer>(*this, path); }
   void Remove(TextView path) override {
     constexpr std::uint32_t kReadOnly = 1;

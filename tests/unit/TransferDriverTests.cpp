@@ -171,6 +171,45 @@ TEST_F(DriverTest, FailsAsALostConnectionDoes) {
   EXPECT_EQ(log.back(), "failed 45 told");
 }
 
+// More than is kept in memory: it is written as it comes, and in the end it is there whole or not at all.
+TEST_F(DriverTest, WritesALargeFileAsItComes) {
+  std::string body;
+  while (body.size() < 900'000) body += std::to_string(body.size());
+  const struct {
+    std::function<void()> ends;
+    std::size_t room;  // on the disk
+    const char* last;  // event
+  } rows[] = {
+      {[&] { socket.events->OnClosedByPeer(); }, SIZE_MAX, "finished"},
+      {[&] { socket.events->OnClosedByPeer(); }, 600'000, "finished without a file"},
+      {[&] { socket.events->OnSocketError(10054); }, SIZE_MAX, "failed 7 told"},
+      {[&] { watchdog.handler(); }, SIZE_MAX, "failed 58"},
+      {[&] { downloader->Cancel(); }, SIZE_MAX, "close"},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(row.last);
+    const bool whole = row.last == std::string("finished");
+    fake.files.files = {{u"C:\\t\\a.jpg", {3, 0, "old"}}};
+    fake.files.mostWritten = row.room;
+    fake.files.bytesWritten = 0;
+    // The host pumps messages before the header was searched.
+    host.in = "received";
+    host.does = [&] { socket.Arrives(std::string_view(body).substr(3, 500'000)); };
+    Start();
+    socket.events->OnConnected();
+    socket.Arrives("HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\n" + body.substr(0, 3));
+    socket.Arrives(std::string_view(body).substr(500'003));
+    EXPECT_EQ(log.back(), "received " + std::to_string(body.size()));
+    EXPECT_GT(fake.files.bytesWritten, 500'000U);
+    EXPECT_EQ(Saved(kTarget), "none");
+    row.ends();
+    EXPECT_EQ(log.back(), row.last);
+    EXPECT_TRUE(Saved(kTarget) == (whole ? body : "none"));
+    EXPECT_TRUE(Saved(u"C:\\t\\a.jpg") == (whole ? body : "old"));
+    EXPECT_EQ(fake.files.writers, 0);
+  }
+}
+
 // Hosts pump messages in their handlers, so whatever the socket has to tell may be told there.
 TEST_F(DriverTest, TakesWhatIsToldInsideAnEvent) {
   const std::string head = "HTTP/1.1 200 OK\r\nContent-Length: 3\r\n\r\n";
