@@ -76,10 +76,10 @@ void RemoveLeftoversOnce(const std::wstring& folder) {
 }
 
 // Without a look-up of the old name, which takes longer than writing a small file.
-bool Rename(HANDLE file, const std::wstring& name) {
+bool Rename(HANDLE file, const std::wstring& name, bool replace) {
   std::vector<char> room(sizeof(FILE_RENAME_INFO) + name.size() * sizeof(wchar_t));
   auto* const info = reinterpret_cast<FILE_RENAME_INFO*>(room.data());
-  info->ReplaceIfExists = TRUE;
+  info->ReplaceIfExists = replace;
   info->FileNameLength = static_cast<DWORD>(name.size() * sizeof(wchar_t));
   name.copy(info->FileName, name.size());
   return SetFileInformationByHandle(file, FileRenameInfo, info, static_cast<DWORD>(room.size()));
@@ -135,13 +135,18 @@ bool StagedFile::Keep() {
 
 bool StagedFile::Commit() {
   if (path_.empty()) return false;
-  const DWORD attributes = GetFileAttributesW(target_.c_str());
-  // Wine: the rename would replace a read-only file.
-  if (attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_READONLY) != 0) return false;
   // A scanner may have opened what was written by its name.
   if (!file_)
     file_ = Opened(path_, DELETE, OPEN_EXISTING, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE);
-  if (!file_ || !Keep() || !Rename(file_.Get(), target_)) return false;
+  if (!file_ || !Keep()) return false;
+  // Most often there is none. To ask first would take as long as the rename in a folder of many files.
+  if (!Rename(file_.Get(), target_, false)) {
+    if (GetLastError() != ERROR_ALREADY_EXISTS) return false;
+    const DWORD attributes = GetFileAttributesW(target_.c_str());
+    // Wine: the rename would replace a read-only file.
+    if (attributes != INVALID_FILE_ATTRIBUTES && (attributes & FILE_ATTRIBUTE_READONLY) != 0) return false;
+    if (!Rename(file_.Get(), target_, true)) return false;
+  }
   path_.clear();
   return true;
 }
