@@ -133,8 +133,9 @@ start_display() {
 # Variables for programs under Wine, as NAME=VALUE.
 wine_environment=()
 
-# Seconds after which a program under Wine counts as hanging.
+# Seconds after which a program under Wine counts as hanging, and what it reads.
 wine_limit=600
+wine_input=/dev/null
 
 # A command in the 32-bit root, with this checkout at the same path. The mounts are made in a name space of their own
 # and go when the command ends; one wineserver still serves all commands, because its socket is below /tmp.
@@ -159,8 +160,8 @@ wine_command() {
   local settings=(LC_ALL=C.UTF-8 WINEDEBUG=-all "WINEPREFIX=$wine_home/$arch" "WINEDLLOVERRIDES=mscoree,mshtml=" "DISPLAY=${DISPLAY-}"
     "${wine_environment[@]}")
   case $arch in
-    x64) timeout -k 10 "$wine_limit" env "${settings[@]}" WINEARCH=win64 "$@" </dev/null ;;
-    x86) in_wine32 "${settings[@]}" WINEARCH=win32 "$@" </dev/null ;;
+    x64) timeout -k 10 "$wine_limit" env "${settings[@]}" WINEARCH=win64 "$@" <"$wine_input" ;;
+    x86) in_wine32 "${settings[@]}" WINEARCH=win32 "$@" <"$wine_input" ;;
     *) die "no such architecture: $arch" ;;
   esac
 }

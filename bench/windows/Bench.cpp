@@ -1,90 +1,91 @@
 #include "Bench.h"
 
-#include <algorithm>
 #include <cstdio>
+#include <cstdlib>
 
 namespace tarnwick::bench {
-namespace {
 
-bool allWithin = true;
-
-void Row(const char* what, double ours, const char* peer, double theirs, double ratio) {
-  std::printf("%-34s %9.1f ms  %-22s %9.1f ms  %7.2f", what, ours * 1000, peer, theirs * 1000, ratio);
+double Native(const std::string& command) {
+  std::printf("run %s\n", command.c_str());
+  std::fflush(stdout);
+  char answer[64] = {};
+  if (!std::fgets(answer, sizeof answer, stdin)) Stop("nobody runs commands");
+  const double microseconds = std::atof(answer);
+  if (microseconds <= 0) Stop(("failed: " + command).c_str());
+  return microseconds / 1e6;
 }
 
-void Limit(const char* side, double limit, bool within) {
-  allWithin = allWithin && within;
-  std::printf("  %s %5.2f  %s\n", side, limit, within ? "good" : "OUT OF BOUNDS");
+std::string NativePath(const std::wstring& path) {
+  using Function = char*(CDECL*)(const wchar_t*);
+  const auto convert = reinterpret_cast<Function>(
+      reinterpret_cast<void (*)()>(GetProcAddress(GetModuleHandleW(L"kernel32"), "wine_get_unix_file_name")));
+  char* const text = convert ? convert(path.c_str()) : nullptr;
+  if (!text) Stop("a file has no name outside of Wine");
+  std::string result = text;
+  HeapFree(GetProcessHeap(), 0, text);
+  return result;
 }
 
-}  // namespace
-
-void Stop(const char* what) {
-  std::fprintf(stderr, "bench: %s\n", what);
-  ExitProcess(2);
+double ProcessorSeconds() {
+  FILETIME created = {};
+  FILETIME ended = {};
+  FILETIME kernel = {};
+  FILETIME user = {};
+  GetProcessTimes(GetCurrentProcess(), &created, &ended, &kernel, &user);
+  return (kernel.dwLowDateTime + static_cast<double>(user.dwLowDateTime)) / 1e7;
 }
 
-double Seconds(const std::function<void()>& work) {
-  LARGE_INTEGER frequency = {};
-  LARGE_INTEGER begin = {};
-  LARGE_INTEGER end = {};
-  QueryPerformanceFrequency(&frequency);
-  QueryPerformanceCounter(&begin);
-  work();
-  QueryPerformanceCounter(&end);
-  return static_cast<double>(end.QuadPart - begin.QuadPart) / static_cast<double>(frequency.QuadPart);
+void Pump() {
+  MSG message = {};
+  while (PeekMessageW(&message, nullptr, 0, 0, PM_REMOVE)) {
+    TranslateMessage(&message);
+    DispatchMessageW(&message);
+  }
 }
 
-std::vector<double> Fastest(int runs, const std::vector<std::function<void()>>& works,
-                            const std::function<void()>& before) {
-  std::vector<double> best(works.size(), 1e9);
-  for (int run = 0; run < runs; ++run)
-    for (std::size_t i = 0; i < works.size(); ++i) {
-      before();
-      best[i] = std::min(best[i], Seconds(works[i]));
-    }
-  return best;
-}
-
-void AtLeast(double least, const char* what, double ours, const char* peer, double theirs) {
-  const double ratio = theirs / ours;
-  Row(what, ours, peer, theirs, ratio);
-  Limit("at least", least, ratio >= least);
-}
-
-void AtMost(double most, const char* what, double ours, const char* peer, double theirs) {
-  const double ratio = ours / theirs;
-  Row(what, ours, peer, theirs, ratio);
-  Limit("at most ", most, ratio <= most);
-}
-
-void AtMost(double most, const char* what, double figure, const char* unit) {
-  std::printf("%-34s %9.2f %-57s", what, figure, unit);
-  Limit("at most ", most, figure <= most);
-}
-
-void Beside(const char* what, double ours, const char* peer, double theirs) {
-  Row(what, ours, peer, theirs, theirs / ours);
-  std::printf("\n");
-}
-
-bool AllWithin() {
-  return allWithin;
-}
-
-std::wstring LogOn(_ctrlListImage& list, const Account& account) {
-  ComPtr<_CFileUpload> client;
-  list.get_mobjFileupload(client.Receive());
+std::wstring LogOn(_CFileUpload& client, const Account& account) {
   VARIANT_BOOL done = VARIANT_FALSE;
-  client->ConnectToServer(Bstr(account.server), &done);
-  client->LogonAs(Bstr(account.product), Bstr(account.user), Bstr(account.password), Bstr(L""), &done);
-  Bstr all(L"*");
-  if (!done || FAILED(list.Init(all.Reference(), &done)) || !done) Stop("no account");
+  client.ConnectToServer(Bstr(account.server), &done);
+  client.LogonAs(Bstr(account.product), Bstr(account.user), Bstr(account.password), Bstr(L""), &done);
+  if (!done) Stop("no account");
   BSTR base = nullptr;
-  client->GetUserBasePath(&base);
+  client.GetUserBasePath(&base);
   std::wstring folder = std::wstring(base) + L"/";
   SysFreeString(base);
   return folder;
+}
+
+std::wstring ShowAccount(_ctrlListImage& list, const Account& account) {
+  ComPtr<_CFileUpload> client;
+  list.get_mobjFileupload(client.Receive());
+  std::wstring folder = LogOn(*client, account);
+  VARIANT_BOOL done = VARIANT_FALSE;
+  Bstr all(L"*");
+  if (FAILED(list.Init(all.Reference(), &done)) || !done) Stop("no listing");
+  return folder;
+}
+
+std::wstring UserFolder(std::wstring url) {
+  wchar_t temporary[MAX_PATH] = {};
+  GetTempPathW(MAX_PATH, temporary);
+  url.pop_back();
+  return temporary + (L"bv\\" + url.substr(url.rfind(L'/') + 1));
+}
+
+Form::Form(const CLSID& control, SIZE size)
+    : window_(CreateWindowExW(0, L"STATIC", L"", WS_POPUP | WS_VISIBLE, 0, 0, size.cx, size.cy, nullptr,
+                              nullptr, nullptr, nullptr)),
+      container_(ComPtr<demo::ControlContainer>::Adopt(new demo::ControlContainer(window_))) {
+  if (FAILED(container_->Create(control, demo::ControlContainer::WayIn::kSteps, nullptr)))
+    Stop("the library is not registered");
+  container_->SetBounds({0, 0, size.cx, size.cy});
+  container_->Do(OLEIVERB_SHOW);
+  Pump();
+}
+
+Form::~Form() {
+  container_->Close();
+  DestroyWindow(window_);
 }
 
 }  // namespace tarnwick::bench

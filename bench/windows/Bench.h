@@ -1,4 +1,4 @@
-// What the benchmarks under Wine share: measuring, one row of the table each, and the account.
+// What the benchmarks under Wine share: commands of the machine itself, windows, and the account.
 #pragma once
 
 #include "platform/windows/ComPtr.h"
@@ -7,34 +7,25 @@
 
 #include <oleauto.h>
 
-#include <functional>
+#include <array>
 #include <string>
-#include <vector>
+
+#include "ControlContainer.h"
+#include "Rounds.h"
 
 namespace tarnwick::bench {
 
-// Ends the program with 2.
-[[noreturn]] void Stop(const char* what);
+// Has the script run a shell command of the machine itself, in the folder of the benchmark, and returns the
+// seconds that it took there.
+double Native(const std::string& command);
+// What such a command calls the file.
+std::string NativePath(const std::wstring& path);
 
-// By the clock on the wall.
-double Seconds(const std::function<void()>& work);
+// Processor seconds of this program up to now, in ticks of 10 ms under Wine.
+double ProcessorSeconds();
 
-// The fastest of several runs of each; they take turns, so that a busy moment hits all alike. `before` runs
-// before each, and its time does not count.
-std::vector<double> Fastest(
-    int runs, const std::vector<std::function<void()>>& works, const std::function<void()>& before = [] {});
-
-// Prints a row and remembers whether it is within its limit.
-// `peer` took `theirs` seconds; the library, which took `ours`, is to be at least `least` times as fast.
-void AtLeast(double least, const char* what, double ours, const char* peer, double theirs);
-// The library is to take at most `most` times the peer's time.
-void AtMost(double most, const char* what, double ours, const char* peer, double theirs);
-// A figure of its own kind.
-void AtMost(double most, const char* what, double figure, const char* unit);
-// A peer that is only shown.
-void Beside(const char* what, double ours, const char* peer, double theirs);
-// Whether all rows so far are within their limits.
-bool AllWithin();
+// Handles what is in the thread's message queue; what is to be painted is part of that.
+void Pump();
 
 class Bstr {
  public:
@@ -57,12 +48,43 @@ struct Account {
   std::wstring product;
 };
 
-// Logs the list on and shows its listing to it. Returns the address of the account's folder, with its slash.
-std::wstring LogOn(_ctrlListImage& list, const Account& account);
+// Connects and logs on, after which the library knows no listing. Returns the address of the account's
+// folder, with its slash.
+std::wstring LogOn(_CFileUpload& client, const Account& account);
+
+// Logs the list's client on and shows its listing to the list.
+std::wstring ShowAccount(_ctrlListImage& list, const Account& account);
+
+// Where the library keeps the copies of the account whose folder has that address.
+std::wstring UserFolder(std::wstring url);
+
+// A window on the display with one control that fills it.
+class Form {
+ public:
+  Form(const CLSID& control, SIZE size);
+  ~Form();
+  Form(const Form&) = delete;
+  Form& operator=(const Form&) = delete;
+  HWND Window() const { return window_; }
+  template <class Interface>
+  ComPtr<Interface> Control() const {
+    ComPtr<Interface> control;
+    container_->Control()->QueryInterface(__uuidof(Interface), control.ReceiveVoid());
+    return control;
+  }
+
+ private:
+  HWND window_;
+  ComPtr<demo::ControlContainer> container_;
+};
 
 // Each prints its rows.
 void TransferBench(const Account& account, std::size_t largeBytes, int smallCount);
-void ListBench(const Account& account, int records);
+void UploadBench(const Account& account);
+// Accounts with 500 and with 100,000 files, and with 2,000, 20,000 and 100,000 on servers that only repeat
+// what another one answered.
+void ListBench(const Account& shown, const Account& all, const std::array<Account, 3>& replays);
+void PageBench(const Account& account);
 void ImageBench(const std::wstring& folder);
 
 }  // namespace tarnwick::bench

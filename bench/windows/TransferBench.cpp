@@ -1,7 +1,8 @@
-// Transfers of the list control beside a plain loop over WinINet and URLDownloadToFile.
+// Downloads of the list control beside a plain loop over WinINet, with and without the copy that the library
+// leaves in the user's folder, curl and cp, and URLDownloadToFile.
 //
-// The account holds the file "large.jpg" of LARGE bytes, SMALL-COUNT files "small-N.jpg", and "stall.jpg",
-// for which the server sends nothing.
+// The account holds "large.jpg" of LARGE bytes, "part.jpg" of an eighth of that, SMALL-COUNT files
+// "small-N.jpg", and "stall.jpg", for which the server sends nothing.
 #include "Bench.h"
 
 #include <urlmon.h>
@@ -32,43 +33,6 @@ void WinInetDownload(const std::wstring& url, const wchar_t* path) {
   InternetCloseHandle(session);
 }
 
-// The plain loop upwards: the same multipart body, a block at a time.
-void WinInetUpload(const std::wstring& host, INTERNET_PORT port,
-                   const std::vector<std::pair<std::string, std::string>>& fields, const wchar_t* path) {
-  const std::string boundary = "bench0123456789";
-  const std::string part = "--" + boundary + "\r\nContent-Disposition: form-data; name=\"";
-  std::string head;
-  for (const auto& [name, value] : fields)
-    head.append(part).append(name).append("\"\r\n\r\n").append(value).append("\r\n");
-  head.append(part).append("File\"; filename=\"upload.jpg\"\r\n\r\n");
-  const std::string tail = "\r\n--" + boundary + "--\r\n";
-  const HANDLE file = CreateFileW(path, GENERIC_READ, FILE_SHARE_READ, nullptr, OPEN_EXISTING, 0, nullptr);
-  const HINTERNET session = InternetOpenW(L"bench", INTERNET_OPEN_TYPE_DIRECT, nullptr, nullptr, 0);
-  const HINTERNET connection =
-      InternetConnectW(session, host.c_str(), port, nullptr, nullptr, INTERNET_SERVICE_HTTP, 0, 0);
-  const HINTERNET request = HttpOpenRequestW(connection, L"POST", L"/httpupload/UploadAcceptor.asp", nullptr,
-                                             nullptr, nullptr, INTERNET_FLAG_RELOAD, 0);
-  const std::wstring header = L"Content-Type: multipart/form-data; boundary=bench0123456789\r\n";
-  INTERNET_BUFFERSW buffers = {};
-  buffers.dwStructSize = sizeof buffers;
-  buffers.lpcszHeader = header.c_str();
-  buffers.dwHeadersLength = static_cast<DWORD>(header.size());
-  buffers.dwBufferTotal = static_cast<DWORD>(head.size() + GetFileSize(file, nullptr) + tail.size());
-  if (!HttpSendRequestExW(request, &buffers, nullptr, 0, 0)) Stop("the upload loop cannot connect");
-  DWORD written = 0;
-  InternetWriteFile(request, head.data(), static_cast<DWORD>(head.size()), &written);
-  std::vector<char> block(64 * 1024);
-  DWORD count = 0;
-  while (ReadFile(file, block.data(), static_cast<DWORD>(block.size()), &count, nullptr) && count > 0)
-    InternetWriteFile(request, block.data(), count, &written);
-  InternetWriteFile(request, tail.data(), static_cast<DWORD>(tail.size()), &written);
-  if (!HttpEndRequestW(request, nullptr, 0, 0)) Stop("the upload loop has no answer");
-  InternetCloseHandle(request);
-  InternetCloseHandle(connection);
-  InternetCloseHandle(session);
-  CloseHandle(file);
-}
-
 // --- What Wine's counters do not tell ---
 
 // A file of this process's that Linux keeps. Its number comes from the script, as Wine has numbers of its
@@ -96,119 +60,158 @@ double PeakBytes(const std::function<void()>& work) {
   return StatusBytes("VmHWM:") - before;
 }
 
-// Processor milliseconds of the process up to now.
-double ProcessorMs() {
-  FILETIME created = {};
-  FILETIME ended = {};
-  FILETIME kernel = {};
-  FILETIME user = {};
-  GetProcessTimes(GetCurrentProcess(), &created, &ended, &kernel, &user);
-  return (kernel.dwLowDateTime + static_cast<double>(user.dwLowDateTime)) / 10'000;
-}
-
 // --- The library ---
 
-ComPtr<_ctrlListImage> list;
+ComPtr<_ctrlListImage> hidden;
+// Where the library keeps copies, as the machine calls it.
+std::string userFolder;
 
-void Select(const std::wstring& name) {
+void Select(_ctrlListImage& list, const std::wstring& name) {
   Bstr text(name);
   VARIANT ignored = {};
-  list->UploadedFileSetFocus(text.Reference(), &ignored);
+  list.UploadedFileSetFocus(text.Reference(), &ignored);
 }
 
-void Download(const std::wstring& name) {
-  Select(name);
+void Download(_ctrlListImage& list, const std::wstring& name, const wchar_t* folder) {
+  Select(list, name);
   BSTR local = nullptr;
-  list->DownLoadFileFromServer(Bstr(L"bench-files"), &local);
-  if (GetFileAttributesW(local) == INVALID_FILE_ATTRIBUTES) Stop("a download failed");
+  list.DownLoadFileFromServer(Bstr(folder), &local);
+  if (SysStringLen(local) == 0) Stop("a download failed");
   SysFreeString(local);
 }
 
 void CALLBACK LoseConnection(HWND, UINT, UINT_PTR timer, DWORD) {
   KillTimer(nullptr, timer);
-  list->put_gbConnectionFailed(VARIANT_TRUE);
+  hidden->put_gbConnectionFailed(VARIANT_TRUE);
 }
 
-// Processor milliseconds of a download for which nothing comes in 10 seconds.
-double StallMs() {
-  Select(L"stall.jpg");
+// Processor seconds of a download for which nothing comes in 10 seconds.
+double Stall() {
+  Select(*hidden, L"stall.jpg");
   SetTimer(nullptr, 0, 10'000, LoseConnection);
-  const double before = ProcessorMs();
+  const double before = ProcessorSeconds();
   BSTR local = nullptr;
-  const double seconds = Seconds([&] { list->DownLoadFileFromServer(Bstr(L"bench-files"), &local); });
+  const double seconds = Seconds([&] { hidden->DownLoadFileFromServer(Bstr(L"library"), &local); });
   SysFreeString(local);
   if (seconds < 9.5) Stop("the stalled download ended early");
-  return ProcessorMs() - before;
+  return ProcessorSeconds() - before;
 }
+
+// --- The rows ---
+
+using Names = std::vector<std::wstring>;
+
+// What each side does with the files of these names. All begin without a file that they will write.
+struct Downloads {
+  std::wstring url;
+  Names names;
+
+  double ByLibrary(_ctrlListImage& list, const wchar_t* folder) const {
+    Native("find " + Narrow(folder) + " '" + userFolder + "' -name '[lps]*.jpg' -delete");
+    const double seconds = Seconds([&] {
+      for (const std::wstring& name : names) Download(list, name, folder);
+    });
+    if (GetFileAttributesW((std::wstring(folder) + L"\\" + names.back()).c_str()) == INVALID_FILE_ATTRIBUTES)
+      Stop("a download left no file");
+    return seconds;
+  }
+  double ByLoop(const std::wstring& folder, bool copied) const {
+    Native("find " + Narrow(folder) + " copies -name '[lps]*.jpg' -delete");
+    return Seconds([&] {
+      for (const std::wstring& name : names) {
+        const std::wstring target = folder + L"\\" + name;
+        WinInetDownload(url + name, target.c_str());
+        if (copied) CopyFileW(target.c_str(), (L"copies\\" + name).c_str(), FALSE);
+      }
+    });
+  }
+  double ByCurl() const {
+    Native("rm -rf curl curl-copies; mkdir curl");
+    std::string addresses;
+    for (const std::wstring& name : names)
+      addresses += "url=" + Narrow(url + name) + "\noutput=curl/" + Narrow(name) + "\n";
+    std::ofstream("addresses", std::ios::binary) << addresses;
+    return Native("curl -sf -K addresses && cp -r curl curl-copies");
+  }
+  double ByUrlmon() const {
+    return Seconds([&] {
+      for (const std::wstring& name : names) {
+        DeleteUrlCacheEntryW((url + name).c_str());
+        URLDownloadToFileW(nullptr, (url + name).c_str(), (L"urlmon\\" + name).c_str(), 0, nullptr);
+      }
+    });
+  }
+  static std::string Narrow(const std::wstring& text) { return {text.begin(), text.end()}; }
+};
 
 }  // namespace
 
 void TransferBench(const Account& account, std::size_t largeBytes, int smallCount) {
   if (FAILED(CoCreateInstance(CLSID_ctrlListImage, nullptr, CLSCTX_INPROC_SERVER, __uuidof(_ctrlListImage),
-                              list.ReceiveVoid())))
+                              hidden.ReceiveVoid())))
     Stop("the library is not registered");
-  const std::wstring folder = LogOn(*list, account);
-  CreateDirectoryW(L"bench-files", nullptr);
+  const std::wstring url = ShowAccount(*hidden, account);
+  const Form form(CLSID_ctrlListImage, {600, 400});
+  const ComPtr<_ctrlListImage> visible = form.Control<_ctrlListImage>();
+  ShowAccount(*visible, account);
+  userFolder = NativePath(UserFolder(url));
+  Native(
+      "mkdir library loop copies urlmon library-full loop-full && "
+      "for i in $(seq 3000); do echo >library-full/other-$i.jpg; done && cp library-full/* loop-full");
 
-  const double peak = PeakBytes([] { Download(L"large.jpg"); });
-  const std::wstring large = folder + L"large.jpg";
-  const auto big = Fastest(
-      3, {[] { Download(L"large.jpg"); }, [&] { WinInetDownload(large, L"bench-files\\large.wininet"); },
-          [&] {
-            DeleteUrlCacheEntryW(large.c_str());
-            URLDownloadToFileW(nullptr, large.c_str(), L"bench-files\\large.urlmon", 0, nullptr);
-          }});
-  AtLeast(1.0, "download, one large file", big[0], "WinINet loop", big[1]);
-  AtLeast(3.0, "download, one large file", big[0], "URLDownloadToFile", big[2]);
+  const Downloads large{url, {L"large.jpg"}};
+  const Downloads part{url, {L"part.jpg"}};
+  const double peak = PeakBytes([&] { large.ByLibrary(*hidden, L"library"); });
+  const double mebibytes = static_cast<double>(largeBytes) / (1 << 20);
+  std::vector<Side> sides = {
+      {"library", [&] { return large.ByLibrary(*hidden, L"library"); }},
+      {"library", [&] { return large.ByLibrary(*visible, L"library"); }},
+      {"WinINet loop, CopyFile", [&] { return large.ByLoop(L"loop", true); }},
+      {"curl, cp", [&] { return large.ByCurl(); }},
+      {"URLDownloadToFile", [&] { return large.ByUrlmon(); }},
+      {"WinINet loop alone", [&] { return large.ByLoop(L"loop", false); }},
+      {"itself, of 8 MiB", [&] { return part.ByLibrary(*hidden, L"library"); }, mebibytes / 8}};
+  Measure(sides);
+  const char* const rest =
+      "a message and an event for each piece that arrives; two files written beside their names and renamed";
+  for (const int ours : {0, 1}) {
+    const std::string what =
+        ours == 0 ? "download of 64 MiB, window hidden" : "download of 64 MiB, window visible";
+    const Side& library = sides[static_cast<std::size_t>(ours)];
+    Row(what, library, sides[2], ">=1.0", rest);
+    Row(what, library, sides[3], ">=0.9", rest);
+    Row(what, library, sides[4], ">=3.0", "the peer writes to its cache first and copies from there");
+    Row(what, library, sides[5], "", "the copy, which the loop alone does not make");
+  }
+  Side each = sides[0];
+  for (double& cost : each.costs) cost /= mebibytes;
+  Row("download, a MiB of 64", each, sides[6], "<=1.2", "a connection and two new files, whatever the size");
 
-  const auto each = [&](const std::function<void(const std::wstring&)>& work) {
-    return [=] {
-      for (int i = 0; i < smallCount; ++i) work(L"small-" + std::to_wstring(i) + L".jpg");
-    };
-  };
-  const auto many = Fastest(3, {each(Download), each([&](const std::wstring& name) {
-                                  WinInetDownload(folder + name, L"bench-files\\small.wininet");
-                                }),
-                                each([&](const std::wstring& name) {
-                                  DeleteUrlCacheEntryW((folder + name).c_str());
-                                  URLDownloadToFileW(nullptr, (folder + name).c_str(),
-                                                     L"bench-files\\small.urlmon", 0, nullptr);
-                                })});
-  AtLeast(1.0, "download, many small files", many[0], "URLDownloadToFile", many[2]);
-  AtLeast(0.8, "download, many small files", many[0], "WinINet loop", many[1]);
+  Downloads small{url, {}};
+  for (int i = 0; i < smallCount; ++i) small.names.push_back(L"small-" + std::to_wstring(i) + L".jpg");
+  const double files = smallCount;
+  std::vector<Side> many = {
+      {"library", [&] { return small.ByLibrary(*hidden, L"library"); }, files},
+      {"library", [&] { return small.ByLibrary(*hidden, L"library-full"); }, files},
+      {"WinINet loop, CopyFile", [&] { return small.ByLoop(L"loop", true); }, files},
+      {"WinINet loop, CopyFile", [&] { return small.ByLoop(L"loop-full", true); }, files},
+      {"WinINet loop alone", [&] { return small.ByLoop(L"loop", false); }, files},
+      {"curl, cp", [&] { return small.ByCurl(); }, files}};
+  Measure(many);
+  const std::string what = "download, one of 500 of 20 KiB";
+  Row(what, many[0], many[2], ">=1.0",
+      "names looked up: two files are written beside their names and renamed");
+  Row(what, many[0], many[4], "", "the copy, which the loop alone does not make");
+  Row(what, many[0], many[5], "", "Wine and its server make hundreds of system calls for a file");
+  Row(what + " beside 3,000", many[1], many[3], ">=1.0",
+      "look-ups of names that are not there, each of which lists the folder");
 
-  const wchar_t* const upload = L"bench-files\\upload.jpg";
-  CopyFileW(L"bench-files\\large.jpg", upload, FALSE);
-  const auto ansi = [](const std::wstring& text) { return std::string(text.begin(), text.end()); };
-  const std::size_t colon = account.server.find(L':');
-  const std::wstring host = account.server.substr(0, colon);
-  const auto port = static_cast<INTERNET_PORT>(_wtoi(account.server.c_str() + colon + 1));
-  const std::vector<std::pair<std::string, std::string>> fields = {
-      {"UsersBaseUrl", "http://" + ansi(account.server) + "/users/"},
-      {"Flag", "0"},
-      {"User", ansi(account.user)},
-      {"Password", ansi(account.password)},
-      {"ProductID", "4A7E2C51-93D0-4f1c-B2E9-6C1D08F3A27E"}};
-  // The library also asks the service before and after, and keeps a copy in the user's folder. Of a picture
-  // that is new there is none yet.
-  wchar_t temporary[MAX_PATH] = {};
-  GetTempPathW(MAX_PATH, temporary);
-  const std::wstring userFolder = folder.substr(0, folder.size() - 1);
-  const std::wstring copy =
-      temporary + (L"bv\\" + userFolder.substr(userFolder.rfind(L'/') + 1)) + L"\\upload.jpg";
-  const auto up = Fastest(9,
-                          {[&] {
-                             VARIANT_BOOL done = VARIANT_FALSE;
-                             list->UploadImage(Bstr(upload), &done);
-                             if (!done) Stop("an upload failed");
-                           },
-                           [&] { WinInetUpload(host, port, fields, upload); }},
-                          [&] { DeleteFileW(copy.c_str()); });
-  AtLeast(1.0, "upload, one large file", up[0], "WinINet loop", up[1]);
-
-  AtMost(1.25, "peak memory of the large download", peak / static_cast<double>(largeBytes), "times the file");
-  AtMost(50, "download that stalls for 10 s", StallMs(), "ms of processor time");
-  list = {};
+  Row("peak memory of a download of 64 MiB, times the file",
+      {"library", {}, 1, {peak / static_cast<double>(largeBytes)}}, "x", "<=1.25",
+      "the pieces that were received and not written");
+  Row("processor time of a download that stalls for 10 s", {"library", {}, 1, {Stall()}}, "s", "<=0.05",
+      "none: the wait is for messages");
+  hidden = {};
 }
 
 }  // namespace tarnwick::bench
