@@ -538,8 +538,12 @@ bool FileControl::Download(const Text& url, const Text& explicitTarget, const Te
   m_lDownloadedBytes = 0;
   downloadFinished_ = downloadWritten_ = downloadFailed_ = false;
   downloadRuns_ = true;
-  downloader_.Start(url, explicitTarget);
-  while (!gbConnectionFailed && !downloadFinished_ && !IsStopped() && !stop()) downloader_.Wait();
+  // Whatever is thrown, such as for a lack of memory: what began here ends here.
+  const bool waited = ResultAsItStood(false, [&](bool& done) {
+    downloader_.Start(url, explicitTarget);
+    while (!gbConnectionFailed && !downloadFinished_ && !IsStopped() && !stop()) downloader_.Wait();
+    done = true;
+  });
   downloadRuns_ = false;
   const bool told = std::exchange(gbConnectionFailed, false);
   // The host may have set the flag; then the transfer would go on behind the back of the next one.
@@ -554,6 +558,7 @@ bool FileControl::Download(const Text& url, const Text& explicitTarget, const Te
     return there;
   // Of a failure the reason was told.
   if (downloadFailed_) return false;
+  if (!waited) Fail(ftp_error::kAborted, u"The operation failed unexpectedly.");
   if (downloadFinished_) {
     Fail(ftp_error::kAborted, u"The local file could not be written.");
   } else if (IsStopped()) {
