@@ -47,11 +47,14 @@ struct FakeListView : ListView {
       if (selected[i]) return i;
     return std::nullopt;
   }
-  void Select(std::size_t index, bool select) override {
+  // What the user does.
+  void Select(std::size_t index, bool select) {
     if (select && !multiple) selected.assign(selected.size(), false);
     selected.at(index) = select;
   }
-  void SetFocusTo(std::size_t index) override {
+  void SelectAlone(std::size_t index) override {
+    selected.assign(selected.size(), false);
+    selected.at(index) = true;
     focused = index;
     log.push_back("view at " + std::to_string(index));
   }

@@ -41,10 +41,8 @@ class ListView : public ControlView {
   virtual bool IsSelected(std::size_t index) const = 0;
   // The first selected item from `from` on.
   virtual std::optional<std::size_t> NextSelected(std::size_t from) const = 0;
-  // Selecting in a list of single selection deselects the other items.
-  virtual void Select(std::size_t index, bool selected) = 0;
-  // Gives the item the focus mark and scrolls it into view.
-  virtual void SetFocusTo(std::size_t index) = 0;
+  // Selects the item and no other, gives it the focus mark and scrolls it into view.
+  virtual void SelectAlone(std::size_t index) = 0;
   // Turning it off keeps the first selected item selected.
   virtual void SetMultiSelect(bool multiple) = 0;
 

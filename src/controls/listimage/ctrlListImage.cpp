@@ -73,7 +73,7 @@ bool ctrlListImage::Init(TextView szFileFilter) {
 
 void ctrlListImage::ChangeFileFilter(TextView szFileFilter) {
   ResultAsItStood(0, [&](int&) {
-    const Text previous = SelectedFileName();
+    const Text previous = reselect_ ? SelectedFileName() : Text();
     const Text filter = LowerCase(szFileFilter);
     if (filter == u"gif") {
       currentFilter_ = filter;
@@ -92,16 +92,22 @@ void ctrlListImage::ChangeFileFilter(TextView szFileFilter) {
       again = i;
       break;
     }
-    SelectAlone(again);
+    view_.SelectAlone(again);
   });
 }
 
 void ctrlListImage::Fill(const std::function<bool(const CUpload&)>& shows) {
-  std::vector<Item> items;
-  items.reserve(listing_.all.Count());
-  for (const FileRecord& record : listing_.all)
-    if (shows(*record)) items.push_back({record});
-  items_ = std::move(items);
+  items_.reserve(listing_.all.Count());
+  std::size_t count = 0;
+  for (const FileRecord& record : listing_.all) {
+    if (!shows(*record)) continue;
+    if (count == items_.size()) items_.emplace_back();
+    Item& item = items_[count++];
+    // Counting references touches each record; most stay where they are.
+    if (item.record != record) item.record = record;
+    item.uploaded = false;
+  }
+  items_.resize(count);
   NoteAccount();
   ++filling_;
   view_.SetItemCount(items_.size());
@@ -135,16 +141,9 @@ void ctrlListImage::UploadedFileSetFocus(TextView szFileName) {
   view_.Focus();
   for (std::size_t i = 0; i < items_.size(); ++i) {
     if (items_[i].record->FileName != name) continue;
-    SelectAlone(i);
+    view_.SelectAlone(i);
     return;
   }
-}
-
-void ctrlListImage::SelectAlone(std::size_t index) {
-  for (auto at = Selected(); at; at = NextSelected(*at + 1))
-    if (*at != index) view_.Select(*at, false);
-  view_.Select(index, true);
-  view_.SetFocusTo(index);
 }
 
 // --- What the view asks ---

@@ -74,7 +74,6 @@ class ctrlListImage final : public FileControl, public ListViewUser {
 
   std::optional<std::size_t> Selected() const { return NextSelected(0); }
   std::optional<std::size_t> NextSelected(std::size_t from) const;
-  void SelectAlone(std::size_t index);
 
   // Puts the records that `shows` lets pass into the list.
   void Fill(const std::function<bool(const CUpload&)>& shows);

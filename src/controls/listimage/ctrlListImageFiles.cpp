@@ -62,7 +62,7 @@ void ctrlListImage::DeleteFile() {
         Fail(ftp_error::kNotTaken, u"The files were deleted, but the rest could not be listed.");
     }
     if (items_.empty()) return;
-    SelectAlone(0);
+    view_.SelectAlone(0);
     OnSelectionChanged();
   });
 }

@@ -148,8 +148,9 @@ void WindowsListView::AddColumns() {
 void WindowsListView::SetItemCount(std::size_t count) {
   if (!Window()) return;
   ListView_CancelEditLabel(list_);
-  // One message for all items: their number does not count.
-  ListView_SetItemState(list_, -1, 0, LVIS_SELECTED | LVIS_FOCUSED);
+  Deselect(-1);
+  const int focused = ListView_GetNextItem(list_, -1, LVNI_FOCUSED);
+  if (focused >= 0) ListView_SetItemState(list_, focused, 0, LVIS_FOCUSED);
   count_ = count;
   ListView_SetItemCountEx(list_, static_cast<int>(count), 0);
   if (count > 0) ListView_EnsureVisible(list_, 0, FALSE);
@@ -186,18 +187,26 @@ std::optional<std::size_t> WindowsListView::NextSelected(std::size_t from) const
   return found < 0 ? std::nullopt : std::optional<std::size_t>(static_cast<std::size_t>(found));
 }
 
-void WindowsListView::Select(std::size_t index, bool selected) {
-  if (!Window()) return;
-  // A list of single selection does not see to it when the selection comes from a program.
-  if (selected && (GetWindowLongW(list_, GWL_STYLE) & LVS_SINGLESEL))
+// Not by one message for all items where it can be avoided: under Wine the list then walks through them, and
+// a selected one is painted again even when it is to stay so.
+void WindowsListView::Deselect(int kept) {
+  const UINT selected = ListView_GetSelectedCount(list_);
+  if (selected == 0) return;
+  const int first = ListView_GetNextItem(list_, -1, LVNI_SELECTED);
+  if (selected > 1) {
     ListView_SetItemState(list_, -1, 0, LVIS_SELECTED);
-  ListView_SetItemState(list_, static_cast<int>(index), selected ? LVIS_SELECTED : 0, LVIS_SELECTED);
+  } else if (first != kept) {
+    ListView_SetItemState(list_, first, 0, LVIS_SELECTED);
+  }
 }
 
-void WindowsListView::SetFocusTo(std::size_t index) {
+void WindowsListView::SelectAlone(std::size_t index) {
   if (!Window()) return;
-  ListView_SetItemState(list_, static_cast<int>(index), LVIS_FOCUSED, LVIS_FOCUSED);
-  ListView_EnsureVisible(list_, static_cast<int>(index), FALSE);
+  const int item = static_cast<int>(index);
+  // A list of single selection does not see to it when the selection comes from a program.
+  Deselect(item);
+  ListView_SetItemState(list_, item, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
+  ListView_EnsureVisible(list_, item, FALSE);
 }
 
 void WindowsListView::SetMultiSelect(bool multiple) {
@@ -206,7 +215,10 @@ void WindowsListView::SetMultiSelect(bool multiple) {
   const std::optional<std::size_t> first = NextSelected(0);
   const LONG style = GetWindowLongW(list_, GWL_STYLE);
   SetWindowLongW(list_, GWL_STYLE, multiple ? style & ~LVS_SINGLESEL : style | LVS_SINGLESEL);
-  if (!multiple && first) Select(*first, true);
+  if (!multiple && first) {
+    Deselect(static_cast<int>(*first));
+    ListView_SetItemState(list_, static_cast<int>(*first), LVIS_SELECTED, LVIS_SELECTED);
+  }
 }
 
 void WindowsListView::EndLabelEdit() {

@@ -36,8 +36,7 @@ class WindowsListView : public ListView, public ControlWindow {
   void SetLabelText(TextView text) override;
   bool IsSelected(std::size_t index) const override;
   std::optional<std::size_t> NextSelected(std::size_t from) const override;
-  void Select(std::size_t index, bool selected) override;
-  void SetFocusTo(std::size_t index) override;
+  void SelectAlone(std::size_t index) override;
   void SetMultiSelect(bool multiple) override;
   void EndLabelEdit() override;
   void Focus() override;
@@ -54,6 +53,8 @@ class WindowsListView : public ListView, public ControlWindow {
   LRESULT OnNotify(const NMHDR& header);
   void Layout() const;
   void SetIcons();
+  // Leaves at most `kept` selected, which is an item or -1.
+  void Deselect(int kept);
   void AddColumns();
 
   ListViewUser* user_ = nullptr;
