@@ -4,9 +4,9 @@
 #include <algorithm>
 #include <cstddef>
 #include <cstdint>
-#include <functional>
 #include <vector>
 
+#include "base/KeyHash.h"
 #include "base/Text.h"
 
 namespace tarnwick {
@@ -29,10 +29,15 @@ class KeyIndex {
   void MakeRoom() {
     if ((count_ + 1) * 2 > hashes_.size()) Grow();
   }
-  // The entry's key is not in the index yet, and there is room.
-  void Add(Entry* entry) {
-    Put(HashOf(entry->*Key), entry);
+  // False when the key is in the index already. There is room.
+  bool Add(Entry* entry) {
+    const std::uint32_t hash = HashOf(entry->*Key);
+    const std::size_t place = PlaceOf(entry->*Key, hash);
+    if (hashes_[place] != 0) return false;
+    hashes_[place] = hash;
+    entries_[place] = entry;
     ++count_;
+    return true;
   }
   // The entry is in the index.
   void Remove(const Entry* entry) {
@@ -52,7 +57,7 @@ class KeyIndex {
  private:
   // Never 0, which marks a free place.
   static std::uint32_t HashOf(TextView key) {
-    return static_cast<std::uint32_t>(std::hash<TextView>()(key)) | 0x80000000U;
+    return static_cast<std::uint32_t>(ProcessHash()(key)) | 0x80000000U;
   }
   // Where the key is, or the free place where it would go.
   std::size_t PlaceOf(TextView key, std::uint32_t hash) const {

@@ -24,11 +24,12 @@ class KeyedList {
   // Puts the item at `position` (1 to Count() + 1). Throws 9 for another position, 457 like Add.
   void Insert(std::size_t position, Item item, TextView key = {}) {
     if (position < 1 || position > Count() + 1) throw RuntimeError(error::kSubscriptOutOfRange);
-    if (!key.empty() && keys_.Find(key)) throw RuntimeError(error::kDuplicateKey);
     if (!key.empty()) keys_.MakeRoom();
     const auto place = entries_.begin() + static_cast<std::ptrdiff_t>(position - 1);
     const auto entry = entries_.insert(place, std::make_unique<Entry>(Entry{std::move(item), Text(key)}));
-    if (!key.empty()) keys_.Add(entry->get());
+    if (key.empty() || keys_.Add(entry->get())) return;
+    entries_.erase(entry);
+    throw RuntimeError(error::kDuplicateKey);
   }
 
   // Throws 9 when `position` is not 1 to Count().

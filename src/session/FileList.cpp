@@ -17,8 +17,12 @@ std::size_t FileList::PositionOf(TextView address) const {
 }
 
 void FileList::Add(FileRecord record) {
-  if (Find(record->FilePath)) throw RuntimeError(error::kDuplicateKey);
-  Insert(Count() + 1, std::move(record));
+  addresses_.MakeRoom();
+  records_.push_back(std::move(record));
+  const CUpload& added = *records_.back();
+  if (added.FilePath.empty() || addresses_.Add(&added)) return;
+  records_.pop_back();
+  throw RuntimeError(error::kDuplicateKey);
 }
 
 void FileList::Insert(std::size_t position, FileRecord record) {
@@ -43,7 +47,7 @@ bool FileList::Holds(const CUpload& record) const {
 }
 
 void FileList::Index(const CUpload& record) {
-  if (record.FilePath.empty() || Find(record.FilePath)) return;
+  if (record.FilePath.empty()) return;
   addresses_.MakeRoom();
   addresses_.Add(&record);
 }

@@ -1,11 +1,32 @@
 #include <gtest/gtest.h>
 
+#include <cstdint>
+#include <set>
+#include <string>
+
+#include "base/KeyHash.h"
 #include "base/KeyedList.h"
 #include "fakes/FakePlatform.h"
 #include "session/TransferLists.h"
 
 namespace tarnwick {
 namespace {
+
+TEST(KeyedHash, IsSipHash13AndCollidesForOneKeyAlone) {
+  // An independent implementation's results for the key 0.
+  EXPECT_EQ(KeyedHash("abc", {}), 0xc03bc3a0042630f2);
+  EXPECT_EQ(KeyedHash("holiday picture 000123.jpg", {}), 0x4c65881e985a52fe);
+  std::set<std::uint64_t> places[2];
+  for (int i = 0; i < 100'000; ++i) {
+    const std::string name = "name" + std::to_string(i);
+    if ((KeyedHash(name, {1, 2}) & 1023) != 5) continue;
+    places[0].insert(KeyedHash(name, {1, 3}) & 1023);
+    places[1].insert(KeyedHash(name, {2, 2}) & 1023);
+  }
+  // Of the about 98 names.
+  EXPECT_GT(places[0].size(), 70U);
+  EXPECT_GT(places[1].size(), 70U);
+}
 
 TEST(KeyedList, KeepsOrderAndUniqueKeys) {
   KeyedList<int> list;
