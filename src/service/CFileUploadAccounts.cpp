@@ -50,7 +50,7 @@ Text CFileUpload::AddUser(TextView ProductID, TextView Username, TextView GUID) 
       // The base path is told for older services; folders are named without it.
       Log(u"Checking base path for '\\'");
       Log(reply.First(u"BasePath").ends_with(u'\\') ? u"'\\' found" : u"'\\' not found, adding '\\'");
-      const TextView folder = reply.First(u"UserFolder");
+      const Text folder = reply.First(u"UserFolder");
       password = reply.First(u"Password");
       mguid = reply.First(u"MGUID");
       if (!SetUpAccount(ProductID, Username, password, mguid, folder)) code = status::kFailure;

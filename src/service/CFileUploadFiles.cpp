@@ -34,9 +34,9 @@ class NormalAttributes {
   bool cleared_ = false;
 };
 
-TextView ElementAt(const std::vector<TextView>& values, std::size_t index) {
+Text ElementAt(const Reply::Values& values, std::size_t index) {
   if (index >= values.size()) throw RuntimeError(error::kSubscriptOutOfRange);
-  return values[index];
+  return TextFromUtf8(values[index]).value();
 }
 
 }  // namespace
@@ -50,15 +50,15 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
     const Reply reply = Ask(u"ListFilesRequest", u"ListFiles",
                             {{u"Username", SessionUser()}, {u"ProductID", SessionProduct()}}, 1);
     if (reply.ErrorOccured() == 1) return;
-    const std::vector<TextView>* names = reply.GetValueByVariableName(u"FileName");
-    const std::vector<TextView>* urls = reply.GetValueByVariableName(u"FileURL");
-    const std::vector<TextView>* sizes = reply.GetValueByVariableName(u"FileSize");
-    const std::vector<TextView>* dates = reply.GetValueByVariableName(u"FileDate");
+    const Reply::Values* names = reply.GetValueByVariableName(u"FileName");
+    const Reply::Values* urls = reply.GetValueByVariableName(u"FileURL");
+    const Reply::Values* sizes = reply.GetValueByVariableName(u"FileSize");
+    const Reply::Values* dates = reply.GetValueByVariableName(u"FileDate");
     // An account without files has them all, empty.
     if (!names || !urls || !sizes || !dates) return;
     for (std::size_t i = 0; i < names->size(); ++i) {
       auto file = std::make_shared<CUpload>();
-      file->FileName = (*names)[i];
+      file->FileName = ElementAt(*names, i);
       file->FilePath = ElementAt(*urls, i);
       file->FileSize = LeadingNumber(ElementAt(*sizes, i));
       file->FileDate = ElementAt(*dates, i);

@@ -1,5 +1,7 @@
 #include "service/HTTPServer.h"
 
+#include <utility>
+
 #include "platform/HttpTransport.h"
 #include "transfer/AcceptorPages.h"
 #include "transfer/HttpAddress.h"
@@ -40,9 +42,9 @@ Reply HTTPServer::SendRequest(const Request& request, TextView path, std::int32_
   post.target = EscapeUnprintable(address->path + u"/" + request.page) + "?" + query;
   post.contentType = "application/x-www-form-urlencoded; charset=utf-8";
   post.body = body;
-  const auto answer = http_.Post(post, kMostReplyBytes);
+  auto answer = http_.Post(post, kMostReplyBytes);
   if (!answer || answer->status != 200) return {};
-  return Reply::FromBody(answer->body);
+  return Reply::FromBody(std::move(answer->body));
 }
 
 void HTTPServer::FolderActionWithEvents(TextView usersBaseUrl, TextView folder, TextView acceptorPath,

@@ -1,7 +1,11 @@
 #include "transfer/Reply.h"
 
+#include <utf8.h>
+
 #include <algorithm>
+#include <array>
 #include <optional>
+#include <utility>
 
 #include "base/RuntimeError.h"
 
@@ -11,93 +15,83 @@ namespace {
 // The service knows a few dozen; each name costs much more memory than its bytes.
 constexpr std::size_t kMostVariables = 1000;
 
-int HexDigit(char digit) {
-  if (digit >= '0' && digit <= '9') return digit - '0';
-  if (digit >= 'A' && digit <= 'F') return digit - 'A' + 10;
-  if (digit >= 'a' && digit <= 'f') return digit - 'a' + 10;
-  return -1;
-}
+// Values of the hexadecimal digits, -1 for all other bytes.
+constexpr auto kHexDigits = [] {
+  std::array<signed char, 256> digits{};
+  digits.fill(-1);
+  for (unsigned i = 0; i < 10; ++i) digits['0' + i] = static_cast<signed char>(i);
+  for (unsigned i = 0; i < 6; ++i) digits['A' + i] = digits['a' + i] = static_cast<signed char>(10 + i);
+  return digits;
+}();
 
-// Unescapes names and values one after the other into room that is made once.
-class Unescaper {
- public:
-  // `texts` keeps its address; it has room for a character for each byte.
-  Unescaper(std::vector<char16_t>& texts, std::size_t bytes) : texts_(texts) { texts_.reserve(bytes); }
-
-  // nullopt when an escape is broken or the bytes are not UTF-8.
-  std::optional<TextView> Unescape(std::string_view escaped) {
-    const std::size_t begin = texts_.size();
-    bool ascii = true;
-    for (std::size_t i = 0; i < escaped.size(); ++i) {
-      int byte = static_cast<unsigned char>(escaped[i]);
-      if (byte == '+') {
-        byte = ' ';
-      } else if (byte == '%') {
-        if (escaped.size() - i < 3) return std::nullopt;
-        const int high = HexDigit(escaped[i + 1]);
-        const int low = HexDigit(escaped[i + 2]);
-        if (high < 0 || low < 0) return std::nullopt;
-        byte = high * 16 + low;
-        i += 2;
-      }
-      ascii = ascii && byte < 0x80;
-      texts_.push_back(static_cast<char16_t>(byte));
+// Unescapes what `escaped`, a part of `body`, says, at its place: it never gets longer. nullopt when an
+// escape is broken or the bytes are not UTF-8.
+std::optional<std::string_view> Unescape(std::string& body, std::string_view escaped) {
+  char* const begin = body.data() + (escaped.data() - body.data());
+  char* end = begin;
+  unsigned seen = 0;
+  for (std::size_t i = 0; i < escaped.size(); ++i) {
+    unsigned byte = static_cast<unsigned char>(escaped[i]);
+    if (byte == '+') {
+      byte = ' ';
+    } else if (byte == '%') {
+      if (escaped.size() - i < 3) return std::nullopt;
+      const int high = kHexDigits[static_cast<unsigned char>(escaped[i + 1])];
+      const int low = kHexDigits[static_cast<unsigned char>(escaped[i + 2])];
+      if (high < 0 || low < 0) return std::nullopt;
+      byte = static_cast<unsigned>(high * 16 + low);
+      i += 2;
     }
-    if (!ascii) {
-      const std::string bytes(texts_.begin() + static_cast<std::ptrdiff_t>(begin), texts_.end());
-      const std::optional<Text> text = TextFromUtf8(bytes);
-      if (!text) return std::nullopt;
-      // Never longer than the bytes were.
-      texts_.resize(begin);
-      texts_.insert(texts_.end(), text->begin(), text->end());
-    }
-    return TextView(texts_.data() + begin, texts_.size() - begin);
+    seen |= byte;
+    *end++ = static_cast<char>(byte);
   }
-
- private:
-  std::vector<char16_t>& texts_;
-};
+  const std::string_view bytes(begin, static_cast<std::size_t>(end - begin));
+  if (seen >= 0x80 && !utf8::is_valid(bytes)) return std::nullopt;
+  return bytes;
+}
 
 }  // namespace
 
-Reply Reply::FromBody(std::string_view body) {
-  if (body.ends_with("\r\n")) body.remove_suffix(2);
+Reply Reply::FromBody(std::string body) {
   Reply reply;
-  Unescaper unescaper(reply.texts_, body.size());
-  // Arrays come in a row, so the name seldom changes.
+  reply.body_ = std::make_unique<std::string>(std::move(body));
+  std::string_view rest = *reply.body_;
+  if (rest.ends_with("\r\n")) rest.remove_suffix(2);
+  // Arrays come in a row, so the name seldom changes. Empty when the next one is to be looked up anyway.
   std::string_view lastName;
-  std::vector<TextView>* values = nullptr;
-  while (!body.empty()) {
-    const std::string_view piece = body.substr(0, body.find('&'));
-    body.remove_prefix(std::min(piece.size() + 1, body.size()));
+  Values* values = nullptr;
+  while (!rest.empty()) {
+    const std::string_view piece = rest.substr(0, rest.find('&'));
+    rest.remove_prefix(std::min(piece.size() + 1, rest.size()));
     if (piece.empty()) continue;
     const std::size_t equals = piece.find('=');
-    if (const std::string_view name = piece.substr(0, equals); !values || name != lastName) {
-      const std::optional<TextView> variable = unescaper.Unescape(name);
+    if (const std::string_view name = piece.substr(0, equals); lastName.empty() || name != lastName) {
+      const std::optional<std::string_view> variable = Unescape(*reply.body_, name);
       if (!variable) return {};
       values = &reply.variables_[*variable];
       if (reply.variables_.size() > kMostVariables) return {};
-      lastName = name;
+      // What had escapes is overwritten, and would pass for another name.
+      lastName = variable->size() == name.size() ? *variable : std::string_view();
     }
     if (equals == std::string_view::npos) continue;
-    const std::optional<TextView> value = unescaper.Unescape(piece.substr(equals + 1));
+    const std::optional<std::string_view> value = Unescape(*reply.body_, piece.substr(equals + 1));
     if (!value) return {};
     values->push_back(*value);
   }
-  const auto error = reply.variables_.find(u"ErrorOccured");
-  reply.failed_ = error != reply.variables_.end() && !error->second.empty() && error->second.front() == u"1";
+  const auto error = reply.variables_.find("ErrorOccured");
+  reply.failed_ = error != reply.variables_.end() && !error->second.empty() && error->second.front() == "1";
   return reply;
 }
 
-const std::vector<TextView>* Reply::GetValueByVariableName(TextView name) const {
-  const auto variable = variables_.find(name);
+const Reply::Values* Reply::GetValueByVariableName(TextView name) const {
+  const auto variable = variables_.find(Utf8FromText(name));
   return variable == variables_.end() ? nullptr : &variable->second;
 }
 
-TextView Reply::First(TextView name) const {
-  const std::vector<TextView>* values = GetValueByVariableName(name);
+Text Reply::First(TextView name) const {
+  const Values* values = GetValueByVariableName(name);
   if (!values || values->empty()) throw RuntimeError(error::kSubscriptOutOfRange);
-  return values->front();
+  return TextFromUtf8(values->front()).value();
 }
 
 }  // namespace tarnwick

@@ -2,17 +2,22 @@
 #pragma once
 
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <string_view>
 #include <unordered_map>
 #include <vector>
 
+#include "base/KeyHash.h"
 #include "base/Text.h"
 
 namespace tarnwick {
 
 class Reply {
  public:
+  // Valid UTF-8.
+  using Values = std::vector<std::string_view>;
+
   // A failed exchange without variables.
   Reply() = default;
   Reply(Reply&&) = default;
@@ -20,22 +25,23 @@ class Reply {
 
   // Reads an `application/x-www-form-urlencoded` body in UTF-8. A broken escape or invalid UTF-8 anywhere
   // makes the exchange a failed one, as do more than 1000 names, and a variable ErrorOccured of 1.
-  static Reply FromBody(std::string_view body);
+  static Reply FromBody(std::string body);
 
   // 1 when the exchange failed, else 0.
   std::int32_t ErrorOccured() const { return failed_ ? 1 : 0; }
 
   // Every value that the server sent under `name` (letter case counts), in its order; a bare name has none.
   // Null when the name did not occur. Owned by the reply.
-  const std::vector<TextView>* GetValueByVariableName(TextView name) const;
+  const Values* GetValueByVariableName(TextView name) const;
 
   // Element 0 of the above. Throws run-time error 9 when there is none.
-  TextView First(TextView name) const;
+  Text First(TextView name) const;
 
  private:
-  // All texts in one piece, which the views below point into: a listing has four of them for each file.
-  std::vector<char16_t> texts_;
-  std::unordered_map<TextView, std::vector<TextView>> variables_;
+  // The body, in which names and values are unescaped where they stand, and which the views below point into:
+  // a listing has four of them for each file. Apart, because the bytes of a short string move with it.
+  std::unique_ptr<std::string> body_;
+  std::unordered_map<std::string_view, Values, ProcessHash> variables_;
   bool failed_ = true;
 };
 

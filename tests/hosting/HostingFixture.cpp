@@ -102,7 +102,7 @@ std::string HostingClient::AskFor(std::string_view variable, std::string_view ac
   const Reply reply = Ask(action, parameters);
   if (reply.ErrorOccured() == 1) return "(error)";
   const auto* values = reply.GetValueByVariableName(TextFromUtf8(variable).value());
-  return values && !values->empty() ? Utf8FromText(values->front()) : "(none)";
+  return values && !values->empty() ? std::string(values->front()) : "(none)";
 }
 
 int HostingClient::Form(std::string_view page, const Fields& fields, const char* user,
@@ -146,15 +146,16 @@ std::map<std::string, std::string> HostingClient::CheckedListing(const char* use
   }
   const std::string server = "http://127.0.0.1:" + std::to_string(port_);
   for (std::size_t i = 0; i < names->size(); ++i) {
-    const std::string name = Utf8FromText((*names)[i]);
-    const std::string url = Utf8FromText((*urls)[i]);
+    const std::string name((*names)[i]);
+    const std::string url((*urls)[i]);
     EXPECT_TRUE(url.starts_with(server + "/users/") && url.ends_with("/" + name)) << url;
     // As the downloader asks: blanks escaped, everything else as it is.
-    const std::string target = Utf8FromText(ReplaceAll((*urls)[i], u" ", u"%20")).substr(server.size());
+    const std::string target =
+        Utf8FromText(ReplaceAll(TextFromUtf8(url).value(), u" ", u"%20")).substr(server.size());
     const RawAnswer picture = RawExchange(port_, "GET " + target + " HTTP/1.1\r\nHost: 127.0.0.1\r\n\r\n");
     EXPECT_EQ(picture.Status(), 200) << target;
     EXPECT_NE(picture.bytes.find("Connection: close\r\n"), std::string::npos);
-    EXPECT_EQ(std::to_string(picture.Body().size()), Utf8FromText((*sizes)[i])) << target;
+    EXPECT_EQ(std::to_string(picture.Body().size()), (*sizes)[i]) << target;
     files[name] = picture.Body();
   }
   return files;

@@ -19,8 +19,8 @@ TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
   EXPECT_EQ(reply.ErrorOccured(), 0);
   const auto& values = *reply.GetValueByVariableName(u"A");
   ASSERT_EQ(values.size(), 2U);
-  EXPECT_EQ(values[0], u"1");
-  EXPECT_EQ(values[1], u"b c");
+  EXPECT_EQ(values[0], "1");
+  EXPECT_EQ(values[1], "b c");
   EXPECT_TRUE(reply.GetValueByVariableName(u"Bare")->empty());
   EXPECT_EQ(reply.First(u"E"), u"");
   EXPECT_EQ(reply.First(u"U"), u"\u00e9");
