@@ -110,8 +110,6 @@ class SocketDownloader {
   void OnWatchdog();
 
   bool IsRunning() const { return running_; }
-  // The announced length of the file; 0 when there is none that is a 32-bit number.
-  std::int32_t ContentLength() const { return contentLength_; }
 
  private:
   // It runs no more, and nothing is left of it.
