@@ -84,7 +84,9 @@ void WindowsListView::Layout() const {
   MoveWindow(label_, 0, (client.bottom - height) / 2, client.right, height, TRUE);
 }
 
-void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
+void WindowsListView::Draw(HDC dc, const RECT& bounds) {
+  // There is no window yet when a form draws a control that it has not shown.
+  if (!smallIcons_) smallIcons_ = MakeSmallIcons(Dpi());
   const SelectionOwner font = SelectInto(dc, Font());
   Fill(dc, bounds, BackColor());
   SetTextColor(dc, TextColor());
@@ -122,11 +124,11 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) const {
 }
 
 void WindowsListView::SetColumns(std::span<const ListColumn> columns) {
-  if (!Window()) return;
-  while (ListView_DeleteColumn(list_, 0)) {
-  }
   titles_.clear();
   for (const ListColumn& column : columns) titles_.emplace_back(column.title);
+  if (!list_) return;
+  while (ListView_DeleteColumn(list_, 0)) {
+  }
   AddColumns();
 }
 
@@ -146,7 +148,10 @@ void WindowsListView::AddColumns() {
 }
 
 void WindowsListView::SetItemCount(std::size_t count) {
-  if (!Window()) return;
+  if (!list_) {
+    count_ = count;
+    return;
+  }
   ListView_CancelEditLabel(list_);
   Deselect(-1);
   const int focused = ListView_GetNextItem(list_, -1, LVNI_FOCUSED);
@@ -157,18 +162,17 @@ void WindowsListView::SetItemCount(std::size_t count) {
 }
 
 void WindowsListView::AppendItem() {
-  if (!Window()) return;
   ++count_;
-  ListView_SetItemCountEx(list_, static_cast<int>(count_), LVSICF_NOSCROLL);
+  if (list_) ListView_SetItemCountEx(list_, static_cast<int>(count_), LVSICF_NOSCROLL);
 }
 
 void WindowsListView::RefreshItem(std::size_t index) {
-  if (Window()) ListView_RedrawItems(list_, static_cast<int>(index), static_cast<int>(index));
+  if (list_) ListView_RedrawItems(list_, static_cast<int>(index), static_cast<int>(index));
 }
 
 void WindowsListView::ShowList(bool list) {
   listShown_ = list;
-  if (!Window()) return;
+  if (!list_) return;
   ShowWindow(list ? label_ : list_, SW_HIDE);
   ShowWindow(list ? list_ : label_, SW_SHOWNA);
 }
@@ -211,7 +215,7 @@ void WindowsListView::SelectAlone(std::size_t index) {
 
 void WindowsListView::SetMultiSelect(bool multiple) {
   multiple_ = multiple;
-  if (!Window()) return;
+  if (!list_) return;
   const std::optional<std::size_t> first = NextSelected(0);
   const LONG style = GetWindowLongW(list_, GWL_STYLE);
   SetWindowLongW(list_, GWL_STYLE, multiple ? style & ~LVS_SINGLESEL : style | LVS_SINGLESEL);
@@ -227,7 +231,7 @@ void WindowsListView::EndLabelEdit() {
 
 void WindowsListView::Focus() {
   // A list that nobody sees takes it from nobody.
-  if (Window() && IsWindowVisible(Outer())) SetFocus(listShown_ ? list_ : Outer());
+  if (list_ && IsWindowVisible(Outer())) SetFocus(listShown_ ? list_ : Outer());
 }
 
 std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) {

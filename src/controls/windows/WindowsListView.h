@@ -24,7 +24,7 @@ class WindowsListView : public ListView, public ControlWindow {
   void SetUser(ListViewUser& user) { user_ = &user; }
 
   // Draws the list as the window would show it, into `bounds`.
-  void Draw(HDC dc, const RECT& bounds) const;
+  void Draw(HDC dc, const RECT& bounds);
   // The small pictures, for a picture made of two.
   HIMAGELIST SmallIcons() const { return smallIcons_.Get(); }
 
