@@ -50,9 +50,6 @@ class KeyedList {
     return 0;
   }
 
-  // Throws 9 like At.
-  void Remove(std::size_t position) { Take(position); }
-
   // Removes an item and returns it. Throws 9 like At.
   Item Take(std::size_t position) {
     const Entry& gone = EntryAt(position);
@@ -61,11 +58,6 @@ class KeyedList {
     Item item = std::move((*entry)->item);
     entries_.erase(entry);
     return item;
-  }
-
-  void Clear() {
-    keys_ = {};
-    entries_.clear();
   }
 
  private:
