@@ -49,6 +49,11 @@ void Measure(std::vector<Side>& sides) {
   }
 }
 
+Side PerUnit(Side side, double units) {
+  for (double& cost : side.costs) cost /= units;
+  return side;
+}
+
 void Row(const std::string& what, const Side& ours, const Side& peer, const char* bound, const char* rest) {
   PrintRow(what, "s", bound, rest, ours);
   PrintSide(peer);

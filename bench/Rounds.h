@@ -28,6 +28,9 @@ struct Side {
 // so that a busy moment of the machine meets all alike.
 void Measure(std::vector<Side>& sides);
 
+// The side, which was measured for the whole, with its costs for one of so many units.
+Side PerUnit(Side side, double units);
+
 // Prints a row. `bound` is ">=1.4" for times as fast as the peer, "<=1.4" for times the peer's cost, or ""
 // for a peer that is only shown. `rest` says what the remaining difference consists of.
 void Row(const std::string& what, const Side& ours, const Side& peer, const char* bound, const char* rest);

@@ -65,7 +65,7 @@ def main(arguments):
         with open(name, encoding="utf-8") as file:
             rows += [Row(line) for line in file if line.startswith("row\t")]
     if table:
-        titles = ("What", "Library", "Peer", "Peer's", "Ratio", "Bound", "", "What the rest is")
+        titles = ("What", "Library", "Peer", "Peer's", "Ratio", "Bound", "Verdict", "What the difference consists of")
         with open(head, encoding="utf-8") as file, open(table, "w", encoding="utf-8") as out:
             out.write(file.read() + "\n| " + " | ".join(titles) + " |\n|" + "---|" * len(titles) + "\n")
             for row in rows:

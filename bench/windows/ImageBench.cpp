@@ -91,7 +91,7 @@ void SizesBench(const std::wstring& folder) {
   Row(what, sides[0], sides[1], "<=1.3", "the search for the size; opening is nearly all of both");
   Row(what, sides[0], sides[2], ">=4.0",
       "opening is nearly all of the library's; the peer also makes a decoder");
-  Row(what, sides[0], sides[3], "", "the peer opens through the C library and reads in small pieces");
+  Row(what, sides[0], sides[3], "", "the peer reads only as far as the size");
 }
 
 }  // namespace

@@ -138,6 +138,8 @@ double Init(const Form& form, const Account& account, int files) {
   const ComPtr<_ctrlListImage> list = form.Control<_ctrlListImage>();
   ComPtr<_CFileUpload> client;
   list->get_mobjFileupload(client.Receive());
+  // As in a new control: the records of the run before are freed first.
+  list->ChangeFileFilter(Bstr(L"gif"));
   LogOn(*client, account);
   Bstr all(L"*");
   VARIANT_BOOL done = VARIANT_FALSE;

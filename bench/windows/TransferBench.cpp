@@ -99,30 +99,26 @@ double Stall() {
 
 // --- The rows ---
 
-using Names = std::vector<std::wstring>;
-
 // What each side does with the files of these names. All begin without a file that they will write.
 struct Downloads {
   std::wstring url;
-  Names names;
+  std::vector<std::wstring> names;
 
   double ByLibrary(_ctrlListImage& list, const wchar_t* folder) const {
     Native("find " + Narrow(folder) + " '" + userFolder + "' -name '[lps]*.jpg' -delete");
-    const double seconds = Seconds([&] {
-      for (const std::wstring& name : names) Download(list, name, folder);
-    });
-    if (GetFileAttributesW((std::wstring(folder) + L"\\" + names.back()).c_str()) == INVALID_FILE_ATTRIBUTES)
-      Stop("a download left no file");
-    return seconds;
+    return Each(folder, [&](const std::wstring& name, const std::wstring&) { Download(list, name, folder); });
   }
   double ByLoop(const std::wstring& folder, bool copied) const {
     Native("find " + Narrow(folder) + " copies -name '[lps]*.jpg' -delete");
-    return Seconds([&] {
-      for (const std::wstring& name : names) {
-        const std::wstring target = folder + L"\\" + name;
-        WinInetDownload(url + name, target.c_str());
-        if (copied) CopyFileW(target.c_str(), (L"copies\\" + name).c_str(), FALSE);
-      }
+    return Each(folder, [&](const std::wstring& name, const std::wstring& target) {
+      WinInetDownload(url + name, target.c_str());
+      if (copied) CopyFileW(target.c_str(), (L"copies\\" + name).c_str(), FALSE);
+    });
+  }
+  double ByUrlmon() const {
+    return Each(L"urlmon", [&](const std::wstring& name, const std::wstring& target) {
+      DeleteUrlCacheEntryW((url + name).c_str());
+      URLDownloadToFileW(nullptr, (url + name).c_str(), target.c_str(), 0, nullptr);
     });
   }
   double ByCurl() const {
@@ -133,13 +129,17 @@ struct Downloads {
     std::ofstream("addresses", std::ios::binary) << addresses;
     return Native("curl -sf -K addresses && cp -r curl curl-copies");
   }
-  double ByUrlmon() const {
-    return Seconds([&] {
-      for (const std::wstring& name : names) {
-        DeleteUrlCacheEntryW((url + name).c_str());
-        URLDownloadToFileW(nullptr, (url + name).c_str(), (L"urlmon\\" + name).c_str(), 0, nullptr);
-      }
+
+ private:
+  // Seconds of `work` with each name and its path in the folder, where the last file is afterwards.
+  double Each(const std::wstring& folder,
+              const std::function<void(const std::wstring&, const std::wstring&)>& work) const {
+    const double seconds = Seconds([&] {
+      for (const std::wstring& name : names) work(name, folder + L"\\" + name);
     });
+    if (GetFileAttributesW((folder + L"\\" + names.back()).c_str()) == INVALID_FILE_ATTRIBUTES)
+      Stop("a download left no file");
+    return seconds;
   }
   static std::string Narrow(const std::wstring& text) { return {text.begin(), text.end()}; }
 };
@@ -175,17 +175,15 @@ void TransferBench(const Account& account, std::size_t largeBytes, int smallCoun
   const char* const rest =
       "a message and an event for each piece that arrives; two files written beside their names and renamed";
   for (const int ours : {0, 1}) {
-    const std::string what =
-        ours == 0 ? "download of 64 MiB, window hidden" : "download of 64 MiB, window visible";
+    const std::string what = std::string("download of 64 MiB, window ") + (ours == 0 ? "hidden" : "visible");
     const Side& library = sides[static_cast<std::size_t>(ours)];
     Row(what, library, sides[2], ">=1.0", rest);
     Row(what, library, sides[3], ">=0.9", rest);
     Row(what, library, sides[4], ">=3.0", "the peer writes to its cache first and copies from there");
     Row(what, library, sides[5], "", "the copy, which the loop alone does not make");
   }
-  Side each = sides[0];
-  for (double& cost : each.costs) cost /= mebibytes;
-  Row("download, a MiB of 64", each, sides[6], "<=1.2", "a connection and two new files, whatever the size");
+  Row("download, a MiB of 64", PerUnit(sides[0], mebibytes), sides[6], "<=1.2",
+      "a connection and two new files, whatever the size");
 
   Downloads small{url, {}};
   for (int i = 0; i < smallCount; ++i) small.names.push_back(L"small-" + std::to_wstring(i) + L".jpg");

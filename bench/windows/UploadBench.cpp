@@ -102,9 +102,8 @@ void UploadBench(const Account& account) {
       "the service is asked before and after; sockets and files in the kernel are three quarters of both");
   Row(what, sides[0], sides[2], "", "the copy, and the service that is asked before and after");
   Row(what, sides[0], sides[3], "", "each piece passes through Wine, and its answer is waited for there");
-  Side each = sides[0];
-  for (double& cost : each.costs) cost /= 64;
-  Row(what + ", a MiB", each, sides[4], "<=1.2", "the requests to the service, whatever the size");
+  Row(what + ", a MiB", PerUnit(sides[0], 64), sides[4], "<=1.2",
+      "the requests to the service, whatever the size");
 }
 
 }  // namespace tarnwick::bench
