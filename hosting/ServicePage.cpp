@@ -290,7 +290,7 @@ Action Find(const std::string& action) {
 std::string ServicePage::ActionOf(const Reply& form) {
   const auto* values = form.ErrorOccured() == 1 ? nullptr : form.GetValueByVariableName(u"ClientAction");
   if (!values || values->empty()) return {};
-  const std::string action = Utf8FromText(EncryptParameter(values->front()));
+  const std::string action = Utf8FromText(EncryptParameter(form.First(u"ClientAction")));
   return Find(action) ? action : std::string();
 }
 
