@@ -77,9 +77,7 @@ TEST_F(CFileUploadTest, EveryFalseLogonRestoresTheUser) {
 
 TEST_F(CFileUploadTest, LogonRenewsTheListing) {
   ASSERT_TRUE(Logon(u"first"));
-  const auto sink = [&](const std::shared_ptr<CUpload>& file) {
-    fake.apartment.listing.all.Add(file);
-  };
+  const auto sink = [&](const std::shared_ptr<CUpload>& file) { fake.apartment.listing.all.Add(file); };
   // A second file of the address ends the listing; the first stays.
   Answer("FileName=a&FileName=b&FileURL=u&FileURL=u&FileSize=1&FileSize=2&FileDate=d&FileDate=d");
   EXPECT_FALSE(client.ListFilesForUser(sink));
