@@ -39,6 +39,7 @@ double Seconds(const std::function<void()>& work) {
 void Measure(std::vector<Side>& sides) {
   std::mt19937 random;
   std::vector<Side*> order;
+  order.reserve(sides.size());
   for (Side& side : sides) order.push_back(&side);
   for (int round = 0; round <= kRounds; ++round) {
     std::shuffle(order.begin(), order.end(), random);

@@ -17,10 +17,10 @@ constexpr std::size_t kMostVariables = 1000;
 
 // Values of the hexadecimal digits, -1 for all other bytes.
 constexpr auto kHexDigits = [] {
-  std::array<signed char, 256> digits{};
+  std::array<short, 256> digits{};
   digits.fill(-1);
-  for (unsigned i = 0; i < 10; ++i) digits['0' + i] = static_cast<signed char>(i);
-  for (unsigned i = 0; i < 6; ++i) digits['A' + i] = digits['a' + i] = static_cast<signed char>(10 + i);
+  for (unsigned i = 0; i < 10; ++i) digits['0' + i] = static_cast<short>(i);
+  for (unsigned i = 0; i < 6; ++i) digits['A' + i] = digits['a' + i] = static_cast<short>(10 + i);
   return digits;
 }();
 
