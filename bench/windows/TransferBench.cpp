@@ -135,7 +135,9 @@ struct Downloads {
   double Each(const std::wstring& folder,
               const std::function<void(const std::wstring&, const std::wstring&)>& work) const {
     const double seconds = Seconds([&] {
-      for (const std::wstring& name : names) work(name, folder + L"\\" + name);
+      std::wstring path = folder + L"\\";
+      const std::size_t length = path.size();
+      for (const std::wstring& name : names) work(name, path.replace(length, path.npos, name));
     });
     if (GetFileAttributesW((folder + L"\\" + names.back()).c_str()) == INVALID_FILE_ATTRIBUTES)
       Stop("a download left no file");
