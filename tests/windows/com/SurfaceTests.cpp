@@ -57,7 +57,7 @@ class Surface : public testing::Test {
   std::string SectionOf(const std::string& name) const {
     for (std::size_t begin = 0; (begin = reference.find("\n## ", begin)) != std::string::npos;) {
       const std::size_t end = reference.find("\n## ", begin + 1);
-      const std::string section = reference.substr(begin, end - begin);
+      std::string section = reference.substr(begin, end - begin);
       if (section.substr(0, section.find('\n', 1)).find(" " + name) != std::string::npos) return section;
       begin = end;
     }
@@ -153,9 +153,11 @@ TEST_F(Surface, IsWhatTheReferenceTells) {
         for (const Parameter& parameter : member.parameters) {
           if (parameter.Is(PARAMFLAG_FRETVAL)) continue;
           const bool isOptional = parameter.Is(PARAMFLAG_FOPT);
-          entry += std::string(entry.empty() ? "" : ", ") + (isOptional ? "[" : "") +
-                   (parameter.Is(PARAMFLAG_FOUT) && !isOfEvents ? "ref " : "") + Narrow(parameter.name) +
-                   (isOptional ? "]" : "");
+          if (!entry.empty()) entry += ", ";
+          entry += isOptional ? "[" : "";
+          entry += parameter.Is(PARAMFLAG_FOUT) && !isOfEvents ? "ref " : "";
+          entry += Narrow(parameter.name);
+          entry += isOptional ? "]" : "";
         }
         entry = "`" + Narrow(member.name) + (member.kind == INVOKE_FUNC ? "(" + entry + ")" : "") + "`";
         EXPECT_NE(section.find(entry), std::string::npos) << entry << " of " << type.name;
