@@ -17,8 +17,8 @@ struct Actions : DownloadActions {
   Text path;
   int ends = 0;
   bool written = false;
-  void Connect(TextView, std::uint16_t port) override {
-    if (port == 0) std::abort();
+  void Connect(const DownloadPlan& plan) override {
+    if (plan.port == 0) std::abort();
   }
   void Send(std::string_view bytes) override { request.append(bytes); }
   void CloseSocket() override {}
@@ -58,7 +58,7 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   const char end = choice.empty() ? '\0' : choice[0];
   Actions actions;
   SocketDownloader machine(actions);
-  machine.StartDownload(u"http://h/" + TextFromLatin1(url), u"C:\\t", u"", end & 4 ? u"proxy" : u"", u"80");
+  machine.StartDownload(u"http://h/" + TextFromLatin1(url), u"", {u"C:\\t", end & 4 ? u"proxy" : u"", u"80"});
   const bool started = machine.IsRunning();
   machine.OnConnected();
   // One request, whose lines are ours.

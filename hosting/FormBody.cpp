@@ -1,7 +1,7 @@
 #include "hosting/FormBody.h"
 
 #include "base/Text.h"
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 
 namespace tarnwick::hosting {
 namespace {

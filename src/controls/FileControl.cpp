@@ -4,8 +4,10 @@
 
 #include "base/RuntimeError.h"
 #include "controls/FileNames.h"
+#include "platform/HttpTransport.h"
 #include "support/PathHelpers.h"
 #include "transfer/AcceptorPages.h"
+#include "transfer/ExchangeFailures.h"
 #include "transfer/FileNameGuard.h"
 
 namespace tarnwick {
@@ -119,6 +121,12 @@ bool FileControl::CheckShownChangeable() {
   return !ShowsOtherAccount();
 }
 
+void FileControl::FailExchange(std::int32_t ftpError, TextView description) {
+  const TextView secure = SecureFailureText(apartment_.platform.http.LastFailure());
+  if (!secure.empty()) return Fail(ftp_error::kConnectAborted, secure);
+  Fail(ftpError, description);
+}
+
 void FileControl::FailStopped() {
   if (IsAborted()) {
     Fail(ftp_error::kAborted, u"The transfer was stopped.");
@@ -136,7 +144,7 @@ bool FileControl::ListAccount() {
     return true;
   // Half a listing would pass for the account.
   listing_.Forget();
-  Fail(ftp_error::kNotTaken, u"The service did not list the files.");
+  FailExchange(ftp_error::kNotTaken, u"The service did not list the files.");
   return false;
 }
 
@@ -186,7 +194,7 @@ bool FileControl::UploadImage(TextView szLocalPath) {
       return Raise(event::kUploadRefused);
     }
     if (answer == status::kFailure) {
-      Fail(ftp_error::kNotAllowed, u"The account takes no files, or the service could not be asked.");
+      FailExchange(ftp_error::kNotAllowed, u"The account takes no files, or the service could not be asked.");
       return Raise(event::kNotAllowed);
     }
     const AccountKey account = apartment_.session.Account();
@@ -216,7 +224,7 @@ Text FileControl::SendAndRegister(CFileUpload& client, const Text& path, const A
     if (apartment_.session.Account() == account) url = client.SaveUploadFile(path);
     if (url.empty()) {
       copies_.LoseUpload(path);
-      Fail(ftp_error::kNotTaken, u"The file was sent, but not registered.");
+      FailExchange(ftp_error::kNotTaken, u"The file was sent, but not registered.");
     }
   }
   downloader_.StopWatchdog();
@@ -270,8 +278,14 @@ void FileControl::FailUpload(CFileUpload& client, const Text& path, std::int32_t
   } else if (number == acceptor::kNameRefused && IsNameAllowed(name) && !taken && IsTooLarge(client, path)) {
     Fail(NumberedFailure(ftp_error::kFull, u"The account is full.", number));
   } else {
-    Fail(PageFailure(number, taken));
+    FailPage(number, taken);
   }
+}
+
+void FileControl::FailPage(std::int32_t number, bool nameTaken) {
+  const Failure failure = PageFailure(number, nameTaken);
+  if (number != acceptor::kUnspecified) return Fail(failure);
+  FailExchange(failure.ftpError, failure.description);
 }
 
 bool FileControl::IsNameAllowed(TextView name) {
@@ -378,7 +392,7 @@ bool FileControl::DeleteOnServer(CFileUpload& client, const CUpload& file) {
                          session.userName, session.password, kProductGuid);
   });
   if (client.DeleteFileForUser(name) != status::kSuccess) {
-    Fail(ftp_error::kNotTaken, u"The file was not deleted.");
+    FailExchange(ftp_error::kNotTaken, u"The file was not deleted.");
     return false;
   }
   copies_.Remove(url);
@@ -431,13 +445,13 @@ bool FileControl::RenameOnServer(const Text& oldName, const Text& newName) {
                          AcceptorPath(u"RenameAcceptor.asp"), session.userName, session.password,
                          kProductGuid);
   } catch (const RuntimeError& failure) {
-    Fail(PageFailure(failure.Number(), IsNameTaken(newName, oldName)));
+    FailPage(failure.Number(), IsNameTaken(newName, oldName));
     return false;
   }
   if (client->RenameFile(TextFromNumber(session.productNumber), session.userName, oldName, newName) ==
       status::kSuccess)
     return true;
-  Fail(ftp_error::kNotTaken, u"The service did not rename the file.");
+  FailExchange(ftp_error::kNotTaken, u"The service did not rename the file.");
   return false;
 }
 

@@ -210,6 +210,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Notes the outcome of the operation that runs, for m_LastError.
   void Fail(std::int32_t ftpError, TextView description);
   void Fail(const Failure& failure) { Fail(failure.ftpError, failure.description); }
+  // Notes that the exchange with the server that ended last failed: why it was not safe, or what is given here.
+  void FailExchange(std::int32_t ftpError, TextView description);
   // Notes why what was told to stop has no result.
   void FailStopped();
   // Whether a transfer may start now; else the reason is noted.
@@ -272,6 +274,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   bool SendFile(CFileUpload& client, const Text& path);
   // Notes why the upload component failed with that number.
   void FailUpload(CFileUpload& client, const Text& path, std::int32_t number);
+  // Notes why a page failed with that number.
+  void FailPage(std::int32_t number, bool nameTaken);
   static bool IsNameAllowed(TextView name);
   // Whether the name is allowed, but another file than the one that is called `own` has it.
   bool IsNameTaken(TextView name, TextView own) const;

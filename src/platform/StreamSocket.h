@@ -25,19 +25,24 @@ class SocketEvents {
   virtual void OnSocketError(std::int32_t number) = 0;
 };
 
-class StreamSocket {
+// Bytes that arrive from a peer.
+class ByteStream {
  public:
-  virtual ~StreamSocket() = default;
+  virtual ~ByteStream() = default;
 
   virtual void SetEvents(SocketEvents* events) = 0;
+  // Reads what is there, as far as it fits; how many bytes.
+  virtual std::size_t Read(std::span<char> room) = 0;
+  virtual void Close() = 0;
+};
+
+class StreamSocket : public ByteStream {
+ public:
   // Begins to connect; closes what was open. Failures are told as events.
   virtual void Connect(TextView host, std::uint16_t port) = 0;
   // Sends as much as the system takes now, and the rest when it takes more; neither blocks nor pumps
   // messages.
   virtual void Send(std::string_view bytes) = 0;
-  // Reads what is there, as far as it fits; how many bytes.
-  virtual std::size_t Read(std::span<char> room) = 0;
-  virtual void Close() = 0;
 };
 
 }  // namespace tarnwick

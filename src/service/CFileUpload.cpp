@@ -8,7 +8,7 @@
 #include "service/modEnctyption.h"
 #include "session/ProxySettings.h"
 #include "session/ResourceStrings.h"
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 
 namespace tarnwick {
 namespace {
@@ -18,8 +18,9 @@ constexpr TextView kServiceFolder = u"/bv/bin";
 constexpr TextView kFtpAgent = u"FileUploadClient";
 constexpr std::uint16_t kFtpPort = 21;
 
-// The FTP session speaks to the session's server as the session's user.
+// The FTP session speaks to the session's server as the session's user. Over TLS there is none.
 void SetFtpLogon(FtpState& ftp, const SessionValues& session) {
+  if (session.IsSecure()) return;
   const auto address = SplitHttpAddress(session.serverName);
   ftp.host = address ? address->host : Text();
   ftp.port = kFtpPort;
@@ -59,7 +60,7 @@ Reply CFileUpload::Ask(TextView requestName, TextView clientAction,
   HTTPServer::AddParameter(request, u"ClientAction", Encipher(clientAction));
   for (const Parameter& parameter : parameters)
     HTTPServer::AddParameter(request, parameter.name, parameter.value);
-  return channel_.SendRequest(request, apartment_.session.serverName + Text(kServiceFolder), sendFlag);
+  return channel_.SendRequest(request, ServerUrl(apartment_.session.serverName) + Text(kServiceFolder), sendFlag);
 }
 
 Text CFileUpload::AskForText(TextView requestName, TextView clientAction,
@@ -107,13 +108,7 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
     session.userName = user;
     session.password = password;
     session.productNumber = NumberFromText(ProductID);
-    const Text status = AskForText(u"ValidationRequest", u"UserValidate",
-                                   {{u"UserName", Encipher(user)},
-                                    {u"Password", Encipher(password)},
-                                    {u"ProductID", product},
-                                    {u"MGUID", session.mguid}},
-                                   0, u"UserAuthenticationStatus", u"FALSE");
-    if (LowerCase(status) != u"true") return;
+    if (!AskForLogon(product)) return;
     session.loggedOn = true;
     // What was listed may be another user's.
     apartment_.listing.Forget();
@@ -128,6 +123,17 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
     session.password = std::move(previousPassword);
   }
   return loggedOn;
+}
+
+bool CFileUpload::AskForLogon(const Text& product) {
+  const SessionValues& session = apartment_.session;
+  const Text status = AskForText(u"ValidationRequest", u"UserValidate",
+                                 {{u"UserName", Encipher(session.userName)},
+                                  {u"Password", Encipher(session.password)},
+                                  {u"ProductID", product},
+                                  {u"MGUID", session.mguid}},
+                                 0, u"UserAuthenticationStatus", u"FALSE");
+  return LowerCase(status) == u"true";
 }
 
 void CFileUpload::LookUpFtpProxy() {
@@ -145,7 +151,16 @@ void CFileUpload::LookUpFtpProxy() {
 bool CFileUpload::OpenSession() {
   return ResultAsItStood(false, [&](bool& open) {
     FtpState& ftp = apartment_.ftp;
-    if (ftp.connection) DisconnectFromServer();
+    if (ftp.connection || !ftp.secureFolder.empty()) DisconnectFromServer();
+    if (apartment_.session.IsSecure()) {
+      // FTP would send the password in clear text.
+      if (!AskForLogon(SessionProduct())) return;
+      const Text path = GetFileUploadPath();
+      if (!path.empty())
+        ftp.secureFolder = ServerUrl(apartment_.session.serverName) + ReplaceAll(path, u"\\", u"/");
+      open = true;
+      return;
+    }
     ftp.internet = apartment_.platform.internet.Open(kFtpAgent);
     if (!ftp.internet) return;
     LookUpFtpProxy();
@@ -167,6 +182,7 @@ void CFileUpload::DisconnectFromServer() {
     // Closed whether or not the server took the farewell: a dead connection must not keep its handles.
     ftp.connection.reset();
     ftp.internet.reset();
+    ftp.secureFolder.clear();
     ftp.connected = false;
   });
 }
@@ -181,7 +197,8 @@ Text CFileUpload::GetFileUploadPath() {
 
 Text CFileUpload::GetUserBasePath() {
   return ResultAsItStood(Text(), [&](Text& url) {
-    url = u"http://" + apartment_.session.serverName + ReplaceAll(GetFileUploadPath(), u"\\", u"/");
+    const Text server = ServerUrl(apartment_.session.serverName);
+    if (!server.empty()) url = server + ReplaceAll(GetFileUploadPath(), u"\\", u"/");
   });
 }
 

@@ -52,7 +52,9 @@ class CFileUpload {
   const std::shared_ptr<CUpload>& GetUploadObject();
   void SetUploadObject(std::shared_ptr<CUpload> record) { uploadObject_ = std::move(record); }
 
-  // Sets the apartment's server name ("host" or "host:port") and asks whether the service is there.
+  // Sets the apartment's server name and asks whether the service is there. With "https://" in front of it
+  // ("https://host" or "https://host:port") everything goes over TLS; what is neither that nor "host" or
+  // "host:port" is asked nothing.
   bool ConnectToServer(TextView szServer);
 
   // Logs the user on and forgets the previous listing. Whenever the result is false, the previous user name
@@ -60,7 +62,8 @@ class CFileUpload {
   bool LogonAs(TextView ProductID, TextView Username, TextView Password, TextView MGUID);
 
   // Opens the FTP connection (no service request but for the folder's path) and goes to the user's folder.
-  // True when the connection is open, even when the folder is not there.
+  // True when the connection is open, even when the folder is not there. Over TLS there is no FTP: true when
+  // the service takes the user.
   bool OpenSession();
 
   // Closes the FTP connection. No service request.
@@ -69,7 +72,8 @@ class CFileUpload {
   // Path of the user's folder from the server's root.
   Text GetFileUploadPath();
 
-  // Web address of the user's folder; "http://" and the server name alone when the service does not tell.
+  // Web address of the user's folder; "http://" (or "https://") and the server name alone when the service
+  // does not tell. Empty, without a request, for a name that cannot be a server's.
   Text GetUserBasePath();
 
   // `szString` with "%", "+", "#" and "&" escaped, the characters that break a form value. No request.
@@ -120,7 +124,8 @@ class CFileUpload {
   // Whether the all-files list is empty. No request.
   bool IsAccountEmpty() const { return apartment_.listing.all.IsEmpty(); }
 
-  // Fetches a file over the FTP connection and returns `szLocalFileName`, or an empty text.
+  // Fetches a file of the user's folder, over the FTP connection or over TLS, and returns `szLocalFileName`, or
+  // an empty text.
   Text DownloadFile(TextView szServerFileName, TextView szLocalFileName);
 
   // Stores the apartment's abort flag; true ends the transfers of its controls that run now. No request.
@@ -198,7 +203,11 @@ class CFileUpload {
   // Logs the new user on and creates the user's folder; false when either fails.
   bool SetUpAccount(TextView ProductID, TextView Username, TextView password, TextView mguid,
                     TextView folder);
+  // Whether the service takes the session's user and password for the product.
+  bool AskForLogon(const Text& product);
   void LookUpFtpProxy();
+  // What DownloadFile does over TLS. May throw.
+  bool FetchSecurely(TextView serverFile, TextView localFile);
 
   // A value as it goes into the form when it is enciphered.
   static Text Encipher(TextView value);

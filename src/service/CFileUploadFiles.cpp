@@ -1,12 +1,17 @@
 // The operations on the files of the account.
 #include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
+#include "platform/HttpTransport.h"
 #include "platform/Internet.h"
 #include "service/CFileUpload.h"
 #include "support/PathHelpers.h"
+#include "support/HttpAddress.h"
 
 namespace tarnwick {
 namespace {
+
+// As many as an upload may have.
+constexpr std::uint64_t kMostFileBytes = 0xFFFF'FFFF;
 
 // Makes a file a normal one as long as the object lives. Where that is not allowed, as on a medium that
 // cannot be written, the file stays as it is.
@@ -162,10 +167,38 @@ void CFileUpload::AbortFileTransfer(bool bAbortStatus) {
   if (bAbortStatus) ++apartment_.aborts;
 }
 
+bool CFileUpload::FetchSecurely(TextView serverFile, TextView localFile) {
+  // A file of the folder, and of no other one.
+  if (serverFile.empty() || serverFile == u"." || serverFile == u".." ||
+      serverFile.find_first_of(u"/\\") != TextView::npos)
+    return false;
+  const auto address = SplitUrl(apartment_.ftp.secureFolder);
+  if (!address || !address->secure) return false;
+  HttpGet get;
+  get.host = address->host;
+  get.port = address->port;
+  get.target = EscapeUnprintable(address->path) + "/" + EscapeFormValue(serverFile);
+  const std::unique_ptr<FileWriter> writer = apartment_.platform.files.Create(localFile);
+  const auto status = apartment_.platform.http.Get(get, kMostFileBytes, [&](std::string_view bytes) {
+    return ResultAsItStood(false, [&](bool& written) {
+      writer->Write(bytes);
+      written = true;
+    });
+  });
+  if (status != 200) return false;
+  writer->Commit();
+  return true;
+}
+
 Text CFileUpload::DownloadFile(TextView szServerFileName, TextView szLocalFileName) {
   return ResultAsItStood(Text(), [&](Text& local) {
+    if (!apartment_.ftp.secureFolder.empty()) {
+      if (FetchSecurely(szServerFileName, szLocalFileName)) local = szLocalFileName;
+      return;
+    }
     FtpConnection* connection = apartment_.ftp.connection.get();
-    if (!connection || !connection->Directory()) return;
+    // One of an earlier session may be open still.
+    if (apartment_.session.IsSecure() || !connection || !connection->Directory()) return;
     if (connection->GetFile(szServerFileName, szLocalFileName)) local = szLocalFileName;
   });
 }

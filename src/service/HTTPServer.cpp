@@ -4,7 +4,7 @@
 
 #include "platform/HttpTransport.h"
 #include "transfer/AcceptorPages.h"
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 
 namespace tarnwick {
 namespace {
@@ -26,8 +26,8 @@ void HTTPServer::AddParameter(Request& request, TextView name, TextView value) {
   request.parameters.emplace_back(name, value);
 }
 
-Reply HTTPServer::SendRequest(const Request& request, TextView path, std::int32_t sendFlag) {
-  const auto address = SplitHttpAddress(path);
+Reply HTTPServer::SendRequest(const Request& request, TextView url, std::int32_t sendFlag) {
+  const auto address = SplitUrl(url);
   if (!address) return {};
 
   std::string query;
@@ -37,6 +37,7 @@ Reply HTTPServer::SendRequest(const Request& request, TextView path, std::int32_
   for (const auto& [name, value] : request.parameters) AppendPair(body, name, value);
 
   HttpPost post;
+  post.secure = address->secure;
   post.host = address->host;
   post.port = address->port;
   post.target = EscapeUnprintable(address->path + u"/" + request.page) + "?" + query;

@@ -35,10 +35,9 @@ class HTTPServer {
 
   static void AddParameter(Request& request, TextView name, TextView value);
 
-  // Sends the request. `path` is the server name ("host" or "host:port") followed by the folder of the page,
-  // without a scheme. Never throws for what the network does: a failed exchange is a reply whose ErrorOccured
-  // is 1.
-  Reply SendRequest(const Request& request, TextView path, std::int32_t sendFlag);
+  // Sends the request. `url` is the server's followed by the folder of the page. Never throws for what the
+  // network does: a failed exchange, which one without a server is too, is a reply whose ErrorOccured is 1.
+  Reply SendRequest(const Request& request, TextView url, std::int32_t sendFlag);
 
   // Asks the acceptor page for `action` on `folder` (a bare name). Throws a run-time error with the page's
   // error number, see PostAcceptorForm.

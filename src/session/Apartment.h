@@ -36,6 +36,8 @@ struct FtpState {
   // The connection is open and its directory is the user's folder.
   bool connected = false;
   Text directory;
+  // Address of the user's folder while a session over TLS is open, which has no FTP connection; else empty.
+  Text secureFolder;
   // The connection goes first when the state ends.
   std::unique_ptr<InternetSession> internet;
   std::unique_ptr<FtpConnection> connection;

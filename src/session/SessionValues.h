@@ -4,6 +4,7 @@
 #include <cstdint>
 
 #include "base/Text.h"
+#include "support/HttpAddress.h"
 
 namespace tarnwick {
 
@@ -17,7 +18,7 @@ struct AccountKey {
 
 // Who is connected to what; set by `ConnectToServer` and `LogonAs`.
 struct SessionValues {
-  // "host" or "host:port".
+  // "host" or "host:port", or the same behind "https://".
   Text serverName;
   Text userName;
   Text password;
@@ -26,6 +27,8 @@ struct SessionValues {
   // Set by a log-on; cleared once its FTP values were rewritten for the proxy.
   bool loggedOn = false;
 
+  // Whether everything goes over TLS.
+  bool IsSecure() const { return IsSecureUrl(serverName); }
   AccountKey Account() const { return {serverName, userName}; }
 };
 

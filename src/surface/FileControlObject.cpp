@@ -20,7 +20,7 @@ FileControlObject<Interface>::FileControlObject(const ControlClass& itsClass, IU
       ole_(*this, itsClass.events, itsClass.extent),
       events_(ole_),
       uploader_(apartment_.Get().platform),
-      downloader_(apartment_.Get(), socket_, watchdog_) {}
+      downloader_(apartment_.Get(), socket_, secureFetch_, watchdog_) {}
 
 template <typename Interface>
 void FileControlObject<Interface>::StopDrops() {
@@ -303,8 +303,12 @@ STDMETHODIMP FileControlObject<Interface>::Init(BSTR* szFileFilter, VARIANT_BOOL
       ole_.ViewChanged();
       return S_OK;
     } catch (const RuntimeError& failure) {
-      return ReportError(failure.Number() == init_error::kNoClient ? L"The control has no service client"
-                                                                   : L"The service did not list the files",
+      if (failure.Number() == init_error::kNoClient)
+        return ReportError(L"The control has no service client", failure.Number());
+      // A connection that was not safe says why.
+      const bool unsafe = Rules().m_LastError == ftp_error::kConnectAborted;
+      return ReportError(unsafe ? WideFromText(Rules().m_strLastErrorDesc).c_str()
+                                : L"The service did not list the files",
                          failure.Number());
     }
   });

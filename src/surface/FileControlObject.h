@@ -4,6 +4,7 @@
 
 #include "controls/FileControl.h"
 #include "controls/windows/ControlWindow.h"
+#include "platform/windows/WindowsSecureFetch.h"
 #include "platform/windows/WindowsStreamSocket.h"
 #include "platform/windows/WindowsTimer.h"
 #include "surface/CFileUploadObject.h"
@@ -176,6 +177,7 @@ class FileControlObject : public DualObject<Interface>,
   HostEvents events_;
   UploadObject uploader_;
   WindowsStreamSocket socket_;
+  WindowsSecureFetch secureFetch_;
   WindowsTimer watchdog_;
   PictureDownloader downloader_;
   // As long as there is a window that was asked for.

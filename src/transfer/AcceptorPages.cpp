@@ -2,16 +2,10 @@
 
 #include "base/RuntimeError.h"
 #include "platform/HttpTransport.h"
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 #include "transfer/Reply.h"
 
 namespace tarnwick {
-namespace {
-
-constexpr TextView kScheme = u"http://";
-
-}  // namespace
-
 std::int32_t ErrorNumberOf(const std::optional<HttpAnswer>& answer) {
   return ResultAsItStood(acceptor::kUnspecified, [&](std::int32_t& number) {
     if (!answer || answer->status != 200) return;
@@ -20,10 +14,10 @@ std::int32_t ErrorNumberOf(const std::optional<HttpAnswer>& answer) {
 }
 
 HttpPost AcceptorPost(TextView usersBaseUrl, TextView acceptorPath) {
-  if (usersBaseUrl.starts_with(kScheme)) usersBaseUrl.remove_prefix(kScheme.size());
-  auto address = SplitHttpAddress(usersBaseUrl);
+  auto address = SplitUrl(usersBaseUrl);
   if (!address) throw RuntimeError(acceptor::kUnspecified);
   HttpPost post;
+  post.secure = address->secure;
   post.host = std::move(address->host);
   post.port = address->port;
   post.target = EscapeUnprintable(acceptorPath);
@@ -31,7 +25,7 @@ HttpPost AcceptorPost(TextView usersBaseUrl, TextView acceptorPath) {
 }
 
 Text UsersBaseUrl(TextView server) {
-  return Text(kScheme).append(server).append(u"/users/");
+  return ServerUrl(server) + u"/users/";
 }
 
 Text AcceptorPath(TextView page) {

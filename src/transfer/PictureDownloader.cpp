@@ -1,12 +1,16 @@
 #include "transfer/PictureDownloader.h"
 
 #include <algorithm>
+#include <initializer_list>
 #include <memory>
+#include <string>
 
 #include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
 #include "platform/Platform.h"
+#include "support/HttpAddress.h"
 #include "support/PathHelpers.h"
+#include "transfer/ExchangeFailures.h"
 #include "transfer/FtpErrors.h"
 
 namespace tarnwick {
@@ -26,11 +30,13 @@ struct Reason {
   TextView text;
 };
 
-Reason ReasonOf(DownloadFailure failure, std::int32_t socketError) {
+Reason ReasonOf(DownloadFailure failure, std::int32_t error) {
   using namespace ftp_error;
   switch (failure) {
     case DownloadFailure::kAddress:
       return {kAborted, u"The file's address is not safe."};
+    case DownloadFailure::kClearText:
+      return {kAborted, u"The file's address is not a secure one, as this session needs it."};
     case DownloadFailure::kFolder:
       return {kAborted, u"There is no folder for local copies."};
     case DownloadFailure::kProxy:
@@ -48,13 +54,20 @@ Reason ReasonOf(DownloadFailure failure, std::int32_t socketError) {
     case DownloadFailure::kConnection:
       break;
   }
-  switch (socketError) {
+  if (const TextView text = SecureFailureText(error); !text.empty()) return {kConnectAborted, text};
+  switch (error) {
     case kWinsockReset:
       return {kConnectionReset, u"The server reset the connection."};
     case kWinsockRefused:
+    case http_error::kCannotConnect:
       return {kConnectionRefused, u"The server refused the connection."};
     case kWinsockHostNotFound:
+    case http_error::kNameNotResolved:
       return {kHostNotFound, u"The server's name was not found."};
+    case http_error::kTimeout:
+      return {kTimeout, u"The server was silent for too long."};
+    case http_error::kConnectionLost:
+      return {kConnectAborted, u"The server closed the connection in the middle of its answer."};
     default:
       return {kConnectAborted, u"The connection failed."};
   }
@@ -85,9 +98,15 @@ void Copy(FileSystem& files, TextView from, TextView to) {
 
 }  // namespace
 
-PictureDownloader::PictureDownloader(Apartment& apartment, StreamSocket& socket, Timer& watchdog)
-    : apartment_(apartment), socket_(socket), watchdog_(watchdog), machine_(*this) {
+PictureDownloader::PictureDownloader(Apartment& apartment, StreamSocket& socket, SecureFetch& secureFetch,
+                                     Timer& watchdog)
+    : apartment_(apartment),
+      socket_(socket),
+      secureFetch_(secureFetch),
+      watchdog_(watchdog),
+      machine_(*this) {
   socket_.SetEvents(this);
+  secureFetch_.SetEvents(this);
   watchdog_.SetHandler([this] {
     if (machine_.IsRunning()) return machine_.OnWatchdog();
     // Of an upload: it fails the transfer all the same.
@@ -98,21 +117,26 @@ PictureDownloader::PictureDownloader(Apartment& apartment, StreamSocket& socket,
 
 PictureDownloader::~PictureDownloader() {
   watchdog_.Stop();
-  socket_.SetEvents(nullptr);
-  socket_.Close();
+  for (ByteStream* const stream : std::initializer_list<ByteStream*>{&socket_, &secureFetch_}) {
+    stream->SetEvents(nullptr);
+    stream->Close();
+  }
+}
+
+DownloadRoute PictureDownloader::Route() const {
+  return {apartment_.UserFolderPath, apartment_.proxy.ProxyHost, apartment_.proxy.ProxyPort,
+          apartment_.session.IsSecure()};
 }
 
 bool PictureDownloader::CanStart(TextView url) const {
   DownloadPlan plan;
-  return !url.empty() && !MakeDownloadPlan(url, apartment_.UserFolderPath, apartment_.proxy.ProxyHost,
-                                           apartment_.proxy.ProxyPort, plan);
+  return !url.empty() && !MakeDownloadPlan(url, Route(), plan);
 }
 
 void PictureDownloader::Start(TextView url, TextView explicitTarget) {
-  socketError_ = 0;
+  error_ = 0;
   changes_ = apartment_.ChangesOfCopy(apartment_.UserFolderPath + u"\\" + Text(FileNameFromUrl(url)));
-  machine_.StartDownload(url, apartment_.UserFolderPath, explicitTarget, apartment_.proxy.ProxyHost,
-                         apartment_.proxy.ProxyPort);
+  machine_.StartDownload(url, explicitTarget, Route());
 }
 
 void PictureDownloader::Wait() {
@@ -128,10 +152,17 @@ bool PictureDownloader::GivesUp() {
   return true;
 }
 
-void PictureDownloader::Connect(TextView host, std::uint16_t port) {
+void PictureDownloader::Connect(const DownloadPlan& plan) {
   // It tells nothing yet, so the event still comes first; and what the host does there finds a download to
   // end.
-  socket_.Connect(host, port);
+  if (plan.secure) {
+    stream_ = &secureFetch_;
+    secureFetch_.Begin(
+        {plan.host, plan.port, EscapeUnprintable(plan.requestTarget), std::string(kDownloadHeaders)});
+  } else {
+    stream_ = &socket_;
+    socket_.Connect(plan.host, plan.port);
+  }
   if (events_) events_->Resolving();
 }
 
@@ -145,7 +176,7 @@ void PictureDownloader::OnConnected() {
 void PictureDownloader::OnReadable() {
   if (GivesUp()) return;
   const std::span<char> room = machine_.Room();
-  if (!room.empty()) machine_.OnArrived(socket_.Read(room));
+  if (!room.empty()) machine_.OnArrived(stream_->Read(room));
 }
 
 void PictureDownloader::OnClosedByPeer() {
@@ -153,7 +184,7 @@ void PictureDownloader::OnClosedByPeer() {
 }
 
 void PictureDownloader::OnSocketError(std::int32_t number) {
-  socketError_ = number;
+  error_ = number;
   machine_.OnSocketError();
 }
 
@@ -212,7 +243,7 @@ void PictureDownloader::Finished(bool written) {
 }
 
 void PictureDownloader::Failed(DownloadFailure failure, bool told) {
-  const Reason reason = ReasonOf(failure, socketError_);
+  const Reason reason = ReasonOf(failure, error_);
   if (events_) events_->Failed(reason.ftpError, reason.text, told);
 }
 

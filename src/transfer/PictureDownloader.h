@@ -1,9 +1,11 @@
-// A control's downloader: ties the machine to a socket, the watchdog and the local files.
+// A control's downloader: ties the machine to a socket, or to a fetch over TLS, the watchdog and the local
+// files.
 #pragma once
 
 #include <memory>
 
 #include "platform/FileSystem.h"
+#include "platform/SecureFetch.h"
 #include "platform/StreamSocket.h"
 #include "platform/Timer.h"
 #include "session/Apartment.h"
@@ -15,7 +17,7 @@ namespace tarnwick {
 class PictureDownloader : public Downloader, private DownloadActions, private SocketEvents {
  public:
   // All of them outlive the object. The owner keeps it alive while it tells its events.
-  PictureDownloader(Apartment& apartment, StreamSocket& socket, Timer& watchdog);
+  PictureDownloader(Apartment& apartment, StreamSocket& socket, SecureFetch& secureFetch, Timer& watchdog);
   ~PictureDownloader() override;
   PictureDownloader(const PictureDownloader&) = delete;
   PictureDownloader& operator=(const PictureDownloader&) = delete;
@@ -31,11 +33,12 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
  private:
   // Cancels a download that is not wanted any more; whether it did.
   bool GivesUp();
+  DownloadRoute Route() const;
 
   // DownloadActions
-  void Connect(TextView host, std::uint16_t port) override;
+  void Connect(const DownloadPlan& plan) override;
   void Send(std::string_view bytes) override { socket_.Send(bytes); }
-  void CloseSocket() override { socket_.Close(); }
+  void CloseSocket() override { stream_->Close(); }
   void BeginFile(TextView path, TextView explicitPath) override;
   void WriteFile(std::string_view bytes) override;
   bool FinishFile(std::string_view rest) override;
@@ -55,11 +58,14 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
 
   Apartment& apartment_;
   StreamSocket& socket_;
+  SecureFetch& secureFetch_;
+  // The one of them that the download uses.
+  ByteStream* stream_ = &socket_;
   Timer& watchdog_;
   SocketDownloader machine_;
   DownloadEvents* events_ = nullptr;
-  // Winsock's number of the last failure of the socket.
-  std::int32_t socketError_ = 0;
+  // Winsock's number of the socket's last failure, or an http_error of the fetch over TLS.
+  std::int32_t error_ = 0;
   // How often the local copy that is fetched had changed before: see Apartment::copyChanges.
   std::uint32_t changes_ = 0;
   // Where the file that is fetched goes: see DownloadActions.

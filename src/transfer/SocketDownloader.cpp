@@ -8,12 +8,12 @@
 #include "base/RuntimeError.h"
 #include "support/PathHelpers.h"
 #include "transfer/FileNameGuard.h"
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 
 namespace tarnwick {
 namespace {
 
-constexpr TextView kScheme = u"http://";
+constexpr TextView kPlainScheme = u"http://";
 constexpr std::string_view kHeaderEnd = "\r\n\r\n";
 
 // Bytes from which on a piece of the body is written: what is less stays in memory until more comes.
@@ -21,11 +21,6 @@ constexpr std::size_t kPiece = std::size_t{256} << 10;
 
 // Room for what arrives at a time, if the file is that long.
 constexpr std::size_t kMostRoom = std::size_t{1} << 20;
-
-// A request target with blanks as %20; other characters go out as their UTF-8 bytes.
-std::string TargetBytes(TextView path) {
-  return Utf8FromText(ReplaceAll(path, u" ", u"%20"));
-}
 
 // The number after the first blank of a header line; 0 when it is no 32-bit number.
 std::int32_t NumberOf(std::string_view line) {
@@ -39,30 +34,37 @@ std::int32_t NumberOf(std::string_view line) {
 
 }  // namespace
 
-std::optional<DownloadFailure> MakeDownloadPlan(TextView url, TextView folder, TextView proxyHost,
-                                                TextView proxyPort, DownloadPlan& plan) {
+std::optional<DownloadFailure> MakeDownloadPlan(TextView url, const DownloadRoute& route, DownloadPlan& plan) {
   const TextView fileName = FileNameFromUrl(url);
-  const TextView rest = url.starts_with(kScheme) ? url.substr(kScheme.size()) : url;
-  const auto address = SplitHttpAddress(rest);
+  const auto address = SplitUrl(url);
   if (!address || address->path.empty() || !IsSafeFileName(fileName)) return DownloadFailure::kAddress;
-  if (folder.empty()) return DownloadFailure::kFolder;
+  if (address->secure != route.secure)
+    return route.secure ? DownloadFailure::kClearText : DownloadFailure::kAddress;
+  if (route.folder.empty()) return DownloadFailure::kFolder;
+  plan.secure = address->secure;
   plan.host = address->host;
   plan.port = address->port;
+  plan.requestTarget = address->path;
+  plan.file = Text(route.folder) + u"\\" + Text(fileName);
+  if (plan.secure) return std::nullopt;
+  const TextView rest = url.starts_with(kPlainScheme) ? url.substr(kPlainScheme.size()) : url;
   // With the port, where there is one.
   plan.hostLine = rest.substr(0, rest.find(u'/'));
-  plan.requestTarget = address->path;
-  plan.file = Text(folder) + u"\\" + Text(fileName);
-  if (proxyHost.empty()) return std::nullopt;
-  const auto proxy = SplitHttpAddress(Text(proxyHost) + u":" + Text(proxyPort));
+  if (route.proxyHost.empty()) return std::nullopt;
+  const auto proxy = SplitHttpAddress(Text(route.proxyHost) + u":" + Text(route.proxyPort));
   if (!proxy || !proxy->path.empty()) return DownloadFailure::kProxy;
   plan.host = plan.hostLine = proxy->host;
   plan.port = proxy->port;
-  plan.requestTarget = Text(kScheme) + Text(rest);
+  plan.requestTarget = Text(kPlainScheme) + Text(rest);
   return std::nullopt;
 }
 
-void SocketDownloader::StartDownload(TextView url, TextView folder, TextView explicitTarget,
-                                     TextView proxyHost, TextView proxyPort) {
+// Other characters than blanks go out as their UTF-8 bytes.
+std::string TargetBytes(TextView path) {
+  return Utf8FromText(ReplaceAll(path, u" ", u"%20"));
+}
+
+void SocketDownloader::StartDownload(TextView url, TextView explicitTarget, const DownloadRoute& route) {
   if (url.empty()) return;
   Cancel();
   reply_ = {};
@@ -72,9 +74,9 @@ void SocketDownloader::StartDownload(TextView url, TextView folder, TextView exp
   running_ = true;
   actions_.RestartWatchdog();
   explicitTarget_ = explicitTarget;
-  if (const auto failure = MakeDownloadPlan(url, folder, proxyHost, proxyPort, plan_))
-    return EndWith(*failure, true);
-  actions_.Connect(plan_.host, plan_.port);
+  plan_ = {};
+  if (const auto failure = MakeDownloadPlan(url, route, plan_)) return EndWith(*failure, true);
+  actions_.Connect(plan_);
 }
 
 void SocketDownloader::Cancel() {
@@ -92,10 +94,10 @@ void SocketDownloader::Stop() {
 
 void SocketDownloader::OnConnected() {
   if (!running_) return;
-  actions_.Send("GET " + TargetBytes(plan_.requestTarget) +
-                " HTTP/1.1\r\nHost: " + Utf8FromText(plan_.hostLine) +
-                "\r\nConnection: close\r\nAccept: */*\r\n"
-                "User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n\r\n");
+  if (!plan_.secure)
+    actions_.Send("GET " + TargetBytes(plan_.requestTarget) +
+                  " HTTP/1.1\r\nHost: " + Utf8FromText(plan_.hostLine) + "\r\n" +
+                  std::string(kDownloadHeaders) + "\r\n");
   // While the server works.
   actions_.BeginFile(plan_.file, explicitTarget_);
 }

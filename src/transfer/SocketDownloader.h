@@ -8,7 +8,7 @@
 //   Connection: close
 //   Accept: */*
 //   User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)
-// The reply is everything up to an orderly close, whatever it says of itself: its bytes after the first empty
+// Over TLS the system writes it, and its answer is handed on in the same form. The reply is everything up to an orderly close, whatever it says of itself: its bytes after the first empty
 // line are the file.
 #pragma once
 
@@ -32,6 +32,7 @@ inline constexpr std::uint32_t kWatchdogMs = 40'000;
 // Why there is no file.
 enum class DownloadFailure {
   kAddress,     // the address, or the name in it, could do harm
+  kClearText,   // the address is not one of TLS, and the session is
   kFolder,      // there is no folder for it
   kProxy,       // the proxy setting names no port
   kConnection,  // the socket failed
@@ -42,12 +43,43 @@ enum class DownloadFailure {
   kSilence,
 };
 
+// Where a file is fetched from and goes to.
+struct DownloadPlan {
+  bool secure = false;
+  Text host;
+  std::uint16_t port = 80;
+  Text hostLine;
+  Text requestTarget;
+  Text file;
+};
+
+// How the files of a session are fetched.
+struct DownloadRoute {
+  // Where they go; there is none when it is empty.
+  TextView folder;
+  // None when its host is empty. Over TLS the system's own is used.
+  TextView proxyHost;
+  TextView proxyPort;
+  // The session is one over TLS.
+  bool secure = false;
+};
+
+// The lines of a request's head between Host and the empty line.
+inline constexpr std::string_view kDownloadHeaders =
+    "Connection: close\r\nAccept: */*\r\nUser-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)\r\n";
+
+// The plan for fetching `url` ("http://host[:port]/path", or without the scheme, or with "https://" over TLS)
+// under the last part of the address. Returns what stands against it: an address of the other kind or with a
+// name that could do harm, a folder that is empty, a proxy without a usable port.
+std::optional<DownloadFailure> MakeDownloadPlan(TextView url, const DownloadRoute& route, DownloadPlan& plan);
+
 // What the downloader wants to be done. The last four are events: in them a host may start or end a download,
 // and more of what happens may be told. Nothing may be told to it from inside the others.
 class DownloadActions {
  public:
   virtual ~DownloadActions() = default;
-  virtual void Connect(TextView host, std::uint16_t port) = 0;
+  // Connects for the plan; over TLS that begins the whole fetch, so nothing is sent afterwards.
+  virtual void Connect(const DownloadPlan& plan) = 0;
   virtual void Send(std::string_view bytes) = 0;
   virtual void CloseSocket() = 0;
   virtual void RestartWatchdog() = 0;
@@ -71,29 +103,13 @@ class DownloadActions {
   virtual void Failed(DownloadFailure failure, bool told) = 0;
 };
 
-// Where a file is fetched from and goes to.
-struct DownloadPlan {
-  Text host;
-  std::uint16_t port = 80;
-  Text hostLine;
-  Text requestTarget;
-  Text file;
-};
-
-// The plan for fetching `url` ("http://host[:port]/path", or without the scheme) into `folder` under the last
-// part of the address, through the proxy unless its host is empty. Returns what stands against it: an address
-// or name that could do harm, a folder that is empty, a proxy without a usable port.
-std::optional<DownloadFailure> MakeDownloadPlan(TextView url, TextView folder, TextView proxyHost,
-                                                TextView proxyPort, DownloadPlan& plan);
-
 class SocketDownloader {
  public:
   explicit SocketDownloader(DownloadActions& actions) : actions_(actions) {}
 
   // Begins to fetch a file as MakeDownloadPlan says, and fails at once where that fails. The file goes to
   // `explicitTarget` first unless that is empty. An empty address does nothing.
-  void StartDownload(TextView url, TextView folder, TextView explicitTarget, TextView proxyHost,
-                     TextView proxyPort);
+  void StartDownload(TextView url, TextView explicitTarget, const DownloadRoute& route);
 
   // Ends a download without an event.
   void Cancel();

@@ -24,6 +24,7 @@ namespace tarnwick {
 // Answers posts with the queued bodies; a post without one is a failed connection.
 struct FakeHttp : HttpTransport {
   struct Sent {
+    bool secure;
     Text host;
     std::uint16_t port;
     std::string target;
@@ -35,15 +36,27 @@ struct FakeHttp : HttpTransport {
   std::vector<Sent> sent;
   // Called with each post before it is answered.
   std::function<void(const Sent&)> onPost;
+  std::int32_t failure = 0;
 
   std::optional<HttpAnswer> Post(const HttpPost& post, std::size_t maxBodyBytes) override {
-    sent.push_back({post.host, post.port, post.target, std::string(post.contentType), std::string(post.body),
+    sent.push_back({post.secure, post.host, post.port, post.target, std::string(post.contentType), std::string(post.body),
                     maxBodyBytes});
     if (onPost) onPost(sent.back());
     if (answers.empty()) return std::nullopt;
     std::optional<HttpAnswer> answer = std::move(answers.front());
     answers.pop_front();
     return answer;
+  }
+  std::int32_t LastFailure() const override { return failure; }
+  // Answered like a post.
+  std::optional<int> Get(const HttpGet& get, std::uint64_t most, const Sink& sink) override {
+    HttpPost post;
+    post.secure = true;
+    post.host = get.host;
+    post.port = get.port;
+    post.target = get.target;
+    const auto answer = Post(post, static_cast<std::size_t>(most));
+    return answer && sink(answer->body) ? std::optional(answer->status) : std::nullopt;
   }
   // Takes the whole body at once, but for its last byte, and is answered like any post.
   std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source,

@@ -11,6 +11,7 @@
 #include "base/RuntimeError.h"
 #include "fakes/FakeHost.h"
 #include "fakes/FakePlatform.h"
+#include "platform/SecureFetch.h"
 #include "platform/StreamSocket.h"
 #include "platform/Timer.h"
 #include "transfer/Transfers.h"
@@ -87,12 +88,12 @@ struct FakeDownloader : Downloader {
   void StopWatchdog() override { log.emplace_back("watchdog stops"); }
 };
 
-// A socket whose events a test tells through `events`.
-struct FakeSocket : StreamSocket {
-  explicit FakeSocket(Transcript& itsLog) : log(itsLog) {}
+// A stream whose events a test tells through `events`.
+template <typename Stream>
+struct FakeStream : Stream {
+  explicit FakeStream(Transcript& itsLog) : log(itsLog) {}
   Transcript& log;
   SocketEvents* events = nullptr;
-  std::string sent;
   std::string waiting;
 
   void Arrives(std::string_view bytes) {
@@ -103,6 +104,17 @@ struct FakeSocket : StreamSocket {
     }
   }
   void SetEvents(SocketEvents* sink) override { events = sink; }
+  std::size_t Read(std::span<char> room) override {
+    const std::size_t count = waiting.copy(room.data(), room.size());
+    waiting.erase(0, count);
+    return count;
+  }
+  void Close() override { log.emplace_back("close"); }
+};
+
+struct FakeSocket : FakeStream<StreamSocket> {
+  using FakeStream::FakeStream;
+  std::string sent;
   void Connect(TextView host, std::uint16_t port) override {
     log.push_back("connect " + Utf8FromText(host) + ":" + std::to_string(port));
   }
@@ -110,12 +122,13 @@ struct FakeSocket : StreamSocket {
     sent = bytes;
     log.push_back("send " + sent.substr(0, sent.find('\r')));
   }
-  std::size_t Read(std::span<char> room) override {
-    const std::size_t count = waiting.copy(room.data(), room.size());
-    waiting.erase(0, count);
-    return count;
+};
+
+struct FakeSecureFetch : FakeStream<SecureFetch> {
+  using FakeStream::FakeStream;
+  void Begin(const HttpGet& get) override {
+    log.push_back("fetch " + Utf8FromText(get.host) + ":" + std::to_string(get.port) + get.target);
   }
-  void Close() override { log.emplace_back("close"); }
 };
 
 struct FakeTimer : Timer {

@@ -14,7 +14,7 @@
 
 #include "base/RuntimeError.h"
 #include "service/modEnctyption.h"
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 
 namespace tarnwick::hosting {
 namespace {

@@ -10,7 +10,7 @@
 #include "fakes/FakeHost.h"
 #include "fakes/FakePlatform.h"
 #include "fakes/FakeTransfers.h"
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 
 namespace tarnwick {
 

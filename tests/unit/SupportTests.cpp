@@ -7,7 +7,7 @@
 #include "session/UserFolder.h"
 #include "support/CRegistry.h"
 #include "support/PathHelpers.h"
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 #include "transfer/Reply.h"
 
 namespace tarnwick {
@@ -42,9 +42,26 @@ TEST(HttpAddress, SplitsAndRefuses) {
   EXPECT_EQ(address->path, u"/a/b");
   EXPECT_EQ(SplitHttpAddress(u"[::1]:81")->port, 81);
   EXPECT_EQ(SplitHttpAddress(u"[::1]")->port, 80);
-  for (const TextView bad :
-       {u"", u"/a", u":80", u"h:", u"h:0", u"h:65536", u"h:9x", u"h\r\n/a", u"h\u007f/a", u"a b/c"})
+  for (const TextView bad : {u"", u"/a", u":80", u"h:", u"h:0", u"h:65536", u"h:9x", u"h\r\n/a", u"h\u007f/a",
+                             u"a b/c", u"u@h", u"[::1", u"[h]", u"[::1]x", u"::1"})
     EXPECT_FALSE(SplitHttpAddress(bad)) << Utf8FromText(bad);
+  EXPECT_TRUE(SplitHttpAddress(u"h/users/a@b/c.jpg")) << "a user's folder is no user of the server";
+
+  const auto secure = SplitUrl(u"https://[::1]/a");
+  ASSERT_TRUE(secure && secure->secure);
+  EXPECT_EQ(secure->host, u"[::1]");
+  EXPECT_EQ(secure->port, 443);
+  const auto plain = SplitUrl(u"http://h/a");
+  EXPECT_TRUE(plain && !plain->secure && plain->host == u"h");
+
+  for (const auto& [name, url] : {std::pair{u"h:1", u"http://h:1"},
+                                  {u"HTTPS://h:1", u"https://h:1"},
+                                  {u"https://[::1]", u"https://[::1]"},
+                                  {u"", u"http://"}})
+    EXPECT_EQ(ServerUrl(name), url);
+  for (const TextView bad : {u"http://h", u"ftp://h", u"https://", u"https://u@h", u"https://h/p", u"https:///h",
+                             u"https://h:65536", u"https://[::1", u"https://http://h", u"u:p@h"})
+    EXPECT_EQ(ServerUrl(bad), u"") << Utf8FromText(bad);
 }
 
 TEST(Numbers, FromText) {

@@ -47,10 +47,11 @@ struct DriverTest : testing::Test {
   Transcript log;
   FakePlatform fake;
   FakeSocket socket{log};
+  FakeSecureFetch secureFetch{log};
   FakeTimer watchdog;
   Host host{log};
   std::unique_ptr<PictureDownloader> downloader =
-      std::make_unique<PictureDownloader>(fake.apartment, socket, watchdog);
+      std::make_unique<PictureDownloader>(fake.apartment, socket, secureFetch, watchdog);
 
   void Start(TextView target = kTarget, TextView url = kUrl) {
     log.clear();

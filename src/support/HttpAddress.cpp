@@ -1,9 +1,12 @@
-#include "transfer/HttpAddress.h"
+#include "support/HttpAddress.h"
 
 #include <algorithm>
 
 namespace tarnwick {
 namespace {
+
+constexpr TextView kPlainScheme = u"http://";
+constexpr TextView kSecureScheme = u"https://";
 
 template <typename Keep>
 std::string Escape(TextView text, Keep keep) {
@@ -25,14 +28,23 @@ bool IsLetterOrDigit(unsigned char byte) {
   return (byte >= '0' && byte <= '9') || (byte >= 'A' && byte <= 'Z') || (byte >= 'a' && byte <= 'z');
 }
 
-}  // namespace
+// Whether `host` ("name", "1.2.3.4", "[::1]") can stand between a scheme and a port.
+bool CanBeHost(TextView host) {
+  if (!host.starts_with(u'[')) return !host.empty() && host.find_first_of(u" @\\?#[]") == TextView::npos;
+  if (!host.ends_with(u']')) return false;
+  const TextView number = host.substr(1, host.size() - 2);
+  return number.find(u':') != TextView::npos &&
+         number.find_first_not_of(u"0123456789ABCDEFabcdef:.") == TextView::npos;
+}
 
-std::optional<HttpAddress> SplitHttpAddress(TextView address) {
+std::optional<HttpAddress> Split(TextView address, bool secure) {
   if (std::any_of(address.begin(), address.end(), [](char16_t unit) { return unit < 0x20 || unit == 0x7F; }))
     return std::nullopt;
   const std::size_t pathStart = std::min(address.find(u'/'), address.size());
   TextView host = address.substr(0, pathStart);
   HttpAddress parts;
+  parts.secure = secure;
+  parts.port = secure ? 443 : 80;
   parts.path = address.substr(pathStart);
   // The colons inside an IPv6 literal's brackets belong to the host.
   const std::size_t colon =
@@ -46,9 +58,32 @@ std::optional<HttpAddress> SplitHttpAddress(TextView address) {
     parts.port = static_cast<std::uint16_t>(port);
     host = host.substr(0, colon);
   }
-  if (host.empty() || host.find(u' ') != TextView::npos) return std::nullopt;
+  if (!CanBeHost(host)) return std::nullopt;
   parts.host = host;
   return parts;
+}
+
+}  // namespace
+
+std::optional<HttpAddress> SplitHttpAddress(TextView address) {
+  return Split(address, false);
+}
+
+std::optional<HttpAddress> SplitUrl(TextView url) {
+  if (IsSecureUrl(url)) return Split(url.substr(kSecureScheme.size()), true);
+  return Split(url.starts_with(kPlainScheme) ? url.substr(kPlainScheme.size()) : url, false);
+}
+
+bool IsSecureUrl(TextView url) {
+  return LowerCase(url.substr(0, kSecureScheme.size())) == kSecureScheme;
+}
+
+Text ServerUrl(TextView serverName) {
+  if (!IsSecureUrl(serverName))
+    return serverName.empty() || SplitHttpAddress(serverName) ? Text(kPlainScheme).append(serverName) : Text();
+  const TextView name = serverName.substr(kSecureScheme.size());
+  const auto address = Split(name, true);
+  return address && address->path.empty() ? Text(kSecureScheme).append(name) : Text();
 }
 
 std::string EscapeUnprintable(TextView text) {
