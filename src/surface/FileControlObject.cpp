@@ -1,5 +1,7 @@
 #include "surface/FileControlObject.h"
 
+#include "platform/windows/AnsiText.h"
+
 #include <array>
 
 #include "surface/Guard.h"

@@ -6,7 +6,7 @@
 
 namespace tarnwick {
 
-std::wstring HttpProxyOf(std::wstring_view list) {
+std::wstring ProxyOf(std::wstring_view list, std::wstring_view scheme) {
   constexpr std::wstring_view kSeparators = L"; \t";
   std::wstring forAll;
   for (std::size_t at = 0; (at = list.find_first_not_of(kSeparators, at)) != std::wstring_view::npos;) {
@@ -14,12 +14,13 @@ std::wstring HttpProxyOf(std::wstring_view list) {
     at += entry.size();
     const std::size_t equals = entry.find(L'=');
     if (equals == std::wstring::npos && forAll.empty()) forAll = entry;
-    if (equals == 4 && _wcsnicmp(entry.c_str(), L"http", equals) == 0) return entry.substr(equals + 1);
+    if (equals == scheme.size() && _wcsnicmp(entry.c_str(), scheme.data(), equals) == 0)
+      return entry.substr(equals + 1);
   }
   return forAll;
 }
 
-UserProxy GetUserProxy() {
+UserProxy GetUserProxy(std::wstring_view scheme) {
   // The texts follow the structure.
   std::vector<INTERNET_PROXY_INFO> info(64);
   for (int tries = 0; tries < 2; ++tries) {
@@ -30,7 +31,7 @@ UserProxy GetUserProxy() {
       const auto* const server = reinterpret_cast<const wchar_t*>(info[0].lpszProxy);
       const auto* const bypass = reinterpret_cast<const wchar_t*>(info[0].lpszProxyBypass);
       if (info[0].dwAccessType != INTERNET_OPEN_TYPE_PROXY || !server) return proxy;
-      proxy.server = HttpProxyOf(server);
+      proxy.server = ProxyOf(server, scheme);
       if (bypass) proxy.bypass = bypass;
       return proxy;
     }

@@ -1,4 +1,4 @@
-// The proxy for HTTP that the user has set in the system.
+// The proxy for HTTP, plain or over TLS, that the user has set in the system.
 #pragma once
 
 #include <string>
@@ -13,11 +13,11 @@ struct UserProxy {
   std::wstring bypass;
 };
 
-// Read anew on each call.
-UserProxy GetUserProxy();
+// The one for a scheme, "http" or "https". Read anew on each call.
+UserProxy GetUserProxy(std::wstring_view scheme);
 
-// The entry for HTTP of a list such as "http=host:port;ftp=host:port", or the one for all schemes; empty when
+// The scheme's entry of a list such as "http=host:port;ftp=host:port", or the one for all schemes; empty when
 // there is none.
-std::wstring HttpProxyOf(std::wstring_view list);
+std::wstring ProxyOf(std::wstring_view list, std::wstring_view scheme);
 
 }  // namespace tarnwick
