@@ -35,6 +35,7 @@ bool WindowsListView::MakeChildren() {
                         LVS_EDITLABELS | LVS_SHAREIMAGELISTS | LVS_SINGLESEL);
   label_ = MakeChild(Outer(), L"STATIC", WideFromText(labelText_).c_str(), SS_CENTER | SS_NOPREFIX);
   if (!list_ || !label_) return false;
+  listProc_ = reinterpret_cast<WNDPROC>(GetClassLongPtrW(list_, GCLP_WNDPROC));
   SetIcons();
   // What an earlier window showed; its selection is lost.
   if (multiple_) SetWindowLongW(list_, GWL_STYLE, GetWindowLongW(list_, GWL_STYLE) & ~LVS_SINGLESEL);
@@ -154,8 +155,8 @@ void WindowsListView::SetItemCount(std::size_t count) {
   }
   ListView_CancelEditLabel(list_);
   Deselect(-1);
-  const int focused = ListView_GetNextItem(list_, -1, LVNI_FOCUSED);
-  if (focused >= 0) ListView_SetItemState(list_, focused, 0, LVIS_FOCUSED);
+  const int focused = NextItem(-1, LVNI_FOCUSED);
+  if (focused >= 0) SetState(focused, 0, LVIS_FOCUSED);
   count_ = count;
   ListView_SetItemCountEx(list_, static_cast<int>(count), 0);
   if (count > 0) ListView_EnsureVisible(list_, 0, FALSE);
@@ -182,25 +183,40 @@ void WindowsListView::SetLabelText(TextView text) {
   if (label_) SetWindowTextW(label_, WideFromText(text).c_str());
 }
 
+LRESULT WindowsListView::Ask(UINT message, WPARAM wParam, LPARAM lParam) const {
+  return list_ ? CallWindowProcW(listProc_, list_, message, wParam, lParam) : 0;
+}
+
+int WindowsListView::NextItem(int after, UINT flags) const {
+  return static_cast<int>(Ask(LVM_GETNEXTITEM, static_cast<WPARAM>(after), static_cast<LPARAM>(flags)));
+}
+
+void WindowsListView::SetState(int item, UINT state, UINT mask) const {
+  LVITEMW changed = {};
+  changed.state = state;
+  changed.stateMask = mask;
+  Ask(LVM_SETITEMSTATE, static_cast<WPARAM>(item), reinterpret_cast<LPARAM>(&changed));
+}
+
 bool WindowsListView::IsSelected(std::size_t index) const {
-  return list_ && (ListView_GetItemState(list_, static_cast<int>(index), LVIS_SELECTED) & LVIS_SELECTED) != 0;
+  return (Ask(LVM_GETITEMSTATE, index, LVIS_SELECTED) & LVIS_SELECTED) != 0;
 }
 
 std::optional<std::size_t> WindowsListView::NextSelected(std::size_t from) const {
-  const int found = list_ ? ListView_GetNextItem(list_, static_cast<int>(from) - 1, LVNI_SELECTED) : -1;
+  const int found = list_ ? NextItem(static_cast<int>(from) - 1, LVNI_SELECTED) : -1;
   return found < 0 ? std::nullopt : std::optional<std::size_t>(static_cast<std::size_t>(found));
 }
 
 // Not by one message for all items where it can be avoided: under Wine the list then walks through them, and
 // a selected one is painted again even when it is to stay so.
 void WindowsListView::Deselect(int kept) {
-  const UINT selected = ListView_GetSelectedCount(list_);
+  const LRESULT selected = Ask(LVM_GETSELECTEDCOUNT, 0, 0);
   if (selected == 0) return;
-  const int first = ListView_GetNextItem(list_, -1, LVNI_SELECTED);
+  const int first = NextItem(-1, LVNI_SELECTED);
   if (selected > 1) {
-    ListView_SetItemState(list_, -1, 0, LVIS_SELECTED);
+    SetState(-1, 0, LVIS_SELECTED);
   } else if (first != kept) {
-    ListView_SetItemState(list_, first, 0, LVIS_SELECTED);
+    SetState(first, 0, LVIS_SELECTED);
   }
 }
 
@@ -209,8 +225,8 @@ void WindowsListView::SelectAlone(std::size_t index) {
   const int item = static_cast<int>(index);
   // A list of single selection does not see to it when the selection comes from a program.
   Deselect(item);
-  ListView_SetItemState(list_, item, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
-  ListView_EnsureVisible(list_, item, FALSE);
+  SetState(item, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
+  Ask(LVM_ENSUREVISIBLE, index, FALSE);
 }
 
 void WindowsListView::SetMultiSelect(bool multiple) {
@@ -221,7 +237,7 @@ void WindowsListView::SetMultiSelect(bool multiple) {
   SetWindowLongW(list_, GWL_STYLE, multiple ? style & ~LVS_SINGLESEL : style | LVS_SINGLESEL);
   if (!multiple && first) {
     Deselect(static_cast<int>(*first));
-    ListView_SetItemState(list_, static_cast<int>(*first), LVIS_SELECTED, LVIS_SELECTED);
+    SetState(static_cast<int>(*first), LVIS_SELECTED, LVIS_SELECTED);
   }
 }
 

@@ -53,12 +53,22 @@ class WindowsListView : public ListView, public ControlWindow {
   LRESULT OnNotify(const NMHDR& header);
   void Layout() const;
   void SetIcons();
+  // Sent to the list itself, past what watches its messages; 0 without a list. A window that is watched looks
+  // its properties up three times for each message, and under Wine another process answers each time. What
+  // the list notifies of goes to the outer window as ever.
+  LRESULT Ask(UINT message, WPARAM wParam, LPARAM lParam) const;
+  // -1 when no item behind `after` has what the flags tell.
+  int NextItem(int after, UINT flags) const;
+  // The state of an item, or of all for -1.
+  void SetState(int item, UINT state, UINT mask) const;
   // Leaves at most `kept` selected, which is an item or -1.
   void Deselect(int kept);
   void AddColumns();
 
   ListViewUser* user_ = nullptr;
   HWND list_ = nullptr;
+  // What the list itself answers by.
+  WNDPROC listProc_ = nullptr;
   HWND label_ = nullptr;
   ImageListOwner largeIcons_;
   ImageListOwner smallIcons_;
