@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <string>
+#include <utility>
 
 #include "controls/windows/Drawing.h"
 #include "platform/windows/AnsiText.h"
@@ -43,6 +44,7 @@ bool WindowsListView::MakeChildren() {
   ListView_SetItemCountEx(list_, static_cast<int>(count_), 0);
   ShowWindow(listShown_ ? list_ : label_, SW_SHOWNA);
   ShowWindow(listShown_ ? label_ : list_, SW_HIDE);
+  if (const auto selected = std::exchange(selected_, std::nullopt)) SelectAlone(*selected);
   return true;
 }
 
@@ -151,6 +153,7 @@ void WindowsListView::AddColumns() {
 void WindowsListView::SetItemCount(std::size_t count) {
   if (!list_) {
     count_ = count;
+    selected_.reset();
     return;
   }
   ListView_CancelEditLabel(list_);
@@ -199,11 +202,12 @@ void WindowsListView::SetState(int item, UINT state, UINT mask) const {
 }
 
 bool WindowsListView::IsSelected(std::size_t index) const {
-  return (Ask(LVM_GETITEMSTATE, index, LVIS_SELECTED) & LVIS_SELECTED) != 0;
+  return list_ ? (Ask(LVM_GETITEMSTATE, index, LVIS_SELECTED) & LVIS_SELECTED) != 0 : selected_ == index;
 }
 
 std::optional<std::size_t> WindowsListView::NextSelected(std::size_t from) const {
-  const int found = list_ ? NextItem(static_cast<int>(from) - 1, LVNI_SELECTED) : -1;
+  if (!list_) return selected_ && *selected_ >= from ? selected_ : std::nullopt;
+  const int found = NextItem(static_cast<int>(from) - 1, LVNI_SELECTED);
   return found < 0 ? std::nullopt : std::optional<std::size_t>(static_cast<std::size_t>(found));
 }
 
@@ -221,7 +225,10 @@ void WindowsListView::Deselect(int kept) {
 }
 
 void WindowsListView::SelectAlone(std::size_t index) {
-  if (!Window()) return;
+  if (!list_) {
+    selected_ = index;
+    return;
+  }
   const int item = static_cast<int>(index);
   // A list of single selection does not see to it when the selection comes from a program.
   Deselect(item);

@@ -74,6 +74,8 @@ class WindowsListView : public ListView, public ControlWindow {
   ImageListOwner smallIcons_;
   std::vector<Text> titles_;
   std::size_t count_ = 0;
+  // Selected before there was a window, which knows it itself.
+  std::optional<std::size_t> selected_;
   bool listShown_ = true;
   bool multiple_ = false;
   Text labelText_;

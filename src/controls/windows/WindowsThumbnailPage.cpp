@@ -111,14 +111,17 @@ void WindowsThumbnailPage::WindowGone() {
 }
 
 void WindowsThumbnailPage::ApplyLook() {
-  LOGFONTW font = {};
-  GetObjectW(Font(), sizeof font, &font);
-  font.lfUnderline = TRUE;
-  linkFont_ = FontOwner(CreateFontIndirectW(&font));
   for (const HWND window : {editorWindow_, messageWindow_, switchWindow_})
     SendMessageW(window, WM_SETFONT, reinterpret_cast<WPARAM>(Font()), TRUE);
   ApplyTexts();
   RefreshGrid();
+}
+
+FontOwner WindowsThumbnailPage::LinkFont() const {
+  LOGFONTW font = {};
+  GetObjectW(Font(), sizeof font, &font);
+  font.lfUnderline = TRUE;
+  return FontOwner(CreateFontIndirectW(&font));
 }
 
 void WindowsThumbnailPage::RefreshGrid() const {
@@ -139,7 +142,7 @@ HWND WindowsThumbnailPage::FirstStop() const {
 
 void WindowsThumbnailPage::Focus() {
   // A window inside that has just got the focus keeps it. A page that nobody sees takes it from nobody.
-  if (!tellingFocus_ && Window() && IsWindowVisible(Outer())) SetFocus(FirstStop());
+  if (!tellingFocus_ && IsWindowVisible(Outer())) SetFocus(FirstStop());
 }
 
 bool WindowsThumbnailPage::HasFocus() const {
@@ -202,7 +205,8 @@ void WindowsThumbnailPage::ApplyTexts() const {
   SIZE text = {};
   {
     const WindowDcOwner dc = DcOf(linkWindow_);
-    const SelectionOwner font = SelectInto(dc.Get().dc, linkFont_.Get());
+    const FontOwner underlined = LinkFont();
+    const SelectionOwner font = SelectInto(dc.Get().dc, underlined.Get());
     GetTextExtentPoint32W(dc.Get().dc, link.c_str(), static_cast<int>(link.size()), &text);
   }
   const int width = std::min<int>(text.cx + 2 * Pixels(60), room.right - room.left);
@@ -565,7 +569,8 @@ void WindowsThumbnailPage::PaintGrid(HWND window) const {
 
 void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
   Fill(dc, area, BackColor());
-  const SelectionOwner font = SelectInto(dc, linkFont_ ? linkFont_.Get() : Font());
+  const FontOwner underlined = LinkFont();
+  const SelectionOwner font = SelectInto(dc, underlined.Get());
   SetTextColor(dc, kLinkColor);
   SetBkMode(dc, TRANSPARENT);
   DrawTextW(dc, WideFromText(link_).c_str(), -1, &area, kLinkFormat);

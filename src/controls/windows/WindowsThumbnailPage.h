@@ -96,6 +96,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void ApplyContent() const;
   void ApplyCaption(int slot);
   void ApplyTexts() const;
+  FontOwner LinkFont() const;
   void RefreshGrid() const;
   void PaintGrid(HWND window) const;
   TileStyle Style() const { return {Dpi(), Font(), BackColor()}; }
@@ -110,7 +111,6 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   Content content_ = Content::kNothing;
   Text message_;
   Text link_;
-  FontOwner linkFont_;
   PageScrollBar scrollBar_;
 
   HWND gridWindow_ = nullptr;

@@ -132,6 +132,21 @@ TEST_F(Lifetime, ControlsWithWindowsAndSinksLeaveNothing) {
   DestroyWindow(form);
 }
 
+// A host may list, select and ask by a control that it never shows.
+TEST(ControlThatIsNotShown, HasNoWindow) {
+  const auto expectNone = [](auto&& form) {
+    const int before = WindowsBelow(nullptr);
+    form.Open(L"*");
+    EXPECT_EQ(form.Select(L"rose.jpg"), L"rose.jpg");
+    EXPECT_EQ(WindowsBelow(nullptr), before);
+    form.Show();
+    EXPECT_GT(WindowsBelow(nullptr), before);
+    EXPECT_EQ(form.Selected(), L"rose.jpg");
+  };
+  expectNone(Form());
+  expectNone(ThumbForm());
+}
+
 // A library that is unloaded takes its window classes along, and works when it is loaded again.
 TEST(Unloading, IsClean) {
   std::wstring path;
