@@ -1,9 +1,8 @@
 #include "surface/FileControlObject.h"
 
-#include "platform/windows/AnsiText.h"
-
 #include <array>
 
+#include "platform/windows/AnsiText.h"
 #include "surface/Guard.h"
 #include "surface/HostCollection.h"
 
