@@ -1,7 +1,9 @@
 #include "hosting/Connection.h"
 
+#include <fcntl.h>
 #include <netinet/in.h>
 #include <netinet/tcp.h>
+#include <openssl/err.h>
 #include <poll.h>
 #include <sys/socket.h>
 #include <unistd.h>
@@ -55,10 +57,15 @@ void RemoveHeader(std::string& head, std::string_view name) {
 
 }  // namespace
 
-Connection::Connection(int socket, int stopEvent) : socket_(socket), stopEvent_(stopEvent) {
+Connection::Connection(int socket, int stopEvent, TlsSession tls)
+    : socket_(socket), stopEvent_(stopEvent), tls_(std::move(tls)) {
   // Head and body are sent apart: without this the second one waits for the client's late acknowledgement.
   const int on = 1;
   setsockopt(socket_, IPPROTO_TCP, TCP_NODELAY, &on, sizeof on);
+  if (tls_) {
+    fcntl(socket_, F_SETFL, fcntl(socket_, F_GETFL) | O_NONBLOCK);
+    SSL_set_fd(tls_.get(), socket_);
+  }
 }
 
 Connection::~Connection() {
@@ -68,6 +75,7 @@ Connection::~Connection() {
   } else if (end_ != End::kLost) {
     if (const Fault* late = Shown(Kind::kLateClose))
       Wait(POLLRDHUP, static_cast<int>(late->amount.value_or(kLateCloseDelay)));
+    if (tls_ && end_ != End::kCut) SSL_shutdown(tls_.get());
     shutdown(socket_, SHUT_WR);
     const auto deadline = Clock::now() + std::chrono::milliseconds(kLingerPatience);
     std::uint64_t taken = 0;
@@ -81,6 +89,12 @@ Connection::~Connection() {
   close(socket_);
 }
 
+void Connection::Stall() {
+  // Only the client's end shows on a socket from which nothing is expected.
+  Wait(POLLRDHUP, kForEver);
+  if (!IsOver()) end_ = End::kCut;
+}
+
 bool Connection::AwaitRequest(int milliseconds) {
   if (IsOver() || Shown(Kind::kLateClose)) return false;
   faults_.clear();
@@ -88,8 +102,11 @@ bool Connection::AwaitRequest(int milliseconds) {
   readBytes_ = sentBytes_ = 0;
   status_ = 0;
   bodyLimit_.reset();
-  const bool hasBegun = position_ < buffer_.size() || (Wait(POLLIN, milliseconds) && Fill());
-  headDeadline_ = Clock::now() + std::chrono::milliseconds(milliseconds);
+  const auto patience = std::chrono::milliseconds(milliseconds);
+  headDeadline_ = Clock::now() + patience;
+  if (tls_ && !ShakeHands()) return false;
+  const bool hasBegun = position_ < buffer_.size() || Fill();
+  headDeadline_ = Clock::now() + patience;
   return hasBegun;
 }
 
@@ -101,7 +118,7 @@ void Connection::Show(const std::vector<Fault>& faults) {
 
 ssize_t Connection::read(char* bytes, size_t size) {
   if (IsOver()) return -1;
-  if (position_ == buffer_.size() && !(AwaitBytes() && Fill())) return IsOver() ? -1 : 0;
+  if (position_ == buffer_.size() && !Fill()) return IsOver() ? -1 : 0;
   const std::size_t got = std::min(size, buffer_.size() - position_);
   std::memcpy(bytes, buffer_.data() + position_, got);
   position_ += got;
@@ -143,23 +160,77 @@ bool Connection::Wait(short events, int milliseconds) {
   return ready > 0;
 }
 
-// A body may take as long as it arrives. A head may not: a client that sends one byte of it now and then
-// would keep the connection for hours.
-bool Connection::AwaitBytes() {
-  if (isHeadRead_) return Wait(POLLIN, kPatience);
+bool Connection::AwaitHead(short events) {
   const auto left = std::chrono::ceil<std::chrono::milliseconds>(headDeadline_ - Clock::now()).count();
-  if (left > 0 && Wait(POLLIN, static_cast<int>(left))) return true;
+  if (left > 0 && Wait(events, static_cast<int>(left))) return true;
   if (!IsOver()) end_ = End::kClosed;
   return false;
 }
 
+// True as well when that was done before.
+bool Connection::ShakeHands() {
+  for (;;) {
+    // What other connections of this thread left in its queue would pass for an error of this one.
+    ERR_clear_error();
+    const int result = SSL_accept(tls_.get());
+    if (result == 1) return true;
+    const int error = SSL_get_error(tls_.get(), result);
+    const bool goesOn = (error == SSL_ERROR_WANT_READ && AwaitHead(POLLIN)) ||
+                        (error == SSL_ERROR_WANT_WRITE && AwaitHead(POLLOUT));
+    if (goesOn) continue;
+    if (end_ != End::kLost) end_ = End::kCut;  // the alert, if there was a reason for one, is sent
+    return false;
+  }
+}
+
+// A body may take as long as it arrives. A head may not: a client that sends one byte of it now and then
+// would keep the connection for hours.
+bool Connection::AwaitBytes() {
+  return isHeadRead_ ? Wait(POLLIN, kPatience) : AwaitHead(POLLIN);
+}
+
 bool Connection::Fill() {
-  buffer_.resize(kBlock);
+  std::optional<ssize_t> received;
+  while (!received && AwaitBytes()) {
+    buffer_.resize(kBlock);
+    received = Receive(buffer_.data(), buffer_.size());
+  }
   position_ = 0;
-  const ssize_t got = recv(socket_, buffer_.data(), buffer_.size(), MSG_DONTWAIT);
+  const ssize_t got = received.value_or(0);
   buffer_.resize(got > 0 ? static_cast<std::size_t>(got) : 0);
-  if (got < 0 && errno != EAGAIN) end_ = End::kLost;
+  if (got < 0) end_ = End::kLost;
   return got > 0;
+}
+
+// Takes what is there: the number of bytes, 0 after the client's last one, -1 when the connection is lost.
+// The room must hold a record of TLS, 16 KiB: what stayed in OpenSSL would not show on the socket. None:
+// nothing has come yet, or no whole record of TLS.
+std::optional<ssize_t> Connection::Receive(char* bytes, std::size_t size) {
+  if (!tls_) {
+    const ssize_t got = recv(socket_, bytes, size, MSG_DONTWAIT);
+    return got < 0 && errno == EAGAIN ? std::nullopt : std::optional(got);
+  }
+  ERR_clear_error();
+  std::size_t got = 0;
+  const int result = SSL_read_ex(tls_.get(), bytes, size, &got);
+  if (result == 1) return static_cast<ssize_t>(got);
+  const int error = SSL_get_error(tls_.get(), result);
+  if (error == SSL_ERROR_WANT_READ || error == SSL_ERROR_WANT_WRITE) return std::nullopt;
+  return error == SSL_ERROR_ZERO_RETURN ? 0 : -1;
+}
+
+// Sends as many bytes as can leave now: their number, -1 when the connection is lost. None: not one can.
+std::optional<ssize_t> Connection::Transmit(std::string_view bytes) {
+  if (!tls_) {
+    const ssize_t sent = send(socket_, bytes.data(), bytes.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
+    return sent < 0 && errno == EAGAIN ? std::nullopt : std::optional(sent);
+  }
+  ERR_clear_error();
+  std::size_t sent = 0;
+  const int result = SSL_write_ex(tls_.get(), bytes.data(), bytes.size(), &sent);
+  if (result == 1) return static_cast<ssize_t>(sent);
+  return SSL_get_error(tls_.get(), result) == SSL_ERROR_WANT_WRITE ? std::nullopt
+                                                                   : std::optional(ssize_t{-1});
 }
 
 bool Connection::SendHead(std::string_view head) {
@@ -195,7 +266,7 @@ bool Connection::SendBody(std::string_view body) {
   if (ends) body = body.substr(0, *bodyLimit_ - sentBytes_);
   if (!Send(body)) return false;
   sentBytes_ += body.size();
-  if (ends) end_ = Shown(Kind::kResetBody) ? End::kReset : End::kClosed;
+  if (ends) end_ = Shown(Kind::kResetBody) ? End::kReset : End::kCut;
   return !ends;
 }
 
@@ -211,18 +282,12 @@ bool Connection::Send(std::string_view bytes) {
 
 bool Connection::SendAtOnce(std::string_view bytes) {
   while (!bytes.empty()) {
-    const ssize_t sent = send(socket_, bytes.data(), bytes.size(), MSG_NOSIGNAL | MSG_DONTWAIT);
-    if (sent > 0) {
-      bytes.remove_prefix(static_cast<std::size_t>(sent));
-    } else if (errno == EAGAIN) {
-      if (!Wait(POLLOUT, kPatience)) {
-        end_ = End::kLost;
-        return false;
-      }
-    } else if (errno != EINTR) {
+    const std::optional<ssize_t> sent = Transmit(bytes);
+    if (sent ? *sent < 0 : !Wait(POLLOUT, kPatience)) {
       end_ = End::kLost;
       return false;
     }
+    bytes.remove_prefix(static_cast<std::size_t>(sent.value_or(0)));
   }
   return true;
 }

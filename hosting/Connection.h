@@ -1,7 +1,7 @@
 // One client's connection. It hands cpp-httplib the bytes of one request after the other and sends the
 // answers, spoilt by faults where they are to be shown: the library has no place of its own where a
-// connection can be reset, cut or slowed down. All waits end at once when the server stops, and none uses
-// processor time.
+// connection can be reset, cut or slowed down, with TLS or without. All waits end at once when the server
+// stops, and none uses processor time.
 #pragma once
 
 #include <httplib.h>
@@ -14,18 +14,24 @@
 #include <vector>
 
 #include "hosting/Faults.h"
+#include "hosting/Tls.h"
 
 namespace tarnwick::hosting {
 
 class Connection : public httplib::Stream {
  public:
-  // Owns the socket. `stopEvent` becomes readable when the server stops and must outlive the connection.
-  Connection(int socket, int stopEvent);
+  // Owns the socket. `stopEvent` becomes readable when the server stops and must outlive the connection. With
+  // a session, all bytes go over TLS.
+  Connection(int socket, int stopEvent, TlsSession tls = {});
   Connection(const Connection&) = delete;
   Connection& operator=(const Connection&) = delete;
   ~Connection() override;
 
-  // Waits for the first byte of the next request. False when the client has gone or nothing came for so long.
+  // Says nothing until the client goes.
+  void Stall();
+
+  // Waits for the first byte of the next request, the first time for TLS's handshake before that. False when
+  // the client has gone or nothing came for so long.
   // From then on the head of the request has that time once more to come whole.
   bool AwaitRequest(int milliseconds);
 
@@ -54,11 +60,16 @@ class Connection : public httplib::Stream {
   socket_t socket() const override { return socket_; }
 
  private:
-  enum class End { kOpen, kClosed, kReset, kLost };
+  // After kCut nothing tells that the end was meant: over TLS, the close-notify is missing.
+  enum class End { kOpen, kClosed, kCut, kReset, kLost };
 
   bool Wait(short events, int milliseconds);
+  bool AwaitHead(short events);
+  bool ShakeHands();
   bool AwaitBytes();
   bool Fill();
+  std::optional<ssize_t> Receive(char* bytes, std::size_t size);
+  std::optional<ssize_t> Transmit(std::string_view bytes);
   bool SendHead(std::string_view head);
   bool SendBody(std::string_view body);
   bool Send(std::string_view bytes);
@@ -67,6 +78,7 @@ class Connection : public httplib::Stream {
 
   int socket_;
   int stopEvent_;
+  TlsSession tls_;  // none: without TLS
   std::string buffer_;
   std::size_t position_ = 0;  // of the first byte of the buffer that is not handed out
   End end_ = End::kOpen;

@@ -22,6 +22,7 @@ constexpr KindWord kKinds[] = {
     {"reset:request", Kind::kResetRequest, Argument::kNone},
     {"reset:head", Kind::kResetHead, Argument::kNone},
     {"reset:body", Kind::kResetBody, Argument::kNone},
+    {"stall:handshake", Kind::kStallHandshake, Argument::kNone},
     {"stall", Kind::kStall, Argument::kMayBe},
     {"drip", Kind::kDrip, Argument::kMust},
     {"cut", Kind::kCut, Argument::kMayBe},
@@ -63,6 +64,8 @@ std::optional<Fault> ParseFault(std::string_view text) {
   for (const KindWord& known : kKinds) {
     if (!what.starts_with(known.word)) continue;
     fault.kind = known.kind;
+    // What is asked for is known only after the handshake.
+    if (known.kind == Kind::kStallHandshake && fault.where != "*") return std::nullopt;
     std::string_view rest = what.substr(known.word.size());
     if (rest.empty()) {
       if (known.argument == Argument::kMust) return std::nullopt;
@@ -86,6 +89,11 @@ std::vector<Fault> FaultsForPath(const std::vector<Fault>& faults, std::string_v
     return fault.where == "*" || (fault.where.starts_with('/') && path.starts_with(fault.where)) ||
            fault.where == page;
   });
+}
+
+bool StallsHandshakes(const std::vector<Fault>& faults) {
+  return std::any_of(faults.begin(), faults.end(),
+                     [](const Fault& fault) { return fault.kind == Kind::kStallHandshake; });
 }
 
 std::vector<Fault> FaultsForAction(const std::vector<Fault>& faults, std::string_view action) {

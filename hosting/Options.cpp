@@ -21,14 +21,16 @@ KIND is one of
   reset:head        it is reset in the middle of the answer's head
   reset:body        it is reset half-way through the answer's body
   stall[:SECONDS]   nothing is sent for so long, or until the client goes
+  stall:handshake   the same for every connection before it is one of TLS; WHERE is *
   drip:MS           one byte each MS milliseconds
-  cut[:BYTES]       closed after half, or BYTES, of the announced body
+  cut[:BYTES]       closed after half, or BYTES, of the announced body; over TLS without a close-notify
   wrong             variables of other names; a listing's sister arrays lack their last element
   garbage           a body that is no form
   status:CODE       another status
   huge[:BYTES]      a body of more than 64 MiB, or of BYTES
   empty             200 and no body
-  length:N          N as the announced length of the body
+  length:N          N as the announced length of the body; more than there is ends early, over TLS with a
+                    close-notify
   late-close[:MS]   a whole answer that says nothing about the connection, which serves no other request and is
                     closed 20, or MS, milliseconds later)";
 
@@ -53,7 +55,18 @@ std::string CheckNotEmpty(const std::string& value) {
   return value.empty() ? "is empty" : "";
 }
 
+// Of an IPv6 address, whose parts ":" separates like a port.
+std::string WithoutBrackets(const std::string& host) {
+  return host.starts_with('[') && host.ends_with(']') ? host.substr(1, host.size() - 2) : host;
+}
+
 }  // namespace
+
+std::string ServerName(const Options& options, int port) {
+  const bool isIpv6 = options.host.find(':') != std::string::npos;
+  return (options.HasTls() ? "https://" : "") + (isIpv6 ? "[" + options.host + "]" : options.host) + ":" +
+         std::to_string(port);
+}
 
 Options ParseOptions(std::vector<std::string> arguments) {
   Options options;
@@ -74,9 +87,26 @@ Options ParseOptions(std::vector<std::string> arguments) {
       ->type_name("DIR")
       ->check(CheckNotEmpty)
       ->required();
-  app.add_option("--host", options.host, "address to listen on")->type_name("ADDRESS")->capture_default_str();
+  app.add_option("--host", options.host, "address to listen on, such as [::1]")
+      ->type_name("ADDRESS")
+      ->check(CheckNotEmpty)
+      ->capture_default_str();
   number("--port", options.port, 65'535,
-         "port to listen on; 0 is any free one. The first line printed names it.");
+         "port to listen on; 0 is any free one. The line \"listening on\" names it.");
+  CLI::Option* const certificate =
+      app.add_option("--tls-certificate", options.tlsCertificate,
+                     "serve TLS with this certificate (PEM; those between it and its authority after it)")
+          ->type_name("FILE")
+          ->check(CheckNotEmpty);
+  CLI::Option* const key = app.add_option("--tls-key", options.tlsKey, "its key (PEM)")
+                               ->type_name("FILE")
+                               ->check(CheckNotEmpty)
+                               ->needs(certificate);
+  certificate->needs(key);
+  app.add_flag("--tls-self-signed", options.tlsSelfSigned,
+               "serve TLS with a certificate for ADDRESS and loopback that is made for three days, and print "
+               "where its authority's is")
+      ->excludes(certificate);
   CLI::Option* const user =
       app.add_option("--seed-user", options.seedUser, "account to make when it is not there yet")
           ->type_name("NAME")
@@ -114,6 +144,7 @@ Options ParseOptions(std::vector<std::string> arguments) {
   } catch (const CLI::ParseError& error) {
     throw OptionError(error.what());
   }
+  options.host = WithoutBrackets(options.host);
   for (const std::string& fault : faults) options.faults.push_back(*ParseFault(fault));
   return options;
 }

@@ -12,9 +12,13 @@
 namespace tarnwick::hosting {
 
 struct Options {
-  std::string host = "127.0.0.1";
-  int port = 0;  // 0: any free one
+  std::string host = "127.0.0.1";  // without the brackets of an IPv6 address
+  int port = 0;                    // 0: any free one
   std::filesystem::path data;
+
+  std::filesystem::path tlsCertificate;  // with its key; empty: none
+  std::filesystem::path tlsKey;
+  bool tlsSelfSigned = false;
 
   std::string seedUser;  // empty: none
   std::string seedPassword;
@@ -27,12 +31,19 @@ struct Options {
   std::int64_t expireDays = 365;
   std::vector<Fault> faults;
 
+  bool HasTls() const { return tlsSelfSigned || !tlsCertificate.empty(); }
+  // What the server writes its own authority's certificate to.
+  std::filesystem::path Authority() const { return data / "authority.pem"; }
+
   std::string help;  // what --help asked for; empty: nothing did
 };
 
 class OptionError : public std::runtime_error {
   using std::runtime_error::runtime_error;
 };
+
+// The server as clients name it: HOST:PORT, over TLS https://HOST:PORT.
+std::string ServerName(const Options& options, int port);
 
 // Reads the arguments after the program's name. Throws OptionError with a sentence for the user.
 Options ParseOptions(std::vector<std::string> arguments);

@@ -154,6 +154,11 @@ Server::Server(hosting::Options options, Log log)
                           options_.seedPictures))
     throw std::runtime_error("the name or folder of --seed-user is taken");
 
+  if (options_.tlsSelfSigned)
+    tls_ = ContextOfOwnAuthority(options_.host, options_.Authority());
+  else if (options_.HasTls())
+    tls_ = ContextFromFiles(options_.tlsCertificate, options_.tlsKey);
+
   new_task_queue = [] { return new Threads; };
   set_keep_alive_timeout(kIdlePatience);
   set_keep_alive_max_count(kRequestsPerConnection);
@@ -197,8 +202,7 @@ int Server::Listen() {
     port = bind_to_any_port(options_.host);
   else if (!bind_to_port(options_.host, port))
     port = -1;
-  if (port <= 0)
-    throw std::runtime_error("cannot listen on " + options_.host + ":" + std::to_string(options_.port));
+  if (port <= 0) throw std::runtime_error("cannot listen on " + ServerName(options_, options_.port));
   // The library lets 5 clients queue; the next one would try again after a second.
   ::listen(svr_sock_, SOMAXCONN);
   return port;
@@ -221,7 +225,8 @@ void Server::Stop() {
 // Serves a connection to its end. The library's own version reads and writes the socket in ways that faults
 // cannot reach, and closes it while the client may still be sending.
 bool Server::process_and_close_socket(socket_t socket) {
-  Connection connection(socket, stopEvent_.Get());
+  Connection connection(socket, stopEvent_.Get(), TlsSession(tls_ ? SSL_new(tls_.get()) : nullptr));
+  if (tls_ && StallsHandshakes(options_.faults)) connection.Stall();
   bool stays = true;
   while (stays && connection.AwaitRequest(kIdlePatience * 1000)) {
     const auto start = std::chrono::steady_clock::now();
@@ -298,8 +303,8 @@ void Server::AnswerService(Exchange& exchange, httplib::Response& answer,
   exchange.faults.insert(exchange.faults.end(), faults.begin(), faults.end());
   exchange.note.action = action;
   if (exchange.connection.IsOver()) return;
-  SetForm(answer, service_.Answer(action, form, exchange.request->get_header_value("Host"), exchange.note),
-          exchange.faults);
+  const std::string server = (tls_ ? "https://" : "http://") + exchange.request->get_header_value("Host");
+  SetForm(answer, service_.Answer(action, form, server, exchange.note), exchange.faults);
 }
 
 void Server::AnswerAcceptor(Exchange& exchange, httplib::Response& answer,

@@ -1,4 +1,5 @@
-// The hosting server: the service page, the acceptor pages and the pictures, over one port.
+// The hosting server: the service page, the acceptor pages and the pictures, over one port, with TLS or
+// without.
 #pragma once
 
 #include <httplib.h>
@@ -12,6 +13,7 @@
 #include "hosting/Options.h"
 #include "hosting/ServicePage.h"
 #include "hosting/Store.h"
+#include "hosting/Tls.h"
 
 namespace tarnwick::hosting {
 
@@ -22,7 +24,8 @@ class Server : private httplib::Server {
   // Takes one line, without its end, for each request. Called by any thread, by one at a time.
   using Log = std::function<void(const std::string& line)>;
 
-  // Opens the data folder and seeds it. Throws std::exception when that fails.
+  // Opens the data folder and seeds it; with --tls-self-signed, makes the certificates. Throws std::exception
+  // when that fails.
   Server(hosting::Options options, Log log);
   ~Server() override;
 
@@ -45,6 +48,7 @@ class Server : private httplib::Server {
   void AnswerAcceptor(Exchange& exchange, httplib::Response& answer, const httplib::ContentReader& reader);
 
   hosting::Options options_;
+  TlsContext tls_;  // none: without TLS
   Store store_;
   ServicePage service_;
   Log log_;

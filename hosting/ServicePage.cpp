@@ -47,7 +47,7 @@ struct Call {
   Store& store;
   const Options& options;
   const Reply& form;
-  const std::string& hostName;
+  const std::string& server;
   LogNote& note;
 
   // A parameter in UTF-8. Throws RuntimeError when the request lacks it.
@@ -71,7 +71,7 @@ struct Call {
   std::int64_t Product() const { return NumberFromText(form.First(u"ProductID")); }
 
   std::string FileUrl(const Account& account, const std::string& name) const {
-    return "http://" + hostName + "/users/" + account.folder + "/" + name;
+    return server + "/users/" + account.folder + "/" + name;
   }
 
   bool HasExpired(const Account& account) const {
@@ -294,14 +294,14 @@ std::string ServicePage::ActionOf(const Reply& form) {
   return Find(action) ? action : std::string();
 }
 
-FormBody ServicePage::Answer(const std::string& action, const Reply& form, const std::string& hostName,
+FormBody ServicePage::Answer(const std::string& action, const Reply& form, const std::string& server,
                              LogNote& note) const {
   const Action found = Find(action);
   note.action = found ? action : "unknown";
   note.result = found ? "ok" : "error";
   try {
     if (found) {
-      const Call call{store_, options_, form, hostName, note};
+      const Call call{store_, options_, form, server, note};
       if (!NeedsNoProduct(action)) call.Value(u"ProductID");
       return found(call);
     }

@@ -21,8 +21,8 @@ class ServicePage {
   static std::string ActionOf(const Reply& form);
 
   // Carries the action out; what is malformed or names an unknown user or action gets an answer that says so.
-  // `hostName` goes into file addresses. Failures of disk or database throw.
-  FormBody Answer(const std::string& action, const Reply& form, const std::string& hostName,
+  // `server`, such as "http://HOST:PORT", goes into file addresses. Failures of disk or database throw.
+  FormBody Answer(const std::string& action, const Reply& form, const std::string& server,
                   LogNote& note) const;
 
  private:

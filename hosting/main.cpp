@@ -33,7 +33,9 @@ int Serve(const hosting::Options& options) {
   signal(SIGXFSZ, SIG_IGN);
 
   hosting::Server server(options, PrintLine);
-  PrintLine("listening on " + options.host + ":" + std::to_string(server.Listen()));
+  const int port = server.Listen();
+  if (options.tlsSelfSigned) PrintLine("authority: " + options.Authority().string());
+  PrintLine("listening on " + hosting::ServerName(options, port));
   server.Start();
   int signal = 0;
   sigwait(&ends, &signal);

@@ -84,7 +84,10 @@ RawAnswer RawExchange(int port, std::string_view request, int patienceMs) {
   return answer;
 }
 
-HostingClient::HostingClient(int port) : port_(port), http_("127.0.0.1", port) {
+HostingClient::HostingClient(int port, const std::filesystem::path& authority)
+    : port_(port),
+      http_((authority.empty() ? "http://127.0.0.1:" : "https://127.0.0.1:") + std::to_string(port)) {
+  if (!authority.empty()) http_.set_ca_cert_path(authority.c_str());
   http_.set_keep_alive(true);
   http_.set_tcp_nodelay(true);
 }
@@ -207,7 +210,8 @@ void HostingTest::Begin(const std::function<void(Options&)>& change) {
   });
   port_ = server_->Listen();
   server_->Start();
-  client_ = std::make_unique<HostingClient>(port_);
+  const bool hasAuthority = options.tlsSelfSigned;
+  client_ = std::make_unique<HostingClient>(port_, hasAuthority ? Authority() : std::filesystem::path());
 }
 
 void HostingTest::End() {

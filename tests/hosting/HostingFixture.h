@@ -69,7 +69,8 @@ RawAnswer RawExchange(int port, std::string_view request, int patienceMs = 5000)
 // Talks to a server as the library does.
 class HostingClient {
  public:
-  explicit HostingClient(int port);
+  // Over TLS when it is told which authority to trust.
+  explicit HostingClient(int port, const std::filesystem::path& authority = {});
 
   // A service request; the action is enciphered.
   Reply Ask(std::string_view action, const Fields& parameters = {});
@@ -118,6 +119,7 @@ class HostingTest : public testing::Test {
 
   HostingClient& Client() { return *client_; }
   int Port() const { return port_; }
+  std::filesystem::path Authority() const { return Data() / "authority.pem"; }
   std::filesystem::path Data() const { return data_.Path() / "data"; }
   std::string LogText();
 

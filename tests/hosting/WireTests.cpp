@@ -260,6 +260,10 @@ TEST(OptionsTest, BadOptionsAreToldApartFromGoodOnes) {
       ParseOptions({"--data", "d d", "--port=80", "--port", "81", "--fault", "/a=b/=drip:5", "--fault=*=cut",
                     "--seed-user", "a@b.c", "--seed-password=x=y", "--quota", "5", "--expire-days", "0"});
   EXPECT_EQ(options.data, "d d");
+  EXPECT_EQ(ServerName(options, 81), "127.0.0.1:81");
+  for (const char* host : {"::1", "[::1]"})
+    EXPECT_EQ(ServerName(ParseOptions({"--data", "d", "--tls-self-signed", "--host", host}), 1),
+              "https://[::1]:1");
   EXPECT_EQ(options.port, 81);
   EXPECT_EQ(options.seedPassword, "x=y");
   ASSERT_EQ(options.faults.size(), 2U);
@@ -270,14 +274,17 @@ TEST(OptionsTest, BadOptionsAreToldApartFromGoodOnes) {
        {Arguments{}, Arguments{"--data"}, Arguments{"--data", "d", "--port", "65536"},
         Arguments{"--data", "d", "--port", "x"}, Arguments{"--data", "d", "--port", "010"},
         Arguments{"--data", "d", "--prot", "1"}, Arguments{"--data", "d", "file"},
+        Arguments{"--data", "d", "--tls-certificate", "c"}, Arguments{"--data", "d", "--tls-key", "k"},
+        Arguments{"--data", "d", "--tls-certificate", "c", "--tls-key", "k", "--tls-self-signed"},
         Arguments{"--data", "d", "--seed-user", "u"}, Arguments{"--data", "d", "--seed-password", "p"},
         Arguments{"--data", "d", "--seed-user", "a#b", "--seed-password", "p"},
         Arguments{"--data", "d", "--seed-user", "u", "--seed-password", "!"},
         Arguments{"--data", "d", "--seed-user", "u", "--seed-password", "p", "--seed-pictures", "/nowhere"}})
     EXPECT_THROW(ParseOptions(bad), OptionError) << bad.size();
-  for (const char* fault : {"ListFiles", "=refuse", "ListFiles=", "ListFiles=explode", "ListFiles=reset",
-                            "ListFiles=reset:tail", "ListFiles=drip", "ListFiles=drip:x",
-                            "ListFiles=refuse:1", "ListFiles=status:99", "ListFiles=cut:-1"})
+  for (const char* fault :
+       {"ListFiles", "=refuse", "ListFiles=", "ListFiles=explode", "ListFiles=reset", "ListFiles=reset:tail",
+        "ListFiles=drip", "ListFiles=drip:x", "ListFiles=stall:handshake", "ListFiles=refuse:1",
+        "ListFiles=status:99", "ListFiles=cut:-1"})
     EXPECT_FALSE(ParseFault(fault)) << fault;
 }
 
