@@ -132,8 +132,9 @@ HttpRequest::HttpRequest(const HttpHead& head, std::uint32_t connectMs, std::uin
   DWORD without = WINHTTP_DISABLE_KEEP_ALIVE | WINHTTP_DISABLE_REDIRECTS | WINHTTP_DISABLE_COOKIES |
                   WINHTTP_DISABLE_AUTHENTICATION;
   if (!WinHttpSetOption(request.Get(), WINHTTP_OPTION_DISABLE_FEATURE, &without, sizeof without) ||
-      !WinHttpAddRequestHeaders(request.Get(), head.headers.c_str(), static_cast<DWORD>(head.headers.size()),
-                                WINHTTP_ADDREQ_FLAG_ADD | WINHTTP_ADDREQ_FLAG_REPLACE))
+      (!head.headers.empty() &&
+       !WinHttpAddRequestHeaders(request.Get(), head.headers.c_str(), static_cast<DWORD>(head.headers.size()),
+                                 WINHTTP_ADDREQ_FLAG_ADD | WINHTTP_ADDREQ_FLAG_REPLACE)))
     return;
   auto share = std::make_unique<std::shared_ptr<HttpExchange>>(exchange_);
   auto context = reinterpret_cast<DWORD_PTR>(share.get());

@@ -135,7 +135,7 @@ TEST(WindowsHttpTransport, GoesThroughTheUsersProxy) {
                {L"http=a:1", L"a:1"},
                {L"a:1;HTTP=b:2 https=c:3", L"b:2"},
                {L"ftp=a:1;https=b:2", L""}};
-  for (const auto& row : lists) EXPECT_EQ(HttpProxyOf(row.list), row.server) << row.list;
+  for (const auto& row : lists) EXPECT_EQ(ProxyOf(row.list, L"http"), row.server) << row.list;
 
   LoopbackServer server({{"HTTP/1.1 200 OK\r\nContent-Length: 2\r\n\r\nok"}});
   constexpr wchar_t kKey[] = L"Software\\Microsoft\\Windows\\CurrentVersion\\Internet Settings";
