@@ -22,6 +22,7 @@ constexpr UINT kTickMs = 1'000;
 // just sent quickly is asked for many; the hand-over of each read costs as much as the deciphering of a few KiB.
 constexpr std::size_t kLeastRead = std::size_t{16} << 10;
 constexpr std::size_t kMostRead = std::size_t{512} << 10;
+constexpr DWORD kManyBytes = 4096;
 constexpr ULONGLONG kQuickMs = 20;
 constexpr ULONGLONG kSlowMs = 200;
 
@@ -183,7 +184,7 @@ void WindowsSecureFetch::OnBody(DWORD count) {
   const ULONGLONG now = GetTickCount64();
   const ULONGLONG took = now - asked_;
   asked_ = now;
-  if (took < kQuickMs) {
+  if (took < kQuickMs && count >= kManyBytes) {
     want_ = std::clamp<std::size_t>(std::size_t{2} * count, kLeastRead, kMostRead);
   } else if (took > kSlowMs) {
     want_ = 0;

@@ -15,11 +15,13 @@ namespace tarnwick::test {
 
 // Named by environment variables, which scripts/test sets.
 struct Server {
-  std::wstring name;      // TARNWICK_SERVER, "host:port", with an FTP server on port 21 of the host
+  // TARNWICK_SERVER, "host:port" with an FTP server on port 21 of the host, or the same behind "https://".
+  std::wstring name;
   std::wstring faulty;    // TARNWICK_FAULTY_SERVER
   std::wstring user;      // TARNWICK_USER
   std::wstring password;  // TARNWICK_PASSWORD
   std::wstring product;   // TARNWICK_PRODUCT
+  bool IsSecure() const { return name.starts_with(L"https://"); }
 };
 const Server& TheServer();
 
