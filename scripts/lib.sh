@@ -195,6 +195,16 @@ wine_prefix() {
   touch "$prefix/complete"
 }
 
+# wine_trust ARCH AUTHORITY: programs in the prefix take the certificates of an authority, whose own is in a PEM file.
+wine_trust() {
+  local arch=$1 key='HKLM\Software\Microsoft\SystemCertificates\Root\Certificates' bytes name length
+  bytes=$(openssl x509 -in "$2" -outform DER | od -An -v -tx1 | tr -d ' \n')
+  name=$(openssl x509 -in "$2" -outform DER | sha1sum | cut -c -40)
+  # A property of kind 32, a certificate; then 1 and the length of the bytes. Numbers begin with their low bytes.
+  length=$(printf '%02x%02x0000' $((${#bytes} / 2 % 256)) $((${#bytes} / 512)))
+  wine_run "$arch" reg add "$key\\${name^^}" /v Blob /t REG_BINARY /d "2000000001000000$length$bytes" /f
+}
+
 # registry_of ARCH FILE [ROOT]: what is registered for all users (HKLM) or, with HKCU, for the current one, as text.
 registry_of() {
   wine_run "$1" reg export "${3-HKLM}\\Software\\Classes" "$2.utf16" /y
@@ -209,8 +219,8 @@ hosting_user=anna.berg@example.org
 hosting_password=Linden42
 hosting_product=7
 
-# start_hosting NAME ADDRESS DATA OPTION...: starts a hosting server with the account seeded; its "host:port" is left in
-# `hosting_server`.
+# start_hosting NAME ADDRESS DATA OPTION...: starts a hosting server with the account seeded; its "host:port", with
+# "https://" before it over TLS, is left in `hosting_server`.
 start_hosting() {
   local name=$1 address=$2 data=$3
   shift 3
