@@ -210,7 +210,8 @@ class FileControl : private UploadEvents, private DownloadEvents {
   // Notes the outcome of the operation that runs, for m_LastError.
   void Fail(std::int32_t ftpError, TextView description);
   void Fail(const Failure& failure) { Fail(failure.ftpError, failure.description); }
-  // Notes that the exchange with the server that ended last failed: why it was not safe, or what is given here.
+  // Notes that the exchange with the server that ended last failed: why it was not safe, or what is given
+  // here.
   void FailExchange(std::int32_t ftpError, TextView description);
   // Notes why what was told to stop has no result.
   void FailStopped();

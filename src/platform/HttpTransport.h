@@ -96,11 +96,12 @@ class HttpTransport {
   // Takes the next bytes of a body; false ends the exchange. Must not throw.
   using Sink = std::function<bool(std::string_view bytes)>;
 
-  // Hands the whole body of the answer to `sink`, piece by piece; blocks without pumping messages. The status,
-  // or nullopt for the same reasons as Post, and when the sink said so.
+  // Hands the whole body of the answer to `sink`, piece by piece; blocks without pumping messages. The
+  // status, or nullopt for the same reasons as Post, and when the sink said so.
   virtual std::optional<int> Get(const HttpGet& get, std::uint64_t maxBodyBytes, const Sink& sink) = 0;
 
-  // Why the exchange that ended last had no answer: an http_error, or 0 when it had one or nothing can be said.
+  // Why the exchange that ended last had no answer: an http_error, or 0 when it had one or nothing can be
+  // said.
   virtual std::int32_t LastFailure() const = 0;
 };
 

@@ -60,7 +60,8 @@ Reply CFileUpload::Ask(TextView requestName, TextView clientAction,
   HTTPServer::AddParameter(request, u"ClientAction", Encipher(clientAction));
   for (const Parameter& parameter : parameters)
     HTTPServer::AddParameter(request, parameter.name, parameter.value);
-  return channel_.SendRequest(request, ServerUrl(apartment_.session.serverName) + Text(kServiceFolder), sendFlag);
+  return channel_.SendRequest(request, ServerUrl(apartment_.session.serverName) + Text(kServiceFolder),
+                              sendFlag);
 }
 
 Text CFileUpload::AskForText(TextView requestName, TextView clientAction,

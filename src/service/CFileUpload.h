@@ -124,8 +124,8 @@ class CFileUpload {
   // Whether the all-files list is empty. No request.
   bool IsAccountEmpty() const { return apartment_.listing.all.IsEmpty(); }
 
-  // Fetches a file of the user's folder, over the FTP connection or over TLS, and returns `szLocalFileName`, or
-  // an empty text.
+  // Fetches a file of the user's folder, over the FTP connection or over TLS, and returns `szLocalFileName`,
+  // or an empty text.
   Text DownloadFile(TextView szServerFileName, TextView szLocalFileName);
 
   // Stores the apartment's abort flag; true ends the transfers of its controls that run now. No request.

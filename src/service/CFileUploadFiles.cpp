@@ -4,8 +4,8 @@
 #include "platform/HttpTransport.h"
 #include "platform/Internet.h"
 #include "service/CFileUpload.h"
-#include "support/PathHelpers.h"
 #include "support/HttpAddress.h"
+#include "support/PathHelpers.h"
 
 namespace tarnwick {
 namespace {

@@ -3,8 +3,8 @@
 #include <utility>
 
 #include "platform/HttpTransport.h"
-#include "transfer/AcceptorPages.h"
 #include "support/HttpAddress.h"
+#include "transfer/AcceptorPages.h"
 
 namespace tarnwick {
 namespace {

@@ -80,7 +80,8 @@ bool IsSecureUrl(TextView url) {
 
 Text ServerUrl(TextView serverName) {
   if (!IsSecureUrl(serverName))
-    return serverName.empty() || SplitHttpAddress(serverName) ? Text(kPlainScheme).append(serverName) : Text();
+    return serverName.empty() || SplitHttpAddress(serverName) ? Text(kPlainScheme).append(serverName)
+                                                              : Text();
   const TextView name = serverName.substr(kSecureScheme.size());
   const auto address = Split(name, true);
   return address && address->path.empty() ? Text(kSecureScheme).append(name) : Text();

@@ -308,9 +308,9 @@ STDMETHODIMP FileControlObject<Interface>::Init(BSTR* szFileFilter, VARIANT_BOOL
         return ReportError(L"The control has no service client", failure.Number());
       // A connection that was not safe says why.
       const bool unsafe = Rules().m_LastError == ftp_error::kConnectAborted;
-      return ReportError(unsafe ? WideFromText(Rules().m_strLastErrorDesc).c_str()
-                                : L"The service did not list the files",
-                         failure.Number());
+      return ReportError(
+          unsafe ? WideFromText(Rules().m_strLastErrorDesc).c_str() : L"The service did not list the files",
+          failure.Number());
     }
   });
 }

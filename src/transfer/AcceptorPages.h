@@ -24,8 +24,8 @@ inline constexpr std::int32_t kFolderState = -2147220840;  // to delete: not the
 inline constexpr std::int32_t kUnspecified = -2147467259;  // no usable answer
 }  // namespace acceptor
 
-// "http://SERVER/users/" or "https://SERVER/users/", from a server name as the host gave it. For what cannot be
-// a server's name it is an address without a server, and so goes nowhere.
+// "http://SERVER/users/" or "https://SERVER/users/", from a server name as the host gave it. For what cannot
+// be a server's name it is an address without a server, and so goes nowhere.
 Text UsersBaseUrl(TextView server);
 
 // "/httpupload/PAGE".

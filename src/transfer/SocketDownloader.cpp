@@ -6,9 +6,9 @@
 #include <utility>
 
 #include "base/RuntimeError.h"
+#include "support/HttpAddress.h"
 #include "support/PathHelpers.h"
 #include "transfer/FileNameGuard.h"
-#include "support/HttpAddress.h"
 
 namespace tarnwick {
 namespace {
@@ -34,7 +34,8 @@ std::int32_t NumberOf(std::string_view line) {
 
 }  // namespace
 
-std::optional<DownloadFailure> MakeDownloadPlan(TextView url, const DownloadRoute& route, DownloadPlan& plan) {
+std::optional<DownloadFailure> MakeDownloadPlan(TextView url, const DownloadRoute& route,
+                                                DownloadPlan& plan) {
   const TextView fileName = FileNameFromUrl(url);
   const auto address = SplitUrl(url);
   if (!address || address->path.empty() || !IsSafeFileName(fileName)) return DownloadFailure::kAddress;
@@ -95,9 +96,8 @@ void SocketDownloader::Stop() {
 void SocketDownloader::OnConnected() {
   if (!running_) return;
   if (!plan_.secure)
-    actions_.Send("GET " + TargetBytes(plan_.requestTarget) +
-                  " HTTP/1.1\r\nHost: " + Utf8FromText(plan_.hostLine) + "\r\n" +
-                  std::string(kDownloadHeaders) + "\r\n");
+    actions_.Send("GET " + TargetBytes(plan_.requestTarget) + " HTTP/1.1\r\nHost: " +
+                  Utf8FromText(plan_.hostLine) + "\r\n" + std::string(kDownloadHeaders) + "\r\n");
   // While the server works.
   actions_.BeginFile(plan_.file, explicitTarget_);
 }

@@ -8,8 +8,8 @@
 //   Connection: close
 //   Accept: */*
 //   User-Agent: Mozilla/4.0 (compatible; MSIE 4.0; Windows NT)
-// Over TLS the system writes it, and its answer is handed on in the same form. The reply is everything up to an orderly close, whatever it says of itself: its bytes after the first empty
-// line are the file.
+// Over TLS the system writes it, and its answer is handed on in the same form. The reply is everything up to
+// an orderly close, whatever it says of itself: its bytes after the first empty line are the file.
 #pragma once
 
 #include <cstdint>

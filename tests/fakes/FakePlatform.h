@@ -39,8 +39,8 @@ struct FakeHttp : HttpTransport {
   std::int32_t failure = 0;
 
   std::optional<HttpAnswer> Post(const HttpPost& post, std::size_t maxBodyBytes) override {
-    sent.push_back({post.secure, post.host, post.port, post.target, std::string(post.contentType), std::string(post.body),
-                    maxBodyBytes});
+    sent.push_back({post.secure, post.host, post.port, post.target, std::string(post.contentType),
+                    std::string(post.body), maxBodyBytes});
     if (onPost) onPost(sent.back());
     if (answers.empty()) return std::nullopt;
     std::optional<HttpAnswer> answer = std::move(answers.front());

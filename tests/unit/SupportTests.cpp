@@ -6,8 +6,8 @@
 #include "session/ResourceStrings.h"
 #include "session/UserFolder.h"
 #include "support/CRegistry.h"
-#include "support/PathHelpers.h"
 #include "support/HttpAddress.h"
+#include "support/PathHelpers.h"
 #include "transfer/Reply.h"
 
 namespace tarnwick {
@@ -59,8 +59,9 @@ TEST(HttpAddress, SplitsAndRefuses) {
                                   {u"https://[::1]", u"https://[::1]"},
                                   {u"", u"http://"}})
     EXPECT_EQ(ServerUrl(name), url);
-  for (const TextView bad : {u"http://h", u"ftp://h", u"https://", u"https://u@h", u"https://h/p", u"https:///h",
-                             u"https://h:65536", u"https://[::1", u"https://http://h", u"u:p@h"})
+  for (const TextView bad :
+       {u"http://h", u"ftp://h", u"https://", u"https://u@h", u"https://h/p", u"https:///h",
+        u"https://h:65536", u"https://[::1", u"https://http://h", u"u:p@h"})
     EXPECT_EQ(ServerUrl(bad), u"") << Utf8FromText(bad);
 }
 

@@ -16,14 +16,13 @@ std::int32_t Probe(const std::wstring& host, std::uint16_t port) {
   const InternetOwner session(InternetOpenW(L"Tarnwick", INTERNET_OPEN_TYPE_PRECONFIG, nullptr, nullptr, 0));
   if (!session) return http_error::kSecureChannel;
   SetTimeouts(session.Get(), kProbeMs, kProbeMs);
-  const InternetOwner connection(InternetConnectW(session.Get(), host.c_str(), port, nullptr, nullptr,
-                                                  INTERNET_SERVICE_HTTP, 0, 0));
-  const InternetOwner request(
-      HttpOpenRequestW(connection.Get(), L"HEAD", L"/", nullptr, nullptr, nullptr,
-                       INTERNET_FLAG_SECURE | INTERNET_FLAG_NO_AUTO_REDIRECT | INTERNET_FLAG_NO_COOKIES |
-                           INTERNET_FLAG_NO_CACHE_WRITE | INTERNET_FLAG_RELOAD | INTERNET_FLAG_NO_UI |
-                           INTERNET_FLAG_NO_AUTH,
-                       0));
+  const InternetOwner connection(
+      InternetConnectW(session.Get(), host.c_str(), port, nullptr, nullptr, INTERNET_SERVICE_HTTP, 0, 0));
+  const InternetOwner request(HttpOpenRequestW(
+      connection.Get(), L"HEAD", L"/", nullptr, nullptr, nullptr,
+      INTERNET_FLAG_SECURE | INTERNET_FLAG_NO_AUTO_REDIRECT | INTERNET_FLAG_NO_COOKIES |
+          INTERNET_FLAG_NO_CACHE_WRITE | INTERNET_FLAG_RELOAD | INTERNET_FLAG_NO_UI | INTERNET_FLAG_NO_AUTH,
+      0));
   if (!request || HttpSendRequestW(request.Get(), nullptr, 0, nullptr, 0)) return http_error::kSecureChannel;
   switch (GetLastError()) {
     case ERROR_INTERNET_SEC_CERT_DATE_INVALID:
@@ -44,8 +43,7 @@ std::int32_t Probe(const std::wstring& host, std::uint16_t port) {
 }  // namespace
 
 bool ProbeCertificate(const Text& host, std::uint16_t port, std::function<void(std::int32_t)> told) {
-  return RunOnPool(
-      [wide = WideFromText(host), port, told = std::move(told)] { told(Probe(wide, port)); });
+  return RunOnPool([wide = WideFromText(host), port, told = std::move(told)] { told(Probe(wide, port)); });
 }
 
 std::int32_t ProbedCertificate(const Text& host, std::uint16_t port) {

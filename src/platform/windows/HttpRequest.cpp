@@ -120,11 +120,10 @@ HttpRequest::HttpRequest(const HttpHead& head, std::uint32_t connectMs, std::uin
   connection_ = HttpOwner(WinHttpConnect(session_.Get(), host.c_str(), head.port, 0));
   if (!connection_) return;
   const wchar_t* acceptTypes[] = {L"*/*", nullptr};
-  HttpOwner request(
-      WinHttpOpenRequest(connection_.Get(), head.verb, target.c_str(), nullptr, WINHTTP_NO_REFERER,
-                         acceptTypes,
-                         WINHTTP_FLAG_REFRESH | WINHTTP_FLAG_ESCAPE_DISABLE |
-                             WINHTTP_FLAG_ESCAPE_DISABLE_QUERY | (head.secure ? WINHTTP_FLAG_SECURE : 0)));
+  HttpOwner request(WinHttpOpenRequest(
+      connection_.Get(), head.verb, target.c_str(), nullptr, WINHTTP_NO_REFERER, acceptTypes,
+      WINHTTP_FLAG_REFRESH | WINHTTP_FLAG_ESCAPE_DISABLE | WINHTTP_FLAG_ESCAPE_DISABLE_QUERY |
+          (head.secure ? WINHTTP_FLAG_SECURE : 0)));
   if (!request) return;
   // A post may have been carried out although its answer was lost, so it is sent exactly once. On a kept
   // connection that the server has closed meanwhile, the system would either fail or send it again on its
@@ -221,8 +220,8 @@ bool HttpRequest::IsCut(std::uint64_t received) const {
   if (const auto announced = AnnouncedLength()) return received < *announced;
   // The chunk that is the last one ends the answer before the connection ends.
   if (IsChunked()) return exchange_->ended;
-  // Only the end of the connection ends it, which anybody on the way can bring about: in the clear that is how
-  // servers answer, over TLS it is no end.
+  // Only the end of the connection ends it, which anybody on the way can bring about: in the clear that is
+  // how servers answer, over TLS it is no end.
   return exchange_->secure;
 }
 
@@ -242,8 +241,7 @@ std::int32_t HttpErrorOf(const HttpExchange& exchange) {
       if (flags & WINHTTP_CALLBACK_STATUS_FLAG_CERT_DATE_INVALID) return http_error::kCertificateDate;
       if (flags & WINHTTP_CALLBACK_STATUS_FLAG_CERT_CN_INVALID) return http_error::kCertificateName;
       if (flags & (WINHTTP_CALLBACK_STATUS_FLAG_INVALID_CA | WINHTTP_CALLBACK_STATUS_FLAG_INVALID_CERT |
-                   WINHTTP_CALLBACK_STATUS_FLAG_CERT_REVOKED |
-                   WINHTTP_CALLBACK_STATUS_FLAG_CERT_REV_FAILED))
+                   WINHTTP_CALLBACK_STATUS_FLAG_CERT_REVOKED | WINHTTP_CALLBACK_STATUS_FLAG_CERT_REV_FAILED))
         return http_error::kUnknownAuthority;
       return http_error::kSecureChannel;
     }

@@ -19,8 +19,8 @@ namespace tarnwick {
 
 using HttpOwner = Owner<HINTERNET, WinHttpCloseHandle>;
 
-// What the system tells of one request, and the memory that it reads and writes. Both live until it has let go
-// of the request.
+// What the system tells of one request, and the memory that it reads and writes. Both live until it has let
+// go of the request.
 struct HttpExchange {
   explicit HttpExchange(bool isSecure) : secure(isSecure) {}
 
@@ -70,9 +70,9 @@ struct HttpHead {
 
 class HttpRequest {
  public:
-  // Opens the request; nothing of it goes over the network yet. Redirects, cookies and passwords of the system
-  // are left out; a secure one takes TLS 1.2 and later versions. The time-outs are the system's, which not every
-  // version of it keeps.
+  // Opens the request; nothing of it goes over the network yet. Redirects, cookies and passwords of the
+  // system are left out; a secure one takes TLS 1.2 and later versions. The time-outs are the system's, which
+  // not every version of it keeps.
   HttpRequest(const HttpHead& head, std::uint32_t connectMs, std::uint32_t silenceMs);
   // Closes the request and waits a little for the system to let go of it. Wine: a call that blocks cannot be
   // ended; it is left behind, with the library loaded until the process ends.
@@ -109,8 +109,8 @@ class HttpRequest {
   HttpOwner request_;
 };
 
-// The http_error that the failure of an exchange is, 0 when nothing can be said to it. Wine: whatever is wrong
-// with a certificate is kSecureChannel.
+// The http_error that the failure of an exchange is, 0 when nothing can be said to it. Wine: whatever is
+// wrong with a certificate is kSecureChannel.
 std::int32_t HttpErrorOf(const HttpExchange& exchange);
 
 }  // namespace tarnwick

@@ -7,8 +7,8 @@
 
 namespace tarnwick {
 
-// A session for one request, which costs little: so a change of the user's proxy settings counts at once. `url`
-// is where it goes. Null on failure.
+// A session for one request, which costs little: so a change of the user's proxy settings counts at once.
+// `url` is where it goes. Null on failure.
 HttpOwner OpenHttpSession(const std::wstring& url);
 
 }  // namespace tarnwick

@@ -18,9 +18,8 @@ void CALLBACK Run(PTP_CALLBACK_INSTANCE, void* context) {
 bool RunOnPool(std::function<void()> work) {
   auto context = std::make_unique<std::function<void()>>(std::move(work));
   HMODULE self = nullptr;
-  GetModuleHandleExW(
-      GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
-      reinterpret_cast<const wchar_t*>(Run), &self);
+  GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
+                     reinterpret_cast<const wchar_t*>(Run), &self);
   TP_CALLBACK_ENVIRON environment;
   InitializeThreadpoolEnvironment(&environment);
   SetThreadpoolCallbackRunsLong(&environment);

@@ -205,8 +205,8 @@ bool Request::ReadBody(std::uint64_t maxBytes, const HttpTransport::Sink& sink) 
   room.resize(kMostPiece);
   exchange_.ended = false;
   for (std::uint64_t used = 0; !announced || used < *announced;) {
-    const auto count = ReadSome(room.data(), announced ? std::min<std::uint64_t>(room.size(), *announced - used)
-                                                       : room.size());
+    const auto count = ReadSome(
+        room.data(), announced ? std::min<std::uint64_t>(room.size(), *announced - used) : room.size());
     if (!count) return false;
     if (*count == 0) return !request_.IsCut(used);
     used += *count;
@@ -240,8 +240,8 @@ class MemorySource : public BodySource {
   std::string_view rest_;
 };
 
-// Sends head and body, and has `receive` read the body of the answer once its head is there. `failure` tells why
-// that has no result.
+// Sends head and body, and has `receive` read the body of the answer once its head is there. `failure` tells
+// why that has no result.
 template <typename Receive>
 auto Exchanged(const HttpHead& head, BodySource& source, const Waiting& waiting, std::int32_t& failure,
                const Receive& receive) -> decltype(receive(std::declval<Request&>())) {
@@ -287,7 +287,8 @@ std::optional<HttpAnswer> WindowsHttpTransport::PostStream(const HttpPost& post,
   return Posted(post, source, maxBodyBytes, {connectMs_, silenceMs_, true}, failure_);
 }
 
-std::optional<int> WindowsHttpTransport::Get(const HttpGet& get, std::uint64_t maxBodyBytes, const Sink& sink) {
+std::optional<int> WindowsHttpTransport::Get(const HttpGet& get, std::uint64_t maxBodyBytes,
+                                             const Sink& sink) {
   MemorySource source({});
   const HttpHead head{L"GET", true, get.host, get.port, get.target, {get.headers.begin(), get.headers.end()}};
   return Exchanged(head, source, {connectMs_, silenceMs_, false}, failure_,

@@ -19,7 +19,8 @@ constexpr UINT_PTR kTimer = 1;
 constexpr UINT kTickMs = 1'000;
 
 // Bytes that are asked for at a time. Wine: a read takes until all of them are there, so only a peer that has
-// just sent quickly is asked for many; the hand-over of each read costs as much as the deciphering of a few KiB.
+// just sent quickly is asked for many; the hand-over of each read costs as much as the deciphering of a few
+// KiB.
 constexpr std::size_t kLeastRead = std::size_t{16} << 10;
 constexpr std::size_t kMostRead = std::size_t{512} << 10;
 constexpr DWORD kManyBytes = 4096;
@@ -32,9 +33,9 @@ constexpr std::uint32_t kLeftBehindMs = 30'000;
 }  // namespace
 
 WindowsSecureFetch::WindowsSecureFetch(std::uint32_t handshakeMs)
-    : handshakeMs_(handshakeMs),
-      window_(
-          [this](UINT message, WPARAM wParam, LPARAM lParam) { return OnMessage(message, wParam, lParam); }) {}
+    : handshakeMs_(handshakeMs), window_([this](UINT message, WPARAM wParam, LPARAM lParam) {
+        return OnMessage(message, wParam, lParam);
+      }) {}
 
 UINT WindowsSecureFetch::MessageOf(UINT which) const {
   return kFirstMessage + fetch_ * kCount + which;
@@ -110,7 +111,8 @@ void WindowsSecureFetch::OnTold(DWORD status, DWORD count) {
       return events_->OnConnected();
     case WINHTTP_CALLBACK_STATUS_SENDREQUEST_COMPLETE:
       events_->OnSent();
-      if (fetch == fetch_ && !WinHttpReceiveResponse(request_->Get(), nullptr)) Fail(http_error::kConnectionLost);
+      if (fetch == fetch_ && !WinHttpReceiveResponse(request_->Get(), nullptr))
+        Fail(http_error::kConnectionLost);
       return;
     case WINHTTP_CALLBACK_STATUS_HEADERS_AVAILABLE:
       return OnHead();
@@ -125,10 +127,10 @@ void WindowsSecureFetch::OnTold(DWORD status, DWORD count) {
       if (error != http_error::kSecureChannel) return Fail(error != 0 ? error : http_error::kConnectionLost);
       // The window may be gone when the answer comes; its number may be another one's then, which has no
       // such message.
-      const bool asked = ProbeCertificate(host_, port_, [window = window_.Get(), message = MessageOf(kProbed)](
-                                                            std::int32_t probed) {
-        PostMessageW(window, message, static_cast<WPARAM>(probed), 0);
-      });
+      const bool asked = ProbeCertificate(
+          host_, port_, [window = window_.Get(), message = MessageOf(kProbed)](std::int32_t probed) {
+            PostMessageW(window, message, static_cast<WPARAM>(probed), 0);
+          });
       if (!asked) Fail(error);
       return;
     }

@@ -13,8 +13,8 @@ namespace tarnwick {
 // How long connection and handshake may take together. Wine: the system waits for a handshake without end.
 inline constexpr std::uint32_t kHandshakeMs = 20'000;
 
-// A fetch through the system's HTTP client, which works on threads of its own; what those tell comes as window
-// messages.
+// A fetch through the system's HTTP client, which works on threads of its own; what those tell comes as
+// window messages.
 class WindowsSecureFetch : public SecureFetch {
  public:
   // Tests shorten the time-out.

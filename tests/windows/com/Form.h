@@ -235,7 +235,8 @@ inline std::wstring FolderName() {
   return name;
 }
 inline std::wstring Address(const std::wstring& file) {
-  return (TheServer().IsSecure() ? L"" : L"http://") + TheServer().name + L"/users/" + FolderName() + L"/" + file;
+  return (TheServer().IsSecure() ? L"" : L"http://") + TheServer().name + L"/users/" + FolderName() + L"/" +
+         file;
 }
 inline const Lines kJpegs = {L"Chelsea the cat.jpg", L"coffee.jpg", L"rocket.jpg", L"rose.jpg"};
 
