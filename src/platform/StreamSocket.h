@@ -38,7 +38,9 @@ class ByteStream {
 
 class StreamSocket : public ByteStream {
  public:
-  // Begins to connect; closes what was open. Failures are told as events.
+  // Begins to connect; closes what was open. Failures are told as events. `host` is a name, an IPv4 number or
+  // an IPv6 one, which may stand in brackets. The addresses of a name are tried one after the other, the next
+  // one when one fails or, within kConnectTimeoutMs for all of several, stays silent.
   virtual void Connect(TextView host, std::uint16_t port) = 0;
   // Sends as much as the system takes now, and the rest when it takes more; neither blocks nor pumps
   // messages.

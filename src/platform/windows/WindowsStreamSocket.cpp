@@ -1,8 +1,10 @@
 #include "platform/windows/WindowsStreamSocket.h"
 
+#include <ws2tcpip.h>
+
 #include <algorithm>
-#include <cstring>
 #include <limits>
+#include <optional>
 #include <utility>
 
 #include "platform/windows/AnsiText.h"
@@ -14,21 +16,52 @@ constexpr UINT kFirstMessage = WM_APP;
 // After so many connections the message numbers come again; those of the first are gone by then.
 constexpr UINT kConnections = 1000;
 
+template <typename Peer>
+SocketAddress AddressOf(const Peer& peer) {
+  return {reinterpret_cast<const char*>(&peer), sizeof peer};
+}
+
+// Whether `host` can only be an IPv6 number: no name has a colon or a bracket.
+bool LooksLikeIpv6(const std::string& host) {
+  return host.find_first_of("[:") != std::string::npos;
+}
+
+// The address that `host` writes out in numbers, an IPv6 one also in brackets.
+std::optional<SocketAddress> AddressInNumbers(const std::string& host, std::uint16_t port) {
+  if (!LooksLikeIpv6(host)) {
+    sockaddr_in peer = {};
+    peer.sin_family = AF_INET;
+    peer.sin_port = htons(port);
+    peer.sin_addr.s_addr = inet_addr(host.c_str());
+    if (peer.sin_addr.s_addr == INADDR_NONE) return std::nullopt;
+    return AddressOf(peer);
+  }
+  std::string number = host;
+  sockaddr_in6 peer = {};
+  int size = sizeof peer;
+  if (WSAStringToAddressA(number.data(), AF_INET6, nullptr, reinterpret_cast<sockaddr*>(&peer), &size) != 0)
+    return std::nullopt;
+  peer.sin6_port = htons(port);
+  return AddressOf(peer);
+}
+
 }  // namespace
 
 // What a message tells. Each connection has message numbers of its own: messages of one that was closed may
 // still wait, and the next one may get its socket handle.
-enum class WindowsStreamSocket::Tells : UINT { kLookedUp, kNetworkEvent, kSent, kError, kCount };
+enum class WindowsStreamSocket::Tells : UINT { kNetworkEvent, kSent, kError, kCount };
 
 UINT WindowsStreamSocket::MessageOf(Tells tells) const {
   return kFirstMessage + connection_ * static_cast<UINT>(Tells::kCount) + static_cast<UINT>(tells);
 }
 
-WindowsStreamSocket::WindowsStreamSocket()
-    : window_(
+WindowsStreamSocket::WindowsStreamSocket(std::unique_ptr<Resolver> resolver, std::uint32_t connectMs)
+    : started_(StartSockets()),
+      resolver_(std::move(resolver)),
+      connectMs_(connectMs),
+      window_(
           [this](UINT message, WPARAM wParam, LPARAM lParam) { return OnMessage(message, wParam, lParam); }) {
-  WSADATA data = {};
-  started_ = SocketsOwner(WSAStartup(MAKEWORD(2, 2), &data) == 0);
+  share_.SetHandler([this] { OnShareIsOver(); });
 }
 
 WindowsStreamSocket::~WindowsStreamSocket() {
@@ -37,12 +70,9 @@ WindowsStreamSocket::~WindowsStreamSocket() {
 }
 
 void WindowsStreamSocket::Close() {
-  if (lookup_) {
-    WSACancelAsyncRequest(lookup_);
-    // Wine: the look-up may go on and write its answer, so the memory for that is left to it.
-    static_cast<void>(lookupAnswer_.release());
-  }
-  lookup_ = nullptr;
+  resolver_->Cancel();
+  addresses_.clear();
+  share_.Stop();
   pending_.clear();
   socket_ = {};
   sent_ = false;
@@ -56,30 +86,56 @@ void WindowsStreamSocket::TellError(int error) {
 
 void WindowsStreamSocket::Connect(TextView host, std::uint16_t port) {
   Close();
-  port_ = port;
   const auto name = AnsiFromText(host);
   if (!name) return TellError(WSAHOST_NOT_FOUND);
   // A number needs no look-up, which would cost a thread each time.
-  const unsigned long number = inet_addr(name->c_str());
-  if (number != INADDR_NONE) return ConnectTo(number);
-  lookupAnswer_ = std::make_unique<char[]>(MAXGETHOSTSTRUCT);
-  lookup_ = WSAAsyncGetHostByName(window_.Get(), MessageOf(Tells::kLookedUp), name->c_str(),
-                                  lookupAnswer_.get(), MAXGETHOSTSTRUCT);
-  if (!lookup_) TellError(WSAGetLastError());
+  if (const auto address = AddressInNumbers(*name, port)) return ConnectToOneOf({*address});
+  if (LooksLikeIpv6(*name)) return TellError(WSAHOST_NOT_FOUND);
+  resolver_->LookUp(host, port,
+                    [this](std::vector<SocketAddress> addresses) { OnLookedUp(std::move(addresses)); });
 }
 
-void WindowsStreamSocket::ConnectTo(std::uint32_t address) {
-  socket_ = SocketOwner(socket(AF_INET, SOCK_STREAM, IPPROTO_TCP));
+void WindowsStreamSocket::ConnectToOneOf(std::vector<SocketAddress> addresses) {
+  deadline_ = addresses.size() > 1 ? GetTickCount64() + connectMs_ : 0;
+  addresses_ = std::move(addresses);
+  ConnectToNext();
+}
+
+void WindowsStreamSocket::ConnectToNext() {
+  int error = WSAHOST_NOT_FOUND;
+  while (!addresses_.empty()) {
+    // Each gets its share of what the ones before have left, so that a silent one leaves time for the rest.
+    const std::uint64_t now = GetTickCount64();
+    const std::uint64_t share = (std::max(deadline_, now) - now) / addresses_.size();
+    // What still waits is of the address before.
+    connection_ = (connection_ + 1) % kConnections;
+    const SocketAddress address = std::move(addresses_.front());
+    addresses_.erase(addresses_.begin());
+    error = ConnectTo(address);
+    if (error != 0) continue;
+    if (deadline_ != 0) share_.Start(static_cast<std::uint32_t>(share));
+    return;
+  }
+  share_.Stop();
+  TellError(error);
+}
+
+int WindowsStreamSocket::ConnectTo(const SocketAddress& address) {
+  const auto* peer = reinterpret_cast<const sockaddr*>(address.data());
+  socket_ = SocketOwner(socket(peer->sa_family, SOCK_STREAM, IPPROTO_TCP));
   if (!socket_ || WSAAsyncSelect(socket_.Get(), window_.Get(), MessageOf(Tells::kNetworkEvent),
                                  FD_CONNECT | FD_READ | FD_WRITE | FD_CLOSE) != 0)
-    return TellError(WSAGetLastError());
-  sockaddr_in peer = {};
-  peer.sin_family = AF_INET;
-  peer.sin_port = htons(port_);
-  peer.sin_addr.s_addr = address;
-  if (connect(socket_.Get(), reinterpret_cast<const sockaddr*>(&peer), sizeof peer) != 0 &&
-      WSAGetLastError() != WSAEWOULDBLOCK)
-    TellError(WSAGetLastError());
+    return WSAGetLastError();
+  if (connect(socket_.Get(), peer, static_cast<int>(address.size())) == 0) return 0;
+  const int error = WSAGetLastError();
+  return error == WSAEWOULDBLOCK ? 0 : error;
+}
+
+void WindowsStreamSocket::OnShareIsOver() {
+  if (!events_) return;
+  if (!addresses_.empty()) return ConnectToNext();
+  Close();
+  events_->OnSocketError(WSAETIMEDOUT);
 }
 
 void WindowsStreamSocket::Send(std::string_view bytes) {
@@ -107,9 +163,6 @@ bool WindowsStreamSocket::OnMessage(UINT message, WPARAM wParam, LPARAM lParam) 
   if (message < kFirstMessage || message >= kFirstMessage + kConnections * kCount) return false;
   if (!events_ || (message - kFirstMessage) / kCount != connection_) return true;
   switch (static_cast<Tells>((message - kFirstMessage) % kCount)) {
-    case Tells::kLookedUp:
-      OnLookedUp(WSAGETASYNCERROR(lParam));
-      break;
     case Tells::kNetworkEvent:
       // The answer to what was sent may be posted before the message that tells of the sending.
       if (TellSent()) OnNetworkEvent(WSAGETSELECTEVENT(lParam), WSAGETSELECTERROR(lParam));
@@ -131,19 +184,19 @@ bool WindowsStreamSocket::TellSent() {
   return connection == connection_;
 }
 
-void WindowsStreamSocket::OnLookedUp(int error) {
-  lookup_ = nullptr;
-  const auto* found = reinterpret_cast<const hostent*>(lookupAnswer_.get());
-  if (error != 0 || found->h_length != sizeof(std::uint32_t))
-    return events_->OnSocketError(WSAHOST_NOT_FOUND);
-  std::uint32_t address = 0;
-  std::memcpy(&address, found->h_addr_list[0], sizeof address);
+void WindowsStreamSocket::OnLookedUp(std::vector<SocketAddress> addresses) {
+  if (!events_) return;
+  if (addresses.empty()) return events_->OnSocketError(WSAHOST_NOT_FOUND);
   const UINT connection = connection_;
   events_->OnResolved();
-  if (connection == connection_) ConnectTo(address);
+  if (connection == connection_) ConnectToOneOf(std::move(addresses));
 }
 
 void WindowsStreamSocket::OnNetworkEvent(int event, int error) {
+  if (error != 0 && !addresses_.empty()) return ConnectToNext();
+  // There is a connection, or there will be none.
+  addresses_.clear();
+  share_.Stop();
   if (error != 0) return events_->OnSocketError(error);
   switch (event) {
     case FD_CONNECT:

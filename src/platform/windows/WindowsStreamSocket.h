@@ -4,26 +4,26 @@
 
 #include <memory>
 #include <string>
+#include <vector>
 
+#include "platform/HttpTransport.h"
 #include "platform/StreamSocket.h"
 #include "platform/windows/MessageWindow.h"
 #include "platform/windows/Owner.h"
+#include "platform/windows/WindowsResolver.h"
+#include "platform/windows/WindowsTimer.h"
 
 namespace tarnwick {
 
 using SocketOwner = Owner<SOCKET, closesocket, INVALID_SOCKET>;
 
-inline void EndSockets(bool) {
-  WSACleanup();
-}
-// Holds true while the system's sockets are started.
-using SocketsOwner = Owner<bool, EndSockets, false>;
-
 // A non-blocking Winsock socket that tells its events as window messages, so that a wait for them uses no
 // processor time.
 class WindowsStreamSocket : public StreamSocket {
  public:
-  WindowsStreamSocket();
+  // The addresses of a host that has several are tried for `connectMs` in all.
+  explicit WindowsStreamSocket(std::unique_ptr<Resolver> resolver = std::make_unique<WindowsResolver>(),
+                               std::uint32_t connectMs = kConnectTimeoutMs);
   ~WindowsStreamSocket() override;
   WindowsStreamSocket(const WindowsStreamSocket&) = delete;
   WindowsStreamSocket& operator=(const WindowsStreamSocket&) = delete;
@@ -39,10 +39,14 @@ class WindowsStreamSocket : public StreamSocket {
 
   UINT MessageOf(Tells tells) const;
   bool OnMessage(UINT message, WPARAM wParam, LPARAM lParam);
-  void OnLookedUp(int error);
+  void OnLookedUp(std::vector<SocketAddress> addresses);
   void OnNetworkEvent(int event, int error);
   void OnClose();
-  void ConnectTo(std::uint32_t address);
+  void ConnectToOneOf(std::vector<SocketAddress> addresses);
+  void ConnectToNext();
+  // The error when it fails at once, or 0.
+  int ConnectTo(const SocketAddress& address);
+  void OnShareIsOver();
   void TellError(int error);
   // Whether the connection is still the same afterwards.
   bool TellSent();
@@ -53,10 +57,15 @@ class WindowsStreamSocket : public StreamSocket {
   SocketOwner socket_;
   // Counts the connections, so that messages of one that was closed can be told.
   UINT connection_ = 0;
-  // Of the look-up that runs; null when none does.
-  HANDLE lookup_ = nullptr;
-  std::unique_ptr<char[]> lookupAnswer_;
-  std::uint16_t port_ = 0;
+  const std::unique_ptr<Resolver> resolver_;
+  const std::uint32_t connectMs_;
+  // Those that were not tried yet; none once there is a connection.
+  std::vector<SocketAddress> addresses_;
+  // When the last of several tries is over, in the system's ticks; 0 for a single one, which is the caller's
+  // to end.
+  std::uint64_t deadline_ = 0;
+  // Runs while one of several addresses is tried.
+  WindowsTimer share_;
   std::string pending_;
   // Bytes have left that the user was not told of.
   bool sent_ = false;

@@ -4,6 +4,8 @@
 
 #include <winsock2.h>
 // Before any <windows.h>, whose own sockets are older.
+#include <ws2tcpip.h>
+
 #include <algorithm>
 #include <atomic>
 #include <chrono>
@@ -17,6 +19,27 @@
 
 namespace tarnwick {
 
+// A socket that listens on the loopback address of `family`; INVALID_SOCKET when there is none.
+inline SOCKET ListenOnLoopback(int family, int most, std::uint16_t& port) {
+  const SOCKET listener = socket(family, SOCK_STREAM, 0);
+  sockaddr_in6 address{};
+  int size = family == AF_INET6 ? sizeof address : sizeof(sockaddr_in);
+  if (family == AF_INET6)
+    address.sin6_addr.s6_addr[15] = 1;
+  else
+    reinterpret_cast<sockaddr_in&>(address).sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+  address.sin6_family = static_cast<short>(family);
+  auto* bare = reinterpret_cast<sockaddr*>(&address);
+  if (bind(listener, bare, size) != 0 || listen(listener, most) != 0 ||
+      getsockname(listener, bare, &size) != 0) {
+    closesocket(listener);
+    return INVALID_SOCKET;
+  }
+  // At the same place in both kinds of addresses.
+  port = ntohs(address.sin6_port);
+  return listener;
+}
+
 class LoopbackServer {
  public:
   enum class End { kClose, kReset, kSilence };
@@ -28,18 +51,11 @@ class LoopbackServer {
     unsigned pauseMs = 0;
   };
 
-  explicit LoopbackServer(std::vector<Answer> answers) : answers_(std::move(answers)) {
+  explicit LoopbackServer(std::vector<Answer> answers, int family = AF_INET) : answers_(std::move(answers)) {
     WSADATA data;
     WSAStartup(MAKEWORD(2, 2), &data);
-    listener_ = socket(AF_INET, SOCK_STREAM, 0);
-    sockaddr_in address{};
-    address.sin_family = AF_INET;
-    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-    int size = sizeof address;
-    if (bind(listener_, reinterpret_cast<sockaddr*>(&address), size) != 0 || listen(listener_, 8) != 0 ||
-        getsockname(listener_, reinterpret_cast<sockaddr*>(&address), &size) != 0)
-      throw std::runtime_error("no loopback socket");
-    port_ = ntohs(address.sin_port);
+    listener_ = ListenOnLoopback(family, 8, port_);
+    if (listener_ == INVALID_SOCKET) throw std::runtime_error("no loopback socket");
     thread_ = std::thread([this] { Serve(); });
   }
   ~LoopbackServer() { Requests(); }

@@ -5,6 +5,7 @@
 
 #include <algorithm>
 #include <functional>
+#include <list>
 
 #include "base/RuntimeError.h"
 #include "platform/windows/WindowsHeaders.h"
@@ -70,6 +71,45 @@ TEST(WindowsTimer, RunsOutOnceAndCountsAnew) {
   EXPECT_LE(ProcessorMs() - processor, 400U);
 }
 
+// A server whose queue is full answers nothing to who connects.
+class FullServer {
+ public:
+  FullServer() {
+    WSADATA data;
+    WSAStartup(MAKEWORD(2, 2), &data);
+    listener_ = ListenOnLoopback(AF_INET, 1, port_);
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_port = htons(port_);
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    for (SOCKET& client : waiting_) {
+      client = socket(AF_INET, SOCK_STREAM, 0);
+      unsigned long on = 1;
+      ioctlsocket(client, FIONBIO, &on);
+      // Does not block: under way is no failure.
+      static_cast<void>(connect(client, reinterpret_cast<const sockaddr*>(&address), sizeof address));
+    }
+  }
+  ~FullServer() {
+    for (const SOCKET client : waiting_) closesocket(client);
+    closesocket(listener_);
+    WSACleanup();
+  }
+  FullServer(const FullServer&) = delete;
+  FullServer& operator=(const FullServer&) = delete;
+
+  std::uint16_t Port() const { return port_; }
+
+ private:
+  SOCKET listener_ = INVALID_SOCKET;
+  SOCKET waiting_[8] = {};
+  std::uint16_t port_ = 0;
+};
+
+std::uint16_t PortOfNobody() {
+  return LoopbackServer({}).Port();
+}
+
 // --- Socket ---
 
 // Writes down what a socket tells, and reads what it has.
@@ -79,6 +119,9 @@ struct Sink : SocketEvents {
   std::string bytes;
   std::size_t room = 64 * 1024;
   Sink() { socket.SetEvents(this); }
+  Sink(std::unique_ptr<Resolver> resolver, std::uint32_t connectMs) : socket(std::move(resolver), connectMs) {
+    socket.SetEvents(this);
+  }
   void OnResolved() override { log += "resolved;"; }
   void OnConnected() override {
     log += "connected;";
@@ -129,20 +172,96 @@ TEST(WindowsStreamSocket, BringsWhatThePeerSendsAndTellsItsClose) {
 }
 
 TEST(WindowsStreamSocket, TellsWhyThereIsNoConnection) {
-  std::uint16_t port = 0;
-  {
-    LoopbackServer gone({});
-    port = gone.Port();
+  const std::uint16_t nobody = PortOfNobody();
+  for (const TextView host : {u"127.0.0.1", u"\u65E5", u"[::1", u"[127.0.0.1]"}) {
+    Sink sink;
+    sink.socket.Connect(host, nobody);
+    EXPECT_TRUE(sink.log.empty());
+    EXPECT_TRUE(PumpUntil([&] { return sink.Over(); }));
+    EXPECT_EQ(sink.log, host == u"127.0.0.1" ? "error 10061;" : "error 11001;") << Utf8FromText(host);
   }
-  Sink refused;
-  refused.socket.Connect(u"127.0.0.1", port);
-  EXPECT_TRUE(PumpUntil([&] { return refused.Over(); }));
-  EXPECT_EQ(refused.log, "error 10061;");
-  Sink unknown;
-  unknown.socket.Connect(u"\u65E5", 80);
-  EXPECT_TRUE(unknown.log.empty());
-  EXPECT_TRUE(PumpUntil([&] { return unknown.Over(); }));
-  EXPECT_EQ(unknown.log, "error 11001;");
+}
+
+TEST(WindowsStreamSocket, TakesANumberOfEitherKindWithoutALookUp) {
+  const SOCKET probe = [] {
+    const LoopbackServer winsock({});
+    std::uint16_t port = 0;
+    return ListenOnLoopback(AF_INET6, 1, port);
+  }();
+  if (probe == INVALID_SOCKET) GTEST_SKIP() << "this machine has no IPv6";
+  closesocket(probe);
+  LoopbackServer server({{"A\r\n\r\nabc"}, {"A\r\n\r\nabc"}}, AF_INET6);
+  for (const TextView host : {u"[::1]", u"::1"}) {
+    Sink sink;
+    sink.socket.Connect(host, server.Port());
+    EXPECT_TRUE(PumpUntil([&] { return sink.Over(); }));
+    EXPECT_EQ(sink.log, "connected;sent;closed;");
+    EXPECT_EQ(sink.bytes, "A\r\n\r\nabc");
+  }
+}
+
+struct FakeResolver : Resolver {
+  // Told with the ports of 127.0.0.1 by the test.
+  Taker taker;
+  void LookUp(TextView, std::uint16_t, Taker its) override { taker = std::move(its); }
+  void Cancel() override { taker = nullptr; }
+  void Tell(const std::vector<std::uint16_t>& ports) {
+    std::vector<SocketAddress> addresses;
+    for (const std::uint16_t port : ports) {
+      sockaddr_in address{};
+      address.sin_family = AF_INET;
+      address.sin_port = htons(port);
+      address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+      addresses.emplace_back(reinterpret_cast<const char*>(&address), sizeof address);
+    }
+    const Taker told = std::move(taker);
+    told(addresses);
+  }
+};
+
+TEST(WindowsStreamSocket, TriesTheAddressesOfANameOneAfterTheOther) {
+  constexpr std::uint32_t kConnectMs = 900;
+  const FullServer full;
+  const std::uint16_t nobody = PortOfNobody();
+  const std::uint16_t silent = full.Port();
+  LoopbackServer server(std::vector<LoopbackServer::Answer>(4, {"A\r\n\r\nabc"}));
+  const std::string good = "resolved;connected;sent;closed;";
+  const struct {
+    std::vector<std::uint16_t> ports;
+    std::string log;
+    DWORD leastMs;
+    DWORD mostMs;
+  } rows[] = {
+      {{}, "error 11001;", 0, 800},
+      {{server.Port()}, good, 0, 800},
+      {{nobody, server.Port(), nobody}, good, 0, 800},
+      {{silent, server.Port()}, good, 400, 800},
+      {{silent, nobody, silent, server.Port()}, good, 400, 800},
+      {{nobody, nobody}, "resolved;error 10061;", 0, 800},
+      {{silent, nobody}, "resolved;error 10061;", 400, 800},
+      {{nobody, silent}, "resolved;error 10060;", 800, 1800},
+      // Only who waits for it ends a single one.
+      {{silent}, "resolved;", 1900, 3000},
+  };
+  std::list<Sink> sinks;
+  for (const auto& row : rows) {
+    SCOPED_TRACE(testing::PrintToString(row.ports));
+    auto resolver = std::make_unique<FakeResolver>();
+    FakeResolver& names = *resolver;
+    Sink& sink = sinks.emplace_back(std::move(resolver), kConnectMs);
+    sink.socket.Connect(u"pictures.example.org", 80);
+    const DWORD begin = GetTickCount();
+    names.Tell(row.ports);
+    PumpUntil([&] { return sink.Over(); }, 2000);
+    const DWORD took = GetTickCount() - begin;
+    EXPECT_GE(took, row.leastMs);
+    EXPECT_LE(took, row.mostMs);
+    EXPECT_EQ(sink.log, row.log);
+  }
+  // Nothing more is told when a share runs out.
+  PumpUntil([] { return false; }, kConnectMs + 100);
+  auto sink = sinks.begin();
+  for (const auto& row : rows) EXPECT_EQ((sink++)->log, row.log);
 }
 
 // The numbers of closed sockets come again, and messages of theirs may still wait.
@@ -153,6 +272,8 @@ TEST(WindowsStreamSocket, TellsNothingOfAnEarlierConnection) {
   for (std::size_t i = 0; i < answers.size() / 2; ++i) {
     // Closed before, or when, what it has to tell is told. The first ones fail at once.
     sink.socket.Connect(u"\u65E5", 80);
+    sink.socket.Connect(u"localhost", server.Port());
+    if (i % 4 < 2) Sleep(20);
     sink.socket.Connect(u"127.0.0.1", server.Port());
     Sleep(i % 2 == 0 ? 0 : 20);
     sink.log.clear();
@@ -331,29 +452,12 @@ TEST(PostStream, EndsWhenItsSourceIsNotWanted) {
   }
 }
 
-// A server whose queue is full answers nothing to who connects.
 TEST(PostStream, GivesUpAnAddressThatSwallowsPackets) {
-  LoopbackServer winsock({});
-  const SOCKET full = socket(AF_INET, SOCK_STREAM, 0);
-  sockaddr_in address{};
-  address.sin_family = AF_INET;
-  address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
-  int size = sizeof address;
-  ASSERT_EQ(bind(full, reinterpret_cast<sockaddr*>(&address), size), 0);
-  ASSERT_EQ(listen(full, 1), 0);
-  ASSERT_EQ(getsockname(full, reinterpret_cast<sockaddr*>(&address), &size), 0);
-  std::vector<SOCKET> waiting(8);
-  for (SOCKET& client : waiting) {
-    client = socket(AF_INET, SOCK_STREAM, 0);
-    unsigned long on = 1;
-    ioctlsocket(client, FIONBIO, &on);
-    // Does not block: under way is no failure.
-    static_cast<void>(connect(client, reinterpret_cast<const sockaddr*>(&address), size));
-  }
+  FullServer full;
   WindowsHttpTransport http(500, 30'000);
   HttpPost post;
   post.host = u"127.0.0.1";
-  post.port = ntohs(address.sin_port);
+  post.port = full.Port();
   post.target = "/";
   post.body = "a=1";
   for (const bool streamed : {false, true}) {
@@ -364,8 +468,6 @@ TEST(PostStream, GivesUpAnAddressThatSwallowsPackets) {
     EXPECT_GE(took, 450U) << streamed;
     EXPECT_LT(took, 2000U) << streamed;
   }
-  for (const SOCKET client : waiting) closesocket(client);
-  closesocket(full);
 }
 
 }  // namespace
