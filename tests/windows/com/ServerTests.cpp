@@ -1,4 +1,6 @@
 // The in-process server itself: class objects, life times, type library.
+#include <filesystem>
+#include <string_view>
 #include <thread>
 
 #include "Form.h"
@@ -44,6 +46,42 @@ TEST(Server, ClassObjects) {
   EXPECT_EQ(canUnloadNow(), S_FALSE);
   ASSERT_EQ(getClassObject(CLSID_CBVAccount, IID_IClassFactory, factory.ReceiveVoid()), S_OK);
   factory->LockServer(FALSE);
+}
+
+// Of the file as the system has loaded it.
+TEST(Server, IsBuiltAgainstAbuseAndNeedsOnlyTheSystem) {
+  const auto client = NewClient();
+  ASSERT_TRUE(client);
+  const auto* const image = reinterpret_cast<const char*>(LoadedLibrary());
+  const auto& head = *reinterpret_cast<const IMAGE_NT_HEADERS*>(
+      image + reinterpret_cast<const IMAGE_DOS_HEADER*>(image)->e_lfanew);
+  constexpr WORD kWanted =
+      IMAGE_DLLCHARACTERISTICS_DYNAMIC_BASE | IMAGE_DLLCHARACTERISTICS_NX_COMPAT |
+      (sizeof(void*) == 8 ? IMAGE_DLLCHARACTERISTICS_HIGH_ENTROPY_VA : IMAGE_DLLCHARACTERISTICS_NO_SEH);
+  EXPECT_EQ(head.OptionalHeader.DllCharacteristics & kWanted, kWanted);
+  const auto directory = [&](int which) { return head.OptionalHeader.DataDirectory[which].VirtualAddress; };
+  // Without it the system cannot choose another address.
+  EXPECT_NE(directory(IMAGE_DIRECTORY_ENTRY_BASERELOC), 0U);
+
+  const IMAGE_SECTION_HEADER* section = IMAGE_FIRST_SECTION(&head);
+  bool stackIsChecked = false;
+  for (int i = 0; i < head.FileHeader.NumberOfSections; ++i, ++section) {
+    constexpr DWORD kBoth = IMAGE_SCN_MEM_WRITE | IMAGE_SCN_MEM_EXECUTE;
+    EXPECT_NE(section->Characteristics & kBoth, kBoth) << i;
+    const std::string_view bytes(image + section->VirtualAddress, section->Misc.VirtualSize);
+    // What the run-time of the check says before it ends the process.
+    stackIsChecked |= bytes.find("stack smashing detected") != std::string_view::npos;
+  }
+  EXPECT_TRUE(stackIsChecked);
+
+  wchar_t folder[MAX_PATH] = {};
+  GetSystemDirectoryW(folder, MAX_PATH);
+  const auto* import =
+      reinterpret_cast<const IMAGE_IMPORT_DESCRIPTOR*>(image + directory(IMAGE_DIRECTORY_ENTRY_IMPORT));
+  ASSERT_NE(import->Name, 0U);
+  for (; import->Name != 0; ++import)
+    EXPECT_TRUE(std::filesystem::exists(std::filesystem::path(folder) / (image + import->Name)))
+        << image + import->Name;
 }
 
 TEST(Server, TypeLibraryIsRegisteredForEveryLocale) {
