@@ -16,6 +16,14 @@ Text StringOf(HINSTANCE module, std::uint16_t identifier) {
   return length > 0 ? TextFromAnsi({bytes.data(), static_cast<std::size_t>(length)}) : Text();
 }
 
+// With a drive and its root, or on a server. Any other path depends on what is current, and a bare name would
+// be searched for.
+bool IsFullPath(TextView path) {
+  const auto isSlash = [](char16_t unit) { return unit == u'\\' || unit == u'/'; };
+  if (path.size() < 3) return false;
+  return (path[1] == u':' && isSlash(path[2])) || (isSlash(path[0]) && isSlash(path[1]));
+}
+
 class WindowsResourceLibrary : public ResourceLibrary {
  public:
   explicit WindowsResourceLibrary(LibraryOwner library) : library_(std::move(library)) {}
@@ -30,7 +38,7 @@ class WindowsResourceLibrary : public ResourceLibrary {
 
 std::unique_ptr<ResourceLibrary> WindowsStringResources::Load(TextView path) {
   const auto ansiPath = AnsiFromText(path);
-  if (!ansiPath || ansiPath->empty()) return nullptr;
+  if (!ansiPath || !IsFullPath(path)) return nullptr;
   // As data: the strings are the same whatever processor the file is for, and none of its code runs.
   LibraryOwner library(
       LoadLibraryExA(ansiPath->c_str(), nullptr, LOAD_LIBRARY_AS_DATAFILE | LOAD_LIBRARY_AS_IMAGE_RESOURCE));
