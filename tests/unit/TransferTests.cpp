@@ -11,14 +11,53 @@ namespace tarnwick {
 namespace {
 
 TEST(FileNameGuard, AcceptsAndRefuses) {
-  for (const TextView good :
-       {u"a", u"a b.jpg", u".x", u"a..b", u"\u00e9.gif", u"con1", u"comx.jpg", u"com", u"nully"})
+  for (const TextView good : {u"a", u"a b.jpg", u".x", u"a..b", u"\u00e9.gif", u"con1", u"comx.jpg", u"com",
+                              u"nully", u"\u05E9\u05DC\u05D5\u05DD 1.jpg", u"\u0645\u06CC\u200C\u062E.png",
+                              u"\u00A0.gif", u"desktop.ini.jpg", u"lnk", u"a.lnk.jpg", u"$MFT"})
     EXPECT_TRUE(IsSafeFileName(good)) << Utf8FromText(good);
-  for (const TextView bad :
-       {u"",        u".",      u"..",   u"a.",   u"a ",       u"a/b",       u"a\\b",    u"a:b", u"*",
-        u"a?",      u"\"",     u"<",    u">",    u"|",        u"a\nb",      u"a\u007f", u"NUL", u"con",
-        u"CoN.jpg", u"aux .x", u"com1", u"COM0", u"LPT9.gif", u"com\u00b9", u"CONOUT$"})
+  for (const TextView bad : {u"",
+                             u".",
+                             u"..",
+                             u"a.",
+                             u"a ",
+                             u"a/b",
+                             u"a\\b",
+                             u"a:b",
+                             u"*",
+                             u"a?",
+                             u"\"",
+                             u"<",
+                             u">",
+                             u"|",
+                             u"a\nb",
+                             u"a\u007f",
+                             u"NUL",
+                             u"con",
+                             u"CoN.jpg",
+                             u"aux .x",
+                             u"com1",
+                             u"COM0",
+                             u"LPT9.gif",
+                             u"com\u00b9",
+                             u"CONOUT$",
+                             u"a::$DATA",
+                             u"a\u0080",
+                             u"\u009Fa",
+                             u"\u061C",
+                             u"a\u200Eb",
+                             u"a\u200Fb",
+                             u"a\u202Agpj.exe",
+                             u"a\u202Egpj.exe",
+                             u"\u2066a",
+                             u"a\u2069",
+                             u"Desktop.INI",
+                             u"autorun.inf",
+                             u".lnk",
+                             u"a.LNK",
+                             u"a.jpg.url",
+                             u"a.library-ms"})
     EXPECT_FALSE(IsSafeFileName(bad)) << Utf8FromText(bad);
+  EXPECT_EQ(ShownName(u"\u05E9\u202Egpj\u0085.e\nxe"), u"\u05E9\uFFFDgpj\uFFFD.e\uFFFDxe");
 }
 
 struct Uploads : UploadEvents {

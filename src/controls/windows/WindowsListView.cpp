@@ -6,6 +6,7 @@
 
 #include "controls/windows/Drawing.h"
 #include "platform/windows/AnsiText.h"
+#include "transfer/FileNameGuard.h"
 
 namespace tarnwick {
 namespace {
@@ -120,7 +121,8 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) {
                        ILD_TRANSPARENT);
         cell.left += MulDiv(18, Dpi(), 96);
       }
-      const Text text = row == 0 ? titles_[column] : user_->ItemText(row - 1, static_cast<int>(column));
+      const Text text =
+          row == 0 ? titles_[column] : ShownName(user_->ItemText(row - 1, static_cast<int>(column)));
       DrawTextW(dc, WideFromText(text).c_str(), -1, &cell, kCell);
     }
   }
@@ -285,7 +287,7 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
       auto& info = *reinterpret_cast<NMLVDISPINFOW*>(const_cast<NMHDR*>(&header));
       const auto item = static_cast<std::size_t>(info.item.iItem);
       if (info.item.iItem < 0 || item >= count_) return 0;
-      if (info.item.mask & LVIF_TEXT) CopyTo(info, user_->ItemText(item, info.item.iSubItem));
+      if (info.item.mask & LVIF_TEXT) CopyTo(info, ShownName(user_->ItemText(item, info.item.iSubItem)));
       if (info.item.mask & LVIF_IMAGE) info.item.iImage = user_->PictureOf(item).small - 1;
       return 0;
     }
@@ -299,7 +301,13 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
     case LVN_BEGINLABELEDITW: {
       // True keeps the list from editing.
       if (!user_->OnBeforeLabelEdit()) return TRUE;
-      if (const HWND editor = ListView_GetEditControl(list_)) Watch(editor);
+      const auto& info = *reinterpret_cast<const NMLVDISPINFOW*>(&header);
+      if (const HWND editor = ListView_GetEditControl(list_)) {
+        Watch(editor);
+        // The list puts in what it shows. An untouched name must come out as it is.
+        const Text name = user_->ItemText(static_cast<std::size_t>(info.item.iItem), 0);
+        if (ShownName(name) != name) SetWindowTextW(editor, WideFromText(name).c_str());
+      }
       return FALSE;
     }
     case LVN_ENDLABELEDITW: {

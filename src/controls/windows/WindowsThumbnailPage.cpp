@@ -8,6 +8,7 @@
 #include "controls/windows/Drawing.h"
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/CommonControls.h"
+#include "transfer/FileNameGuard.h"
 
 namespace tarnwick {
 namespace {
@@ -227,7 +228,7 @@ void WindowsThumbnailPage::ClearSlot(int slot) {
 }
 
 void WindowsThumbnailPage::SetCaption(int slot, TextView caption) {
-  At(slot).caption = caption;
+  At(slot).caption = ShownName(caption);
   ApplyCaption(slot);
 }
 

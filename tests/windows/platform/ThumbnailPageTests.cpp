@@ -599,8 +599,8 @@ TEST_F(ThumbnailPageTest, TheHookTakesTheColourRequestAndNothingElse) {
     EXPECT_EQ(request(WM_CTLCOLORSTATIC), statics);
 
     // The control goes on as before, texts that are not ANSI included.
-    page_->SetCaption(1, u"\u65E5\u672C.gif");
-    EXPECT_EQ(NameOf(Slot(1)), L"\u65E5\u672C.gif");
+    page_->SetCaption(1, u"\u65E5\u202E\u672C.gif");
+    EXPECT_EQ(NameOf(Slot(1)), L"\u65E5\uFFFD\u672C.gif");
 
     // A second control takes the state over; both work on.
     WindowsThumbnailPage second(GetModuleHandleW(nullptr), user_);
