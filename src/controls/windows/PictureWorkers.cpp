@@ -7,6 +7,8 @@
 #include <mutex>
 #include <utility>
 
+#include "platform/windows/ThreadPool.h"
+
 namespace tarnwick {
 namespace {
 
@@ -45,11 +47,11 @@ struct PictureWorkers::Shared {
   HandleOwner ended{CreateEventW(nullptr, FALSE, FALSE, nullptr)};
 
   void Work();
-  static void CALLBACK Run(PTP_CALLBACK_INSTANCE instance, void* context);
 };
 
 // Decodes until nothing waits. The caller has counted itself as running.
 void PictureWorkers::Shared::Work() {
+  const bool com = SUCCEEDED(CoInitializeEx(nullptr, COINIT_MULTITHREADED));
   for (;;) {
     std::list<Job> current;
     {
@@ -68,18 +70,11 @@ void PictureWorkers::Shared::Work() {
     if (window) PostMessageW(window, kDecoded, 0, 0);
   }
   SetEvent(ended.Get());
-}
-
-void CALLBACK PictureWorkers::Shared::Run(PTP_CALLBACK_INSTANCE, void* context) {
-  const std::unique_ptr<std::shared_ptr<Shared>> shared(static_cast<std::shared_ptr<Shared>*>(context));
-  const bool com = SUCCEEDED(CoInitializeEx(nullptr, COINIT_MULTITHREADED));
-  (*shared)->Work();
   if (com) CoUninitialize();
 }
 
-PictureWorkers::PictureWorkers(HINSTANCE module, Taker taker)
-    : module_(module),
-      taker_(std::move(taker)),
+PictureWorkers::PictureWorkers(Taker taker)
+    : taker_(std::move(taker)),
       shared_(std::make_shared<Shared>()),
       window_([this](UINT message, WPARAM, LPARAM) {
         if (message != kDecoded) return false;
@@ -100,22 +95,11 @@ bool PictureWorkers::Start(const std::shared_ptr<const PictureRequest>& request,
   if (!window) return false;
   std::list<Job> job;
   job.push_back({request, std::move(file), request->width, request->height, request->background, {}});
-  auto share = std::make_unique<std::shared_ptr<Shared>>(shared_);
   const std::lock_guard guard(shared_->lock);
   shared_->window = window;
   // Whoever leafs quickly must not fill the memory.
   shared_->waiting.remove_if([](const Job& other) { return other.request.expired(); });
-  if (shared_->running < mostWorkers) {
-    TP_CALLBACK_ENVIRON environment;
-    InitializeThreadpoolEnvironment(&environment);
-    SetThreadpoolCallbackRunsLong(&environment);
-    SetThreadpoolCallbackLibrary(&environment, module_);
-    if (TrySubmitThreadpoolCallback(Shared::Run, share.get(), &environment)) {
-      static_cast<void>(share.release());
-      ++shared_->running;
-    }
-    DestroyThreadpoolEnvironment(&environment);
-  }
+  if (shared_->running < mostWorkers && RunOnPool([shared = shared_] { shared->Work(); })) ++shared_->running;
   if (shared_->running == 0) return false;
   shared_->waiting.splice(shared_->waiting.end(), job);
   return true;

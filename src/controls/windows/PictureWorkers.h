@@ -32,8 +32,7 @@ class PictureWorkers {
   // somebody still waits for.
   using Taker = std::function<void(const std::shared_ptr<const PictureRequest>&, BitmapOwner)>;
 
-  // `module` is where this code is: it stays loaded as long as a worker runs.
-  PictureWorkers(HINSTANCE module, Taker taker);
+  explicit PictureWorkers(Taker taker);
   // Does not wait for what is being decoded.
   ~PictureWorkers();
   PictureWorkers(const PictureWorkers&) = delete;
@@ -51,7 +50,6 @@ class PictureWorkers {
 
   void Take();
 
-  const HINSTANCE module_;
   const Taker taker_;
   const std::shared_ptr<Shared> shared_;
   MessageWindow window_;

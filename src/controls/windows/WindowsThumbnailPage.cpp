@@ -47,8 +47,7 @@ PaintingOwner Paint(HWND window) {
 }  // namespace
 
 WindowsThumbnailPage::WindowsThumbnailPage(HINSTANCE module, ControlWindowUser& control)
-    : ControlWindow(module, kClassName, control),
-      workers_(module, [this](const auto& request, BitmapOwner picture) {
+    : ControlWindow(module, kClassName, control), workers_([this](const auto& request, BitmapOwner picture) {
         TakePicture(request, std::move(picture));
       }) {}
 

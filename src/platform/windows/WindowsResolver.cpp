@@ -7,6 +7,7 @@
 
 #include "base/RuntimeError.h"
 #include "platform/windows/AnsiText.h"
+#include "platform/windows/ThreadPool.h"
 
 namespace tarnwick {
 namespace {
@@ -49,19 +50,17 @@ struct WindowsResolver::Shared {
   bool done = false;
   std::vector<SocketAddress> addresses;
 
-  static void CALLBACK Run(PTP_CALLBACK_INSTANCE instance, void* context);
+  void Work();
 };
 
-void CALLBACK WindowsResolver::Shared::Run(PTP_CALLBACK_INSTANCE, void* context) {
-  const std::unique_ptr<std::shared_ptr<Shared>> share(static_cast<std::shared_ptr<Shared>*>(context));
-  Shared& shared = **share;
-  std::vector<SocketAddress> addresses = ResultAsItStood(
-      std::vector<SocketAddress>(),
-      [&](std::vector<SocketAddress>& found) { found = AddressesOf(shared.host, shared.port); });
-  const std::lock_guard guard(shared.lock);
-  shared.addresses = std::move(addresses);
-  shared.done = true;
-  if (shared.window) PostMessageW(shared.window, kLookedUp, 0, 0);
+void WindowsResolver::Shared::Work() {
+  std::vector<SocketAddress> found =
+      ResultAsItStood(std::vector<SocketAddress>(),
+                      [&](std::vector<SocketAddress>& result) { result = AddressesOf(host, port); });
+  const std::lock_guard guard(lock);
+  addresses = std::move(found);
+  done = true;
+  if (window) PostMessageW(window, kLookedUp, 0, 0);
 }
 
 WindowsResolver::WindowsResolver()
@@ -82,22 +81,9 @@ void WindowsResolver::LookUp(TextView host, std::uint16_t port, Taker taker) {
   shared_->host = WideFromText(host);
   shared_->port = std::to_wstring(port);
   shared_->window = window_.Get();
-  auto share = std::make_unique<std::shared_ptr<Shared>>(shared_);
-  // This code stays loaded as long as the worker runs.
-  HMODULE module = nullptr;
-  GetModuleHandleExW(GET_MODULE_HANDLE_EX_FLAG_UNCHANGED_REFCOUNT | GET_MODULE_HANDLE_EX_FLAG_FROM_ADDRESS,
-                     reinterpret_cast<const wchar_t*>(Shared::Run), &module);
-  TP_CALLBACK_ENVIRON environment;
-  InitializeThreadpoolEnvironment(&environment);
-  SetThreadpoolCallbackRunsLong(&environment);
-  SetThreadpoolCallbackLibrary(&environment, module);
-  if (TrySubmitThreadpoolCallback(Shared::Run, share.get(), &environment)) {
-    static_cast<void>(share.release());
-  } else {
-    shared_->done = true;
-    PostMessageW(shared_->window, kLookedUp, 0, 0);
-  }
-  DestroyThreadpoolEnvironment(&environment);
+  if (RunOnPool([shared = shared_] { shared->Work(); })) return;
+  shared_->done = true;
+  PostMessageW(shared_->window, kLookedUp, 0, 0);
 }
 
 void WindowsResolver::Cancel() {
