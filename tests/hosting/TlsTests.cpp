@@ -1,6 +1,7 @@
 // The server over TLS: who can talk to it, and how its faults look there.
 #include <openssl/err.h>
 #include <openssl/ssl.h>
+#include <openssl/x509v3.h>
 #include <sys/socket.h>
 
 #include <cerrno>
@@ -158,11 +159,14 @@ TEST_F(TlsTest, CertificatesComeFromFilesAndHoldForTheAddressOfTheServer) {
     options.tlsSelfSigned = true;
     options.host = "::1";
   });
-  httplib::Client client("https://[::1]:" + std::to_string(Port()));
-  client.set_ca_cert_path(Authority().c_str());
-  const auto answer = client.Get("/");
-  ASSERT_TRUE(answer) << to_string(answer.error());
-  EXPECT_EQ(answer->status, 404);
+  // The client of cpp-httplib 0.11 reads past the end of an IPv4 address that stands beside an IPv6 one.
+  const TlsContext context(SSL_CTX_new(TLS_client_method()));
+  SSL_CTX_set_verify(context.get(), SSL_VERIFY_PEER, nullptr);
+  SSL_CTX_load_verify_locations(context.get(), Authority().c_str(), nullptr);
+  X509_VERIFY_PARAM_set1_ip_asc(SSL_CTX_get0_param(context.get()), "::1");
+  const std::unique_ptr<BIO, FreeWith<BIO_free_all>> client(BIO_new_ssl_connect(context.get()));
+  BIO_set_conn_hostname(client.get(), ("[::1]:" + std::to_string(Port())).c_str());
+  EXPECT_EQ(BIO_do_handshake(client.get()), 1);
 }
 
 }  // namespace
