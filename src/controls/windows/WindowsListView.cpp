@@ -356,8 +356,9 @@ std::optional<LRESULT> WindowsListView::OnListMessage(HWND list, UINT message, W
         return 0;
       }
       if (wParam == VK_F2) {
-        // The list asks whether it may, as it does after a slow second click.
-        if (const auto selected = NextSelected(0)) ListView_EditLabel(list, static_cast<int>(*selected));
+        // The list asks whether it may, as it does after a slow second click. The other form of the message
+        // edits what the code page can hold.
+        if (const auto selected = NextSelected(0)) SendMessageW(list, LVM_EDITLABELW, *selected, 0);
         return 0;
       }
       const LRESULT result = DefSubclassProc(list, message, wParam, lParam);

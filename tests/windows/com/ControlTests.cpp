@@ -718,6 +718,8 @@ TYPED_TEST(AnyControl, UploadsRenamesInPlaceAndDeletes) {
   } rows[] = {
       {L"other.jpg", VK_ESCAPE, L"", L"label test.jpg"},
       {L"a#b.jpg", VK_RETURN, L"1034", L"label test.jpg"},
+      // Shown in another way, but edited as it is.
+      {L"a\u202Egpj.gif", VK_RETURN, L"1031", L"a\u202Egpj.jpg"},
       {L"l\u00E4bel & two.gif", VK_RETURN, L"1031", L"l\u00E4bel & two.jpg"},
   };
   // While a name is edited all keys are the editor's.
@@ -739,6 +741,7 @@ TYPED_TEST(AnyControl, UploadsRenamesInPlaceAndDeletes) {
     EXPECT_EQ(GetFocus(), editor);
     form.events.clear();
     // All of the name is selected.
+    EXPECT_EQ(TextOf(editor), form.Selected());
     form.Press(VK_DELETE, editor);
     EXPECT_EQ(TextOf(editor), L"");
     for (const wchar_t* letter = row.typed; *letter; ++letter)
@@ -758,12 +761,12 @@ TYPED_TEST(AnyControl, UploadsRenamesInPlaceAndDeletes) {
   EXPECT_EQ(EditorOf(form), nullptr);
   // The server has it under the new name.
   form.Open(L"jpg");
-  EXPECT_EQ(form.Select(rows[2].name), rows[2].name);
+  EXPECT_EQ(form.Select(rows[3].name), rows[3].name);
   form.events.clear();
   form.control->DeleteFile();
   EXPECT_EQ(std::count(form.events.begin(), form.events.end(), L"1001 "), 1);
   form.Open(L"jpg");
-  EXPECT_NE(form.Select(rows[2].name), rows[2].name);
+  EXPECT_NE(form.Select(rows[3].name), rows[3].name);
 }
 
 int MeasureOf(const Form& form) {
