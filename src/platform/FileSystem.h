@@ -77,8 +77,13 @@ class FileSystem {
   // A file that will be at `path`. Throws 75 when there cannot be one in that folder.
   virtual std::unique_ptr<FileWriter> Create(TextView path) = 0;
 
+  // Writes a file of these bytes where there is none. Until it is whole nobody can open it, and when that
+  // fails, or the process is killed, it goes. Whether it is there; false as well for a name that is taken.
+  virtual bool WriteNew(TextView path, std::string_view bytes) = 0;
+
   // Writes a file of these bytes over an existing one, whole or not at all. Throws 75.
   void Write(TextView path, std::string_view bytes) {
+    if (WriteNew(path, bytes)) return;
     const std::unique_ptr<FileWriter> file = Create(path);
     file->Write(bytes);
     file->Commit();

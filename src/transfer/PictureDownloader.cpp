@@ -4,6 +4,7 @@
 #include <initializer_list>
 #include <memory>
 #include <string>
+#include <utility>
 
 #include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
@@ -192,14 +193,11 @@ void PictureDownloader::BeginFile(TextView path, TextView explicitPath) {
   path_ = path;
   explicitPath_ = explicitPath;
   large_ = false;
-  writer_ = ResultAsItStood(std::unique_ptr<FileWriter>(), [&](std::unique_ptr<FileWriter>& writer) {
-    writer = apartment_.platform.files.Create(explicitPath.empty() ? path : explicitPath);
-  });
 }
 
 void PictureDownloader::WriteFile(std::string_view bytes) {
-  large_ = true;
   const bool written = ResultAsItStood(false, [&](bool& done) {
+    if (!std::exchange(large_, true)) writer_ = apartment_.platform.files.Create(Target());
     if (writer_) writer_->Write(bytes);
     done = true;
   });
@@ -209,7 +207,7 @@ void PictureDownloader::WriteFile(std::string_view bytes) {
 bool PictureDownloader::FinishFile(std::string_view rest) {
   std::unique_ptr<FileWriter> writer = std::move(writer_);
   return ResultAsItStood(false, [&](bool& written) {
-    if (!writer) return;
+    if (large_ && !writer) return;
     FileSystem& files = apartment_.platform.files;
     // An upload, a rename or a delete has come before these bytes, which are not the file's any more. The
     // target may be the copy itself.
@@ -217,16 +215,21 @@ bool PictureDownloader::FinishFile(std::string_view rest) {
     if (overtaken && (explicitPath_.empty() || LowerCase(explicitPath_) == LowerCase(path_) ||
                       files.SameFile(explicitPath_, path_)))
       return;
-    writer->Write(rest);
-    writer->Commit();
-    // It holds the file.
-    writer.reset();
+    if (large_) {
+      writer->Write(rest);
+      writer->Commit();
+      // It holds the file.
+      writer.reset();
+    } else {
+      files.Write(Target(), rest);
+    }
     written = true;
     if (overtaken || explicitPath_.empty() || explicitPath_ == path_) return;
     if (large_) return Copy(files, explicitPath_, path_);
     // Not copied from the other one: the bytes are here. Most often the picture has been shown before, and
-    // the user's folder has it.
-    if (!Holds(files, path_, rest)) files.Write(path_, rest);
+    // the user's folder has it. In a large folder it takes long to find that a name is not there, so nothing
+    // looks before the file is made.
+    if (!files.WriteNew(path_, rest) && !Holds(files, path_, rest)) files.Write(path_, rest);
   });
 }
 

@@ -71,7 +71,9 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   // Where the file that is fetched goes: see DownloadActions.
   Text path_;
   Text explicitPath_;
-  // Of the first of them; null when it cannot be written.
+  // The first of them.
+  const Text& Target() const { return explicitPath_.empty() ? path_ : explicitPath_; }
+  // Of a large file; null when it cannot be written.
   std::unique_ptr<FileWriter> writer_;
   // Whether a part of it was written, so that it is not in memory any more.
   bool large_ = false;

@@ -207,6 +207,13 @@ struct FakeFiles : FileSystem {
   // All that was ever written.
   std::size_t bytesWritten = 0;
   std::unique_ptr<FileWriter> Create(TextView path) override { return std::make_unique<Writer>(*this, path); }
+  bool WriteNew(TextView path, std::string_view bytes) override {
+    if (files.contains(Spelled(path)) || bytes.size() > mostWritten) return false;
+    Writer file(*this, path);
+    file.Write(bytes);
+    file.Commit();
+    return true;
+  }
   void Remove(TextView path) override {
     constexpr std::uint32_t kReadOnly = 1;
     if ((At(path).attributes & kReadOnly) != 0) throw RuntimeError(error::kPathAccess);

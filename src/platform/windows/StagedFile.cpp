@@ -75,6 +75,11 @@ void RemoveLeftoversOnce(const std::wstring& folder) {
   if (isNew) StagedFile::RemoveLeftovers(folder);
 }
 
+// With its last separator. A path without a folder is in the current one; "C:name" keeps its drive.
+std::wstring FolderOf(const std::wstring& path) {
+  return path.substr(0, path.find_last_of(L"\\/:") + 1);
+}
+
 // Without a look-up of the old name, which takes longer than writing a small file.
 bool Rename(HANDLE file, const std::wstring& name, bool replace) {
   std::vector<char> room(sizeof(FILE_RENAME_INFO) + name.size() * sizeof(wchar_t));
@@ -87,11 +92,10 @@ bool Rename(HANDLE file, const std::wstring& name, bool replace) {
 
 }  // namespace
 
-StagedFile::StagedFile(const std::wstring& target) : target_(target) {
-  // A target without a folder is in the current one; "C:name" keeps its drive.
-  const std::wstring folder = target.substr(0, target.find_last_of(L"\\/:") + 1);
-  RemoveLeftoversOnce(folder);
-  path_ = folder + UniqueName();
+StagedFile::StagedFile(const std::wstring& target) : StagedFile(target, FolderOf(target) + UniqueName()) {}
+
+StagedFile::StagedFile(const std::wstring& target, const std::wstring& path) : target_(target), path_(path) {
+  RemoveLeftoversOnce(FolderOf(path));
   file_ = Opened(path_, GENERIC_WRITE | DELETE, CREATE_NEW);
   if (file_)
     goesWhenClosed_ = SetGoesWhenClosed(file_.Get(), true);
@@ -102,6 +106,13 @@ StagedFile::StagedFile(const std::wstring& target) : target_(target) {
 StagedFile::~StagedFile() {
   file_ = {};
   if (!path_.empty() && !goesWhenClosed_) RemoveFile(path_);
+}
+
+bool StagedFile::WriteNew(const std::wstring& target, std::string_view bytes) {
+  StagedFile file(target, target);
+  if (!file.goesWhenClosed_ || !file.Write(bytes) || !file.Keep()) return false;
+  file.path_.clear();
+  return true;
 }
 
 void StagedFile::RemoveLeftovers(const std::wstring& folder) {

@@ -1,4 +1,5 @@
-// A new file beside its target, which becomes the target whole or goes away, also when the process is ended.
+// A new file that becomes its target whole or goes away, also when the process is ended: beside the target,
+// or in its place at once when all of the bytes are there.
 #pragma once
 
 #include <string>
@@ -34,10 +35,16 @@ class StagedFile {
   // there stays.
   bool Commit();
 
+  // Writes a file of these bytes in its place at once, where there is none. False, and nothing is left of it,
+  // when it cannot be there whole or the system cannot let it go with its handle.
+  static bool WriteNew(const std::wstring& target, std::string_view bytes);
+
   // Removes what ended processes left in the folder, which is named with its last separator.
   static void RemoveLeftovers(const std::wstring& folder);
 
  private:
+  // Creates the file `path`.
+  StagedFile(const std::wstring& target, const std::wstring& path);
   // The file stays when it is closed.
   bool Keep();
 

@@ -156,6 +156,10 @@ std::unique_ptr<FileWriter> WindowsFileSystem::Create(TextView path) {
   return std::make_unique<WindowsFileWriter>(WidePath(path, error::kPathAccess));
 }
 
+bool WindowsFileSystem::WriteNew(TextView path, std::string_view bytes) {
+  return StagedFile::WriteNew(WidePath(path, error::kPathAccess), bytes);
+}
+
 void WindowsFileSystem::Remove(TextView path) {
   const std::wstring widePath = WidePath(path, error::kFileNotFound);
   if (!DeleteFileW(widePath.c_str()))

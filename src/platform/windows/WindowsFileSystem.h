@@ -15,6 +15,7 @@ class WindowsFileSystem : public FileSystem {
   std::unique_ptr<FileReader> Open(TextView path) override;
   std::size_t ReadBeginning(TextView path, std::span<char> room) override;
   std::unique_ptr<FileWriter> Create(TextView path) override;
+  bool WriteNew(TextView path, std::string_view bytes) override;
   void Remove(TextView path) override;
   void RemoveLeftovers(TextView folder) noexcept override;
   bool Exists(TextView pattern, bool folders) override;
