@@ -24,28 +24,30 @@ constexpr auto kHexDigits = [] {
   return digits;
 }();
 
-// Unescapes what `escaped`, a part of `body`, says, at its place: it never gets longer. nullopt when an
-// escape is broken or the bytes are not UTF-8.
-std::optional<std::string_view> Unescape(std::string& body, std::string_view escaped) {
-  char* const begin = body.data() + (escaped.data() - body.data());
-  char* end = begin;
+// Unescapes at its place what stands from `from` to `end` or to the first '&', where `from` is then: it never
+// gets longer. nullopt when an escape is broken or the bytes are not UTF-8.
+std::optional<std::string_view> Unescape(char*& from, const char* end) {
+  char* const begin = from;
+  char* to = begin;
   unsigned seen = 0;
-  for (std::size_t i = 0; i < escaped.size(); ++i) {
-    unsigned byte = static_cast<unsigned char>(escaped[i]);
+  for (; from != end; ++from) {
+    unsigned byte = static_cast<unsigned char>(*from);
     if (byte == '+') {
       byte = ' ';
     } else if (byte == '%') {
-      if (escaped.size() - i < 3) return std::nullopt;
-      const int high = kHexDigits[static_cast<unsigned char>(escaped[i + 1])];
-      const int low = kHexDigits[static_cast<unsigned char>(escaped[i + 2])];
+      if (end - from < 3) return std::nullopt;
+      const int high = kHexDigits[static_cast<unsigned char>(from[1])];
+      const int low = kHexDigits[static_cast<unsigned char>(from[2])];
       if (high < 0 || low < 0) return std::nullopt;
       byte = static_cast<unsigned>(high * 16 + low);
-      i += 2;
+      from += 2;
+    } else if (byte == '&') {
+      break;
     }
     seen |= byte;
-    *end++ = static_cast<char>(byte);
+    *to++ = static_cast<char>(byte);
   }
-  const std::string_view bytes(begin, static_cast<std::size_t>(end - begin));
+  const std::string_view bytes(begin, static_cast<std::size_t>(to - begin));
   if (seen >= 0x80 && !utf8::is_valid(bytes)) return std::nullopt;
   return bytes;
 }
@@ -55,26 +57,30 @@ std::optional<std::string_view> Unescape(std::string& body, std::string_view esc
 Reply Reply::FromBody(std::string body) {
   Reply reply;
   reply.body_ = std::make_unique<std::string>(std::move(body));
-  std::string_view rest = *reply.body_;
-  if (rest.ends_with("\r\n")) rest.remove_suffix(2);
+  char* from = reply.body_->data();
+  char* const end = from + reply.body_->size() - (reply.body_->ends_with("\r\n") ? 2 : 0);
   // Arrays come in a row, so the name seldom changes. Empty when the next one is to be looked up anyway.
   std::string_view lastName;
   Values* values = nullptr;
-  while (!rest.empty()) {
-    const std::string_view piece = rest.substr(0, rest.find('&'));
-    rest.remove_prefix(std::min(piece.size() + 1, rest.size()));
-    if (piece.empty()) continue;
-    const std::size_t equals = piece.find('=');
-    if (const std::string_view name = piece.substr(0, equals); lastName.empty() || name != lastName) {
-      const std::optional<std::string_view> variable = Unescape(*reply.body_, name);
-      if (!variable) return {};
-      values = &reply.variables_[*variable];
+  while (from != end) {
+    if (*from == '&') {
+      ++from;
+      continue;
+    }
+    const std::string_view rest(from, end);
+    if (!lastName.empty() && rest.starts_with(lastName) && rest.substr(lastName.size()).starts_with('=')) {
+      from += lastName.size();
+    } else {
+      const std::size_t length = std::min(rest.find_first_of("=&"), rest.size());
+      const std::optional<std::string_view> name = Unescape(from, from + length);
+      if (!name) return {};
+      values = &reply.variables_[*name];
       if (reply.variables_.size() > kMostVariables) return {};
       // What had escapes is overwritten, and would pass for another name.
-      lastName = variable->size() == name.size() ? *variable : std::string_view();
+      lastName = name->size() == length ? *name : std::string_view();
     }
-    if (equals == std::string_view::npos) continue;
-    const std::optional<std::string_view> value = Unescape(*reply.body_, piece.substr(equals + 1));
+    if (from == end || *from == '&') continue;
+    const std::optional<std::string_view> value = Unescape(++from, end);
     if (!value) return {};
     values->push_back(*value);
   }
