@@ -28,14 +28,25 @@ bool IsDigit(char16_t unit) {
   return unit >= u'0' && unit <= u'9';
 }
 
-bool IsAscii(std::string_view bytes) {
-  std::uint64_t seen = 0;
-  for (std::uint64_t block = 0; bytes.size() >= sizeof block; bytes.remove_prefix(sizeof block)) {
-    std::memcpy(&block, bytes.data(), sizeof block);
-    seen |= block;
+// Writes each byte as the character of the same number; false when one is no ASCII, so that it is not one.
+bool WidenAscii(std::string_view bytes, char16_t* units) {
+  // Blocks of a fixed length become a few vector instructions.
+  constexpr std::size_t kBlock = 16;
+  unsigned char block[kBlock];
+  char16_t wide[kBlock];
+  unsigned seen = 0;
+  while (bytes.size() >= kBlock) {
+    std::memcpy(block, bytes.data(), kBlock);
+    for (std::size_t i = 0; i < kBlock; ++i) wide[i] = block[i];
+    std::memcpy(units, wide, sizeof wide);
+    std::uint64_t halves[2];
+    std::memcpy(halves, block, sizeof halves);
+    if (((halves[0] | halves[1]) & 0x8080808080808080) != 0) return false;
+    bytes.remove_prefix(kBlock);
+    units += kBlock;
   }
-  for (const char byte : bytes) seen |= static_cast<unsigned char>(byte);
-  return (seen & 0x8080808080808080) == 0;
+  for (const char byte : bytes) seen |= * units++ = static_cast<unsigned char>(byte);
+  return seen < 0x80;
 }
 
 // Printable ASCII of `text`, for the number parsers; any other character becomes one that no number holds.
@@ -66,11 +77,17 @@ std::string Utf8FromText(TextView text) {
   return bytes;
 }
 
+char16_t* WriteValidUtf8(std::string_view bytes, char16_t* units) {
+  // Most are.
+  if (WidenAscii(bytes, units)) return units + bytes.size();
+  return utf8::unchecked::utf8to16(bytes.begin(), bytes.end(), units);
+}
+
 std::optional<Text> TextFromUtf8(std::string_view bytes) {
-  // Most are, and need neither a check nor a second look at each byte.
-  if (IsAscii(bytes)) return Text(bytes.begin(), bytes.end());
-  if (!utf8::is_valid(bytes)) return std::nullopt;
   Text text(bytes.size(), u'\0');
+  // Most are, and need no check.
+  if (WidenAscii(bytes, text.data())) return text;
+  if (!utf8::is_valid(bytes)) return std::nullopt;
   const char16_t* const end = utf8::unchecked::utf8to16(bytes.begin(), bytes.end(), text.data());
   text.resize(static_cast<std::size_t>(end - text.data()));
   return text;

@@ -1,4 +1,8 @@
 // The operations on the files of the account.
+#include <algorithm>
+#include <memory>
+#include <optional>
+
 #include "base/RuntimeError.h"
 #include "platform/FileSystem.h"
 #include "platform/HttpTransport.h"
@@ -39,10 +43,64 @@ class NormalAttributes {
   bool cleared_ = false;
 };
 
-Text ElementAt(const Reply::Values& values, std::size_t index) {
+std::string_view ElementAt(const Reply::Values& values, std::size_t index) {
   if (index >= values.size()) throw RuntimeError(error::kSubscriptOutOfRange);
-  return TextFromUtf8(values[index]).value();
+  return values[index];
 }
+
+// Makes the records of a listing and their texts, many in one block of memory: otherwise the memory would
+// take most of the time. The blocks are short, because each of their records keeps them.
+class RecordMaker {
+ public:
+  explicit RecordMaker(std::size_t files) : left_(files) {}
+
+  // There is one left. All arguments are valid UTF-8.
+  std::shared_ptr<CUpload> Next(std::string_view name, std::string_view url, std::string_view date) {
+    if (nextRecord_ == recordsEnd_) {
+      const std::size_t count = std::min(kBlockFiles, left_);
+      records_ = std::make_shared<CUpload[]>(count);
+      nextRecord_ = records_.get();
+      recordsEnd_ = nextRecord_ + count;
+    }
+    if (const std::size_t need = name.size() + url.size() + date.size(); need > room_) {
+      // The files that follow are likely to be much like this one.
+      room_ = std::max(need, std::min(kBlockUnits, need * left_));
+      units_ = std::make_shared_for_overwrite<char16_t[]>(room_);
+      end_ = units_.get();
+    }
+    // As a rule the address ends with the name, which then needs no units of its own.
+    const bool endsWithName = url.ends_with(name);
+    if (endsWithName) url.remove_suffix(name.size());
+    const TextView address = Write(url);
+    const TextView ownName = Write(name);
+    CUpload& record = *nextRecord_++;
+    record.FileName = {units_, ownName};
+    record.FilePath = {units_, {address.data(), address.size() + (endsWithName ? ownName.size() : 0)}};
+    record.FileDate = {units_, Write(date)};
+    --left_;
+    return {records_, &record};
+  }
+
+ private:
+  static constexpr std::size_t kBlockFiles = 64;
+  static constexpr std::size_t kBlockUnits = 8192;
+
+  TextView Write(std::string_view bytes) {
+    const char16_t* const begin = end_;
+    end_ = WriteValidUtf8(bytes, end_);
+    const TextView text(begin, end_);
+    room_ -= text.size();
+    return text;
+  }
+
+  std::size_t left_;
+  std::shared_ptr<CUpload[]> records_;
+  CUpload* nextRecord_ = nullptr;
+  CUpload* recordsEnd_ = nullptr;
+  std::shared_ptr<char16_t[]> units_;
+  char16_t* end_ = nullptr;
+  std::size_t room_ = 0;
+};
 
 }  // namespace
 
@@ -61,12 +119,10 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
     const Reply::Values* dates = reply.GetValueByVariableName(u"FileDate");
     // An account without files has them all, empty.
     if (!names || !urls || !sizes || !dates) return;
+    RecordMaker maker(names->size());
     for (std::size_t i = 0; i < names->size(); ++i) {
-      auto file = std::make_shared<CUpload>();
-      file->FileName = ElementAt(*names, i);
-      file->FilePath = ElementAt(*urls, i);
-      file->FileSize = LeadingNumber(ElementAt(*sizes, i));
-      file->FileDate = ElementAt(*dates, i);
+      const auto file = maker.Next((*names)[i], ElementAt(*urls, i), ElementAt(*dates, i));
+      file->FileSize = LeadingNumber(TextFromUtf8(ElementAt(*sizes, i)).value());
       colFiles(file);
     }
     listed = true;

@@ -1,16 +1,16 @@
 #pragma once
 
-#include "base/Text.h"
+#include "base/SharedText.h"
 
 namespace tarnwick {
 
 // One file of the account, as the server lists it. Plain values without rules of their own.
 struct CUpload {
-  Text FileName;
+  SharedText FileName;
   // The server's text, "M/D/YYYY h:mm:ss AM" as a rule.
-  Text FileDate;
+  SharedText FileDate;
   // The file's web address.
-  Text FilePath;
+  SharedText FilePath;
   // Bytes.
   double FileSize = 0;
 };

@@ -14,8 +14,8 @@ Text Listing::AddressLike(const Text& address) const {
   // Every address contains an empty text, which a file has that the service listed without one.
   if (address.empty()) return {};
   if (all.Find(address)) return address;
-  const std::size_t position =
-      all.PositionWhere([&](const CUpload& record) { return record.FilePath.find(address) != Text::npos; });
+  const std::size_t position = all.PositionWhere(
+      [&](const CUpload& record) { return TextView(record.FilePath).find(address) != Text::npos; });
   return position == 0 ? Text() : all.At(position)->FilePath;
 }
 

@@ -106,9 +106,41 @@ TEST_F(CFileUploadTest, CollectionsMayCallTheClient) {
   Text names;
   EXPECT_TRUE(client.ListFilesForUser([&](const std::shared_ptr<CUpload>& file) {
     EXPECT_EQ(client.CanUploadFile(), 1004);
-    names += file->FileName + file->FileDate + file->FilePath;
+    for (const TextView text : {file->FileName, file->FileDate, file->FilePath}) names += text;
   }));
   EXPECT_EQ(names, u"ad1u1bd2u2");
+}
+
+TEST_F(CFileUploadTest, ListedRecordsStandAlone) {
+  // Names that the address ends with, in part or not at all, and texts of every length.
+  std::string reply = "FileSize&FileName&FileURL&FileDate";
+  Text expected;
+  for (std::size_t i = 0; i < 200; ++i) {
+    const std::string number = std::to_string(i);
+    const std::string name = i % 5 == 0 ? "" : std::string(i % 7 == 0 ? i * i : i, 'n') + "\u00e9" + number;
+    const std::string url = number + (i % 3 == 0   ? "/u/x" + name
+                                      : i % 3 == 1 ? "/\U0001F600"
+                                                   : name.substr(name.size() / 2));
+    reply += "&FileName=" + name + "&FileURL=" + url + "&FileSize=" + number + "&FileDate=d" + number;
+    expected += TextFromUtf8(name + "|" + url + "|d" + number + "\n").value();
+  }
+  Answer(reply.c_str());
+  std::vector<std::shared_ptr<CUpload>> files;
+  ASSERT_TRUE(client.ListFilesForUser([&](const std::shared_ptr<CUpload>& file) { files.push_back(file); }));
+  Text listed;
+  for (const auto& file : files)
+    listed += Text(file->FileName) + u"|" + Text(file->FilePath) + u"|" + Text(file->FileDate) + u"\n";
+  EXPECT_EQ(listed, expected);
+
+  // Another name changes nothing else, and a copy does not need the listing.
+  CUpload copy = *files[3];
+  files[3]->FileName = u"other";
+  EXPECT_EQ(files[3]->FilePath, copy.FilePath);
+  files.clear();
+  EXPECT_EQ(copy.FileName, u"nnn\u00e93");
+  EXPECT_EQ(copy.FilePath, u"3/u/xnnn\u00e93");
+  copy.FileName = TextView(copy.FileName).substr(2);
+  EXPECT_EQ(copy.FileName, u"n\u00e93");
 }
 
 TEST_F(CFileUploadTest, RegistrationRestoresAttributesOnEveryWayOut) {
@@ -119,7 +151,7 @@ TEST_F(CFileUploadTest, RegistrationRestoresAttributesOnEveryWayOut) {
   }
   EXPECT_EQ(fake.files.attributesSet, (std::vector<std::uint32_t>{0, 1, 0, 1, 0, 1}));
   const CUpload& record = *client.GetUploadObject();
-  EXPECT_EQ(record.FileName + u"|" + record.FilePath, u"a.jpg|C:\\a.jpg");
+  EXPECT_EQ(Text(record.FileName) + u"|" + Text(record.FilePath), u"a.jpg|C:\\a.jpg");
   EXPECT_EQ(client.SaveUploadFile(u"C:\\missing.jpg"), u"");
   EXPECT_EQ(fake.http.sent.size(), 3U);
   // On a medium that cannot be written the file is registered as it is, and nothing is restored.

@@ -180,7 +180,8 @@ TEST_F(ListImageTest, AnswersQueries) {
   for (const TextView address : {u"http://h/u/b.jpg", u"b.jpg"}) control.GetFileDetails(address, take);
   ASSERT_EQ(details.size(), 2U);
   const CUpload& record = *details[0];
-  EXPECT_EQ(record.FileName + u"|" + record.FileDate + u"|" + record.FilePath, u"b.jpg|today|");
+  EXPECT_EQ(Text(record.FileName) + u"|" + Text(record.FileDate) + u"|" + Text(record.FilePath),
+            u"b.jpg|today|");
   EXPECT_EQ(record.FileSize, 2);
 
   const struct {
