@@ -32,17 +32,18 @@ std::optional<std::string_view> Unescape(char*& from, const char* end) {
   unsigned seen = 0;
   for (; from != end; ++from) {
     unsigned byte = static_cast<unsigned char>(*from);
-    if (byte == '+') {
-      byte = ' ';
-    } else if (byte == '%') {
-      if (end - from < 3) return std::nullopt;
-      const int high = kHexDigits[static_cast<unsigned char>(from[1])];
-      const int low = kHexDigits[static_cast<unsigned char>(from[2])];
-      if (high < 0 || low < 0) return std::nullopt;
-      byte = static_cast<unsigned>(high * 16 + low);
-      from += 2;
-    } else if (byte == '&') {
-      break;
+    // Most bytes stand for themselves, and all of those with a meaning come before them.
+    if (byte <= '+') {
+      if (byte == '&') break;
+      if (byte == '+') byte = ' ';
+      if (byte == '%') {
+        if (end - from < 3) return std::nullopt;
+        const int high = kHexDigits[static_cast<unsigned char>(from[1])];
+        const int low = kHexDigits[static_cast<unsigned char>(from[2])];
+        if (high < 0 || low < 0) return std::nullopt;
+        byte = static_cast<unsigned>(high * 16 + low);
+        from += 2;
+      }
     }
     seen |= byte;
     *to++ = static_cast<char>(byte);
