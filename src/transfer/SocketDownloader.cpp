@@ -98,7 +98,6 @@ void SocketDownloader::OnConnected() {
   if (!plan_.secure)
     actions_.Send("GET " + TargetBytes(plan_.requestTarget) + " HTTP/1.1\r\nHost: " +
                   Utf8FromText(plan_.hostLine) + "\r\n" + std::string(kDownloadHeaders) + "\r\n");
-  // While the server works.
   actions_.BeginFile(plan_.file, explicitTarget_);
 }
 
