@@ -42,7 +42,7 @@ class Bstr {
 };
 
 struct Account {
-  std::wstring server;  // host:port
+  std::wstring server;  // host:port, or the same behind https://
   std::wstring user;
   std::wstring password;
   std::wstring product;
@@ -80,6 +80,8 @@ class Form {
 
 // Each prints its rows.
 void TransferBench(const Account& account, std::size_t largeBytes, int smallCount);
+// The same account over TLS.
+void TlsBench(const Account& account, int smallCount);
 void UploadBench(const Account& account);
 // Accounts with 500 and with 100,000 files, and with 2,000, 20,000 and 100,000 on servers that only repeat
 // what another one answered.
