@@ -241,7 +241,7 @@ bool FileControl::SendFile(CFileUpload& client, const Text& path) {
   copies_.BeginUpload(path);
   try {
     uploader_.UploadFile(path, UsersBaseUrl(session.serverName), AcceptorPath(u"UploadAcceptor.asp"), 0,
-                         Text(session.userName), Text(session.password), kProductGuid, *this);
+                         Text(session.userName), Secret(session.password), kProductGuid, *this);
   } catch (const RuntimeError& failure) {
     const std::int32_t number = failure.Number();
     if (number != acceptor::kNothingChanged && number != kInvalidProperty) {

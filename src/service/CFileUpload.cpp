@@ -2,6 +2,9 @@
 // on accounts are in CFileUploadFiles.cpp and CFileUploadAccounts.cpp.
 #include "service/CFileUpload.h"
 
+#include <algorithm>
+#include <array>
+
 #include "base/RuntimeError.h"
 #include "platform/Internet.h"
 #include "service/Log.h"
@@ -18,9 +21,15 @@ constexpr TextView kServiceFolder = u"/bv/bin";
 constexpr TextView kFtpAgent = u"FileUploadClient";
 constexpr std::uint16_t kFtpPort = 21;
 
-// The FTP session speaks to the session's server as the session's user. Over TLS there is none.
+// The FTP session speaks to the session's server as the session's user. Over TLS there is none, and what the
+// log-on before left for it goes.
 void SetFtpLogon(FtpState& ftp, const SessionValues& session) {
-  if (session.IsSecure()) return;
+  if (session.IsSecure()) {
+    ftp.host.clear();
+    ftp.userName.clear();
+    ftp.password = {};
+    return;
+  }
   const auto address = SplitHttpAddress(session.serverName);
   ftp.host = address ? address->host : Text();
   ftp.port = kFtpPort;
@@ -68,7 +77,8 @@ Text CFileUpload::AskForText(TextView requestName, TextView clientAction,
                              std::initializer_list<Parameter> parameters, std::int32_t sendFlag,
                              TextView variable, TextView onFailure) {
   const Reply reply = Ask(requestName, clientAction, parameters, sendFlag);
-  return Text(reply.ErrorOccured() == 1 ? onFailure : reply.First(variable));
+  if (reply.ErrorOccured() == 1) return Text(onFailure);
+  return reply.First(variable);
 }
 
 std::int32_t CFileUpload::AskForNumber(TextView requestName, TextView clientAction,
@@ -100,10 +110,10 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
   SessionValues& session = apartment_.session;
   // Copies first: the arguments may be views of the very values that are replaced.
   Text previousUser = session.userName;
-  Text previousPassword = session.password;
+  Secret previousPassword = session.password;
   const bool loggedOn = ResultAsItStood(false, [&](bool& result) {
     const Text user(Username);
-    const Text password(Password);
+    const Secret password{Text(Password)};
     const Text product(ProductID);
     session.mguid = Text(MGUID);
     session.userName = user;
@@ -204,13 +214,25 @@ Text CFileUpload::GetUserBasePath() {
 }
 
 Text CFileUpload::Encipher(TextView value) {
-  return EnCodeString(EncryptParameter(value));
+  return EnCodeString(Secret(EncryptParameter(value)));
 }
 
 Text CFileUpload::EnCodeString(TextView szString) {
-  // The percent sign goes first, so that the escapes of the others are not escaped again.
-  const Text percent = ReplaceAll(szString, u"%", u"%25");
-  return ReplaceAll(ReplaceAll(ReplaceAll(percent, u"+", u"%2B"), u"#", u"%23"), u"&", u"%26");
+  constexpr TextView kEscaped = u"%+#&";
+  constexpr std::array<TextView, 4> kEscapes = {u"%25", u"%2B", u"%23", u"%26"};
+  const auto count =
+      std::ranges::count_if(szString, [&](char16_t unit) { return kEscaped.find(unit) != TextView::npos; });
+  Text escaped;
+  // All at once, because it may be a password: a text that grows leaves what it was behind.
+  escaped.reserve(szString.size() + 2 * static_cast<std::size_t>(count));
+  for (const char16_t unit : szString) {
+    const std::size_t which = kEscaped.find(unit);
+    if (which == TextView::npos)
+      escaped.push_back(unit);
+    else
+      escaped.append(kEscapes[which]);
+  }
+  return escaped;
 }
 
 }  // namespace tarnwick

@@ -180,7 +180,7 @@ class CFileUpload {
  private:
   struct Parameter {
     TextView name;
-    Text value;
+    Secret value;
   };
 
   // One exchange: composes the request, sends it and reads the reply. `parameters` follow the enciphered

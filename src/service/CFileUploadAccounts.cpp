@@ -38,7 +38,7 @@ Text CFileUpload::AddUser(TextView ProductID, TextView Username, TextView GUID) 
         {{u"UserName", EnCodeString(Username)}, {u"ProductID", Text(ProductID)}, {u"MGUID", Text(GUID)}}, 1);
     std::int32_t code = status::kFailure;
     bool addedOnService = false;
-    Text password;
+    Secret password;
     Text mguid;
     if (reply.ErrorOccured() != 1) {
       Log(u"Start select case on return value");

@@ -1,5 +1,6 @@
 #include "service/HTTPServer.h"
 
+#include <string>
 #include <utility>
 
 #include "platform/HttpTransport.h"
@@ -11,9 +12,11 @@ namespace {
 
 constexpr std::size_t kMostReplyBytes = std::size_t{64} << 20;
 
-void AppendPair(std::string& form, TextView name, TextView value) {
-  if (!form.empty()) form += '&';
-  form.append(EscapeUnprintable(name)).append("=").append(EscapeUnprintable(value));
+void AppendPair(SecretBytes& form, TextView name, TextView value) {
+  if (!form.IsEmpty()) form.Append("&");
+  form.Append(EscapeUnprintable(name));
+  form.Append("=");
+  form.Append(SecretBytes(EscapeUnprintable(value)));
 }
 
 }  // namespace
@@ -23,24 +26,22 @@ Request HTTPServer::CreateXLLDFRequest(TextView requestName, TextView page) {
 }
 
 void HTTPServer::AddParameter(Request& request, TextView name, TextView value) {
-  request.parameters.emplace_back(name, value);
+  request.parameters.emplace_back(name, Secret(Text(value)));
 }
 
 Reply HTTPServer::SendRequest(const Request& request, TextView url, std::int32_t sendFlag) {
   const auto address = SplitUrl(url);
   if (!address) return {};
 
-  std::string query;
-  AppendPair(query, u"Request", request.name);
-  AppendPair(query, u"Flag", TextFromNumber(sendFlag));
-  std::string body;
+  SecretBytes body;
   for (const auto& [name, value] : request.parameters) AppendPair(body, name, value);
 
   HttpPost post;
   post.secure = address->secure;
   post.host = address->host;
   post.port = address->port;
-  post.target = EscapeUnprintable(address->path + u"/" + request.page) + "?" + query;
+  post.target = EscapeUnprintable(address->path + u"/" + request.page) +
+                "?Request=" + EscapeUnprintable(request.name) + "&Flag=" + std::to_string(sendFlag);
   post.contentType = "application/x-www-form-urlencoded; charset=utf-8";
   post.body = body;
   auto answer = http_.Post(post, kMostReplyBytes);

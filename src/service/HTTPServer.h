@@ -7,10 +7,10 @@
 #pragma once
 
 #include <cstdint>
-#include <string>
 #include <utility>
 #include <vector>
 
+#include "base/Secret.h"
 #include "base/Text.h"
 #include "transfer/Reply.h"
 
@@ -22,7 +22,8 @@ class HttpTransport;
 struct Request {
   Text name;
   Text page;
-  std::vector<std::pair<Text, Text>> parameters;
+  // Some of the values are passwords, so all are wiped.
+  std::vector<std::pair<Text, Secret>> parameters;
 };
 
 class HTTPServer {

@@ -2,6 +2,7 @@
 
 #include <array>
 #include <cstddef>
+#include <string>
 
 namespace tarnwick {
 namespace {
@@ -36,7 +37,8 @@ Text StripToAlphabet(TextView value) {
 }
 
 void ApplyCipher(Text& value) {
-  value = StripToAlphabet(value);
+  // In place: the text may be a password, of which nothing stays in memory that this function owns.
+  std::erase_if(value, [](char16_t character) { return PositionOf(character) == kAbsent; });
   std::size_t keyIndex = value.size() % kKey.size();
   for (char16_t& character : value) {
     const std::size_t shifted =

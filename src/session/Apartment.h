@@ -6,6 +6,7 @@
 #include <map>
 #include <memory>
 
+#include "base/Secret.h"
 #include "base/Text.h"
 #include "platform/Platform.h"
 #include "session/Listing.h"
@@ -28,7 +29,7 @@ struct FtpState {
   Text host;
   std::uint16_t port = 21;
   Text userName;
-  Text password;
+  Secret password;
   Text proxyHost;
   Text proxyPort;
   ProxyStyle proxyStyle = ProxyStyle::kUserAtHostColonPort;

@@ -3,6 +3,7 @@
 
 #include <cstdint>
 
+#include "base/Secret.h"
 #include "base/Text.h"
 #include "support/HttpAddress.h"
 
@@ -21,7 +22,7 @@ struct SessionValues {
   // "host" or "host:port", or the same behind "https://".
   Text serverName;
   Text userName;
-  Text password;
+  Secret password;
   std::int32_t productNumber = 0;
   Text mguid;
   // Set by a log-on; cleared once its FTP values were rewritten for the proxy.

@@ -2,6 +2,8 @@
 
 #include <algorithm>
 
+#include "base/Secret.h"
+
 namespace tarnwick {
 namespace {
 
@@ -11,9 +13,13 @@ constexpr TextView kSecureScheme = u"https://";
 template <typename Keep>
 std::string Escape(TextView text, Keep keep) {
   constexpr std::string_view kHex = "0123456789ABCDEF";
-  const std::string bytes = Utf8FromText(text);
+  const SecretBytes secret(Utf8FromText(text));
+  const std::string_view bytes = secret;
+  const auto kept = static_cast<std::size_t>(std::count_if(
+      bytes.begin(), bytes.end(), [&](char byte) { return keep(static_cast<unsigned char>(byte)); }));
   std::string escaped;
-  escaped.reserve(bytes.size());
+  // All at once: it may be a password, and a text that grows leaves what it was behind.
+  escaped.reserve(3 * bytes.size() - 2 * kept);
   for (const char character : bytes) {
     const auto byte = static_cast<unsigned char>(character);
     if (keep(byte))

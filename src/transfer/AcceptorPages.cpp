@@ -1,6 +1,7 @@
 #include "transfer/AcceptorPages.h"
 
 #include "base/RuntimeError.h"
+#include "base/Secret.h"
 #include "platform/HttpTransport.h"
 #include "support/HttpAddress.h"
 #include "transfer/Reply.h"
@@ -35,10 +36,12 @@ Text AcceptorPath(TextView page) {
 void PostAcceptorForm(HttpTransport& http, TextView usersBaseUrl, TextView acceptorPath,
                       std::initializer_list<AcceptorField> fields) {
   HttpPost post = AcceptorPost(usersBaseUrl, acceptorPath);
-  std::string body;
+  SecretBytes body;
   for (const AcceptorField& field : fields) {
-    if (!body.empty()) body += '&';
-    body.append(EscapeFormValue(field.name)).append("=").append(EscapeFormValue(field.value));
+    if (!body.IsEmpty()) body.Append("&");
+    body.Append(EscapeFormValue(field.name));
+    body.Append("=");
+    body.Append(SecretBytes(EscapeFormValue(field.value)));
   }
   post.contentType = "application/x-www-form-urlencoded; charset=utf-8";
   post.body = body;

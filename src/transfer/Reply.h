@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "base/KeyHash.h"
+#include "base/Secret.h"
 #include "base/Text.h"
 
 namespace tarnwick {
@@ -38,9 +39,18 @@ class Reply {
   Text First(TextView name) const;
 
  private:
+  // Some replies tell a user's key; long ones list files.
+  struct WipingDelete {
+    void operator()(std::string* body) const noexcept {
+      constexpr std::size_t kLong = 64 * 1024;
+      if (body->size() < kLong) Wipe(*body);
+      delete body;
+    }
+  };
+
   // The body, in which names and values are unescaped where they stand, and which the views below point into:
   // a listing has four of them for each file. Apart, because the bytes of a short string move with it.
-  std::unique_ptr<std::string> body_;
+  std::unique_ptr<std::string, WipingDelete> body_;
   std::unordered_map<std::string_view, Values, ProcessHash> variables_;
   bool failed_ = true;
 };

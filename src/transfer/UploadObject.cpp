@@ -7,6 +7,7 @@
 #include <string>
 
 #include "base/RuntimeError.h"
+#include "base/Secret.h"
 #include "platform/FileSystem.h"
 #include "platform/HttpTransport.h"
 #include "support/PathHelpers.h"
@@ -40,7 +41,8 @@ class UploadBody : public BodySource {
 
   void AddField(std::string_view name, TextView value) {
     AddPartHead(name, {});
-    head_.append(Utf8FromText(value)).append("\r\n");
+    head_.Append(SecretBytes(Utf8FromText(value)));
+    head_.Append("\r\n");
   }
   // The last part. The name can be quoted.
   void AddFile(std::string_view name, TextView fileName) {
@@ -49,7 +51,7 @@ class UploadBody : public BodySource {
     tail_ = "\r\n--" + boundary_ + "--\r\n";
   }
 
-  std::uint64_t Length() const override { return head_.size() + length_ + tail_.size(); }
+  std::uint64_t Length() const override { return Head().size() + length_ + tail_.size(); }
 
   std::size_t Read(std::span<char> room) override {
     std::size_t filled = 0;
@@ -72,7 +74,7 @@ class UploadBody : public BodySource {
 
   void Sent(std::uint64_t sent) override {
     // Of the file alone: the fields around it are no progress that a user would see.
-    const std::uint64_t ofFile = std::min(sent - std::min<std::uint64_t>(sent, head_.size()), length_);
+    const std::uint64_t ofFile = std::min(sent - std::min<std::uint64_t>(sent, Head().size()), length_);
     const auto percent =
         static_cast<std::int32_t>(length_ == 0 ? (sent == 0 ? 0 : 100) : ofFile * 100 / length_);
     if (!started_) events_.UploadStarted();
@@ -85,13 +87,17 @@ class UploadBody : public BodySource {
 
  private:
   void AddPartHead(std::string_view name, std::string_view more) {
-    head_.append("--").append(boundary_).append("\r\nContent-Disposition: form-data; name=\"").append(name);
-    head_.append("\"").append(more).append("\r\n\r\n");
+    for (const std::string_view part : {std::string_view("--"), std::string_view(boundary_),
+                                        std::string_view("\r\nContent-Disposition: form-data; name=\""), name,
+                                        std::string_view("\""), more, std::string_view("\r\n\r\n")})
+      head_.Append(part);
   }
 
+  std::string_view Head() const { return head_; }
+
   std::size_t ReadSome(std::span<char> room) {
-    const std::uint64_t afterFile = head_.size() + length_;
-    if (position_ < head_.size()) return Copy(head_, position_, room);
+    const std::uint64_t afterFile = Head().size() + length_;
+    if (position_ < Head().size()) return Copy(Head(), position_, room);
     if (position_ >= afterFile) {
       if (position_ == afterFile) ExpectEnd();
       return Copy(tail_, position_ - afterFile, room);
@@ -116,7 +122,7 @@ class UploadBody : public BodySource {
   }
 
   const std::string boundary_ = NewBoundary();
-  std::string head_;
+  SecretBytes head_;
   std::string tail_;
   const std::uint64_t length_;
   const std::unique_ptr<FileReader> file_;

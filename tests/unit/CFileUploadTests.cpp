@@ -63,7 +63,7 @@ TEST_F(CFileUploadTest, EveryFalseLogonRestoresTheUser) {
     Answer(body);
     EXPECT_FALSE(client.LogonAs(u"9", u"second", u"other", u"{N}"));
     EXPECT_EQ(fake.apartment.session.userName, u"first");
-    EXPECT_EQ(fake.apartment.session.password, u"pw");
+    EXPECT_EQ(TextView(fake.apartment.session.password), u"pw");
     EXPECT_EQ(fake.apartment.session.mguid, u"{N}");
     EXPECT_EQ(fake.apartment.session.productNumber, 9);
     EXPECT_EQ(fake.apartment.ftp.userName, u"first");

@@ -28,7 +28,7 @@ class ControlTest : public testing::Test {
     SessionValues& session = fake.apartment.session;
     session.serverName = u"h:81";
     session.userName = u"u@x";
-    session.password = u"p";
+    session.password = Text(u"p");
     session.productNumber = 7;
     fake.registry.InternetSettings()[u"ProxyEnable"] = FakeRegistry::Number(0);
     fake.strings.own[3582] = u"No pictures.";

@@ -177,7 +177,7 @@ class OperationTest : public testing::TestWithParam<Operation> {
  protected:
   // The result of the operation in a fresh session, given that answer.
   static std::string ResultOf(const std::optional<HttpAnswer>& answer, FakePlatform& fake) {
-    fake.apartment.session = {u"h:8080", u"a+b&c@d.e", u"pw", 7, u"{M}", false};
+    fake.apartment.session = {u"h:8080", u"a+b&c@d.e", Text(u"pw"), 7, u"{M}", false};
     fake.files.files[u"C:\\x/a+b.jpg"] = {12, 0};
     fake.http.answers = {answer};
     CFileUpload client(fake.apartment);
