@@ -54,20 +54,22 @@ void OnFree(void* block, std::size_t size) noexcept {
   std::memset(block, 0, size);
 }
 
-// The end of the password, which a shorter one that is written over it would leave, in all its forms.
+// In all its forms. The end is what a shorter one that is written over it would leave, the beginning is what
+// a text that grows leaves.
 void LookFor(TextView password) {
-  constexpr std::size_t kEnd = 6;
+  constexpr std::size_t kUnits = 6;
   for (const Text& form : {Text(password), EncryptParameter(password)}) {
-    const Text end = form.substr(form.size() - kEnd);
-    ASSERT_EQ(end.find_first_of(u"#@$*.-_"), Text::npos) << "would be escaped";
-    watch.patterns.push_back({std::string(reinterpret_cast<const char*>(end.data()), 2 * end.size())});
-    watch.patterns.push_back({Utf8FromText(end)});
+    for (const Text& part : {form.substr(0, kUnits), form.substr(form.size() - kUnits)}) {
+      ASSERT_EQ(part.find(u'#'), Text::npos) << "would be escaped";
+      watch.patterns.push_back({std::string(reinterpret_cast<const char*>(part.data()), 2 * part.size())});
+      watch.patterns.push_back({Utf8FromText(part)});
+    }
   }
 }
 
 // Short ones lie inside the objects that hold them, long ones in blocks of their own.
 constexpr TextView kShort = u"Ulme7x";
-constexpr TextView kLong = u"Rosmarin4Lindenblatt";
+constexpr TextView kLong = u"Rosmarin4Lindenblatt5Wacholderbeere";
 constexpr TextView kRefused = u"Espenlaub4Weidenkorb";
 constexpr TextView kKey = u"Haselnuss1Holunder";
 
@@ -134,7 +136,7 @@ TEST(Secrets, AreWipedWhenTheyEndAreReplacedOrGrow) {
     const auto client = std::make_shared<CFileUpload>(*apartment);
     control.mobjFileupload = client;
     apartment->session.serverName = u"h";
-    EXPECT_TRUE(client->LogonAs(u"7", u"anna", kShort, u""));
+    EXPECT_TRUE(client->LogonAs(u"7", u"anna", kLong, u""));
     holdsNone("log-on");
     EXPECT_TRUE(control.Init(u"*"));
     EXPECT_TRUE(control.UploadImage(u"C:\\a.jpg"));
@@ -143,14 +145,14 @@ TEST(Secrets, AreWipedWhenTheyEndAreReplacedOrGrow) {
     view.Select(0, true);
     control.DeleteFile();
     holdsNone("rename and delete");
-    EXPECT_EQ(client->ManagePassword(u"7", u"anna", kShort, kLong), 1001);
+    EXPECT_EQ(client->ManagePassword(u"7", u"anna", kLong, kShort), 1001);
     holdsNone("change of password");
     EXPECT_FALSE(client->LogonAs(u"7", u"anna", kRefused, u""));
-    EXPECT_EQ(TextView(apartment->session.password), kShort);
-    EXPECT_TRUE(client->LogonAs(u"7", u"anna", kLong, u""));
-    EXPECT_FALSE(HoldsPattern(apartment.get(), sizeof *apartment)) << "the short one is replaced";
+    EXPECT_EQ(TextView(apartment->session.password), kLong);
+    EXPECT_TRUE(client->LogonAs(u"7", u"anna", kShort, u""));
     holdsNone("refused and second log-on");
     EXPECT_EQ(client->AddUser(u"7", u"berta", u""), u"m");
+    EXPECT_FALSE(HoldsPattern(apartment.get(), sizeof *apartment)) << "the log-on is another one now";
     EXPECT_EQ(client->ActivateAccount(u"7", u"berta", kKey), u"m");
     Text key = client->GetKeyForUser(u"7", u"berta");
     EXPECT_EQ(key, kKey);
@@ -166,8 +168,9 @@ TEST(Secrets, AreWipedWhenTheyEndAreReplacedOrGrow) {
   holdsNone("end of the apartment");
   watch.on = false;
   EXPECT_EQ(server.pages, 5) << "three for the file, two for the folder of the account";
-  for (std::size_t i = 3; i < watch.patterns.size(); i += 4)
-    EXPECT_TRUE(watch.patterns[i].sent) << "pattern " << i;
+  // By password: two forms, two parts, two encodings.
+  for (std::size_t i = 5; i < watch.patterns.size(); i += 8)
+    EXPECT_TRUE(watch.patterns[i].sent) << "the enciphered form of password " << i / 8;
 }
 
 #ifdef __SANITIZE_ADDRESS__
