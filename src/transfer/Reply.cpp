@@ -59,8 +59,7 @@ Reply Reply::FromBody(std::string body) {
   Reply reply;
   reply.body_.reset(new std::string(std::move(body)));
   char* from = reply.body_->data();
-  char* const end = from + reply.body_->size() - (reply.body_->ends_with("
-") ? 2 : 0);
+  char* const end = from + reply.body_->size() - (reply.body_->ends_with("\r\n") ? 2 : 0);
   // Arrays come in a row, so the name seldom changes. Empty when the next one is to be looked up anyway.
   std::string_view lastName;
   Values* values = nullptr;
