@@ -30,8 +30,8 @@ class BasicSecret {
   using View = std::basic_string_view<Unit>;
 
   BasicSecret() = default;
-  // Takes the text over: short ones stay behind in what they are moved from.
-  BasicSecret(Value value) noexcept { Take(value); }
+  // Takes the text over, and wipes where it was: a short one stays behind when it is moved.
+  BasicSecret(Value&& value) noexcept { Take(value); }
   BasicSecret(const BasicSecret& other) = default;
   BasicSecret(BasicSecret&& other) noexcept { Take(other.value_); }
   BasicSecret& operator=(BasicSecret other) noexcept {

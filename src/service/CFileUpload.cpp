@@ -141,8 +141,8 @@ bool CFileUpload::AskForLogon(const Text& product) {
   const Text status = AskForText(u"ValidationRequest", u"UserValidate",
                                  {{u"UserName", Encipher(session.userName)},
                                   {u"Password", Encipher(session.password)},
-                                  {u"ProductID", product},
-                                  {u"MGUID", session.mguid}},
+                                  {u"ProductID", Text(product)},
+                                  {u"MGUID", Text(session.mguid)}},
                                  0, u"UserAuthenticationStatus", u"FALSE");
   return LowerCase(status) == u"true";
 }
