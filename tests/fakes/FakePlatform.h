@@ -48,7 +48,7 @@ struct FakeHttp : HttpTransport {
     return answer;
   }
   std::int32_t LastFailure() const override { return failure; }
-  // Answered like a post.
+  // Answered like a post; status 0 stands for an answer that is cut after these bytes.
   std::optional<int> Get(const HttpGet& get, std::uint64_t most, const Sink& sink) override {
     HttpPost post;
     post.secure = true;
@@ -56,7 +56,8 @@ struct FakeHttp : HttpTransport {
     post.port = get.port;
     post.target = get.target;
     const auto answer = Post(post, static_cast<std::size_t>(most));
-    return answer && sink(answer->body) ? std::optional(answer->status) : std::nullopt;
+    if (!answer || !sink(answer->body) || answer->status == 0) return std::nullopt;
+    return answer->status;
   }
   // Takes the whole body at once, but for its last byte, and is answered like any post.
   std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source,

@@ -109,7 +109,11 @@ struct FakeStream : Stream {
     waiting.erase(0, count);
     return count;
   }
-  void Close() override { log.emplace_back("close"); }
+  int closed = 0;
+  void Close() override {
+    ++closed;
+    log.emplace_back("close");
+  }
 };
 
 struct FakeSocket : FakeStream<StreamSocket> {
@@ -126,7 +130,9 @@ struct FakeSocket : FakeStream<StreamSocket> {
 
 struct FakeSecureFetch : FakeStream<SecureFetch> {
   using FakeStream::FakeStream;
+  std::string headers;
   void Begin(const HttpGet& get) override {
+    headers = get.headers;
     log.push_back("fetch " + Utf8FromText(get.host) + ":" + std::to_string(get.port) + get.target);
   }
 };

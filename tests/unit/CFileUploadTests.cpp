@@ -49,9 +49,29 @@ TEST_F(CFileUploadTest, ServerName) {
   ASSERT_EQ(fake.http.sent.size(), 1U);
   EXPECT_EQ(fake.http.sent[0].host, u"second");
   // Nothing is sent to a name that would break the request.
-  for (const TextView name : {u"", u"h\r\nX: y", u"h:0", u"http://h"})
+  for (const TextView name : {u"", u"h\r\nX: y", u"h:0", u"http://h", u"https://", u"https://u@h",
+                              u"https://h:0", u"https://h/p", u"https://h\r\nX: y"}) {
     EXPECT_FALSE(client.ConnectToServer(name));
+    EXPECT_EQ(client.GetUserBasePath(), name.empty() ? u"http://" : u"") << Utf8FromText(name);
+  }
   EXPECT_EQ(fake.http.sent.size(), 1U);
+}
+
+TEST_F(CFileUploadTest, EverythingOfASecureSessionGoesOverTls) {
+  for (const auto& [name, port] : {std::pair(u"https://h", 443), std::pair(u"HTTPS://h:8443", 8443)}) {
+    fake.http.sent.clear();
+    client.ConnectToServer(name);
+    ASSERT_TRUE(Logon(u"u"));
+    for (const char* body : {"AddUser=1001&BasePath=b&UserFolder=f&Password=p&MGUID=m",
+                             "UserAuthenticationStatus=TRUE", "ErrorNumber=0", "SendMail=1001"})
+      Answer(body);
+    EXPECT_EQ(client.AddUser(u"7", u"a@b.c", u"{g}"), u"m");
+    EXPECT_EQ(Requests(),
+              "EstablishConnection ValidationRequest UserKeyRequest ValidationRequest "
+              "CreateFolderAcceptor.asp EmailKeyRequest");
+    for (const FakeHttp::Sent& sent : fake.http.sent)
+      EXPECT_TRUE(sent.secure && sent.host == u"h" && sent.port == port) << sent.target;
+  }
 }
 
 TEST_F(CFileUploadTest, EveryFalseLogonRestoresTheUser) {
@@ -302,6 +322,63 @@ TEST_F(CFileUploadTest, FtpSessionThatDoesNotOpen) {
   }
   EXPECT_EQ(fake.internet.calls,
             (Calls{u"open FileUploadClient", u"connect h|21|u|pw", u"cd ", u"QUIT", u"close"}));
+}
+
+// FTP would send the password in clear.
+TEST_F(CFileUploadTest, SecureSessionFetchesFilesWithoutFtp) {
+  ASSERT_TRUE(Logon(u"u"));
+  ASSERT_TRUE(OpenSession());
+  fake.internet.calls.clear();
+  client.SetHTTPServer(u"https://h");
+  EXPECT_EQ(client.DownloadFile(u"a", u"b"), u"") << "over the connection that is open still";
+  EXPECT_EQ(fake.internet.calls, Calls());
+  Answer(kRefused);
+  EXPECT_FALSE(client.OpenSession());
+  EXPECT_EQ(client.DownloadFile(u"a", u"b"), u"");
+  Answer(kLoggedOn);
+  Answer("PathFromRoot=%5Cusers%5Ca b");
+  EXPECT_TRUE(client.OpenSession());
+  EXPECT_EQ(Requests(), "ValidationRequest PathFromRoot ValidationRequest ValidationRequest PathFromRoot");
+  EXPECT_EQ(fake.http.sent[3].body, fake.http.sent[0].body) << "the user and the product of the session";
+
+  const struct {
+    const char16_t* name;
+    HttpAnswer answer;    // status 0: cut
+    const char* fetched;  // nothing when it is empty
+    std::size_t room = SIZE_MAX;
+  } rows[] = {
+      {u"a.jpg", {200, "new"}, "a.jpg"},
+      {u"my \u00e9&#%.jpg", {200, "new"}, "my%20%C3%A9%26%23%25.jpg"},
+      {u"a.jpg", {404, "none"}, "a.jpg"},
+      {u"a.jpg", {0, "ne"}, "a.jpg"},
+      {u"a.jpg", {200, "new"}, "a.jpg", 2},
+      {u"", {200, "new"}, ""},
+      {u"..", {200, "new"}, ""},
+      {u"x/a.jpg", {200, "new"}, ""},
+      {u"x\\a.jpg", {200, "new"}, ""},
+  };
+  for (const auto& row : rows) {
+    SCOPED_TRACE(Utf8FromText(row.name) + " " + std::to_string(row.answer.status));
+    fake.files.files = {{u"C:\\b", {3, 0, "old"}}};
+    fake.files.mostWritten = row.room;
+    fake.http.sent.clear();
+    fake.http.answers = {row.answer};
+    const bool whole = *row.fetched != '\0' && row.answer.status == 200 && row.room > 2;
+    EXPECT_EQ(client.DownloadFile(row.name, u"C:\\b"), whole ? u"C:\\b" : u"");
+    EXPECT_EQ(fake.files.At(u"C:\\b").bytes, whole ? "new" : "old");
+    EXPECT_EQ(fake.files.writers, 0);
+    ASSERT_EQ(fake.http.sent.size(), *row.fetched != '\0' ? 1U : 0U);
+    for (const FakeHttp::Sent& sent : fake.http.sent) {
+      EXPECT_EQ(sent.target, std::string("/users/a%20b/") + row.fetched);
+      EXPECT_TRUE(sent.host == u"h" && sent.port == 443);
+    }
+  }
+  client.DisconnectFromServer();
+  fake.http.sent.clear();
+  EXPECT_EQ(client.DownloadFile(u"a.jpg", u"C:\\b"), u"");
+  EXPECT_TRUE(fake.http.sent.empty());
+  // The one that was open before has been closed, and there was no other.
+  EXPECT_EQ(fake.internet.calls, (Calls{u"QUIT", u"close"}));
 }
 
 TEST_F(CFileUploadTest, FtpProxy) {

@@ -34,7 +34,9 @@ struct Host : DownloadEvents {
   void Finished(bool written) override { Tell(written ? "finished" : "finished without a file"); }
   bool IsWanted() const override { return wanted; }
   bool wanted = true;
-  void Failed(std::int32_t ftpError, TextView, bool told) override {
+  std::string reason;
+  void Failed(std::int32_t ftpError, TextView text, bool told) override {
+    reason = Utf8FromText(text);
     Tell("failed " + std::to_string(ftpError) + (told ? " told" : ""));
   }
 };
@@ -141,8 +143,9 @@ TEST_F(DriverTest, LooksAtEachByteOfTheHeaderOnce) {
 }
 
 TEST_F(DriverTest, FailsAsALostConnectionDoes) {
-  for (const TextView bad : {u"http://h/a\r\nb.jpg", u"http://h/CON.jpg", u"http://h/", u"h",
-                             u"http://h:0/a.jpg", u"http://h/a%.", u"/a.jpg", u"http://h/a:b"}) {
+  for (const TextView bad :
+       {u"http://h/a\r\nb.jpg", u"http://h/CON.jpg", u"http://h/", u"h", u"http://h:0/a.jpg", u"http://h/a%.",
+        u"/a.jpg", u"http://h/a:b", u"https://h/a.jpg"}) {
     Start(kTarget, bad);
     EXPECT_EQ(log, (Transcript{"close", "failed 45 told"})) << Utf8FromText(bad);
   }
@@ -170,6 +173,62 @@ TEST_F(DriverTest, FailsAsALostConnectionDoes) {
   EXPECT_TRUE(log.back().starts_with("received"));
   socket.Arrives(piece);
   EXPECT_EQ(log.back(), "failed 45 told");
+}
+
+// Only what is asked of the network differs.
+TEST_F(DriverTest, TellsADownloadOverTlsAsAnyOther) {
+  fake.apartment.session.serverName = u"https://h";
+  // The system's settings count instead.
+  fake.apartment.proxy = {u"proxy", u"3128", u""};
+  Start(kTarget, u"https://h/users/a@b/my \u00e9.jpg");
+  secureFetch.events->OnConnected();
+  secureFetch.Arrives("HTTP/1.1 200 OK\r\n\r\nab");
+  watchdog.runs = 0;
+  secureFetch.events->OnSent();
+  EXPECT_EQ(watchdog.runs, kWatchdogMs);
+  secureFetch.Arrives("c");
+  secureFetch.events->OnClosedByPeer();
+  EXPECT_EQ(log, (Transcript{"fetch h:443/users/a@b/my%20%C3%A9.jpg", "resolving", "connected", "starting",
+                             "received 21", "reply HTTP/1.1 200 OK 2", "received 3", "close", "finished"}));
+  EXPECT_EQ(secureFetch.headers, kDownloadHeaders);
+  EXPECT_EQ(Saved(kTarget), "abc");
+
+  // An address in the clear goes nowhere.
+  EXPECT_FALSE(downloader->CanStart(kUrl));
+  Start();
+  EXPECT_EQ(log, (Transcript{"close", "failed 45 told"}));
+  EXPECT_EQ(host.reason, "The file's address is not a secure one, as this session needs it.");
+
+  const TextView url = u"HTTPS://h:8443/a.jpg";
+  const struct {
+    std::int32_t error;
+    const char* event;
+    const char* reason;  // a part of it
+  } rows[] = {
+      {http_error::kTimeout, "failed 58 told", "silent"},
+      {http_error::kNameNotResolved, "failed 9 told", "name was not found"},
+      {http_error::kCannotConnect, "failed 6 told", "refused"},
+      {http_error::kConnectionLost, "failed 5 told", "in the middle"},
+      {http_error::kCertificateDate, "failed 5 told", "expired"},
+      {http_error::kCertificateName, "failed 5 told", "another name"},
+      {http_error::kUnknownAuthority, "failed 5 told", "an authority"},
+      {http_error::kSecureChannel, "failed 5 told", "no secure connection"},
+  };
+  for (const auto& row : rows) {
+    Start(kTarget, url);
+    EXPECT_EQ(log.at(0), "fetch h:8443/a.jpg");
+    secureFetch.events->OnSocketError(row.error);
+    EXPECT_EQ(log.back(), row.event) << row.reason;
+    EXPECT_NE(host.reason.find(row.reason), std::string::npos) << host.reason;
+  }
+  Start(kTarget, url);
+  secureFetch.events->OnConnected();
+  secureFetch.closed = 0;
+  downloader->Cancel();
+  EXPECT_EQ(secureFetch.closed, 1);
+  EXPECT_EQ(watchdog.runs, 0U);
+  downloader.reset();
+  EXPECT_EQ(secureFetch.events, nullptr);
 }
 
 // More than is kept in memory: it is written as it comes, and in the end it is there whole or not at all.
