@@ -16,17 +16,20 @@ certificates() {
   openssl req -x509 -newkey ec -pkeyopt ec_paramgen_curve:P-256 -nodes -subj "/CN=Tarnwick tests $(date +%s)" -days 2 \
     -keyout "$1/authority.key" -out "$1/authority.pem"
   # An address stands among the names too, where Wine looks for it.
-  certificate "$1" good 2 "IP:$2,DNS:$2"
+  certificate "$1" good 2 "IP:$2,DNS:$2,IP:::1,DNS:[::1]"
   certificate "$1" expired -1 "IP:$2,DNS:$2"
   certificate "$1" wrong-name 2 "DNS:pictures.example.org"
 }
 
 # start_tls_servers FOLDER ADDRESS OPTION...: starts them with the certificates in FOLDER, the one with faults with the
-# options. Their variables for programs under Wine are left in `tls_environment`; who trusts the authority of FOLDER
-# trusts all but TARNWICK_TLS_UNKNOWN.
+# options; `hosting_server` names one in the clear. Their variables for programs under Wine are left in
+# `tls_environment`; who trusts the authority of FOLDER trusts all but TARNWICK_TLS_UNKNOWN.
 start_tls_servers() {
-  local folder=$1 address=$2 variable kind own options
+  local folder=$1 address=$2 clear=$hosting_server variable kind own options listing users
   shift 2
+  users=users/${hosting_user/example.org/example-org}
+  listing="EstablishConnection=TRUE&UserAuthenticationStatus=TRUE"
+  listing+="&FileName=coffee.jpg&FileURL=http://$clear/$users/coffee.jpg&FileSize=1&FileDate=d"
   tls_environment=()
   for variable in SERVER EXPIRED WRONG_NAME UNKNOWN STALL FAULTY; do
     kind=${variable,,} own=good options=()
@@ -39,5 +42,20 @@ start_tls_servers() {
     [[ $variable != UNKNOWN ]] || options=(--tls-self-signed)
     start_hosting "hosting server with TLS, $kind" "$address" "$folder/$kind" "${options[@]}" || return 1
     tls_environment+=("TARNWICK_TLS_$variable=$hosting_server")
+    [[ $variable != SERVER ]] || kind=rose
+    listing+="&FileName=$kind.jpg&FileURL=$hosting_server/$users/$kind.jpg&FileSize=1&FileDate=d"
   done
+  # One whose listing leads to all of them, and one that speaks no version of TLS that is safe.
+  for variable in LISTING:TLSv1_2 OLD:TLSv1_1; do
+    start_server "service with ${variable#*:}" '^listening on ' tests/windows/network.py answer "$address" "${variable#*:}" \
+      "$folder/good.pem" "$folder/good.key" "$listing" || return 1
+    tls_environment+=("TARNWICK_TLS_${variable%:*}=https://${server_line#listening on }")
+  done
+  # Of every machine with IPv6.
+  grep -qs '^0*1 ' /proc/net/if_inet6 || return 0
+  start_hosting "hosting server with IPv6" "[::1]" "$folder/ipv6" || return 1
+  tls_environment+=("TARNWICK_IPV6=$hosting_server")
+  start_hosting "hosting server with TLS and IPv6" "[::1]" "$folder/tls-ipv6" --tls-certificate "$folder/good.pem" \
+    --tls-key "$folder/good.key" || return 1
+  tls_environment+=("TARNWICK_TLS_IPV6=$hosting_server")
 }

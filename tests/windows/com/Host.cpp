@@ -9,9 +9,9 @@
 namespace tarnwick::test {
 namespace {
 
-std::wstring Variable(const wchar_t* name) {
-  wchar_t value[256] = L"";
-  if (GetEnvironmentVariableW(name, value, 256) == 0) {
+std::wstring Needed(const wchar_t* name) {
+  std::wstring value = Variable(name);
+  if (value.empty()) {
     std::fprintf(stderr, "%ls is not set: these tests are started by scripts/test\n", name);
     ExitProcess(2);
   }
@@ -34,10 +34,16 @@ class NothingIsLeft : public testing::EmptyTestEventListener {
 
 }  // namespace
 
+std::wstring Variable(const wchar_t* name) {
+  wchar_t value[256] = L"";
+  GetEnvironmentVariableW(name, value, 256);
+  return value;
+}
+
 const Server& TheServer() {
-  static const Server server = {Variable(L"TARNWICK_SERVER"), Variable(L"TARNWICK_FAULTY_SERVER"),
-                                Variable(L"TARNWICK_USER"), Variable(L"TARNWICK_PASSWORD"),
-                                Variable(L"TARNWICK_PRODUCT")};
+  static const Server server = {Needed(L"TARNWICK_SERVER"), Needed(L"TARNWICK_FAULTY_SERVER"),
+                                Needed(L"TARNWICK_USER"), Needed(L"TARNWICK_PASSWORD"),
+                                Needed(L"TARNWICK_PRODUCT")};
   return server;
 }
 

@@ -13,6 +13,9 @@
 
 namespace tarnwick::test {
 
+// An environment variable; empty when it is not set.
+std::wstring Variable(const wchar_t* name);
+
 // Named by environment variables, which scripts/test sets.
 struct Server {
   // TARNWICK_SERVER, "host:port" with an FTP server on port 21 of the host, or the same behind "https://".
