@@ -27,7 +27,7 @@ var own = {
   Add: function (item, key) { this.items.push(item.FileName + "|" + key); }
 };
 check("ListFilesForUser, an object of the script", client.ListFilesForUser(own), true);
-check("with keys", own.items[0].indexOf("|http://" + server + "/users/") > 0, true);
+check("with keys", own.items[0].indexOf("|" + (/^https:/.test(server) ? "" : "http://") + server + "/users/") > 0, true);
 check("an object without Add", client.ListFilesForUser({}), false);
 check("null, whose result is lost", client.ListFilesForUser(null), true);
 

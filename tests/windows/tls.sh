@@ -1,4 +1,5 @@
-# Servers for tests over TLS, whose certificates are good, or bad in one way each. Sourced, never run.
+# Servers for tests over TLS, whose certificates are good, or bad in one way each, and what the network shows of TLS.
+# Sourced, never run.
 
 # certificate FOLDER NAME DAYS NAMES: FOLDER/NAME.pem with FOLDER/NAME.key, signed by FOLDER/authority.
 certificate() {
@@ -23,7 +24,8 @@ certificates() {
 
 # start_tls_servers FOLDER ADDRESS OPTION...: starts them with the certificates in FOLDER, the one with faults with the
 # options; `hosting_server` names one in the clear. Their variables for programs under Wine are left in
-# `tls_environment`; who trusts the authority of FOLDER trusts all but TARNWICK_TLS_UNKNOWN.
+# `tls_environment`, and the one without faults in `secure_server`; who trusts the authority of FOLDER trusts all but
+# TARNWICK_TLS_UNKNOWN.
 start_tls_servers() {
   local folder=$1 address=$2 clear=$hosting_server variable kind own options listing users
   shift 2
@@ -31,18 +33,18 @@ start_tls_servers() {
   listing="EstablishConnection=TRUE&UserAuthenticationStatus=TRUE"
   listing+="&FileName=coffee.jpg&FileURL=http://$clear/$users/coffee.jpg&FileSize=1&FileDate=d"
   tls_environment=()
-  for variable in SERVER EXPIRED WRONG_NAME UNKNOWN STALL FAULTY; do
+  for variable in SERVER EXPIRED WRONG_NAME UNKNOWN STALL FAULTY_SERVER; do
     kind=${variable,,} own=good options=()
     case $variable in
       EXPIRED | WRONG_NAME) own=${kind/_/-} ;;
       STALL) options=(--fault '*=stall:handshake') ;;
-      FAULTY) options=("$@") ;;
+      FAULTY_SERVER) options=("$@") ;;
     esac
     options+=(--tls-certificate "$folder/$own.pem" --tls-key "$folder/$own.key")
     [[ $variable != UNKNOWN ]] || options=(--tls-self-signed)
     start_hosting "hosting server with TLS, $kind" "$address" "$folder/$kind" "${options[@]}" || return 1
     tls_environment+=("TARNWICK_TLS_$variable=$hosting_server")
-    [[ $variable != SERVER ]] || kind=rose
+    if [[ $variable == SERVER ]]; then kind=rose secure_server=$hosting_server; fi
     listing+="&FileName=$kind.jpg&FileURL=$hosting_server/$users/$kind.jpg&FileSize=1&FileDate=d"
   done
   # One whose listing leads to all of them, and one that speaks no version of TLS that is safe.
@@ -59,3 +61,37 @@ start_tls_servers() {
     --tls-key "$folder/good.key" || return 1
   tls_environment+=("TARNWICK_TLS_IPV6=$hosting_server")
 }
+
+# over_tls ARCH PROGRAM ARGUMENT...: the same as wine_run, with the servers over TLS in place of the others.
+over_tls() {
+  wine_environment+=("${tls_environment[@]/#TARNWICK_TLS_/TARNWICK_}" "TARNWICK_SLOW=")
+  wine_run "$@"
+}
+
+# record ARCH SERVER FILE: uses the account at the server, and keeps what the network carries meanwhile.
+record() {
+  local name=${2#https://}
+  start_server "relay to $name" '^listening on ' tests/windows/network.py relay "${name%:*}" "$name" "$3"
+  wine_environment+=("TARNWICK_SERVER=${2%"$name"}${server_line#listening on }")
+  wine_run "$1" "build/windows-$1/tests/windows/com/tarnwick_com_tests.exe" \
+    --gtest_filter='AnyControl/0.Uploads*:ThumbNailControl.ShowsPages*'
+}
+
+# wire ARCH: the network shows nothing of a session over TLS that it shows of one in the clear.
+wire() (
+  clear=build/wire-$1-clear secure=build/wire-$1-secure
+  started=()
+  trap 'stop_servers "${#started[@]}"' EXIT
+  record "$1" "$hosting_server" "$clear"
+  record "$1" "$secure_server" "$secure"
+  secrets=("$hosting_user" "$hosting_password" rose.jpg @demo/pictures/rose.jpg)
+  # As the log-on sends them.
+  for field in UserName Password; do
+    secrets+=("$(grep -a -o -m 1 "$field=[^&]*" "$clear" | sed 's/.*=//')")
+  done
+  [[ $(tests/windows/network.py found "$clear" "${secrets[@]}") == $(printf '%s\n' "${secrets[@]}") ]]
+  tests/windows/network.py found "$secure" "${secrets[@]}" | tee "$secure-shows"
+  [[ ! -s $secure-shows ]]
+  # All of it went that way.
+  (($(stat -c %s "$secure") > $(stat -c %s "$clear")))
+)

@@ -5,7 +5,7 @@
 namespace tarnwick::test {
 namespace {
 
-TEST(Client, FetchesOverFtp) {
+TEST(Client, FetchesFilesInASession) {
   const ComPtr<_CFileUpload> client = LoggedOnClient();
   const Bstr local(L"fetched.bin");
   Bstr result;
