@@ -313,13 +313,24 @@ TEST_F(ThumbNailTest, FetchesACopyOfAnotherLengthOnceInAListing) {
 TEST_F(ThumbNailTest, PagingReplacesTheFill) {
   ListNumbers(9);
   for (int i = 1; i <= 9; ++i) fake.files.files.erase(CopyOf(std::to_string(i) + ".gif"));
-  // The second picture is on its way when the user pages on; the third is never asked for.
-  downloader.waits = {Arrival(), [this](FakeDownloader&) { Scroll(6); }, Arrival(), Arrival(), Arrival()};
-  control.ChangeFileFilter(u"*");
+  // The second picture of a page is on its way when the user chooses one and turns the wheel twice: what was
+  // in between is never asked for.
+  downloader.waits = {Arrival(),
+                      [this](FakeDownloader&) {
+                        EXPECT_TRUE(page.scrolls);
+                        control.OnSlotPressed(1, false);
+                        EXPECT_EQ(page.Look(), "3.gif* Downloading 4.gif! ! ! ");
+                        Scroll(4);
+                        Scroll(6);
+                      },
+                      Arrival(), Arrival(), Arrival()};
+  Scroll(2);
   EXPECT_EQ(page.Look(), "7.gif* 8.gif 9.gif ");
   EXPECT_EQ(page.value, 6);
-  EXPECT_EQ(Events(), "1234 1,9999 11,9999 11,9999 11,9999 11,1234 -1,");
-  EXPECT_FALSE(HasCopy("2.gif") || HasCopy("3.gif"));
+  EXPECT_EQ(Events(),
+            "1234 1,9999 11,1022 ,1015 " + AddressOf("3.gif") + ",9999 11,9999 11,9999 11,1234 -1,");
+  EXPECT_FALSE(HasCopy("4.gif") || HasCopy("5.gif"));
+  EXPECT_TRUE(page.scrolls);
   // So does filtering in the event that tells that it begins.
   log.clear();
   OnEvent("1234 1", [this] { control.ChangeFileFilter(u"none"); });

@@ -270,14 +270,15 @@ void ctrlThumbNailView::TransferEnded() {
 }
 
 void ctrlThumbNailView::OnScrollChanged(int value) {
+  // The bar stays enabled: while the page waits for its pictures, the user may go on to another one.
   ResultAsItStood(0, [&](int&) {
-    page_.EnableScroll(false);
     scrolledBack_ = value < previousScroll_;
     previousScroll_ = value;
     if (value < static_cast<int>(listing_.shown.Count())) {
       ShowPage(value);
       UpdateSelection();
     }
+    // Another control may have changed the number of pictures meanwhile.
     page_.EnableScroll(listing_.shown.Count() > kSlotCount);
   });
 }

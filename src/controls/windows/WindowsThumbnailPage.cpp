@@ -393,10 +393,15 @@ std::optional<LRESULT> WindowsThumbnailPage::OnOuterMessage(UINT message, WPARAM
       if (content_ != Content::kGrid || !scrollBar_.IsEnabled()) return std::nullopt;
       scrollBar_.OnWheel(GET_WHEEL_DELTA_WPARAM(wParam), *user_);
       return 0;
-    case WM_VSCROLL:
+    case WM_VSCROLL: {
       if (sender != scrollWindow_) return std::nullopt;
-      scrollBar_.OnScroll(LOWORD(wParam), HIWORD(wParam), *user_);
+      const int code = LOWORD(wParam);
+      scrollBar_.OnScroll(code, HIWORD(wParam), *user_);
+      // A pressed bar moves on until its own loop hears that the button is up. A page that was filled in
+      // between may have taken that message.
+      if (code < SB_THUMBPOSITION && GetCapture() == sender && GetKeyState(VK_LBUTTON) >= 0) ReleaseCapture();
       return 0;
+    }
     case WM_COMMAND:
       if (HIWORD(wParam) != BN_CLICKED) return std::nullopt;
       if (sender == linkWindow_)

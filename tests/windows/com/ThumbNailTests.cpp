@@ -165,6 +165,66 @@ TEST(ThumbNailControl, TellsWhatTheUserDoes) {
   EXPECT_EQ(slot, 3);
 }
 
+// What is done as soon as a slot waits for a picture, one after the other.
+struct Step {
+  int slot;
+  std::wstring awaited;
+  std::function<void()> action;
+};
+std::function<void()> onTick;
+void CALLBACK Tick(HWND, UINT, UINT_PTR, DWORD) {
+  onTick();
+}
+
+TEST(ThumbNailControl, IsLeftWhileItsServerIsSilent) {
+  RemoveCopies();
+  ThumbForm form;
+  form.LogOn(TheServer().faulty);
+  form.Show();
+  const auto post = [](HWND window, UINT message, WPARAM wParam, int x = 0, int y = 0) {
+    PostMessageW(window, message, wParam, MAKELPARAM(x, y));
+  };
+  const auto pressBar = [&](int y) {
+    post(form.ScrollBar(), WM_LBUTTONDOWN, MK_LBUTTON, 5, y);
+    post(form.ScrollBar(), WM_LBUTTONUP, 0, 5, y);
+  };
+  const std::wstring stalled = L"Downloading stall.jpg";
+  std::wstring chosen;
+  std::vector<Step> steps = {
+      {2, stalled,
+       [&] {
+         EXPECT_TRUE(IsWindowEnabled(form.ScrollBar()));
+         SendMessageW(form.Slot(1), WM_LBUTTONDOWN, MK_LBUTTON, MAKELPARAM(5, 5));
+         SendMessageW(form.Slot(1), WM_LBUTTONUP, 0, MAKELPARAM(5, 5));
+         chosen = Told(form.control.Get(), L"GetSelectedFilesHttpPath");
+         pressBar(3);
+       }},
+      {4, stalled, [&] { pressBar(330); }},
+      {2, stalled, [&] { post(form.Grid(), WM_MOUSEWHEEL, MAKEWPARAM(0, 2 * WHEEL_DELTA)); }},
+  };
+  auto next = steps.begin();
+  onTick = [&] {
+    if (next == steps.end() || TextOf(form.Slot(next->slot)) != next->awaited) return;
+    const auto action = next++->action;
+    action();
+  };
+  EXPECT_TRUE(form.Init(L"jpg"));
+  form.events.clear();
+  SetTimer(form.frame, 1, 50, Tick);
+  const ULONGLONG begin = GetTickCount64();
+  Scroll(form, SB_BOTTOM);
+  EXPECT_LT(GetTickCount64() - begin, 20'000U);
+  KillTimer(form.frame, 1);
+  EXPECT_EQ(next - steps.begin(), std::ssize(steps));
+  EXPECT_EQ(form.Captions(),
+            (Lines{L"reset-body.jpg", L"reset-head.jpg", L"reset-request.jpg", L"rocket.jpg"}));
+  // 5555 is of the pictures whose connection was reset.
+  form.events.erase(std::remove(form.events.begin(), form.events.end(), L"5555 "), form.events.end());
+  EXPECT_EQ(form.events, (Lines{L"1234 1", L"1022 ", L"1015 " + chosen, L"1234 -1"}));
+  EXPECT_TRUE(chosen.ends_with(L"/rose.jpg"));
+  RemoveCopies();
+}
+
 // The page is filled in a message, or in a late-bound call; in both nothing but the library itself holds the
 // control when its host let go of it.
 TEST(ThumbNailControl, MayEndInAnEventOfAPageThatIsFilled) {
