@@ -24,6 +24,7 @@ struct FakeThumbnailPage : ThumbnailPage {
   bool grid = false;
   std::string message;
   std::string link;
+  std::string gridText;
   bool scrolls = false;
   int max = 0;
   int value = 0;
@@ -34,7 +35,7 @@ struct FakeThumbnailPage : ThumbnailPage {
   // The captions of the visible slots; "*" marks the selected one, "!" one without a picture.
   std::string Look() const {
     if (!grid) return message + "/" + link;
-    std::string look;
+    std::string look = gridText;
     for (const Slot& slot : slots)
       if (slot.shown) look += slot.caption + (slot.selected ? "*" : "") + (slot.picture.empty() ? "! " : " ");
     return look;
@@ -48,6 +49,7 @@ struct FakeThumbnailPage : ThumbnailPage {
     message = Utf8FromText(itsMessage);
     link = Utf8FromText(itsLink);
   }
+  void SetGridText(TextView text) override { gridText = Utf8FromText(text); }
   void ShowSlot(int slot, bool shown) override { At(slot).shown = shown; }
   void ClearSlot(int slot) override {
     At(slot).caption.clear();

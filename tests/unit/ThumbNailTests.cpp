@@ -17,6 +17,7 @@ class ThumbNailTest : public ControlTest {
     fake.strings.own[487] = u"Click";
     fake.strings.own[488] = u"here";
     fake.strings.own[489] = u"for it";
+    fake.strings.own[4001] = u"No such pictures.";
     fake.pump.onYield = nullptr;
   }
   bool HasCopy(const std::string& name) const { return fake.files.files.contains(CopyOf(name)); }
@@ -128,7 +129,7 @@ TEST_F(ThumbNailTest, PagingMovesTheSelection) {
   control.ChangeFileFilter(u"jpg");
   fake.apartment.listing.shown.Clear();
   control.OnScrollDragged(8);
-  EXPECT_EQ(page.Look(), "");
+  EXPECT_EQ(page.Look(), "No such pictures.");
   EXPECT_EQ(control.iImgNo, 0);
 }
 
@@ -162,6 +163,8 @@ TEST_F(ThumbNailTest, FiltersByTheEndOfTheName) {
     control.ChangeFileFilter(filter);
     EXPECT_EQ(Shown(), shown);
   }
+  EXPECT_EQ(page.Look(), "No such pictures.");
+  EXPECT_EQ(control.iImgNo, 0);
   EXPECT_TRUE(control.Init(u"jpg"));
   EXPECT_EQ(page.Look(), "b.jpg* e.Jpg ");
   EXPECT_EQ(fake.http.sent.size(), asked) << "the listing is fetched once";

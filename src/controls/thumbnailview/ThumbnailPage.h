@@ -27,6 +27,8 @@ class ThumbnailPage : public ControlView {
   virtual void ShowGrid(bool grid) = 0;
   // The texts of an empty account.
   virtual void SetEmptyTexts(TextView message, TextView link) = 0;
+  // What the grid says in place of pictures, where the message of an empty account stands; empty for nothing.
+  virtual void SetGridText(TextView text) = 0;
 
   // Frame and caption of a slot.
   virtual void ShowSlot(int slot, bool shown) = 0;

@@ -9,6 +9,7 @@
 #include "base/RuntimeError.h"
 #include "controls/FileNames.h"
 #include "platform/FileSystem.h"
+#include "platform/StringResources.h"
 #include "session/ResourceStrings.h"
 #include "session/UserFolder.h"
 #include "support/PathHelpers.h"
@@ -22,6 +23,7 @@ constexpr double kBoxLeft = 150;
 constexpr double kBoxTop = 180;
 
 constexpr std::uint16_t kNoImagesString = 3582;
+constexpr std::uint16_t kNoHitsString = 4001;
 constexpr std::uint16_t kLinkStrings[] = {487, 488, 489};
 
 constexpr std::size_t kCaptionLength = 20;
@@ -178,6 +180,8 @@ void ctrlThumbNailView::FillPage(int first) {
   if (!editedName_.empty() && AddressOf(editedSlot_) != edited) OnEditorLeft();
   // While the account is not listed, nobody knows whether it is empty.
   const bool empty = listing_.all.IsEmpty() && listing_.isLoaded;
+  const bool hasHits = empty || !listing_.isLoaded || !listing_.shown.IsEmpty();
+  page_.SetGridText(hasHits ? Text() : apartment_.platform.strings.OwnString(kNoHitsString));
   page_.ShowGrid(!empty);
   if (empty) {
     addresses_.fill({});

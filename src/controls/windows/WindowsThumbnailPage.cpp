@@ -195,6 +195,12 @@ void WindowsThumbnailPage::SetEmptyTexts(TextView message, TextView link) {
   ApplyTexts();
 }
 
+void WindowsThumbnailPage::SetGridText(TextView text) {
+  if (gridText_ == text) return;
+  gridText_ = text;
+  if (gridWindow_) InvalidateRect(gridWindow_, nullptr, FALSE);
+}
+
 void WindowsThumbnailPage::ApplyTexts() const {
   if (!linkWindow_) return;
   SetWindowTextW(messageWindow_, WideFromText(message_).c_str());
@@ -561,7 +567,11 @@ void WindowsThumbnailPage::PaintGrid(HWND window) const {
   const PaintingOwner painting = Paint(window);
   const HDC screen = painting.Get().paint.hdc;
   const int slot = SlotOf(window);
-  if (slot == 0) return Fill(screen, painting.Get().paint.rcPaint, BackColor());
+  if (slot == 0) {
+    Fill(screen, painting.Get().paint.rcPaint, BackColor());
+    const SelectionOwner font = SelectInto(screen, Font());
+    return DrawMessage(screen, Pixels(layout::kMessage), gridText_);
+  }
   RECT client = {};
   GetClientRect(window, &client);
   const MemoryDcOwner memory(CreateCompatibleDC(screen));
@@ -570,6 +580,12 @@ void WindowsThumbnailPage::PaintGrid(HWND window) const {
   DrawTile(memory.Get(), client, slots_[static_cast<std::size_t>(slot) - 1], Style(),
            GetFocus() == gridWindow_);
   BitBlt(screen, 0, 0, client.right, client.bottom, memory.Get(), 0, 0, SRCCOPY);
+}
+
+void WindowsThumbnailPage::DrawMessage(HDC dc, RECT area, TextView text) const {
+  SetTextColor(dc, TextColor());
+  SetBkMode(dc, TRANSPARENT);
+  DrawTextW(dc, WideFromText(text).c_str(), -1, &area, DT_CENTER | DT_WORDBREAK | DT_NOPREFIX);
 }
 
 void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
@@ -595,11 +611,10 @@ void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) {
   if (content_ == Content::kGrid) {
     for (std::size_t slot = 0; slot < kSlotCount; ++slot)
       if (slots_[slot].shown) DrawTile(dc, placed(kFrames[slot]), slots_[slot], Style(), false);
+    DrawMessage(dc, placed(layout::kMessage), gridText_);
     scrollBar_.Draw(dc, placed(layout::kScrollBar), Pixels(120));
   } else if (content_ == Content::kEmptyAccount) {
-    RECT message = placed(layout::kMessage);
-    SetTextColor(dc, TextColor());
-    DrawTextW(dc, WideFromText(message_).c_str(), -1, &message, DT_CENTER | DT_WORDBREAK | DT_NOPREFIX);
+    DrawMessage(dc, placed(layout::kMessage), message_);
     DrawLink(dc, placed(layout::kLink), false);
   }
   RECT button = placed(layout::kButton);

@@ -42,6 +42,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
 
   void ShowGrid(bool grid) override;
   void SetEmptyTexts(TextView message, TextView link) override;
+  void SetGridText(TextView text) override;
   void ShowSlot(int slot, bool shown) override;
   void ClearSlot(int slot) override;
   void SetCaption(int slot, TextView caption) override;
@@ -100,6 +101,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void RefreshGrid() const;
   void PaintGrid(HWND window) const;
   TileStyle Style() const { return {Dpi(), Font(), BackColor()}; }
+  void DrawMessage(HDC dc, RECT area, TextView text) const;
   void DrawLink(HDC dc, RECT area, bool focus) const;
   int Pixels(int twips) const { return layout::Pixels(twips, Dpi()); }
   RECT Pixels(const layout::TwipRect& area) const { return layout::Pixels(area, Dpi()); }
@@ -111,6 +113,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   Content content_ = Content::kNothing;
   Text message_;
   Text link_;
+  Text gridText_;
   PageScrollBar scrollBar_;
 
   HWND gridWindow_ = nullptr;

@@ -307,6 +307,21 @@ TEST_F(ThumbnailPageTest, DrawsPicturesSelectionAndCaptions) {
   page_->Draw(dc, size);
   EXPECT_EQ(pixel(1, 115, 1160), window);
   EXPECT_EQ(pixel(2, 1130, 1160), window);
+
+  // What the grid says in place of pictures, drawn and on the screen.
+  for (int slot = 1; slot <= kSlotCount; ++slot) page_->ShowSlot(slot, false);
+  page_->SetGridText(u"none");
+  page_->Draw(dc, size);
+  UpdateWindow(Grid());
+  const RECT message = layout::Pixels(layout::kMessage, SystemDpi());
+  const WindowDcOwner grid = DcOf(Grid());
+  for (const HDC shown : {dc, grid.Get().dc}) {
+    int inked = 0;
+    for (LONG x = message.left; x < message.right; ++x)
+      inked += GetPixel(shown, x, message.top + 8) != window ? 1 : 0;
+    EXPECT_GT(inked, 2);
+    EXPECT_LT(inked, 30);
+  }
   SelectObject(dc, old);
   DeleteDC(dc);
 }
