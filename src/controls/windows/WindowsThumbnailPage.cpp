@@ -28,22 +28,6 @@ constexpr COLORREF kLinkColor = RGB(0, 0, 255);
 
 constexpr UINT kLinkFormat = DT_CENTER | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
 
-// The painting of a window, from its beginning to its end.
-struct Painting {
-  HWND window;
-  PAINTSTRUCT paint;
-  bool operator==(const Painting& other) const { return window == other.window; }
-};
-void EndPainting(const Painting& held) {
-  EndPaint(held.window, &held.paint);
-}
-using PaintingOwner = Owner<Painting, EndPainting>;
-PaintingOwner Paint(HWND window) {
-  Painting begun = {window, {}};
-  BeginPaint(window, &begun.paint);
-  return PaintingOwner(begun);
-}
-
 }  // namespace
 
 WindowsThumbnailPage::WindowsThumbnailPage(HINSTANCE module, ControlWindowUser& control)

@@ -91,6 +91,22 @@ inline WindowDcOwner DcOf(HWND window) {
   return dc ? WindowDcOwner({window, dc}) : WindowDcOwner();
 }
 
+// The painting of a window, from its beginning to its end.
+struct Painting {
+  HWND window;
+  PAINTSTRUCT paint;
+  bool operator==(const Painting& other) const { return window == other.window; }
+};
+inline void EndPainting(const Painting& held) {
+  EndPaint(held.window, &held.paint);
+}
+using PaintingOwner = Owner<Painting, EndPainting>;
+[[nodiscard]] inline PaintingOwner Paint(HWND window) {
+  Painting begun = {window, {}};
+  BeginPaint(window, &begun.paint);
+  return PaintingOwner(begun);
+}
+
 // What was selected before, and is selected again at the end.
 struct Selection {
   HDC dc;
