@@ -57,6 +57,51 @@ class Kept {
   std::size_t length_ = 0;
 };
 
+// --- What cameras tell ---
+
+// The first directory of a TIFF file. What cameras tell of a picture is such a file, too.
+class TiffDirectory {
+ public:
+  explicit TiffDirectory(Bytes file) : file_(file) {
+    little_ = StartsWith(file, {"II*\0", 4});
+    if (!little_ && !StartsWith(file, {"MM\0*", 4})) return;
+    const Bytes count = Part(Number(Part(4, 4)), 2);
+    if (count.empty()) return;
+    const auto begin = static_cast<std::size_t>(count.data() - file.data()) + 2;
+    entries_ =
+        file.subspan(begin, std::min((file.size() - begin) / kEntry, std::size_t{Number(count)}) * kEntry);
+  }
+
+  // The first number of an entry; `otherwise` when there is none.
+  std::uint32_t First(std::uint32_t tag, std::uint32_t otherwise) const {
+    constexpr std::uint32_t kShort = 3;
+    for (std::size_t at = 0; at < entries_.size(); at += kEntry) {
+      if (Number(entries_.subspan(at, 2)) != tag) continue;
+      const bool isShort = Number(entries_.subspan(at + 2, 2)) == kShort;
+      return Number(entries_.subspan(at + 8, isShort ? 2 : 4));
+    }
+    return otherwise;
+  }
+
+ private:
+  static constexpr std::size_t kEntry = 12;
+
+  // Empty when the file has not that many bytes there.
+  Bytes Part(std::size_t at, std::size_t size) const {
+    return at <= file_.size() && size <= file_.size() - at ? file_.subspan(at, size) : Bytes();
+  }
+  std::uint32_t Number(Bytes bytes) const { return little_ ? LittleEndian(bytes) : BigEndian(bytes); }
+
+  Bytes file_;
+  bool little_ = false;
+  Bytes entries_;
+};
+
+unsigned Orientation(const TiffDirectory& directory) {
+  const std::uint32_t told = directory.First(0x0112, 1);
+  return told >= 1 && told <= 8 ? told : 1;
+}
+
 // --- PNG ---
 
 // The smallest pieces that programs write are of about 8 KiB, or of a line; this is more than either needs.
@@ -85,6 +130,7 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
   kept.Keep(0, kSignature);
   std::uint64_t packed = 0;
   int chunks = 0;
+  unsigned orientation = 1;
   for (std::size_t at = kSignature; file.size() - at >= kAround;) {
     const std::uint32_t length = BigEndian(file.subspan(at, 4));
     const Bytes name = file.subspan(at + 4, 4);
@@ -92,6 +138,7 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
     const bool last = StartsWith(name, "IEND");
     if (length > file.size() - at - kAround) return {};
     const std::size_t end = at + kAround + length;
+    if (StartsWith(name, "eXIf")) orientation = Orientation(TiffDirectory(file.subspan(at + 8, length)));
     if ((data && length > 0) || last || StartsWith(name, "IHDR") || StartsWith(name, "PLTE") ||
         StartsWith(name, "tRNS")) {
       kept.Keep(at, end);
@@ -104,6 +151,7 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
   // Packing adds next to nothing to what cannot be made smaller. More is blocks that unpack to nothing.
   if (chunks > kMostPngChunks || packed > unpacked + unpacked / 16 + 4096) return {};
   PictureFacts facts = Whole(PictureFormat::kPng, width, height);
+  facts.orientation = orientation;
   facts.length = kept.Length();
   return facts;
 }
@@ -235,6 +283,7 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
   int scans = 0;
   bool progressive = false;
   unsigned components = 0;
+  std::optional<unsigned> orientation;
   for (std::size_t at = 2;;) {
     // Up to the next marker: 0xFF, repeated at will, and its number.
     const auto* mark =
@@ -256,6 +305,9 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
     const std::size_t begin = at - 2;
     const Bytes data = file.subspan(at + 2, length - 2);
     at += length;
+    constexpr std::string_view kExif{"Exif\0\0", 6};
+    if (marker == 0xE1 && !orientation && StartsWith(data, kExif))
+      orientation = Orientation(TiffDirectory(data.subspan(kExif.size())));
     // All but the application's data and comments. Of those two tell how colours are meant.
     const bool jfif = marker == 0xE0;
     const bool adobe = marker == 0xEE;
@@ -295,6 +347,7 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
   if (!facts || scans == 0) return {};
   const std::uint64_t work = static_cast<std::uint64_t>(scans - 1) + kScanOfWork;
   if (std::uint64_t{facts->width} * facts->height * work > kMostPixels * kScanOfWork) return {};
+  facts->orientation = orientation.value_or(1);
   facts->length = kept.Length();
   return facts;
 }

@@ -31,11 +31,19 @@ struct PictureFacts {
   std::uint32_t top = 0;
   std::uint32_t frameWidth = 0;
   std::uint32_t frameHeight = 0;
+  // How the picture is to be seen, as Exif counts: 1 is as it lies in the file; the first line of 2 to 4 is
+  // at the top or bottom, of 5 to 8 at the left or right.
+  unsigned orientation = 1;
   // The first so many bytes are a file with all that makes the picture.
   std::size_t length = 0;
 
   bool operator==(const PictureFacts&) const = default;
 };
+
+// Whether the picture is seen with its sides exchanged.
+inline bool IsTurned(const PictureFacts& facts) {
+  return facts.orientation >= 5;
+}
 
 // Looks at a whole file and moves what makes the picture to its front. Empty when it is none of the four
 // formats or is refused. Each byte is looked at once at most.

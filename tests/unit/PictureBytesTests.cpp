@@ -112,6 +112,43 @@ TEST(PictureBytes, JpegKeepsWhatMakesThePixels) {
                                Times(16, Segment(0xDB, std::string(65'000, 'q'))) + all + kEoi));
 }
 
+// What a camera tells, with the orientation behind another entry. `type` is 3 for two bytes and 4 for four.
+std::string Directory(bool little, int type, std::uint32_t orientation) {
+  const auto number = [&](std::uint32_t value, int bytes) {
+    const std::string big = Big(value, bytes);
+    return little ? std::string(big.rbegin(), big.rend()) : big;
+  };
+  return (little ? "II" : "MM") + number(42, 2) + number(10, 4) + ".." + number(2, 2) + number(0x0100, 2) +
+         number(3, 2) + number(1, 4) + "...." + number(0x0112, 2) +
+         number(static_cast<std::uint32_t>(type), 2) + number(1, 4) +
+         (number(orientation, type == 3 ? 2 : 4) + "..").substr(0, 4);
+}
+
+TEST(PictureBytes, CamerasTellHowAPictureIsSeen) {
+  const auto orientation = [](std::string file) {
+    const auto facts = ReducePicture({reinterpret_cast<std::uint8_t*>(file.data()), file.size()});
+    return facts ? facts->orientation : 0;
+  };
+  const auto jpeg = [&](const std::string& segments) {
+    return orientation(kSoi + segments + Frame(kBaseline, 8, 8) + Segment(0xDA, "\x03......") + kEoi);
+  };
+  const auto exif = [](const std::string& directory) {
+    return Segment(0xE1, std::string("Exif\0\0", 6) + directory);
+  };
+  for (std::uint32_t told = 1; told <= 8; ++told) {
+    EXPECT_EQ(told, jpeg(exif(Directory(true, 3, told))));
+    EXPECT_EQ(told,
+              jpeg(Segment(0xE1, "http://") + exif(Directory(false, 4, told)) + exif(Directory(true, 3, 3))));
+  }
+  EXPECT_EQ(6U, orientation(
+                    Png(2, 2, 8, 6, false, Chunk("eXIf", Directory(false, 3, 6)) + Chunk("IDAT", "packed"))));
+  for (const std::uint32_t wrong : {0U, 9U, 0x60006U}) EXPECT_EQ(1U, jpeg(exif(Directory(true, 4, wrong))));
+  // Cut off anywhere before its last byte, it tells nothing.
+  const std::string whole = Directory(true, 4, 6);
+  for (std::size_t length = 0; length < whole.size(); ++length)
+    EXPECT_EQ(1U, jpeg(exif(whole.substr(0, length)))) << length;
+}
+
 TEST(PictureBytes, GifKeepsItsFirstPicture) {
   const auto gif = [](const std::string& blocks) {
     const std::string screen("\x04\0\x04\0\x80\0\0", 7);

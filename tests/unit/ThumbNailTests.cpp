@@ -201,12 +201,10 @@ TEST(ThumbNail, FitsPicturesIntoTheSquare) {
       {1, 1, {150, 180, 1965, 1965}},
       {1, 65535, {150, 1162.5, 1965, 0}},
   };
-  const auto tied = [](const PicturePlace& place) {
-    return std::tie(place.left, place.top, place.width, place.height);
-  };
   for (const auto& test : kCases) {
     const PicturePlace place = FitImage(test.height, test.width);
-    EXPECT_EQ(tied(place), tied(test.place));
+    EXPECT_EQ(place, test.place);
+    EXPECT_EQ(Turned(place), FitImage(test.width, test.height));
   }
   const auto numberOf = [](std::int32_t height, std::int32_t width) {
     try {

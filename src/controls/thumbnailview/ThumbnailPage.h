@@ -2,22 +2,13 @@
 // the editor over a caption and the button that switches to the list.
 #pragma once
 
-#include <cstdint>
-
 #include "base/Text.h"
 #include "controls/ControlView.h"
+#include "controls/thumbnailview/PicturePlace.h"
 
 namespace tarnwick {
 
 inline constexpr int kSlotCount = 4;
-
-// Where a picture stands in its slot's frame, in twips (1440 to an inch).
-struct PicturePlace {
-  double left = 0;
-  double top = 0;
-  std::int32_t width = 0;
-  std::int32_t height = 0;
-};
 
 // Slots count from 1: top left, top right, bottom left, bottom right. What the rules change through this
 // interface is not reported back to them: ThumbnailPageUser hears of what the user does.
@@ -36,9 +27,10 @@ class ThumbnailPage : public ControlView {
   virtual void ClearSlot(int slot) = 0;
   // "&&" stands for one "&", as in the caption of any label.
   virtual void SetCaption(int slot, TextView caption) = 0;
-  // Reads the file, and shows it at `place` as soon as it is decoded, which takes no time of the caller's.
-  // False when the file cannot be read. One that turns out to be no picture, or an absurdly large one, leaves
-  // the square empty, too, and ThumbnailPageUser hears of it.
+  // Reads the file, and shows it as soon as it is decoded, which takes no time of the caller's. `place` is
+  // that of the picture as it lies in the file; one that its file has turned stands as it is seen. False when
+  // the file cannot be read. One that turns out to be no picture, or an absurdly large one, leaves the square
+  // empty, too, and ThumbnailPageUser hears of it.
   virtual bool SetPicture(int slot, TextView path, const PicturePlace& place) = 0;
   // The look of the selected picture.
   virtual void SetSelected(int slot, bool selected) = 0;

@@ -3,7 +3,6 @@
 #include "controls/thumbnailview/ctrlThumbNailView.h"
 
 #include <algorithm>
-#include <limits>
 #include <utility>
 
 #include "base/RuntimeError.h"
@@ -17,38 +16,13 @@
 namespace tarnwick {
 namespace {
 
-// Twips.
-constexpr std::int32_t kBoxSide = 1965;
-constexpr double kBoxLeft = 150;
-constexpr double kBoxTop = 180;
-
 constexpr std::uint16_t kNoImagesString = 3582;
 constexpr std::uint16_t kNoHitsString = 4001;
 constexpr std::uint16_t kLinkStrings[] = {487, 488, 489};
 
 constexpr std::size_t kCaptionLength = 20;
 
-// side * kBoxSide / longer, rounded half to even.
-std::int32_t Scaled(std::int32_t side, std::int32_t longer) {
-  const std::int64_t product = std::int64_t{side} * kBoxSide;
-  if (product > std::numeric_limits<std::int32_t>::max()) throw RuntimeError(error::kOverflow);
-  if (longer == 0) throw RuntimeError(error::kDivisionByZero);
-  return RoundHalfToEven(static_cast<double>(product) / longer);
-}
-
 }  // namespace
-
-PicturePlace FitImage(std::int32_t height, std::int32_t width) {
-  PicturePlace place{kBoxLeft, kBoxTop, kBoxSide, kBoxSide};
-  if (height <= width) {
-    place.height = Scaled(height, width);
-    place.top += (kBoxSide - place.height) / 2.0;
-  } else {
-    place.width = Scaled(width, height);
-    place.left += (kBoxSide - place.width) / 2.0;
-  }
-  return place;
-}
 
 Text FormatLabelText(TextView name) {
   Text caption(name);

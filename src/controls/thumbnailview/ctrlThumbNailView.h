@@ -12,10 +12,6 @@
 
 namespace tarnwick {
 
-// Where a picture of that size in pixels stands in its slot: as large as the square of 1965 twips lets it be,
-// in the middle. Throws 11 for a side of 0 that it would have to divide by, 6 when the product is too large.
-PicturePlace FitImage(std::int32_t height, std::int32_t width);
-
 // The caption for a file's name: at most 20 characters, and "&&" for each "&".
 Text FormatLabelText(TextView name);
 

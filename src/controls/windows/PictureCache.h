@@ -8,23 +8,22 @@
 #include <memory>
 
 #include "controls/windows/PictureWorkers.h"
-#include "platform/windows/Owner.h"
 
 namespace tarnwick {
 
-using SharedBitmap = std::shared_ptr<const BitmapOwner>;
+using SharedPicture = std::shared_ptr<const ShownPicture>;
 
 class PictureCache {
  public:
   // Null when it is not there.
-  SharedBitmap Find(const PictureRequest& request);
+  SharedPicture Find(const PictureRequest& request);
   // Keeps a picture as long as there is room for it; what was not used for the longest time goes first.
-  void Keep(const PictureRequest& request, const SharedBitmap& picture);
+  void Keep(const PictureRequest& request, const SharedPicture& picture);
 
  private:
   struct Entry {
     PictureRequest request;
-    SharedBitmap picture;
+    SharedPicture picture;
   };
   // What was used last is in front. Some hundred entries at most, which are compared faster than drawn.
   std::list<Entry> entries_;

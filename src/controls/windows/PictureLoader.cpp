@@ -11,7 +11,6 @@
 #include <vector>
 
 #include "platform/windows/ComPtr.h"
-#include "support/PictureBytes.h"
 
 namespace tarnwick {
 namespace {
@@ -181,6 +180,23 @@ class Averager {
   std::uint32_t row_ = 0;
 };
 
+// Writes a picture of `size`, seen as `orientation` says, from its pixels as they lie in the file.
+void Turn(const std::vector<std::uint32_t>& stored, unsigned orientation, SIZE size, std::uint32_t* seen) {
+  const bool turned = orientation >= 5;
+  const LONG width = turned ? size.cy : size.cx;
+  const LONG height = turned ? size.cx : size.cy;
+  const bool fromRight = orientation == 2 || orientation == 3 || orientation == 7 || orientation == 8;
+  const bool fromBottom = orientation == 3 || orientation == 4 || orientation == 6 || orientation == 7;
+  for (LONG y = 0; y < size.cy; ++y)
+    for (LONG x = 0; x < size.cx; ++x) {
+      const LONG column = turned ? y : x;
+      const LONG line = turned ? x : y;
+      const LONG at =
+          (fromBottom ? height - 1 - line : line) * width + (fromRight ? width - 1 - column : column);
+      *seen++ = stored[static_cast<std::size_t>(at)];
+    }
+}
+
 const GUID& Container(PictureFormat format) {
   switch (format) {
     case PictureFormat::kPng:
@@ -328,9 +344,8 @@ PictureFile Read(const std::wstring& path) {
   return picture;
 }
 
-BitmapOwner Decode(const PictureFile& file, int width, int height, COLORREF background,
+BitmapOwner Decode(const PictureFile& file, const TargetSize& targetSize, COLORREF background,
                    const std::function<bool()>& isWanted) {
-  if (width <= 0 || height <= 0 || width > kLongestTargetSide || height > kLongestTargetSide) return {};
   if (!file || !isWanted()) return {};
   const std::span bytes(file.bytes.get(), file.size);
   const std::optional<PictureFacts> facts = ReducePicture(bytes);
@@ -344,19 +359,27 @@ BitmapOwner Decode(const PictureFile& file, int width, int height, COLORREF back
   const std::optional<Source> source = OpenSource(*factory, stream, *facts);
   if (!source) return {};
 
+  const SIZE size = targetSize(*facts);
+  if (size.cx <= 0 || size.cy <= 0 || size.cx > kLongestTargetSide || size.cy > kLongestTargetSide) return {};
   BITMAPINFO info = {};
   info.bmiHeader.biSize = sizeof info.bmiHeader;
-  info.bmiHeader.biWidth = width;
-  info.bmiHeader.biHeight = -height;
+  info.bmiHeader.biWidth = size.cx;
+  info.bmiHeader.biHeight = -size.cy;
   info.bmiHeader.biPlanes = 1;
   info.bmiHeader.biBitCount = 32;
   void* pixels = nullptr;
   BitmapOwner bitmap(CreateDIBSection(nullptr, &info, DIB_RGB_COLORS, &pixels, nullptr, 0));
   if (!bitmap || !pixels) return {};
-  Averager averager(facts->width, facts->height, static_cast<std::uint32_t>(width),
-                    static_cast<std::uint32_t>(height), source->layout, background,
-                    static_cast<std::uint32_t*>(pixels));
+  const auto width = static_cast<std::uint32_t>(IsTurned(*facts) ? size.cy : size.cx);
+  const auto height = static_cast<std::uint32_t>(IsTurned(*facts) ? size.cx : size.cy);
+  // Turned when it is small.
+  std::vector<std::uint32_t> stored;
+  if (facts->orientation != 1) stored.resize(std::size_t{width} * height);
+  auto* seen = static_cast<std::uint32_t*>(pixels);
+  Averager averager(facts->width, facts->height, width, height, source->layout, background,
+                    stored.empty() ? seen : stored.data());
   if (!AddLines(*source, *facts, averager)) return {};
+  if (!stored.empty()) Turn(stored, facts->orientation, size, seen);
   return bitmap;
 }
 
@@ -370,10 +393,10 @@ PictureFile ReadPictureFile(const std::wstring& path) {
   }
 }
 
-BitmapOwner DecodePicture(PictureFile file, int width, int height, COLORREF background,
+BitmapOwner DecodePicture(PictureFile file, const TargetSize& targetSize, COLORREF background,
                           const std::function<bool()>& isWanted) {
   try {
-    return Decode(file, width, height, background, isWanted);
+    return Decode(file, targetSize, background, isWanted);
   } catch (...) {
     return {};
   }

@@ -10,6 +10,7 @@
 #include <string>
 
 #include "platform/windows/Owner.h"
+#include "support/PictureBytes.h"
 
 namespace tarnwick {
 
@@ -25,9 +26,13 @@ struct PictureFile {
 // Never throws. The file is closed when the function returns.
 PictureFile ReadPictureFile(const std::wstring& path);
 
-// Decodes a PNG, GIF (its first picture), JPEG or BMP file, told by its bytes, scales it to exactly `width` x
-// `height` device pixels and lays it on `background`, which shows through where the picture is transparent.
-// When it shrinks, each pixel is the average of all that it covers, parts of pixels included.
+// How large a picture is to be shown, in device pixels, as it is seen.
+using TargetSize = std::function<SIZE(const PictureFacts&)>;
+
+// Decodes a PNG, GIF (its first picture), JPEG or BMP file, told by its bytes, turns it as its file says,
+// scales it to exactly what `targetSize` tells and lays it on `background`, which shows through where the
+// picture is transparent. When it shrinks, each pixel is the average of all that it covers, parts of pixels
+// included.
 //
 // The result is a top-down section of 32 bits a pixel, the highest byte 255; nobody else has it selected.
 // Empty when the file is empty, none of the four, broken or cut off, has more than 64,000,000 pixels or is
@@ -35,12 +40,17 @@ PictureFile ReadPictureFile(const std::wstring& path);
 // asked now and then, says no. Never throws.
 //
 // On any thread that has initialised COM.
-BitmapOwner DecodePicture(PictureFile file, int width, int height, COLORREF background,
+BitmapOwner DecodePicture(PictureFile file, const TargetSize& targetSize, COLORREF background,
                           const std::function<bool()>& isWanted);
 
 // Both in one, for who can wait.
 inline BitmapOwner LoadPicture(const std::wstring& path, int width, int height, COLORREF background) {
-  return DecodePicture(ReadPictureFile(path), width, height, background, [] { return true; });
+  return DecodePicture(
+      ReadPictureFile(path),
+      [&](const PictureFacts&) {
+        return SIZE{width, height};
+      },
+      background, [] { return true; });
 }
 
 }  // namespace tarnwick

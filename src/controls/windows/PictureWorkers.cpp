@@ -7,6 +7,7 @@
 #include <mutex>
 #include <utility>
 
+#include "controls/windows/ThumbnailLayout.h"
 #include "platform/windows/ThreadPool.h"
 
 namespace tarnwick {
@@ -26,11 +27,31 @@ DWORD MostWorkers() {
 struct Job {
   std::weak_ptr<const PictureRequest> request;
   PictureFile file;
-  int width;
-  int height;
+  PicturePlace place;
+  int dpi;
   COLORREF background;
-  BitmapOwner picture;
+  ShownPicture picture;
 };
+
+RECT Pixels(const PicturePlace& place, int dpi) {
+  const auto pixels = [dpi](double twips) { return layout::Pixels(twips, dpi); };
+  RECT area = {pixels(place.left), pixels(place.top), pixels(place.left + place.width),
+               pixels(place.top + place.height)};
+  // Of a very long or very high picture a line remains.
+  area.right = std::max(area.right, area.left + 1);
+  area.bottom = std::max(area.bottom, area.top + 1);
+  return area;
+}
+
+void Decode(Job& job) {
+  RECT& place = job.picture.place;
+  const auto size = [&](const PictureFacts& facts) {
+    place = Pixels(IsTurned(facts) ? Turned(job.place) : job.place, job.dpi);
+    return SIZE{place.right - place.left, place.bottom - place.top};
+  };
+  job.picture.bitmap =
+      DecodePicture(std::move(job.file), size, job.background, [&] { return !job.request.expired(); });
+}
 
 }  // namespace
 
@@ -62,9 +83,7 @@ void PictureWorkers::Shared::Work() {
       }
       current.splice(current.begin(), waiting, waiting.begin());
     }
-    Job& job = current.front();
-    job.picture = DecodePicture(std::move(job.file), job.width, job.height, job.background,
-                                [&] { return !job.request.expired(); });
+    Decode(current.front());
     const std::lock_guard guard(lock);
     decoded.splice(decoded.end(), current);
     if (window) PostMessageW(window, kDecoded, 0, 0);
@@ -94,7 +113,7 @@ bool PictureWorkers::Start(const std::shared_ptr<const PictureRequest>& request,
   const HWND window = window_.Get();
   if (!window) return false;
   std::list<Job> job;
-  job.push_back({request, std::move(file), request->width, request->height, request->background, {}});
+  job.push_back({request, std::move(file), request->place, request->dpi, request->background, {}});
   const std::lock_guard guard(shared_->lock);
   shared_->window = window;
   // Whoever leafs quickly must not fill the memory.

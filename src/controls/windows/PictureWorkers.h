@@ -8,6 +8,7 @@
 #include <memory>
 #include <string>
 
+#include "controls/thumbnailview/PicturePlace.h"
 #include "controls/windows/PictureLoader.h"
 #include "platform/windows/MessageWindow.h"
 
@@ -18,19 +19,25 @@ struct PictureRequest {
   std::wstring path;
   std::uint64_t length = 0;
   std::uint64_t written = 0;  // when, as the file system counts
-  // In pixels.
-  int width = 0;
-  int height = 0;
+  // Of the picture as it lies in the file.
+  PicturePlace place;
+  int dpi = 0;
   COLORREF background = 0;
 
   bool operator==(const PictureRequest&) const = default;
 };
 
+// A picture as large as it is shown, at `place` in its slot's frame, in pixels. Empty when it cannot be
+// shown.
+struct ShownPicture {
+  BitmapOwner bitmap;
+  RECT place = {};
+};
+
 class PictureWorkers {
  public:
-  // Takes a picture, empty when the file cannot be shown. Called on the thread of the object, for what
-  // somebody still waits for.
-  using Taker = std::function<void(const std::shared_ptr<const PictureRequest>&, BitmapOwner)>;
+  // Takes a picture. Called on the thread of the object, for what somebody still waits for.
+  using Taker = std::function<void(const std::shared_ptr<const PictureRequest>&, ShownPicture)>;
 
   explicit PictureWorkers(Taker taker);
   // Does not wait for what is being decoded.

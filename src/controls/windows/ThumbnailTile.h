@@ -10,8 +10,9 @@ namespace tarnwick {
 
 struct ThumbnailTile {
   Text caption;
-  // As large as it is shown, at `place` in the frame; null when there is none.
-  SharedBitmap picture;
+  // Null when there is none.
+  SharedPicture picture;
+  // Where it stands in the frame, or will stand at most.
   RECT place = {};
   bool selected = false;
 };

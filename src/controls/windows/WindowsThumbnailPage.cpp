@@ -31,7 +31,7 @@ constexpr UINT kLinkFormat = DT_CENTER | DT_VCENTER | DT_SINGLELINE | DT_NOPREFI
 }  // namespace
 
 WindowsThumbnailPage::WindowsThumbnailPage(HINSTANCE module, ControlWindowUser& control)
-    : ControlWindow(module, kClassName, control), workers_([this](const auto& request, BitmapOwner picture) {
+    : ControlWindow(module, kClassName, control), workers_([this](const auto& request, ShownPicture picture) {
         TakePicture(request, std::move(picture));
       }) {}
 
@@ -78,10 +78,15 @@ void WindowsThumbnailPage::PlaceChildren() const {
   place(switchWindow_, layout::kButton);
 }
 
-void WindowsThumbnailPage::DpiChanged(int) {
+void WindowsThumbnailPage::DpiChanged(int before) {
   PlaceChildren();
-  for (Slot& slot : slots_)
+  for (Slot& slot : slots_) {
+    // Until it is loaded anew, or for good when its file is gone.
+    RECT& place = slot.place;
+    for (LONG* side : {&place.left, &place.top, &place.right, &place.bottom})
+      *side = MulDiv(*side, Dpi(), before);
     if (slot.picture || slot.awaited) LoadPictureOf(slot);
+  }
   PlaceEditor();
 }
 
@@ -251,26 +256,16 @@ void WindowsThumbnailPage::Redraw(const Slot& slot) {
 // False when there is no such file. A picture that is no longer there to be loaded again stays as it was
 // loaded.
 bool WindowsThumbnailPage::LoadPictureOf(Slot& slot) {
-  const auto pixels = [this](double twips) { return layout::Pixels(twips, Dpi()); };
-  const PicturePlace& twips = slot.twips;
-  slot.place = {pixels(twips.left), pixels(twips.top), pixels(twips.left + twips.width),
-                pixels(twips.top + twips.height)};
-  // Of a very long or very high picture a line remains.
-  const int width = std::max<int>(1, slot.place.right - slot.place.left);
-  const int height = std::max<int>(1, slot.place.bottom - slot.place.top);
-  slot.place.right = slot.place.left + width;
-  slot.place.bottom = slot.place.top + height;
-
+  if (!slot.picture) slot.place = Pixels(layout::kPicture);
   WIN32_FILE_ATTRIBUTE_DATA file = {};
   if (!GetFileAttributesExW(slot.path.c_str(), GetFileExInfoStandard, &file)) return false;
   const auto joined = [](DWORD high, DWORD low) { return std::uint64_t{high} << 32 | low; };
   const auto request = std::make_shared<const PictureRequest>(
       PictureRequest{slot.path, joined(file.nFileSizeHigh, file.nFileSizeLow),
-                     joined(file.ftLastWriteTime.dwHighDateTime, file.ftLastWriteTime.dwLowDateTime), width,
-                     height, BackColor()});
-  if (const SharedBitmap known = pictures_.Find(*request)) {
-    slot.picture = known;
-    slot.awaited = {};
+                     joined(file.ftLastWriteTime.dwHighDateTime, file.ftLastWriteTime.dwLowDateTime),
+                     slot.twips, Dpi(), BackColor()});
+  if (const SharedPicture known = pictures_.Find(*request)) {
+    Show(slot, known);
     return true;
   }
   // Read here and now, in a few milliseconds: as long as a worker had the file open, it could not be
@@ -281,13 +276,19 @@ bool WindowsThumbnailPage::LoadPictureOf(Slot& slot) {
   return true;
 }
 
+void WindowsThumbnailPage::Show(Slot& slot, const SharedPicture& picture) {
+  slot.picture = picture;
+  slot.place = picture->place;
+  slot.awaited = {};
+}
+
 void WindowsThumbnailPage::TakePicture(const std::shared_ptr<const PictureRequest>& request,
-                                       BitmapOwner picture) {
+                                       ShownPicture picture) {
   const auto slot = std::ranges::find(slots_, request, &Slot::awaited);
   if (slot == slots_.end()) return;
   slot->awaited = {};
-  if (picture) {
-    slot->picture = std::make_shared<const BitmapOwner>(std::move(picture));
+  if (picture.bitmap) {
+    Show(*slot, std::make_shared<const ShownPicture>(std::move(picture)));
     pictures_.Keep(*request, slot->picture);
     Redraw(*slot);
   } else if (!slot->picture) {

@@ -91,7 +91,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   HWND FirstStop() const;
   void PlaceChildren() const;
   bool LoadPictureOf(Slot& slot);
-  void TakePicture(const std::shared_ptr<const PictureRequest>& request, BitmapOwner picture);
+  static void Show(Slot& slot, const SharedPicture& picture);
+  void TakePicture(const std::shared_ptr<const PictureRequest>& request, ShownPicture picture);
   static void Redraw(const Slot& slot);
   void PlaceEditor() const;
   void ApplyContent() const;

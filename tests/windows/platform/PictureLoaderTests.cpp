@@ -3,6 +3,7 @@
 
 #include <gtest/gtest.h>
 #include <objbase.h>
+#include <wincodec.h>
 
 #include <algorithm>
 #include <cstdint>
@@ -12,6 +13,7 @@
 #include <utility>
 #include <vector>
 
+#include "platform/windows/ComPtr.h"
 #include "platform/windows/Owner.h"
 
 namespace tarnwick {
@@ -68,6 +70,39 @@ Bytes Bmp(const Picture& picture) {
     bytes.resize(end);
   }
   return bytes;
+}
+
+// By the system's encoder.
+Bytes Encoded(const GUID& container, const Picture& picture) {
+  ComPtr<IWICImagingFactory> factory;
+  ComPtr<IStream> stream;
+  ComPtr<IWICBitmapEncoder> encoder;
+  ComPtr<IWICBitmapFrameEncode> frame;
+  ComPtr<IPropertyBag2> options;
+  WICPixelFormatGUID format = GUID_WICPixelFormat24bppBGR;
+  Bytes lines;
+  for (const std::uint32_t pixel : picture.pixels) Append(lines, pixel, 3);
+  EXPECT_HRESULT_SUCCEEDED(CoCreateInstance(CLSID_WICImagingFactory, nullptr, CLSCTX_INPROC_SERVER,
+                                            __uuidof(IWICImagingFactory), factory.ReceiveVoid()));
+  EXPECT_HRESULT_SUCCEEDED(CreateStreamOnHGlobal(nullptr, TRUE, stream.Receive()));
+  EXPECT_HRESULT_SUCCEEDED(factory->CreateEncoder(container, nullptr, encoder.Receive()));
+  EXPECT_HRESULT_SUCCEEDED(encoder->Initialize(stream.Get(), WICBitmapEncoderNoCache));
+  EXPECT_HRESULT_SUCCEEDED(encoder->CreateNewFrame(frame.Receive(), options.Receive()));
+  EXPECT_HRESULT_SUCCEEDED(frame->Initialize(options.Get()));
+  EXPECT_HRESULT_SUCCEEDED(
+      frame->SetSize(static_cast<UINT>(picture.width), static_cast<UINT>(picture.height)));
+  EXPECT_HRESULT_SUCCEEDED(frame->SetPixelFormat(&format));
+  EXPECT_HRESULT_SUCCEEDED(frame->WritePixels(static_cast<UINT>(picture.height),
+                                              static_cast<UINT>(picture.width * 3),
+                                              static_cast<UINT>(lines.size()), lines.data()));
+  EXPECT_HRESULT_SUCCEEDED(frame->Commit());
+  EXPECT_HRESULT_SUCCEEDED(encoder->Commit());
+  STATSTG facts = {};
+  EXPECT_HRESULT_SUCCEEDED(stream->Stat(&facts, STATFLAG_NONAME));
+  EXPECT_HRESULT_SUCCEEDED(stream->Seek({}, STREAM_SEEK_SET, nullptr));
+  Bytes file(static_cast<std::size_t>(facts.cbSize.QuadPart));
+  EXPECT_HRESULT_SUCCEEDED(stream->Read(file.data(), static_cast<ULONG>(file.size()), nullptr));
+  return file;
 }
 
 // Of the demo pictures.
@@ -160,6 +195,48 @@ TEST_F(PictureLoaderTest, EachFormatIsToldByItsBytes) {
   }
 }
 
+// A JPEG whose quarters are red, black, blue and white by lines, with what a camera writes about its
+// orientation.
+Bytes TurnedJpeg(std::uint8_t orientation) {
+  Picture quarters = {64, 32, {}};
+  for (int y = 0; y < 32; ++y)
+    for (int x = 0; x < 64; ++x)
+      quarters.pixels.push_back(y < 16   ? (x < 32 ? 0xFFFF0000 : 0xFF000000)
+                                : x < 32 ? 0xFF0000FF
+                                         : 0xFFFFFFFF);
+  Bytes jpeg = Encoded(GUID_ContainerFormatJpeg, quarters);
+  const Bytes exif = {0xFF, 0xE1, 0,    34, 'E', 'x', 'i', 'f', 0, 0, 'I',         'I', 42, 0, 8, 0, 0, 0,
+                      1,    0,    0x12, 1,  3,   0,   1,   0,   0, 0, orientation, 0,   0,  0, 0, 0, 0, 0};
+  jpeg.insert(jpeg.begin() + 2, exif.begin(), exif.end());
+  return jpeg;
+}
+
+TEST_F(PictureLoaderTest, APictureIsTurnedAsItsCameraTells) {
+  // Of the quarters as they are seen, by lines.
+  const char* const seen[] = {"rkbw", "krwb", "wbkr", "bwrk", "rbkw", "brwk", "wkbr", "kwrb"};
+  for (std::uint8_t orientation = 1; orientation <= 8; ++orientation) {
+    std::string quarters;
+    for (const std::uint32_t pixel : Shown(TurnedJpeg(orientation), 2, 2)) {
+      const bool red = (pixel >> 16 & 0xFF) > 128;
+      const bool blue = (pixel & 0xFF) > 128;
+      quarters += red ? (blue ? 'w' : 'r') : blue ? 'b' : 'k';
+    }
+    EXPECT_EQ(seen[orientation - 1], quarters) << int{orientation};
+  }
+  // The size that is told is the file's own.
+  Write(TurnedJpeg(6));
+  PictureFacts told;
+  EXPECT_TRUE(DecodePicture(
+      ReadPictureFile(path_),
+      [&](const PictureFacts& facts) {
+        told = facts;
+        return SIZE{2, 3};
+      },
+      kBackground, [] { return true; }));
+  EXPECT_EQ(64U, told.width);
+  EXPECT_TRUE(IsTurned(told));
+}
+
 TEST_F(PictureLoaderTest, TheBackgroundShowsThrough) {
   // What is not seen, seen half and seen; then all in one, without the hidden one's colour, which is white.
   const Bytes png = {0x89, 0x50, 0x4E, 0x47, 0x0D, 0x0A, 0x1A, 0x0A, 0,    0,    0,    0x0D, 0x49,
@@ -211,7 +288,12 @@ TEST_F(PictureLoaderTest, ABrokenFileIsNotShown) {
   EXPECT_TRUE(ShownFile(2, 2).empty()) << "a folder";
   path_ = file;
   int asked = 0;
-  EXPECT_FALSE(DecodePicture(ReadPictureFile(path_), 2, 2, kBackground, [&] { return ++asked < 2; }))
+  EXPECT_FALSE(DecodePicture(
+      ReadPictureFile(path_),
+      [](const PictureFacts&) {
+        return SIZE{2, 2};
+      },
+      kBackground, [&] { return ++asked < 2; }))
       << "given up on the way";
 }
 
