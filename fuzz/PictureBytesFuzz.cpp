@@ -10,14 +10,16 @@ extern "C" int LLVMFuzzerTestOneInput(const std::uint8_t* data, std::size_t size
   using namespace tarnwick;
   std::vector<std::uint8_t> file(data, data + size);
   auto facts = ReducePicture(file);
-  if (!facts) return 0;
-  if (facts->length > size || std::uint64_t{facts->width} * facts->height > kMostPixels) std::abort();
-  if (facts->frameWidth == 0 || facts->left + facts->frameWidth > facts->width) std::abort();
-  if (facts->frameHeight == 0 || facts->top + facts->frameHeight > facts->height) std::abort();
-  if (facts->orientation < 1 || facts->orientation > 8) std::abort();
-  // What tells it makes no pixels.
-  facts->orientation = 1;
-  file.resize(facts->length);
-  if (ReducePicture(file) != facts) std::abort();
+  if (facts.fault != PictureFault::kNone) return 0;
+  if (facts.length > size || std::uint64_t{facts.width} * facts.height > kMostPixels) std::abort();
+  const bool measured = facts.format != PictureFormat::kWebp && facts.format != PictureFormat::kHeif;
+  if ((facts.frameWidth > 0) != measured || facts.left + facts.frameWidth > facts.width) std::abort();
+  if ((facts.frameHeight > 0) != measured || facts.top + facts.frameHeight > facts.height) std::abort();
+  if (facts.orientation < 1 || facts.orientation > 8) std::abort();
+  file.resize(facts.length);
+  PictureFacts again = ReducePicture(file);
+  // What tells it makes no pixels, and may have been left out.
+  again.orientation = facts.orientation;
+  if (again != facts) std::abort();
   return 0;
 }

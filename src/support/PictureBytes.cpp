@@ -26,12 +26,22 @@ std::uint32_t LittleEndian(Bytes bytes) {
 }
 
 bool Shown(std::uint64_t width, std::uint64_t height) {
-  return width > 0 && height > 0 && width <= kMostPixels && height <= kMostPixels &&
-         width * height <= kMostPixels;
+  return SizeFault(width, height) == PictureFault::kNone;
+}
+
+PictureFacts Refused(PictureFault fault) {
+  PictureFacts facts;
+  facts.fault = fault;
+  return facts;
+}
+
+PictureFacts TooLarge() {
+  return Refused(PictureFault::kTooLarge);
 }
 
 PictureFacts Whole(PictureFormat format, std::uint32_t width, std::uint32_t height) {
   PictureFacts facts;
+  facts.fault = PictureFault::kNone;
   facts.format = format;
   facts.width = facts.frameWidth = width;
   facts.height = facts.frameHeight = height;
@@ -65,32 +75,53 @@ class TiffDirectory {
   explicit TiffDirectory(Bytes file) : file_(file) {
     little_ = StartsWith(file, {"II*\0", 4});
     if (!little_ && !StartsWith(file, {"MM\0*", 4})) return;
-    const Bytes count = Part(Number(Part(4, 4)), 2);
+    const Bytes count = Part(Value(Part(4, 4)), 2);
     if (count.empty()) return;
     const auto begin = static_cast<std::size_t>(count.data() - file.data()) + 2;
     entries_ =
-        file.subspan(begin, std::min((file.size() - begin) / kEntry, std::size_t{Number(count)}) * kEntry);
+        file.subspan(begin, std::min((file.size() - begin) / kEntry, std::size_t{Value(count)}) * kEntry);
   }
 
+  // The numbers of an entry.
+  struct Numbers {
+    Bytes bytes;
+    std::size_t size = 1;  // of each, in bytes
+    std::size_t Count() const { return bytes.size() / size; }
+  };
+  // Without any when there is no such entry, or not all of it.
+  Numbers Find(std::uint32_t tag) const {
+    for (std::size_t at = 0; at < entries_.size(); at += kEntry) {
+      if (Value(entries_.subspan(at, 2)) != tag) continue;
+      // Bytes and what is not told, numbers of two bytes, of four.
+      const std::uint32_t type = Value(entries_.subspan(at + 2, 2));
+      const std::size_t size = type == 1 || type == 7 ? 1 : type == 3 ? 2 : type == 4 ? 4 : 0;
+      const std::uint64_t bytes = std::uint64_t{Value(entries_.subspan(at + 4, 4))} * size;
+      if (bytes == 0 || bytes > file_.size()) return {};
+      const auto count = static_cast<std::size_t>(bytes);
+      // Up to four bytes stand in the entry itself.
+      return {count <= 4 ? entries_.subspan(at + 8, count) : Part(Value(entries_.subspan(at + 8, 4)), count),
+              size};
+    }
+    return {};
+  }
+  std::uint32_t At(const Numbers& numbers, std::size_t index) const {
+    return Value(numbers.bytes.subspan(index * numbers.size, numbers.size));
+  }
   // The first number of an entry; `otherwise` when there is none.
   std::uint32_t First(std::uint32_t tag, std::uint32_t otherwise) const {
-    constexpr std::uint32_t kShort = 3;
-    for (std::size_t at = 0; at < entries_.size(); at += kEntry) {
-      if (Number(entries_.subspan(at, 2)) != tag) continue;
-      const bool isShort = Number(entries_.subspan(at + 2, 2)) == kShort;
-      return Number(entries_.subspan(at + 8, isShort ? 2 : 4));
-    }
-    return otherwise;
+    const Numbers numbers = Find(tag);
+    return numbers.Count() > 0 ? At(numbers, 0) : otherwise;
   }
-
- private:
-  static constexpr std::size_t kEntry = 12;
 
   // Empty when the file has not that many bytes there.
   Bytes Part(std::size_t at, std::size_t size) const {
     return at <= file_.size() && size <= file_.size() - at ? file_.subspan(at, size) : Bytes();
   }
-  std::uint32_t Number(Bytes bytes) const { return little_ ? LittleEndian(bytes) : BigEndian(bytes); }
+
+ private:
+  static constexpr std::size_t kEntry = 12;
+
+  std::uint32_t Value(Bytes bytes) const { return little_ ? LittleEndian(bytes) : BigEndian(bytes); }
 
   Bytes file_;
   bool little_ = false;
@@ -107,7 +138,7 @@ unsigned Orientation(const TiffDirectory& directory) {
 // The smallest pieces that programs write are of about 8 KiB, or of a line; this is more than either needs.
 constexpr int kMostPngChunks = 200'000;
 
-std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
+PictureFacts ReducePng(std::span<std::uint8_t> file) {
   constexpr std::size_t kSignature = 8;
   constexpr std::size_t kAround = 12;  // length and name before the data, the check sum behind it
   constexpr std::size_t kHeaderEnd = kSignature + kAround + 13;
@@ -116,7 +147,7 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
     return {};
   const std::uint32_t width = BigEndian(file.subspan(16, 4));
   const std::uint32_t height = BigEndian(file.subspan(20, 4));
-  if (!Shown(width, height)) return {};
+  if (!Shown(width, height)) return Refused(SizeFault(width, height));
   const unsigned depth = file[24];
   const unsigned colorType = file[25];
   const unsigned channels = (colorType & 1) != 0 ? 1 : ((colorType & 2) != 0 ? 3 : 1) + (colorType >> 2 & 1);
@@ -124,7 +155,7 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
   // interlaced lines together takes as long again.
   const std::uint64_t unpacked = (std::uint64_t{width} * channels * depth / 8 + 2) * height;
   const std::uint64_t bytes = std::uint64_t{width} * height * channels * depth / 8;
-  if ((file[28] != 0 ? 2 * bytes : bytes) > 4 * kMostPixels) return {};
+  if ((file[28] != 0 ? 2 * bytes : bytes) > 4 * kMostPixels) return TooLarge();
 
   Kept kept(file);
   kept.Keep(0, kSignature);
@@ -149,7 +180,7 @@ std::optional<PictureFacts> ReducePng(std::span<std::uint8_t> file) {
     if (last) break;
   }
   // Packing adds next to nothing to what cannot be made smaller. More is blocks that unpack to nothing.
-  if (chunks > kMostPngChunks || packed > unpacked + unpacked / 16 + 4096) return {};
+  if (chunks > kMostPngChunks || packed > unpacked + unpacked / 16 + 4096) return TooLarge();
   PictureFacts facts = Whole(PictureFormat::kPng, width, height);
   facts.orientation = orientation;
   facts.length = kept.Length();
@@ -178,7 +209,8 @@ class GifCodes {
         count_ -= width_;
         if (code == 1U << codeSize_) {
           Clear();
-          if (++clears_ > kMostClearCodes) return false;
+          ++clears_;
+          if (HasTooMany()) return false;
         } else if (code == (1U << codeSize_) + 1) {
           ended_ = true;
         } else if (next_ <= 4096 && ++next_ > 1U << width_ && width_ < 12) {
@@ -188,6 +220,8 @@ class GifCodes {
     }
     return true;
   }
+
+  bool HasTooMany() const { return clears_ > kMostClearCodes; }
 
  private:
   void Clear() {
@@ -204,7 +238,7 @@ class GifCodes {
   bool ended_ = false;
 };
 
-std::optional<PictureFacts> ReduceGif(std::span<std::uint8_t> file) {
+PictureFacts ReduceGif(std::span<std::uint8_t> file) {
   constexpr std::size_t kHeader = 13;
   if (file.size() < kHeader) return {};
   const auto tableBytes = [](unsigned flags) {
@@ -242,8 +276,7 @@ std::optional<PictureFacts> ReduceGif(std::span<std::uint8_t> file) {
   }
   constexpr std::size_t kDescriptor = 10;
   if (file.size() - at < kDescriptor || file[at] != 0x2C) return {};
-  PictureFacts facts;
-  facts.format = PictureFormat::kGif;
+  PictureFacts facts = Whole(PictureFormat::kGif, 0, 0);
   facts.left = LittleEndian(file.subspan(at + 1, 2));
   facts.top = LittleEndian(file.subspan(at + 3, 2));
   facts.frameWidth = LittleEndian(file.subspan(at + 5, 2));
@@ -251,12 +284,15 @@ std::optional<PictureFacts> ReduceGif(std::span<std::uint8_t> file) {
   // A first picture that is larger than the whole makes the whole larger.
   facts.width = std::max(LittleEndian(file.subspan(6, 2)), facts.left + facts.frameWidth);
   facts.height = std::max(LittleEndian(file.subspan(8, 2)), facts.top + facts.frameHeight);
-  if (!Shown(facts.width, facts.height) || !Shown(facts.frameWidth, facts.frameHeight)) return {};
+  if (!Shown(facts.frameWidth, facts.frameHeight))
+    return Refused(SizeFault(facts.frameWidth, facts.frameHeight));
+  if (!Shown(facts.width, facts.height)) return TooLarge();
 
   const std::size_t codeSizeAt = at + kDescriptor + tableBytes(file[at + 9]);
   if (codeSizeAt >= file.size() || file[codeSizeAt] < 1 || file[codeSizeAt] > 8) return {};
   GifCodes codes(file[codeSizeAt]);
   const std::size_t end = blocksEnd(codeSizeAt + 1, &codes);
+  if (codes.HasTooMany()) return TooLarge();
   if (end == 0 || end == file.size()) return {};
   kept.Keep(control, controlEnd);
   kept.Keep(at, end);
@@ -275,7 +311,7 @@ constexpr std::size_t kMostJpegTables = 1'000'000;
 constexpr int kMostJpegScans = 40;
 constexpr std::uint64_t kScanOfWork = 12;
 
-std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
+PictureFacts ReduceJpeg(std::span<std::uint8_t> file) {
   Kept kept(file);
   kept.Keep(0, 2);
   std::optional<PictureFacts> facts;
@@ -313,11 +349,11 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
     const bool adobe = marker == 0xEE;
     if (((marker & 0xF0) == 0xE0 && !jfif && !adobe) || marker == 0xFE) continue;
     tables += length;
-    if (tables > kMostJpegTables) return {};
+    if (tables > kMostJpegTables) return TooLarge();
     if (marker >= 0xC0 && marker <= 0xCF && marker != 0xC4 && marker != 0xC8 && marker != 0xCC) {
       if (facts || data.size() < 6) return {};
       facts = Whole(PictureFormat::kJpeg, BigEndian(data.subspan(3, 2)), BigEndian(data.subspan(1, 2)));
-      if (!Shown(facts->width, facts->height)) return {};
+      if (!Shown(facts->width, facts->height)) return Refused(SizeFault(facts->width, facts->height));
       components = data[5];
       progressive = marker == 0xC2;
     }
@@ -326,7 +362,8 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
     kept.Keep(begin, at);
     if (marker != 0xDA) continue;
 
-    if (!facts || data.empty() || ++scans > kMostJpegScans) return {};
+    if (!facts || data.empty()) return {};
+    if (++scans > kMostJpegScans) return TooLarge();
     if (hasAll) {
       // One scan has it all; the decoder stops at its end.
       kept.Keep(at, file.size());
@@ -346,10 +383,10 @@ std::optional<PictureFacts> ReduceJpeg(std::span<std::uint8_t> file) {
   }
   if (!facts || scans == 0) return {};
   const std::uint64_t work = static_cast<std::uint64_t>(scans - 1) + kScanOfWork;
-  if (std::uint64_t{facts->width} * facts->height * work > kMostPixels * kScanOfWork) return {};
+  if (std::uint64_t{facts->width} * facts->height * work > kMostPixels * kScanOfWork) return TooLarge();
   facts->orientation = orientation.value_or(1);
   facts->length = kept.Length();
-  return facts;
+  return *facts;
 }
 
 // --- BMP ---
@@ -384,7 +421,7 @@ bool FillsAll(Bytes code, std::uint32_t width, std::uint32_t height, unsigned bi
   return y == height || (y + 1 == height && x == width);
 }
 
-std::optional<PictureFacts> ReduceBmp(std::span<std::uint8_t> file) {
+PictureFacts ReduceBmp(std::span<std::uint8_t> file) {
   constexpr std::size_t kFileHeader = 14;
   if (file.size() < kFileHeader + 12) return {};
   const std::uint32_t offset = LittleEndian(file.subspan(10, 4));
@@ -406,7 +443,8 @@ std::optional<PictureFacts> ReduceBmp(std::span<std::uint8_t> file) {
     bits = LittleEndian(file.subspan(28, 2));
     compression = LittleEndian(file.subspan(30, 4));
   }
-  if (!Shown(width, height) || bits > 32 || offset > file.size()) return {};
+  if (!Shown(width, height)) return Refused(SizeFault(width, height));
+  if (bits > 32 || offset > file.size()) return {};
   if (compression == 1 || compression == 2) {
     if (!FillsAll(file.subspan(offset), width, height, compression == 1 ? 8 : 4)) return {};
   } else {
@@ -418,14 +456,112 @@ std::optional<PictureFacts> ReduceBmp(std::span<std::uint8_t> file) {
   return facts;
 }
 
+// --- TIFF ---
+
+// Of tables that all parts of a JPEG-packed picture share.
+constexpr std::size_t kMostTiffTables = 65'536;
+// A part has one for all colours, or one for each.
+constexpr int kMostTiffScans = 4;
+
+int ScansIn(Bytes jpeg) {
+  const auto isScan = [](std::uint8_t one, std::uint8_t next) { return one == 0xFF && next == 0xDA; };
+  int scans = 0;
+  for (auto at = jpeg.begin(); (at = std::adjacent_find(at, jpeg.end(), isScan)) != jpeg.end(); ++at) ++scans;
+  return scans;
+}
+
+PictureFacts ReduceTiff(std::span<std::uint8_t> file) {
+  const TiffDirectory directory(file);
+  const std::uint32_t width = directory.First(0x0100, 0);
+  const std::uint32_t height = directory.First(0x0101, 0);
+  if (!Shown(width, height)) return Refused(SizeFault(width, height));
+  // Tiles, or strips of whole lines, which may be larger than the picture.
+  const bool tiled = directory.Find(0x0142).Count() > 0;
+  const std::uint64_t partWidth = tiled ? directory.First(0x0142, 0) : width;
+  const std::uint64_t partHeight =
+      tiled ? directory.First(0x0143, 0) : std::min(directory.First(0x0116, height), height);
+  if (partWidth == 0 || partHeight == 0) return {};
+  if (std::max({width, height}) > kLongestSide || partWidth > kLongestSide || partHeight > kLongestSide)
+    return TooLarge();
+  const std::uint64_t pixels =
+      (width + partWidth - 1) / partWidth * partWidth * ((height + partHeight - 1) / partHeight * partHeight);
+  const std::uint64_t bits = std::uint64_t{directory.First(0x0102, 1)} * directory.First(0x0115, 1);
+  // Four bytes for each pixel of the picture, and a quarter for what tiles have beside it.
+  if (pixels > 2 * kMostPixels || pixels * bits > 40 * kMostPixels) return TooLarge();
+
+  const auto offsets = directory.Find(tiled ? 0x0144 : 0x0111);
+  const auto sizes = directory.Find(tiled ? 0x0145 : 0x0117);
+  if (offsets.Count() == 0 || offsets.Count() != sizes.Count()) return {};
+  const std::uint32_t packing = directory.First(0x0103, 1);
+  constexpr std::uint32_t kOldJpeg = 6;
+  constexpr std::uint32_t kJpeg = 7;
+  if (packing == kOldJpeg) return Refused(PictureFault::kOtherKind);
+  if (directory.Find(0x015B).Count() > kMostTiffTables) return TooLarge();
+  std::uint64_t packed = 0;
+  for (std::size_t i = 0; i < sizes.Count(); ++i) {
+    const Bytes part = directory.Part(directory.At(offsets, i), directory.At(sizes, i));
+    if (part.empty()) return {};
+    // Parts that lie over each other would be unpacked again and again.
+    packed += part.size();
+    if (packed > file.size()) return TooLarge();
+    if (packing == kJpeg && ScansIn(part) > kMostTiffScans) return TooLarge();
+  }
+  PictureFacts facts = Whole(PictureFormat::kTiff, width, height);
+  facts.orientation = Orientation(directory);
+  facts.length = file.size();
+  return facts;
+}
+
+// What only a decoder knows more about, which reads no pixels before it is asked for some.
+PictureFacts Unmeasured(PictureFormat format, std::size_t length) {
+  PictureFacts facts = Whole(format, 0, 0);
+  facts.length = length;
+  return facts;
+}
+
 }  // namespace
 
-std::optional<PictureFacts> ReducePicture(std::span<std::uint8_t> file) {
-  if (StartsWith(file, "\x89PNG\r\n\x1A\n")) return ReducePng(file);
-  if (StartsWith(file, "GIF87a") || StartsWith(file, "GIF89a")) return ReduceGif(file);
-  if (StartsWith(file, "\xFF\xD8\xFF")) return ReduceJpeg(file);
-  if (StartsWith(file, "BM")) return ReduceBmp(file);
+PictureFault SizeFault(std::uint64_t width, std::uint64_t height) {
+  if (width == 0 || height == 0) return PictureFault::kDamaged;
+  const bool shown = width <= kMostPixels && height <= kMostPixels && width * height <= kMostPixels;
+  return shown ? PictureFault::kNone : PictureFault::kTooLarge;
+}
+
+std::optional<PictureFormat> FormatOf(std::span<const std::uint8_t> head) {
+  if (StartsWith(head, "\x89PNG\r\n\x1A\n")) return PictureFormat::kPng;
+  if (StartsWith(head, "GIF87a") || StartsWith(head, "GIF89a")) return PictureFormat::kGif;
+  if (StartsWith(head, "\xFF\xD8\xFF")) return PictureFormat::kJpeg;
+  if (StartsWith(head, "BM")) return PictureFormat::kBmp;
+  if (StartsWith(head, {"II*\0", 4}) || StartsWith(head, {"MM\0*", 4})) return PictureFormat::kTiff;
+  if (head.size() < kFormatBytes) return {};
+  if (StartsWith(head, "RIFF") && StartsWith(head.subspan(8), "WEBP")) return PictureFormat::kWebp;
+  // Films begin alike, with other brands.
+  if (StartsWith(head.subspan(4), "ftyp"))
+    for (const std::string_view brand :
+         {"heic", "heix", "hevc", "hevx", "heim", "heis", "mif1", "msf1", "avif"})
+      if (StartsWith(head.subspan(8), brand)) return PictureFormat::kHeif;
   return {};
+}
+
+PictureFacts ReducePicture(std::span<std::uint8_t> file) {
+  const std::optional<PictureFormat> format = FormatOf(file);
+  if (!format) return Refused(PictureFault::kOtherKind);
+  switch (*format) {
+    case PictureFormat::kPng:
+      return ReducePng(file);
+    case PictureFormat::kGif:
+      return ReduceGif(file);
+    case PictureFormat::kJpeg:
+      return ReduceJpeg(file);
+    case PictureFormat::kBmp:
+      return ReduceBmp(file);
+    case PictureFormat::kTiff:
+      return ReduceTiff(file);
+    case PictureFormat::kWebp:
+    case PictureFormat::kHeif:
+      break;
+  }
+  return Unmeasured(*format, file.size());
 }
 
 }  // namespace tarnwick

@@ -18,11 +18,24 @@ inline constexpr std::uint64_t kMostPixels = 64'000'000;
 // is no picture within that limit, or has more than a quarter of a gigabyte beside it.
 inline constexpr std::uint64_t kMostPictureBytes = 4 * kMostPixels + 1'000'000;
 
-enum class PictureFormat { kPng, kGif, kJpeg, kBmp };
+// The longest side of the formats that CImageHeight does not know, for whose sizes there is no bound in bits.
+inline constexpr std::uint32_t kLongestSide = 1'000'000;
+
+enum class PictureFormat { kPng, kGif, kJpeg, kBmp, kTiff, kWebp, kHeif };
+
+// Why a file is not shown.
+enum class PictureFault { kNone, kDamaged, kTooLarge, kOtherKind };
+
+// Of the first so many bytes of a file, the format that they begin; empty for none of them. A decoder for
+// WebP and HEIF (HEIC and AVIF) is not on every system.
+inline constexpr std::size_t kFormatBytes = 12;
+std::optional<PictureFormat> FormatOf(std::span<const std::uint8_t> head);
 
 struct PictureFacts {
+  // What the rest means something without.
+  PictureFault fault = PictureFault::kDamaged;
   PictureFormat format = PictureFormat::kBmp;
-  // The whole picture, in pixels.
+  // The whole picture, in pixels; 0 where only a decoder tells (WebP, HEIF).
   std::uint32_t width = 0;
   std::uint32_t height = 0;
   // What the decoder calls the picture; smaller than the whole only where a GIF's first picture covers a
@@ -45,8 +58,15 @@ inline bool IsTurned(const PictureFacts& facts) {
   return facts.orientation >= 5;
 }
 
-// Looks at a whole file and moves what makes the picture to its front. Empty when it is none of the four
-// formats or is refused. Each byte is looked at once at most.
-std::optional<PictureFacts> ReducePicture(std::span<std::uint8_t> file);
+// Whether CImageHeight knows the format, whose sizes are then those that count on the page.
+inline bool IsMeasured(const PictureFacts& facts) {
+  return facts.format <= PictureFormat::kBmp;
+}
+
+// What is wrong with a size; kNone for one that is shown.
+PictureFault SizeFault(std::uint64_t width, std::uint64_t height);
+
+// Looks at a whole file and moves what makes the picture to its front. Each byte is looked at once at most.
+PictureFacts ReducePicture(std::span<std::uint8_t> file);
 
 }  // namespace tarnwick

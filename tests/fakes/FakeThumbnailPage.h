@@ -59,10 +59,12 @@ struct FakeThumbnailPage : ThumbnailPage {
     At(slot).caption = Utf8FromText(caption);
     log.push_back("caption " + std::to_string(slot) + " " + At(slot).caption);
   }
-  bool SetPicture(int slot, TextView path, const PicturePlace& place) override {
-    log.push_back("picture " + std::to_string(slot));
+  bool SetPicture(int slot, TextView path, const std::optional<PicturePlace>& place) override {
+    log.push_back("picture " + std::to_string(slot) + (place ? "" : " without a place"));
+    // As if only what has a place were a picture.
+    if (!place) return false;
     At(slot).picture = Utf8FromText(path);
-    At(slot).place = place;
+    At(slot).place = *place;
     return true;
   }
   void SetSelected(int slot, bool selected) override { At(slot).selected = selected; }

@@ -3,15 +3,29 @@
 
 #include <gtest/gtest.h>
 
+#include <map>
 #include <string>
+#include <vector>
 
 namespace tarnwick {
 namespace {
 
-// What ReducePicture leaves of a file; "refused" when it does.
+PictureFacts FactsOf(std::string& file) {
+  return ReducePicture({reinterpret_cast<std::uint8_t*>(file.data()), file.size()});
+}
+
+// What ReducePicture leaves of a file; why it leaves nothing.
 std::string Reduced(std::string file) {
-  const auto facts = ReducePicture({reinterpret_cast<std::uint8_t*>(file.data()), file.size()});
-  return facts ? file.substr(0, facts->length) : "refused";
+  const PictureFacts facts = FactsOf(file);
+  return facts.fault == PictureFault::kNone       ? file.substr(0, facts.length)
+         : facts.fault == PictureFault::kDamaged  ? "damaged"
+         : facts.fault == PictureFault::kTooLarge ? "too large"
+                                                  : "other kind";
+}
+
+bool IsShown(const std::string& file) {
+  const std::string left = Reduced(file);
+  return left != "damaged" && left != "too large" && left != "other kind";
 }
 
 std::string Big(std::uint32_t value, int bytes) {
@@ -61,13 +75,13 @@ TEST(PictureBytes, PngKeepsWhatMakesThePixels) {
                         Chunk("iCCP", std::string(5000, 'p')) + palette + Chunk("tEXt", "a") + clear + data +
                             Chunk("IDAT", "") + data + end + "behind the end")));
 
-  EXPECT_EQ("refused", Reduced(Png(2, 2, 8, 3, false, Big(1000, 4) + "IDATshort")));
+  EXPECT_EQ("damaged", Reduced(Png(2, 2, 8, 3, false, Big(1000, 4) + "IDATshort")));
   // Blocks that unpack to nothing.
-  EXPECT_EQ("refused", Reduced(Png(2, 2, 8, 3, false, Chunk("IDAT", std::string(5000, '\0')) + end)));
+  EXPECT_EQ("too large", Reduced(Png(2, 2, 8, 3, false, Chunk("IDAT", std::string(5000, '\0')) + end)));
   // 64 megapixels, and what a decoder would need for them.
   const auto shown = [&](std::uint32_t width, std::uint32_t height, int depth, int colorType,
                          bool interlaced) {
-    return Reduced(Png(width, height, depth, colorType, interlaced, data + end)) != "refused";
+    return IsShown(Png(width, height, depth, colorType, interlaced, data + end));
   };
   EXPECT_TRUE(shown(8000, 8000, 8, 6, false));
   EXPECT_FALSE(shown(8001, 8000, 8, 6, false));
@@ -98,7 +112,7 @@ TEST(PictureBytes, JpegKeepsWhatMakesThePixels) {
                     kEoi + "behind the end"));
 
   const auto shown = [&](int kind, std::uint32_t width, std::uint32_t height, int scans) {
-    return Reduced(kSoi + Frame(kind, width, height) + Times(scans, one + codes) + kEoi) != "refused";
+    return IsShown(kSoi + Frame(kind, width, height) + Times(scans, one + codes) + kEoi);
   };
   EXPECT_TRUE(shown(kBaseline, 8000, 8000, 1));
   EXPECT_FALSE(shown(kBaseline, 8001, 8000, 1));
@@ -106,10 +120,10 @@ TEST(PictureBytes, JpegKeepsWhatMakesThePixels) {
   EXPECT_FALSE(shown(kProgressive, 4000, 3000, 41));
   EXPECT_FALSE(shown(kProgressive, 8000, 8000, 10));
   EXPECT_FALSE(shown(kProgressive, 8, 8, 0));
-  EXPECT_EQ("refused", Reduced(kSoi + Frame(kBaseline, 8, 8) + Frame(kBaseline, 9, 9) + all + codes + kEoi));
-  EXPECT_EQ("refused", Reduced(kSoi + Frame(kBaseline, 8, 8)));
-  EXPECT_EQ("refused", Reduced(kSoi + Frame(kBaseline, 8, 8) +
-                               Times(16, Segment(0xDB, std::string(65'000, 'q'))) + all + kEoi));
+  EXPECT_EQ("damaged", Reduced(kSoi + Frame(kBaseline, 8, 8) + Frame(kBaseline, 9, 9) + all + codes + kEoi));
+  EXPECT_EQ("damaged", Reduced(kSoi + Frame(kBaseline, 8, 8)));
+  EXPECT_EQ("too large", Reduced(kSoi + Frame(kBaseline, 8, 8) +
+                                 Times(16, Segment(0xDB, std::string(65'000, 'q'))) + all + kEoi));
 }
 
 // What a camera tells, with the orientation behind another entry. `type` is 3 for two bytes and 4 for four.
@@ -125,10 +139,7 @@ std::string Directory(bool little, int type, std::uint32_t orientation) {
 }
 
 TEST(PictureBytes, CamerasTellHowAPictureIsSeen) {
-  const auto orientation = [](std::string file) {
-    const auto facts = ReducePicture({reinterpret_cast<std::uint8_t*>(file.data()), file.size()});
-    return facts ? facts->orientation : 0;
-  };
+  const auto orientation = [](std::string file) { return FactsOf(file).orientation; };
   const auto jpeg = [&](const std::string& segments) {
     return orientation(kSoi + segments + Frame(kBaseline, 8, 8) + Segment(0xDA, "\x03......") + kEoi);
   };
@@ -159,14 +170,14 @@ TEST(PictureBytes, GifKeepsItsFirstPicture) {
   const std::string picture("\x2C\x01\0\x01\0\x02\0\x02\0\0\x02\x03\x44\0\x05\0", 16);
   EXPECT_EQ(gif(control + picture + ";"),
             Reduced(gif(comment + control + comment + picture + control + picture + ";")));
-  EXPECT_EQ("refused", Reduced(gif(comment + ";")));
-  EXPECT_EQ("refused", Reduced(gif(control + picture.substr(0, 14))));
+  EXPECT_EQ("damaged", Reduced(gif(comment + ";")));
+  EXPECT_EQ("damaged", Reduced(gif(control + picture.substr(0, 14))));
 
   // Nothing but clear codes, of three bits each: a decoder empties its table for each.
   const std::string clears = "\xFF" + Times(85, "\x24\x49\x92");
   const std::string begin("\x2C\0\0\0\0\x02\0\x02\0\0\x02", 11);
   const auto shown = [&](int blocks) {
-    return Reduced(gif(begin + Times(blocks, clears) + std::string(1, '\0') + ";")) != "refused";
+    return IsShown(gif(begin + Times(blocks, clears) + std::string(1, '\0') + ";"));
   };
   EXPECT_TRUE(shown(700));
   EXPECT_FALSE(shown(800));
@@ -180,8 +191,8 @@ TEST(PictureBytes, BmpFillsItsPicture) {
       return std::string(big.rbegin(), big.rend());
     };
     const std::string format{1, 0, bits, 0, compression};
-    return Reduced("BM" + std::string(8, '\0') + little(54) + little(40) + little(width) + little(height) +
-                   format + std::string(23, '\0') + pixels) != "refused";
+    return IsShown("BM" + std::string(8, '\0') + little(54) + little(40) + little(width) + little(height) +
+                   format + std::string(23, '\0') + pixels);
   };
   // Lines of 24 bits take 12 bytes for three pixels; a negative height counts from the top.
   for (const std::uint32_t height : {2U, 0U - 2U}) {
@@ -205,6 +216,92 @@ TEST(PictureBytes, BmpFillsItsPicture) {
   };
   for (const auto& row : rows)
     EXPECT_EQ(shown(row.width, 2, 8, row.compression, row.code), row.shown) << &row - rows;
+}
+
+// A file whose directory stands behind `pictures`, with numbers of four bytes each.
+using Entries = std::map<std::uint32_t, std::vector<std::uint32_t>>;
+std::string Tiff(const std::string& pictures, const Entries& entries) {
+  std::string directory = Big(static_cast<std::uint32_t>(entries.size()), 2);
+  std::string lists;
+  const std::size_t begin = 8 + pictures.size();
+  for (const auto& [tag, numbers] : entries) {
+    directory += Big(tag, 2) + Big(4, 2) + Big(static_cast<std::uint32_t>(numbers.size()), 4);
+    std::string list;
+    for (const std::uint32_t number : numbers) list += Big(number, 4);
+    if (list.size() > 4) {
+      directory += Big(static_cast<std::uint32_t>(begin + 2 + 12 * entries.size() + lists.size()), 4);
+      lists += list;
+    } else {
+      directory += list;
+    }
+  }
+  return std::string("MM\0*", 4) + Big(static_cast<std::uint32_t>(begin), 4) + pictures + directory + lists;
+}
+
+TEST(PictureBytes, TiffIsWithinTheLimits) {
+  constexpr std::uint32_t kWidth = 0x0100, kHeight = 0x0101, kBits = 0x0102, kPacking = 0x0103,
+                          kOffsets = 0x0111, kLines = 0x0116, kSizes = 0x0117, kTileWidth = 0x0142,
+                          kTileHeight = 0x0143, kTileOffsets = 0x0144, kTileSizes = 0x0145, kTables = 0x015B;
+  const std::string scans = Times(4, "\xFF\xDA");
+  const Entries strips = {
+      {kWidth, {4}}, {kHeight, {4}}, {kLines, {2}}, {kOffsets, {8, 12}}, {kSizes, {4, 4}}};
+  const Entries tiles = {{kWidth, {4}},       {kHeight, {4}},      {kTileWidth, {16}},
+                         {kTileHeight, {16}}, {kTileOffsets, {8}}, {kTileSizes, {8}}};
+  const struct {
+    const char* what;
+    Entries base;
+    Entries with;
+    std::string outcome;
+  } rows[] = {
+      {"strips", strips, {}, "shown"},
+      {"tiles", tiles, {}, "shown"},
+      {"64 megapixels", strips, {{kWidth, {8000}}, {kHeight, {8000}}, {kBits, {32}}}, "shown"},
+      {"more", strips, {{kWidth, {8001}}, {kHeight, {8000}}}, "too large"},
+      {"more for each pixel", strips, {{kWidth, {8000}}, {kHeight, {8000}}, {kBits, {64}}}, "too large"},
+      {"a line without end", strips, {{kWidth, {2'000'000}}}, "too large"},
+      {"no size", strips, {{kWidth, {0}}}, "damaged"},
+      {"a tile for nothing", tiles, {{kTileWidth, {100'000}}, {kTileHeight, {100'000}}}, "too large"},
+      {"tiles for nothing", tiles, {{kHeight, {64'000}}, {kTileWidth, {100'000}}}, "too large"},
+      {"a tile of nothing", tiles, {{kTileHeight, {0}}}, "damaged"},
+      {"cut off", strips, {{kSizes, {4, 400}}}, "damaged"},
+      {"no strips", strips, {{kOffsets, {}}}, "damaged"},
+      {"one without a size", strips, {{kSizes, {4}}}, "damaged"},
+      {"over each other",
+       strips,
+       {{kOffsets, std::vector<std::uint32_t>(999, 8)}, {kSizes, std::vector<std::uint32_t>(999, 100)}},
+       "too large"},
+      {"old JPEG", strips, {{kPacking, {6}}}, "other kind"},
+      {"JPEG", tiles, {{kPacking, {7}}}, "shown"},
+      {"too many scans", tiles, {{kPacking, {7}}, {kTileSizes, {12}}}, "too large"},
+      {"tables", tiles, {{kPacking, {7}}, {kTables, std::vector<std::uint32_t>(70'000, 0)}}, "too large"},
+  };
+  for (const auto& row : rows) {
+    Entries entries = row.with;
+    entries.insert(row.base.begin(), row.base.end());
+    std::string file = Tiff(scans + "\xFF\xDA..", entries);
+    EXPECT_EQ(row.outcome, IsShown(file) ? "shown" : Reduced(file)) << row.what;
+  }
+}
+
+TEST(PictureBytes, OnlyPicturesAreRead) {
+  const struct {
+    std::string head;
+    std::optional<PictureFormat> format;
+  } rows[] = {
+      {{"II*\0", 4}, PictureFormat::kTiff},
+      {"RIFF....WEBP", PictureFormat::kWebp},
+      {"RIFF....WAVE", {}},
+      {"....ftypheic", PictureFormat::kHeif},
+      {"....ftypavif", PictureFormat::kHeif},
+      {"....ftypisom", {}},
+      {"....ftyphei", {}},
+      {"\x89PNG", {}},
+      {"", {}},
+  };
+  for (const auto& row : rows) {
+    const auto* head = reinterpret_cast<const std::uint8_t*>(row.head.data());
+    EXPECT_EQ(row.format, FormatOf({head, row.head.size()})) << row.head;
+  }
 }
 
 }  // namespace

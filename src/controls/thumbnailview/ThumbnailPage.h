@@ -2,6 +2,8 @@
 // the editor over a caption and the button that switches to the list.
 #pragma once
 
+#include <optional>
+
 #include "base/Text.h"
 #include "controls/ControlView.h"
 #include "controls/thumbnailview/PicturePlace.h"
@@ -28,10 +30,11 @@ class ThumbnailPage : public ControlView {
   // "&&" stands for one "&", as in the caption of any label.
   virtual void SetCaption(int slot, TextView caption) = 0;
   // Reads the file, and shows it as soon as it is decoded, which takes no time of the caller's. `place` is
-  // that of the picture as it lies in the file; one that its file has turned stands as it is seen. False when
-  // the file cannot be read. One that turns out to be no picture, or an absurdly large one, leaves the square
-  // empty, too, and ThumbnailPageUser hears of it.
-  virtual bool SetPicture(int slot, TextView path, const PicturePlace& place) = 0;
+  // that of the picture as it lies in the file; one that its file has turned stands as it is seen. Without
+  // it, and for a format that CImageHeight does not know, the place follows from the size that the decoder
+  // tells. False when the file cannot be read or does not begin as a picture. One that turns out to be
+  // damaged, or an absurdly large one, leaves the square empty, too, and ThumbnailPageUser hears of it.
+  virtual bool SetPicture(int slot, TextView path, const std::optional<PicturePlace>& place) = 0;
   // The look of the selected picture.
   virtual void SetSelected(int slot, bool selected) = 0;
 

@@ -230,9 +230,13 @@ bool ctrlThumbNailView::Fetch(int slot, const CUpload& record, const Text& copy)
 
 bool ctrlThumbNailView::ShowPicture(int slot, const Text& copy) {
   return ResultAsItStood(false, [&](bool& shown) {
-    header_.ReadImageInfo(copy);
-    shown = header_.ImageType() != kImageUnknown &&
-            page_.SetPicture(slot, copy, FitImage(header_.Height(), header_.Width()));
+    // Without one for a format that the header reader does not know, or a header that it does not reach.
+    const auto place =
+        ResultAsItStood(std::optional<PicturePlace>(), [&](std::optional<PicturePlace>& fitted) {
+          header_.ReadImageInfo(copy);
+          if (header_.ImageType() != kImageUnknown) fitted = FitImage(header_.Height(), header_.Width());
+        });
+    shown = page_.SetPicture(slot, copy, place);
   });
 }
 

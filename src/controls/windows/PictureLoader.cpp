@@ -8,6 +8,7 @@
 #include <memory>
 #include <optional>
 #include <span>
+#include <utility>
 #include <vector>
 
 #include "platform/windows/ComPtr.h"
@@ -17,6 +18,8 @@ namespace {
 
 // Lines are decoded in strips of about this size, which the cache of a processor core holds.
 constexpr std::size_t kStripBytes = 256 * 1024;
+// Pictures of tiles in strips of more lines, because a decoder unpacks a whole tile for any of its lines.
+constexpr std::uint32_t kTileLines = 1024;
 
 // Larger than any screen; keeps a line of the target small beside the picture.
 constexpr int kLongestTargetSide = 16'384;
@@ -205,6 +208,12 @@ const GUID& Container(PictureFormat format) {
       return GUID_ContainerFormatGif;
     case PictureFormat::kJpeg:
       return GUID_ContainerFormatJpeg;
+    case PictureFormat::kTiff:
+      return GUID_ContainerFormatTiff;
+    case PictureFormat::kWebp:
+      return GUID_ContainerFormatWebp;
+    case PictureFormat::kHeif:
+      return GUID_ContainerFormatHeif;
     case PictureFormat::kBmp:
       break;
   }
@@ -272,18 +281,29 @@ struct Source {
   Layout layout = Layout::kBgra;
 };
 
-// The first picture, in a layout that the averager knows: the decoder's own where that is one of them.
-std::optional<Source> OpenSource(IWICImagingFactory& factory, IStream& stream, const PictureFacts& facts) {
+// The first picture, in a layout that the averager knows: the decoder's own where that is one of them. Tells
+// its size where the file's bytes did not, and what is wrong with it.
+std::optional<Source> OpenSource(IWICImagingFactory& factory, IStream& stream, PictureFacts& facts) {
   ComPtr<IWICBitmapDecoder> decoder;
   ComPtr<IWICBitmapFrameDecode> frame;
   UINT width = 0;
   UINT height = 0;
   WICPixelFormatGUID format = {};
-  if (FAILED(factory.CreateDecoder(Container(facts.format), nullptr, decoder.Receive())) ||
-      FAILED(decoder->Initialize(&stream, WICDecodeMetadataCacheOnDemand)) ||
+  if (FAILED(factory.CreateDecoder(Container(facts.format), nullptr, decoder.Receive()))) {
+    facts.fault = PictureFault::kOtherKind;
+    return {};
+  }
+  facts.fault = PictureFault::kDamaged;
+  if (FAILED(decoder->Initialize(&stream, WICDecodeMetadataCacheOnDemand)) ||
       FAILED(decoder->GetFrame(0, frame.Receive())) || FAILED(frame->GetSize(&width, &height)) ||
       FAILED(frame->GetPixelFormat(&format)))
     return {};
+  if (facts.width == 0) {
+    facts.fault = std::max(width, height) > kLongestSide ? PictureFault::kTooLarge : SizeFault(width, height);
+    if (facts.fault != PictureFault::kNone) return {};
+    facts.width = facts.frameWidth = width;
+    facts.height = facts.frameHeight = height;
+  }
   if (width != facts.frameWidth || height != facts.frameHeight) return {};
 
   const ComPtr<IWICBitmapSource> plain(frame.Get());
@@ -306,8 +326,9 @@ std::optional<Source> OpenSource(IWICImagingFactory& factory, IStream& stream, c
 // Gives all lines of the picture to `averager`; false when one cannot be decoded.
 bool AddLines(const Source& source, const PictureFacts& facts, Averager& averager) {
   const std::size_t stride = std::size_t{facts.width} * BytesPerPixel(source.layout);
-  const auto stripLines = static_cast<std::uint32_t>(
-      std::clamp<std::size_t>(kStripBytes / stride, 1, std::size_t{facts.frameHeight}));
+  const std::size_t wanted =
+      IsMeasured(facts) ? std::max<std::size_t>(kStripBytes / stride, 1) : std::size_t{kTileLines};
+  const auto stripLines = static_cast<std::uint32_t>(std::min<std::size_t>(wanted, facts.frameHeight));
   // Zero is transparent: what stands beside a picture that covers only a part.
   std::vector<std::uint8_t> strip(stride * stripLines);
   const std::size_t indent = std::size_t{facts.left} * BytesPerPixel(source.layout);
@@ -333,33 +354,52 @@ PictureFile Read(const std::wstring& path) {
   const FileOwner file(CreateFileW(path.c_str(), GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_DELETE, nullptr,
                                    OPEN_EXISTING, FILE_FLAG_SEQUENTIAL_SCAN, nullptr));
   LARGE_INTEGER size = {};
+  PictureFile picture;
   if (!file || GetFileType(file.Get()) != FILE_TYPE_DISK || !GetFileSizeEx(file.Get(), &size)) return {};
-  if (size.QuadPart <= 0 || static_cast<std::uint64_t>(size.QuadPart) > kMostPictureBytes) return {};
-  const auto most = static_cast<std::size_t>(size.QuadPart);
-  PictureFile picture = {std::make_unique_for_overwrite<std::uint8_t[]>(most), most};
+  std::array<std::uint8_t, kFormatBytes> head = {};
+  DWORD headCount = 0;
+  if (!ReadFile(file.Get(), head.data(), static_cast<DWORD>(head.size()), &headCount, nullptr) ||
+      headCount == 0)
+    return {};
+  // The account may hold files of any kind and size, which are not read.
+  if (!FormatOf(std::span(head).first(headCount))) {
+    picture.fault = PictureFault::kOtherKind;
+    return picture;
+  }
+  if (static_cast<std::uint64_t>(size.QuadPart) > kMostPictureBytes) {
+    picture.fault = PictureFault::kTooLarge;
+    return picture;
+  }
+  const std::size_t most = std::max(static_cast<std::size_t>(size.QuadPart), std::size_t{headCount});
+  picture.bytes = std::make_unique_for_overwrite<std::uint8_t[]>(most);
+  std::copy_n(head.data(), headCount, picture.bytes.get());
   DWORD count = 0;
-  if (!ReadFile(file.Get(), picture.bytes.get(), static_cast<DWORD>(most), &count, nullptr)) return {};
+  if (!ReadFile(file.Get(), picture.bytes.get() + headCount, static_cast<DWORD>(most - headCount), &count,
+                nullptr))
+    return {};
   // Shorter when somebody cuts it at this moment.
-  picture.size = count;
+  picture.size = headCount + count;
+  picture.fault = PictureFault::kNone;
   return picture;
 }
 
-BitmapOwner Decode(const PictureFile& file, const TargetSize& targetSize, COLORREF background,
-                   const std::function<bool()>& isWanted) {
-  if (!file || !isWanted()) return {};
+DecodedPicture Decode(const PictureFile& file, const TargetSize& targetSize, COLORREF background,
+                      const std::function<bool()>& isWanted) {
+  if (!file) return {{}, file.fault};
+  if (!isWanted()) return {};
   const std::span bytes(file.bytes.get(), file.size);
-  const std::optional<PictureFacts> facts = ReducePicture(bytes);
-  if (!facts) return {};
+  PictureFacts facts = ReducePicture(bytes);
+  if (facts.fault != PictureFault::kNone) return {{}, facts.fault};
 
   ComPtr<IWICImagingFactory> factory;
   if (FAILED(CoCreateInstance(CLSID_WICImagingFactory, nullptr, CLSCTX_INPROC_SERVER,
                               __uuidof(IWICImagingFactory), factory.ReceiveVoid())))
     return {};
-  FileStream stream(bytes.first(facts->length), isWanted);
-  const std::optional<Source> source = OpenSource(*factory, stream, *facts);
-  if (!source) return {};
+  FileStream stream(bytes.first(facts.length), isWanted);
+  const std::optional<Source> source = OpenSource(*factory, stream, facts);
+  if (!source) return {{}, facts.fault};
 
-  const SIZE size = targetSize(*facts);
+  const SIZE size = targetSize(facts);
   if (size.cx <= 0 || size.cy <= 0 || size.cx > kLongestTargetSide || size.cy > kLongestTargetSide) return {};
   BITMAPINFO info = {};
   info.bmiHeader.biSize = sizeof info.bmiHeader;
@@ -370,17 +410,17 @@ BitmapOwner Decode(const PictureFile& file, const TargetSize& targetSize, COLORR
   void* pixels = nullptr;
   BitmapOwner bitmap(CreateDIBSection(nullptr, &info, DIB_RGB_COLORS, &pixels, nullptr, 0));
   if (!bitmap || !pixels) return {};
-  const auto width = static_cast<std::uint32_t>(IsTurned(*facts) ? size.cy : size.cx);
-  const auto height = static_cast<std::uint32_t>(IsTurned(*facts) ? size.cx : size.cy);
+  const auto width = static_cast<std::uint32_t>(IsTurned(facts) ? size.cy : size.cx);
+  const auto height = static_cast<std::uint32_t>(IsTurned(facts) ? size.cx : size.cy);
   // Turned when it is small.
   std::vector<std::uint32_t> stored;
-  if (facts->orientation != 1) stored.resize(std::size_t{width} * height);
+  if (facts.orientation != 1) stored.resize(std::size_t{width} * height);
   auto* seen = static_cast<std::uint32_t*>(pixels);
-  Averager averager(facts->width, facts->height, width, height, source->layout, background,
+  Averager averager(facts.width, facts.height, width, height, source->layout, background,
                     stored.empty() ? seen : stored.data());
-  if (!AddLines(*source, *facts, averager)) return {};
-  if (!stored.empty()) Turn(stored, facts->orientation, size, seen);
-  return bitmap;
+  if (!AddLines(*source, facts, averager)) return {};
+  if (!stored.empty()) Turn(stored, facts.orientation, size, seen);
+  return {std::move(bitmap), PictureFault::kNone};
 }
 
 }  // namespace
@@ -393,8 +433,8 @@ PictureFile ReadPictureFile(const std::wstring& path) {
   }
 }
 
-BitmapOwner DecodePicture(PictureFile file, const TargetSize& targetSize, COLORREF background,
-                          const std::function<bool()>& isWanted) {
+DecodedPicture DecodePicture(PictureFile file, const TargetSize& targetSize, COLORREF background,
+                             const std::function<bool()>& isWanted) {
   try {
     return Decode(file, targetSize, background, isWanted);
   } catch (...) {

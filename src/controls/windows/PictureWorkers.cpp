@@ -27,7 +27,7 @@ DWORD MostWorkers() {
 struct Job {
   std::weak_ptr<const PictureRequest> request;
   PictureFile file;
-  PicturePlace place;
+  std::optional<PicturePlace> place;
   int dpi;
   COLORREF background;
   ShownPicture picture;
@@ -46,10 +46,14 @@ RECT Pixels(const PicturePlace& place, int dpi) {
 void Decode(Job& job) {
   RECT& place = job.picture.place;
   const auto size = [&](const PictureFacts& facts) {
-    place = Pixels(IsTurned(facts) ? Turned(job.place) : job.place, job.dpi);
+    const PicturePlace stored =
+        job.place && IsMeasured(facts)
+            ? *job.place
+            : FitImage(static_cast<std::int32_t>(facts.height), static_cast<std::int32_t>(facts.width));
+    place = Pixels(IsTurned(facts) ? Turned(stored) : stored, job.dpi);
     return SIZE{place.right - place.left, place.bottom - place.top};
   };
-  job.picture.bitmap =
+  job.picture.decoded =
       DecodePicture(std::move(job.file), size, job.background, [&] { return !job.request.expired(); });
 }
 

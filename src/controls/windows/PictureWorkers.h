@@ -6,6 +6,7 @@
 #include <cstdint>
 #include <functional>
 #include <memory>
+#include <optional>
 #include <string>
 
 #include "controls/thumbnailview/PicturePlace.h"
@@ -19,8 +20,8 @@ struct PictureRequest {
   std::wstring path;
   std::uint64_t length = 0;
   std::uint64_t written = 0;  // when, as the file system counts
-  // Of the picture as it lies in the file.
-  PicturePlace place;
+  // Of the picture as it lies in the file; empty when its size is not known.
+  std::optional<PicturePlace> place;
   int dpi = 0;
   COLORREF background = 0;
 
@@ -30,7 +31,7 @@ struct PictureRequest {
 // A picture as large as it is shown, at `place` in its slot's frame, in pixels. Empty when it cannot be
 // shown.
 struct ShownPicture {
-  BitmapOwner bitmap;
+  DecodedPicture decoded;
   RECT place = {};
 };
 

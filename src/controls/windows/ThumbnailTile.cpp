@@ -51,9 +51,9 @@ void DrawTile(HDC dc, const RECT& frame, const ThumbnailTile& tile, const TileSt
   if (tile.picture) {
     const RECT place = placed(tile.place);
     const MemoryDcOwner memory(CreateCompatibleDC(nullptr));
-    const SelectionOwner picture = SelectInto(memory.Get(), tile.picture->bitmap.Get());
+    const SelectionOwner picture = SelectInto(memory.Get(), tile.picture->decoded.bitmap.Get());
     BITMAP bitmap = {};
-    GetObjectW(tile.picture->bitmap.Get(), sizeof bitmap, &bitmap);
+    GetObjectW(tile.picture->decoded.bitmap.Get(), sizeof bitmap, &bitmap);
     // One to one on the screen, as a rule; a printer may map pixels to many.
     SetStretchBltMode(dc, HALFTONE);
     SetBrushOrgEx(dc, 0, 0, nullptr);

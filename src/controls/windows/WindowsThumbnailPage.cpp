@@ -235,7 +235,7 @@ void WindowsThumbnailPage::ApplyCaption(int slot) {
   InvalidateRect(changed.window, nullptr, FALSE);
 }
 
-bool WindowsThumbnailPage::SetPicture(int slot, TextView path, const PicturePlace& place) {
+bool WindowsThumbnailPage::SetPicture(int slot, TextView path, const std::optional<PicturePlace>& place) {
   Slot& changed = At(slot);
   changed.path = WideFromText(path);
   changed.twips = place;
@@ -287,7 +287,7 @@ void WindowsThumbnailPage::TakePicture(const std::shared_ptr<const PictureReques
   const auto slot = std::ranges::find(slots_, request, &Slot::awaited);
   if (slot == slots_.end()) return;
   slot->awaited = {};
-  if (picture.bitmap) {
+  if (picture.decoded) {
     Show(*slot, std::make_shared<const ShownPicture>(std::move(picture)));
     pictures_.Keep(*request, slot->picture);
     Redraw(*slot);

@@ -46,7 +46,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void ShowSlot(int slot, bool shown) override;
   void ClearSlot(int slot) override;
   void SetCaption(int slot, TextView caption) override;
-  bool SetPicture(int slot, TextView path, const PicturePlace& place) override;
+  bool SetPicture(int slot, TextView path, const std::optional<PicturePlace>& place) override;
   void SetSelected(int slot, bool selected) override;
   void SetScrollRange(int max) override { scrollBar_.SetRange(max); }
   void EnableScroll(bool enabled) override { scrollBar_.Enable(enabled); }
@@ -65,7 +65,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
     HWND window = nullptr;
     // Where the picture comes from and goes to.
     std::wstring path;
-    PicturePlace twips;
+    std::optional<PicturePlace> twips;
     // The picture that a worker decodes for the slot; null when there is none.
     std::shared_ptr<const PictureRequest> awaited;
     bool shown = true;

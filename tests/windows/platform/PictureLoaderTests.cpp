@@ -136,8 +136,10 @@ class PictureLoaderTest : public testing::Test {
     return ShownFile(width, height);
   }
   Pixels ShownFile(int width, int height) {
-    const BitmapOwner bitmap = LoadPicture(path_, width, height, kBackground);
-    if (!bitmap) return {};
+    const DecodedPicture picture = LoadPicture(path_, width, height, kBackground);
+    fault_ = picture.fault;
+    if (!picture) return {};
+    const BitmapOwner& bitmap = picture.bitmap;
     DIBSECTION section = {};
     EXPECT_EQ(sizeof section, static_cast<std::size_t>(GetObjectW(bitmap.Get(), sizeof section, &section)));
     EXPECT_EQ(width, section.dsBm.bmWidth);
@@ -147,6 +149,8 @@ class PictureLoaderTest : public testing::Test {
   }
 
   std::wstring path_;
+  // Why the file that was shown last was not.
+  PictureFault fault_ = PictureFault::kNone;
 };
 
 // The exact average of what each pixel of the target covers, by the definition: both grids are put on one
@@ -185,6 +189,7 @@ TEST_F(PictureLoaderTest, EachPixelIsTheAverageOfWhatItCovers) {
 TEST_F(PictureLoaderTest, EachFormatIsToldByItsBytes) {
   const Picture picture = Colours(4, 2);
   EXPECT_EQ(picture.pixels, Shown(Bmp(picture), 4, 2));
+  EXPECT_EQ(picture.pixels, Shown(Encoded(GUID_ContainerFormatTiff, picture), 4, 2));
   // The average of all pixels, as another program tells it.
   for (const auto& [name, average] :
        {std::pair{"deep-field.png", 0x121312}, {"wizard.gif", 0xD6D6DF}, {"coffee.jpg", 0x9E5533}}) {
@@ -262,23 +267,28 @@ TEST_F(PictureLoaderTest, TheBackgroundShowsThrough) {
 }
 
 TEST_F(PictureLoaderTest, ABrokenFileIsNotShown) {
-  const std::pair<const char*, Bytes> files[] = {{"PNG", FileOf("horse.png")},
-                                                 {"GIF", FileOf("wizard.gif")},
-                                                 {"JPEG", FileOf("rose.jpg")},
-                                                 {"BMP", Bmp(Colours(64, 64))}};
+  const std::pair<const char*, Bytes> files[] = {
+      {"PNG", FileOf("horse.png")},
+      {"GIF", FileOf("wizard.gif")},
+      {"JPEG", FileOf("rose.jpg")},
+      {"BMP", Bmp(Colours(64, 64))},
+      {"TIFF", Encoded(GUID_ContainerFormatTiff, Colours(64, 64))}};
   for (const auto& [name, bytes] : files) {
     EXPECT_FALSE(Shown(bytes, 2, 2).empty()) << name;
     Bytes cut = bytes;
     for (const std::size_t length : {bytes.size() * 9 / 10, bytes.size() / 2, std::size_t{3}}) {
       cut.resize(length);
       EXPECT_TRUE(Shown(cut, 2, 2).empty()) << name << " cut after " << length << " of " << bytes.size();
+      EXPECT_EQ(FormatOf(cut) ? PictureFault::kDamaged : PictureFault::kOtherKind, fault_) << name;
     }
     Bytes noise = bytes;
     for (std::size_t i = 12; i < noise.size(); ++i) noise[i] = static_cast<std::uint8_t>(i * 77);
     EXPECT_TRUE(Shown(noise, 2, 2).empty()) << name << " with noise";
   }
   EXPECT_TRUE(Shown({}, 2, 2).empty());
+  EXPECT_EQ(PictureFault::kDamaged, fault_);
   EXPECT_TRUE(Shown(Bytes(200, 'x'), 2, 2).empty());
+  EXPECT_EQ(PictureFault::kOtherKind, fault_);
 
   Write(files[0].second);
   for (const int width : {0, -1, 20'000}) EXPECT_TRUE(ShownFile(width, 1).empty());
@@ -325,6 +335,7 @@ TEST_F(PictureLoaderTest, AFileThatClaimsTooMuchIsNotShown) {
     put(row.width, 8001);
     put(row.height, 8000);
     EXPECT_TRUE(Shown(bytes, 2, 2).empty()) << row.name;
+    EXPECT_EQ(PictureFault::kTooLarge, fault_) << row.name;
   }
 }
 

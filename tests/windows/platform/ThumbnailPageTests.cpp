@@ -7,6 +7,7 @@
 
 #include <functional>
 #include <memory>
+#include <span>
 #include <string>
 #include <vector>
 
@@ -132,9 +133,12 @@ class PictureFile {
     bytes[54] = GetBValue(color);
     bytes[55] = GetGValue(color);
     bytes[56] = GetRValue(color);
+    Write({bytes, sizeof bytes});
+  }
+  void Write(std::span<const unsigned char> bytes) const {
     const FileOwner file(CreateFileW(path_.c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr));
     DWORD written = 0;
-    WriteFile(file.Get(), bytes, sizeof bytes, &written, nullptr);
+    WriteFile(file.Get(), bytes.data(), static_cast<DWORD>(bytes.size()), &written, nullptr);
   }
 
  private:
@@ -283,7 +287,7 @@ TEST_F(ThumbnailPageTest, DrawsPicturesSelectionAndCaptions) {
   const COLORREF window = GetSysColor(COLOR_WINDOW);
   const COLORREF highlight = GetSysColor(COLOR_HIGHLIGHT);
 
-  page_->SetPicture(1, file_.Path(), {150, 671.5, 1965, 982});
+  page_->SetPicture(1, file_.Path(), PicturePlace{150, 671.5, 1965, 982});
   page_->SetPicture(3, u"C:\\no such picture.gif", kWholeSquare);
   page_->SetSelected(1, true);
   page_->ShowSlot(4, false);
@@ -301,6 +305,24 @@ TEST_F(ThumbnailPageTest, DrawsPicturesSelectionAndCaptions) {
   EXPECT_EQ(pixel(3, 1130, 1160), window);
   EXPECT_NE(pixel(3, 0, 1000), window);
   EXPECT_EQ(pixel(4, 0, 1000), window);
+
+  // Two grey pixels side by side that are seen one above the other, with a size that only a decoder tells.
+  const unsigned char tiff[] = {'I', 'I', 42, 0, 8, 0, 0, 0, 9,   0,        //
+                                0,   1,   4,  0, 1, 0, 0, 0, 2,   0, 0, 0,  // width
+                                1,   1,   4,  0, 1, 0, 0, 0, 1,   0, 0, 0,  // height
+                                2,   1,   3,  0, 1, 0, 0, 0, 8,   0, 0, 0,  // bits
+                                3,   1,   3,  0, 1, 0, 0, 0, 1,   0, 0, 0,  // as they are
+                                6,   1,   3,  0, 1, 0, 0, 0, 1,   0, 0, 0,  // black is 0
+                                17,  1,   4,  0, 1, 0, 0, 0, 122, 0, 0, 0,  // where
+                                18,  1,   3,  0, 1, 0, 0, 0, 6,   0, 0, 0,  // from the right
+                                22,  1,   4,  0, 1, 0, 0, 0, 1,   0, 0, 0,  // lines
+                                23,  1,   4,  0, 1, 0, 0, 0, 2,   0, 0, 0, 0, 0, 0, 0, 80, 160};
+  file_.Write(tiff);
+  EXPECT_TRUE(page_->SetPicture(1, file_.Path(), std::nullopt));
+  page_->Draw(dc, size);
+  EXPECT_EQ(pixel(1, 1130, 640), RGB(80, 80, 80));
+  EXPECT_EQ(pixel(1, 1130, 1690), RGB(160, 160, 160));
+  EXPECT_EQ(pixel(1, 620, 640), window);
 
   page_->SetSelected(1, false);
   page_->SetPicture(2, u"", kWholeSquare);
