@@ -15,6 +15,7 @@ struct FakeThumbnailPage : ThumbnailPage {
   struct Slot {
     bool shown = false;
     std::string caption;
+    std::string tip;
     std::string picture;
     PicturePlace place;
     bool selected = false;
@@ -53,12 +54,14 @@ struct FakeThumbnailPage : ThumbnailPage {
   void ShowSlot(int slot, bool shown) override { At(slot).shown = shown; }
   void ClearSlot(int slot) override {
     At(slot).caption.clear();
+    At(slot).tip.clear();
     At(slot).picture.clear();
   }
   void SetCaption(int slot, TextView caption) override {
     At(slot).caption = Utf8FromText(caption);
     log.push_back("caption " + std::to_string(slot) + " " + At(slot).caption);
   }
+  void SetTip(int slot, TextView tip) override { At(slot).tip = Utf8FromText(tip); }
   bool SetPicture(int slot, TextView path, const std::optional<PicturePlace>& place) override {
     log.push_back("picture " + std::to_string(slot) + (place ? "" : " without a place"));
     // As if only what has a place were a picture.

@@ -223,6 +223,17 @@ TEST(ThumbNail, ShortensCaptions) {
   EXPECT_EQ(FormatLabelText(u"exactly-twenty-c.jpg"), u"exactly-twenty-c.jpg");
   EXPECT_EQ(FormatLabelText(u"Tom & Jerry.jpg"), u"Tom && Jerry.jpg");
   EXPECT_EQ(FormatLabelText(u"0123456789&&&&&&&&&&&.gif"), u"0123456789&&&&&&....gif");
+
+  // Tips say all; nothing in them turns the line or begins one.
+  CUpload file;
+  file.FileName = u"averyveryverylong & \u202Ename.jpeg";
+  file.FileDate = u"3/1/2024\n1:02:03 PM";
+  file.FileSize = 2560;
+  EXPECT_EQ(FormatTip(file),
+            u"averyveryverylong & \uFFFDname.jpeg\r\n2560 Bytes (2 KB)\r\n3/1/2024\uFFFD1:02:03 PM");
+  file.FileDate = Text();
+  file.FileSize = -1;
+  EXPECT_EQ(FormatTip(file), u"averyveryverylong & \uFFFDname.jpeg");
 }
 
 // --- Fetching ---
@@ -553,6 +564,7 @@ TEST_F(ThumbNailTest, EditsTheNameInPlace) {
   control.OnEditorEntered();
   EXPECT_EQ(log.front(), "caption 2 new && old.jpg") << "as it was edited, until it is renamed";
   EXPECT_EQ(Events(), "1031 ,");
+  EXPECT_EQ(page.At(2).tip.find("new & old.gif"), 0U) << page.At(2).tip;
   EXPECT_EQ(page.Look(), "1.gif new && old.gif* 3.gif 4.gif ");
   EXPECT_EQ(Shown() + Records(), "1.gif,new & old.gif,3.gif,4.gif,1.gif,new & old.gif,3.gif,4.gif,");
   EXPECT_TRUE(HasCopy("new & old.gif") && !HasCopy("2.gif"));

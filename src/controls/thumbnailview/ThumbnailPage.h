@@ -25,10 +25,12 @@ class ThumbnailPage : public ControlView {
 
   // Frame and caption of a slot.
   virtual void ShowSlot(int slot, bool shown) = 0;
-  // Takes the picture out and empties the caption.
+  // Takes the picture out and empties caption and tip.
   virtual void ClearSlot(int slot) = 0;
   // "&&" stands for one "&", as in the caption of any label.
   virtual void SetCaption(int slot, TextView caption) = 0;
+  // What is told when the pointer rests on the slot, in lines. The page adds why its picture is not shown.
+  virtual void SetTip(int slot, TextView tip) = 0;
   // Reads the file, and shows it as soon as it is decoded, which takes no time of the caller's. `place` is
   // that of the picture as it lies in the file; one that its file has turned stands as it is seen. Without
   // it, and for a format that CImageHeight does not know, the place follows from the size that the decoder

@@ -12,6 +12,7 @@
 #include "session/ResourceStrings.h"
 #include "session/UserFolder.h"
 #include "support/PathHelpers.h"
+#include "transfer/FileNameGuard.h"
 
 namespace tarnwick {
 namespace {
@@ -29,6 +30,16 @@ Text FormatLabelText(TextView name) {
   if (caption.size() > kCaptionLength)
     caption = Text(name.substr(0, 13)) + u"..." + Text(name.substr(name.size() - 4));
   return ReplaceAll(caption, u"&", u"&&");
+}
+
+Text FormatTip(const CUpload& file) {
+  Text tip = ShownName(file.FileName);
+  // What is 2 GiB and more has a negative size after an upload.
+  if (file.FileSize >= 0)
+    tip +=
+        u"\r\n" + SizeText(file.FileSize) + u" Bytes (" + TextFromNumber(Kilobytes(file.FileSize)) + u" KB)";
+  if (!TextView(file.FileDate).empty()) tip += u"\r\n" + ShownName(file.FileDate);
+  return tip;
 }
 
 ctrlThumbNailView::ctrlThumbNailView(const ControlParts& parts, ThumbnailPage& page)
@@ -185,6 +196,7 @@ void ctrlThumbNailView::FillPage(int first) {
 
 bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
   FileSystem& files = apartment_.platform.files;
+  page_.SetTip(slot, FormatTip(record));
   // Another user's folder is none for these pictures.
   Text copy = ShowsOtherAccount() ? Text() : copies_.PathOf(record.FilePath);
   // Once more when the file was changed in the account meanwhile; not when it was deleted.

@@ -15,6 +15,9 @@ namespace tarnwick {
 // The caption for a file's name: at most 20 characters, and "&&" for each "&".
 Text FormatLabelText(TextView name);
 
+// All of a file's name, its size and its date, in lines.
+Text FormatTip(const CUpload& file);
+
 class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
  public:
   ctrlThumbNailView(const ControlParts& parts, ThumbnailPage& page);

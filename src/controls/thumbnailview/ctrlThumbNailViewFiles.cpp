@@ -161,6 +161,7 @@ void ctrlThumbNailView::ShowRenamed(const FileRecord& record, const Text& oldUrl
     if (AddressOf(slot) != before) continue;
     AddressOf(slot) = renamed->FilePath;
     page_.SetCaption(slot, FormatLabelText(newName));
+    page_.SetTip(slot, FormatTip(*renamed));
   }
 }
 

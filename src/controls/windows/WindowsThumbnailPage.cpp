@@ -24,6 +24,23 @@ constexpr wchar_t kEditorName[] = L"New name";
 constexpr wchar_t kSlotName[] = L"Picture ";
 constexpr wchar_t kSwitchText[] = L"List view";
 
+// In pixels at 96 dots per inch; a longer line goes on below.
+constexpr int kTipWidth = 400;
+
+const wchar_t* ReasonOf(PictureFault fault) {
+  switch (fault) {
+    case PictureFault::kDamaged:
+      return L"Not shown: the file is damaged or cannot be read.";
+    case PictureFault::kTooLarge:
+      return L"Not shown: the picture is too large.";
+    case PictureFault::kOtherKind:
+      return L"Not shown: this is another kind of file.";
+    case PictureFault::kNone:
+      break;
+  }
+  return L"";
+}
+
 constexpr COLORREF kLinkColor = RGB(0, 0, 255);
 
 constexpr UINT kLinkFormat = DT_CENTER | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
@@ -93,6 +110,7 @@ void WindowsThumbnailPage::DpiChanged(int before) {
 void WindowsThumbnailPage::WindowGone() {
   gridWindow_ = scrollWindow_ = messageWindow_ = linkWindow_ = switchWindow_ = editorWindow_ = nullptr;
   for (Slot& slot : slots_) slot.window = nullptr;
+  tips_ = {};
   scrollBar_.SetWindow(nullptr);
   edited_ = 0;
   tellingFocus_ = tellingEditor_ = false;
@@ -218,7 +236,11 @@ void WindowsThumbnailPage::ShowSlot(int slot, bool shown) {
 void WindowsThumbnailPage::ClearSlot(int slot) {
   At(slot).picture = {};
   At(slot).awaited = {};
+  At(slot).fault = PictureFault::kNone;
+  SetTip(slot, {});
   SetCaption(slot, {});
+  // It may show what was there.
+  if (tips_) SendMessageW(tips_.Get(), TTM_POP, 0, 0);
 }
 
 void WindowsThumbnailPage::SetCaption(int slot, TextView caption) {
@@ -257,6 +279,7 @@ void WindowsThumbnailPage::Redraw(const Slot& slot) {
 // loaded.
 bool WindowsThumbnailPage::LoadPictureOf(Slot& slot) {
   if (!slot.picture) slot.place = Pixels(layout::kPicture);
+  slot.fault = PictureFault::kNone;
   WIN32_FILE_ATTRIBUTE_DATA file = {};
   if (!GetFileAttributesExW(slot.path.c_str(), GetFileExInfoStandard, &file)) return false;
   const auto joined = [](DWORD high, DWORD low) { return std::uint64_t{high} << 32 | low; };
@@ -271,6 +294,7 @@ bool WindowsThumbnailPage::LoadPictureOf(Slot& slot) {
   // Read here and now, in a few milliseconds: as long as a worker had the file open, it could not be
   // replaced, and a rename meanwhile would take it away.
   PictureFile bytes = ReadPictureFile(slot.path);
+  if (!bytes && !slot.picture) slot.fault = bytes.fault;
   if (!bytes || !workers_.Start(request, std::move(bytes))) return false;
   slot.awaited = request;
   return true;
@@ -292,6 +316,7 @@ void WindowsThumbnailPage::TakePicture(const std::shared_ptr<const PictureReques
     pictures_.Keep(*request, slot->picture);
     Redraw(*slot);
   } else if (!slot->picture) {
+    slot->fault = picture.decoded.fault;
     user_->OnPictureUnreadable(static_cast<int>(slot - slots_.begin()) + 1);
   }
 }
@@ -413,7 +438,17 @@ std::optional<LRESULT> WindowsThumbnailPage::OnOuterMessage(UINT message, WPARAM
 std::optional<LRESULT> WindowsThumbnailPage::OnGridMessage(HWND window, UINT message, WPARAM wParam,
                                                            LPARAM lParam) {
   const POINT at = {static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))};
+  if (message >= WM_MOUSEFIRST && message <= WM_MOUSELAST && window != gridWindow_)
+    RelayToTips({window, message, wParam, lParam, 0, {}});
   switch (message) {
+    case WM_NOTIFY: {
+      auto& header = *reinterpret_cast<NMHDR*>(lParam);
+      if (header.hwndFrom != tips_.Get() || header.code != TTN_GETDISPINFOW) return std::nullopt;
+      const int slot = SlotOf(reinterpret_cast<HWND>(header.idFrom));
+      tipText_ = slot == 0 ? std::wstring() : TipOf(At(slot));
+      reinterpret_cast<NMTTDISPINFOW&>(header).lpszText = tipText_.data();
+      return 0;
+    }
     case WM_PAINT:
       PaintGrid(window);
       return 0;
@@ -449,6 +484,37 @@ std::optional<LRESULT> WindowsThumbnailPage::OnGridMessage(HWND window, UINT mes
     default:
       return std::nullopt;
   }
+}
+
+void WindowsThumbnailPage::RelayToTips(const MSG& message) {
+  if (IsWindow(tips_.Get()) || MakeTips())
+    SendMessageW(tips_.Get(), TTM_RELAYEVENT, 0, reinterpret_cast<LPARAM>(&message));
+}
+
+// False on failure.
+bool WindowsThumbnailPage::MakeTips() {
+  // A name is shown with each "&" that it has.
+  tips_ = Owner<HWND, DestroyWindow>(CreateWindowExW(
+      WS_EX_TOPMOST, TOOLTIPS_CLASSW, nullptr, WS_POPUP | TTS_ALWAYSTIP | TTS_NOPREFIX, CW_USEDEFAULT,
+      CW_USEDEFAULT, CW_USEDEFAULT, CW_USEDEFAULT, GetAncestor(Outer(), GA_ROOT), nullptr, nullptr, nullptr));
+  if (!tips_) return false;
+  SendMessageW(tips_.Get(), TTM_SETMAXTIPWIDTH, 0, MulDiv(kTipWidth, Dpi(), 96));
+  for (const Slot& slot : slots_) {
+    TTTOOLINFOW tool = {};
+    // The size that all versions of the common controls take.
+    tool.cbSize = TTTOOLINFOW_V2_SIZE;
+    tool.uFlags = TTF_IDISHWND;
+    tool.hwnd = gridWindow_;
+    tool.uId = reinterpret_cast<UINT_PTR>(slot.window);
+    tool.lpszText = LPSTR_TEXTCALLBACKW;
+    SendMessageW(tips_.Get(), TTM_ADDTOOLW, 0, reinterpret_cast<LPARAM>(&tool));
+  }
+  return true;
+}
+
+std::wstring WindowsThumbnailPage::TipOf(const Slot& slot) {
+  const std::wstring tip = WideFromText(slot.tip);
+  return tip.empty() || slot.fault == PictureFault::kNone ? tip : tip + L"\r\n" + ReasonOf(slot.fault);
 }
 
 LRESULT WindowsThumbnailPage::OnPress(HWND window, UINT message, POINT at) {

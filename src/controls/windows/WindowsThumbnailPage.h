@@ -8,6 +8,7 @@
 #include <array>
 #include <memory>
 #include <optional>
+#include <string>
 
 #include "controls/thumbnailview/ThumbnailPage.h"
 #include "controls/thumbnailview/ThumbnailPageUser.h"
@@ -46,6 +47,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void ShowSlot(int slot, bool shown) override;
   void ClearSlot(int slot) override;
   void SetCaption(int slot, TextView caption) override;
+  void SetTip(int slot, TextView tip) override { At(slot).tip = tip; }
   bool SetPicture(int slot, TextView path, const std::optional<PicturePlace>& place) override;
   void SetSelected(int slot, bool selected) override;
   void SetScrollRange(int max) override { scrollBar_.SetRange(max); }
@@ -68,6 +70,9 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
     std::optional<PicturePlace> twips;
     // The picture that a worker decodes for the slot; null when there is none.
     std::shared_ptr<const PictureRequest> awaited;
+    Text tip;
+    // Why the picture is not shown; kNone also when there is no file.
+    PictureFault fault = PictureFault::kNone;
     bool shown = true;
   };
   enum class Content { kNothing, kGrid, kEmptyAccount };
@@ -81,6 +86,9 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   std::optional<LRESULT> OnGridMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
   std::optional<LRESULT> OnEditorMessage(UINT message, WPARAM wParam, LPARAM lParam);
   std::optional<LRESULT> OnButtonMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
+  void RelayToTips(const MSG& message);
+  bool MakeTips();
+  static std::wstring TipOf(const Slot& slot);
   LRESULT OnFocus(HWND window, WPARAM wParam, LPARAM lParam);
   LRESULT OnPress(HWND window, UINT message, POINT at);
   LRESULT OnMove(POINT at);
@@ -123,6 +131,11 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   HWND linkWindow_ = nullptr;
   HWND switchWindow_ = nullptr;
   HWND editorWindow_ = nullptr;
+  // Made when the pointer comes to a slot first. It belongs to the host's window of that moment, and may be
+  // gone with it.
+  Owner<HWND, DestroyWindow> tips_;
+  // As long as the window of the tips reads it.
+  std::wstring tipText_;
   // The slot whose name is edited, or 0.
   int edited_ = 0;
   // The control is being told of the focus, or of the end of the edit: what follows from that is no news.

@@ -5,15 +5,18 @@
 #include <gtest/gtest.h>
 #include <objbase.h>
 
+#include <algorithm>
 #include <functional>
 #include <memory>
 #include <span>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "controls/windows/WindowsScrollHook.h"
 #include "controls/windows/WindowsThumbnailPage.h"
 #include "platform/windows/AnsiText.h"
+#include "platform/windows/CommonControls.h"
 #include "platform/windows/SystemDpi.h"
 
 namespace tarnwick {
@@ -375,6 +378,58 @@ TEST_F(ThumbnailPageTest, DrawsAPictureWhenItIsDecoded) {
   Await([&] { return !user_.told.empty() && Seen(3) != window; });
   EXPECT_EQ(user_.Take(), Told{"unreadable 1"});
   EXPECT_EQ(Seen(1), window);
+}
+
+// The text of the tip that a slot has once the pointer was over it.
+std::wstring TipOver(HWND slot) {
+  SendMessageW(slot, WM_MOUSEMOVE, 0, MAKELPARAM(9, 9));
+  std::wstring tip(300, L'\0');
+  const auto ask = [](HWND window, LPARAM param) -> BOOL {
+    wchar_t name[40] = {};
+    GetClassNameW(window, name, 40);
+    if (std::wstring(name) != TOOLTIPS_CLASSW) return TRUE;
+    auto& tool = *reinterpret_cast<TTTOOLINFOW*>(param);
+    return SendMessageW(window, TTM_GETTEXTW, 300, param), tool.lpszText[0] == L'\0';
+  };
+  TTTOOLINFOW tool = {};
+  tool.cbSize = TTTOOLINFOW_V2_SIZE;
+  tool.hwnd = GetParent(slot);
+  tool.uId = reinterpret_cast<UINT_PTR>(slot);
+  tool.lpszText = tip.data();
+  EnumThreadWindows(GetCurrentThreadId(), ask, reinterpret_cast<LPARAM>(&tool));
+  tip.resize(wcslen(tip.c_str()));
+  return tip;
+}
+
+TEST_F(ThumbnailPageTest, TipsSayWhyAPictureIsNotShown) {
+  const PictureFile broken(L"thumbnail-broken.picture", 0);
+  page_->SetTip(2, u"Tom & J\u00E9r\u014Dme.gif\r\n12 Bytes");
+  EXPECT_EQ(TipOver(Slot(2)), L"Tom & J\u00E9r\u014Dme.gif\r\n12 Bytes");
+  const auto expect = [&](bool shows, std::wstring_view reason) {
+    page_->ClearSlot(1);
+    EXPECT_EQ(TipOver(Slot(1)), L"");
+    page_->SetTip(1, u"name");
+    EXPECT_EQ(page_->SetPicture(1, broken.Path(), kWholeSquare), shows);
+    if (shows) Await([&] { return !user_.told.empty(); });
+    user_.Take();
+    EXPECT_NE(TipOver(Slot(1)).find(reason), std::wstring::npos) << reason.data();
+  };
+  broken.Write(0, 2);
+  expect(true, L"name\r\nNot shown: the file is damaged");
+  std::vector<unsigned char> bytes(100, 'x');
+  broken.Write(bytes);
+  expect(false, L"name\r\nNot shown: this is another kind");
+  const std::string huge("GIF89a\xFF\xFF\xFF\xFF\0\0\0,\0\0\0\0\xFF\xFF\xFF\xFF", 22);
+  std::copy(huge.begin(), huge.end(), bytes.begin());
+  broken.Write(bytes);
+  expect(true, L"name\r\nNot shown: the picture is too large");
+  // What is shown has nothing more to say, in another window of the host's, too.
+  DestroyWindow(page_->Window());
+  Place(page_->Window());
+  page_->SetTip(1, u"name");
+  page_->SetPicture(1, file_.Path(), kWholeSquare);
+  Await([&] { return Seen(1) == RGB(200, 30, 90); });
+  EXPECT_EQ(TipOver(Slot(1)), L"name");
 }
 
 TEST_F(ThumbnailPageTest, APictureThatWasLeftIsNotDrawn) {
