@@ -72,7 +72,7 @@ void LookFor(TextView password) {
 }
 
 // Short ones lie inside the objects that hold them, long ones in blocks of their own.
-constexpr TextView kShort = u"Ulme7x";
+constexpr TextView kShort = u"Ulmen7x";
 constexpr TextView kLong = u"Rosmarin4Lindenblatt5Wacholderbeere";
 constexpr TextView kRefused = u"Espenlaub4Weidenkorb";
 constexpr TextView kKey = u"Haselnuss1Holunder";
