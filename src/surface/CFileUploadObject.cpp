@@ -204,7 +204,7 @@ STDMETHODIMP CFileUploadObject::DeleteUser(BSTR ProductID, BSTR Username, VARIAN
                                            LONG* result) {
   const ComPtr<IUnknown> alive = KeptAlive();
   return Answered(result, 0, [&] {
-    *result = client_->DeleteUser(ViewOf(ProductID), ViewOf(Username), TextFromVariant(Password));
+    *result = client_->DeleteUser(ViewOf(ProductID), ViewOf(Username), Secret(TextFromVariant(Password)));
   });
 }
 
@@ -215,7 +215,8 @@ STDMETHODIMP CFileUploadObject::IsValidUserID(VARIANT Username, VARIANT ProductI
 }
 
 STDMETHODIMP CFileUploadObject::GetKeyForUser(BSTR ProductID, BSTR Username, BSTR* result) {
-  return AnsweredText(result, [&] { return client_->GetKeyForUser(ViewOf(ProductID), ViewOf(Username)); });
+  return AnsweredText(result,
+                      [&] { return Secret(client_->GetKeyForUser(ViewOf(ProductID), ViewOf(Username))); });
 }
 
 STDMETHODIMP CFileUploadObject::EmailKeyToUser(BSTR ProductID, BSTR Username, LONG* blnNewUser,

@@ -12,6 +12,7 @@
 #include <optional>
 #include <string>
 
+#include "base/Secret.h"
 #include "base/Text.h"
 #include "platform/windows/Owner.h"
 
@@ -23,6 +24,10 @@ using HttpOwner = Owner<HINTERNET, WinHttpCloseHandle>;
 // go of the request.
 struct HttpExchange {
   explicit HttpExchange(bool isSecure) : secure(isSecure) {}
+  // Forms and the heads of uploads hold passwords, some answers hold keys.
+  ~HttpExchange() {
+    for (std::string* const bytes : {&piece, &next, &answer}) Wipe(*bytes);
+  }
 
   const bool secure;
   // Something was told.
@@ -43,7 +48,9 @@ struct HttpExchange {
   // The peer has ended the connection while its answer was read.
   std::atomic<bool> ended = false;
   std::atomic<bool> closed = false;
+  // What is sent, and what is read meanwhile.
   std::string piece;
+  std::string next;
   std::string answer;
 
   // Posts `message` with a notification and its `count` to the window from here on; with null, to none.

@@ -127,7 +127,7 @@ bool Request::Done(DWORD expected, Call&& call) {
 // source that is not wanted any more can keep the body from being whole until then.
 bool Request::SendBody() {
   const std::uint64_t step = std::clamp(length_ / 100, kLeastStep, kMostStep);
-  std::string next;
+  std::string& next = exchange_.next;
   int quick = 0;  // pieces in a row
   std::uint64_t read = 0;
   const auto readNext = [&] {

@@ -5,6 +5,7 @@
 #include <string>
 #include <utility>
 
+#include "base/Secret.h"
 #include "platform/HttpTransport.h"
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/InternetOwner.h"
@@ -73,10 +74,11 @@ class WindowsInternetSession : public InternetSession {
                                             TextView password) override {
     const auto ansiHost = Argument(host);
     const auto ansiUser = Argument(userName);
-    const auto ansiPassword = Argument(password);
+    auto ansiPassword = Argument(password);
     if (!ansiHost || ansiHost->empty() || !ansiUser || !ansiPassword) return nullptr;
     InternetOwner connection(InternetConnectA(session_.Get(), ansiHost->c_str(), port, ansiUser->c_str(),
                                               ansiPassword->c_str(), INTERNET_SERVICE_FTP, 0, 0));
+    Wipe(*ansiPassword);
     if (!connection) return nullptr;
     return std::make_unique<WindowsFtpConnection>(std::move(connection));
   }
