@@ -27,8 +27,9 @@ constexpr DWORD kManyBytes = 4096;
 constexpr ULONGLONG kQuickMs = 20;
 constexpr ULONGLONG kSlowMs = 200;
 
-// The time-outs of the system for what is left behind.
-constexpr std::uint32_t kLeftBehindMs = 30'000;
+// The time-outs of the system for what is left behind. How long a silence may last is the download's to say,
+// which allows for less.
+constexpr std::uint32_t kLeftBehindMs = 60'000;
 
 }  // namespace
 
