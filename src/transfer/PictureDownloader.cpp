@@ -154,14 +154,16 @@ bool PictureDownloader::GivesUp() {
 }
 
 void PictureDownloader::Connect(const DownloadPlan& plan) {
+  ByteStream& stream = plan.secure ? static_cast<ByteStream&>(secureFetch_) : socket_;
+  // One that fell silent in a session of the other kind is open still, and its end would pass for this one's.
+  if (stream_ != &stream) stream_->Close();
+  stream_ = &stream;
   // It tells nothing yet, so the event still comes first; and what the host does there finds a download to
   // end.
   if (plan.secure) {
-    stream_ = &secureFetch_;
     secureFetch_.Begin(
         {plan.host, plan.port, EscapeUnprintable(plan.requestTarget), std::string(kDownloadHeaders)});
   } else {
-    stream_ = &socket_;
     socket_.Connect(plan.host, plan.port);
   }
   if (events_) events_->Resolving();

@@ -188,8 +188,9 @@ TEST_F(DriverTest, TellsADownloadOverTlsAsAnyOther) {
   EXPECT_EQ(watchdog.runs, kWatchdogMs);
   secureFetch.Arrives("c");
   secureFetch.events->OnClosedByPeer();
-  EXPECT_EQ(log, (Transcript{"fetch h:443/users/a@b/my%20%C3%A9.jpg", "resolving", "connected", "starting",
-                             "received 21", "reply HTTP/1.1 200 OK 2", "received 3", "close", "finished"}));
+  EXPECT_EQ(
+      log, (Transcript{"close", "fetch h:443/users/a@b/my%20%C3%A9.jpg", "resolving", "connected", "starting",
+                       "received 21", "reply HTTP/1.1 200 OK 2", "received 3", "close", "finished"}));
   EXPECT_EQ(secureFetch.headers, kDownloadHeaders);
   EXPECT_EQ(Saved(kTarget), "abc");
 
@@ -227,6 +228,14 @@ TEST_F(DriverTest, TellsADownloadOverTlsAsAnyOther) {
   downloader->Cancel();
   EXPECT_EQ(secureFetch.closed, 1);
   EXPECT_EQ(watchdog.runs, 0U);
+
+  // What fell silent in this session does not end a download of one in the clear.
+  Start(kTarget, url);
+  watchdog.handler();
+  secureFetch.closed = 0;
+  fake.apartment.session.serverName = u"h";
+  Start();
+  EXPECT_EQ(secureFetch.closed, 1);
   downloader.reset();
   EXPECT_EQ(secureFetch.events, nullptr);
 }
