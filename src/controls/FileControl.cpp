@@ -5,6 +5,7 @@
 #include "base/RuntimeError.h"
 #include "controls/FileNames.h"
 #include "platform/HttpTransport.h"
+#include "support/HttpAddress.h"
 #include "support/PathHelpers.h"
 #include "transfer/AcceptorPages.h"
 #include "transfer/ExchangeFailures.h"
@@ -122,8 +123,11 @@ bool FileControl::CheckShownChangeable() {
 }
 
 void FileControl::FailExchange(std::int32_t ftpError, TextView description) {
-  const TextView secure = SecureFailureText(apartment_.platform.http.LastFailure());
-  if (!secure.empty()) return Fail(ftp_error::kConnectAborted, secure);
+  const SessionValues& session = apartment_.session;
+  // A server whose name is none was not asked, so that the last failure is another one's.
+  const bool isAsked = session.IsSecure() && !ServerUrl(session.serverName).empty();
+  const TextView unsafe = isAsked ? SecureFailureText(apartment_.platform.http.LastFailure()) : TextView();
+  if (!unsafe.empty()) return Fail(ftp_error::kConnectAborted, unsafe);
   Fail(ftpError, description);
 }
 

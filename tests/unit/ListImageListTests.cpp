@@ -43,6 +43,15 @@ TEST_F(ListImageTest, FailingInitLeavesTheList) {
   listingFails = true;
   EXPECT_EQ(failure(), init_error::kListingFailed);
   EXPECT_FALSE(fake.apartment.listing.isCurrent);
+  // A server that is not asked says nothing against its certificate.
+  fake.http.failure = http_error::kCertificateName;
+  for (const auto& [server, error] :
+       {std::pair(u"https://h", ftp_error::kConnectAborted), std::pair(u"https://u@h", ftp_error::kNotTaken),
+        std::pair(u"", ftp_error::kNotTaken)}) {
+    fake.apartment.session.serverName = server;
+    EXPECT_EQ(failure(), init_error::kListingFailed);
+    EXPECT_EQ(control.m_LastError, error) << Utf8FromText(server);
+  }
   control.mobjFileupload.reset();
   EXPECT_EQ(failure(), init_error::kNoClient);
   EXPECT_EQ(Names(), "a.jpg,");
