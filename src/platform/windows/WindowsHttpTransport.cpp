@@ -257,7 +257,11 @@ auto Exchanged(const HttpHead& head, BodySource& source, const Waiting& waiting,
     // all would go on for ever.
     if (request.IsOnOldConnection() && repeatable && tries < kMostOldConnections) continue;
     if (sent && request.SendBody() && request.ReceiveHead()) {
-      if (auto result = receive(request)) return result;
+      if (auto result = receive(request)) {
+        // The source may have run other exchanges.
+        failure = 0;
+        return result;
+      }
     }
     failure = request.Failure();
     if (failure == http_error::kSecureChannel) failure = ProbedCertificate(head.host, head.port);
