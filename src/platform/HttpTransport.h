@@ -1,4 +1,5 @@
-// The seam to the system's HTTP client, for the service requests and the acceptor pages.
+// The seam to the system's HTTP client, for the service requests, the acceptor pages and what is fetched over
+// TLS.
 #pragma once
 
 #include <cstddef>

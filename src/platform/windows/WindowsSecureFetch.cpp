@@ -126,8 +126,7 @@ void WindowsSecureFetch::OnTold(DWORD status, DWORD count) {
     default: {
       const std::int32_t error = HttpErrorOf(request_->Exchange());
       if (error != http_error::kSecureChannel) return Fail(error != 0 ? error : http_error::kConnectionLost);
-      // The window may be gone when the answer comes; its number may be another one's then, which has no
-      // such message.
+      // The window may be gone when the answer comes; its number is not given to another one so soon.
       const bool asked = ProbeCertificate(
           host_, port_, [window = window_.Get(), message = MessageOf(kProbed)](std::int32_t probed) {
             PostMessageW(window, message, static_cast<WPARAM>(probed), 0);
