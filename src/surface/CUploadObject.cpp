@@ -3,25 +3,6 @@
 #include "surface/Guard.h"
 
 namespace tarnwick {
-namespace {
-
-// The two methods of a property that is nothing but `text`.
-HRESULT GetText(const SharedText& text, BSTR* value) noexcept {
-  if (!value) return E_POINTER;
-  *value = nullptr;
-  return Guarded([&] {
-    *value = NewBstr(text);
-    return S_OK;
-  });
-}
-HRESULT PutText(SharedText& text, BSTR value) noexcept {
-  return Guarded([&] {
-    text = ViewOf(value);
-    return S_OK;
-  });
-}
-
-}  // namespace
 
 ComPtr<CUploadObject> CUploadObject::From(IUnknown* object) {
   // The class's own identifier serves as a private interface that leads back to the object.

@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "base/RuntimeError.h"
+#include "base/Secret.h"
 #include "surface/Automation.h"
 
 namespace tarnwick {
@@ -34,10 +35,10 @@ HRESULT Answered(Result* result, std::type_identity_t<Result> neutral, Body&& bo
   return S_OK;
 }
 
-// The same for a text, which body() returns; empty when it throws.
+// The same for a text, which body() returns; empty when it throws. It may be a user's key.
 template <typename Body>
 HRESULT AnsweredText(BSTR* result, Body&& body) noexcept {
-  return Answered(result, nullptr, [&] { *result = NewBstr(std::forward<Body>(body)()); });
+  return Answered(result, nullptr, [&] { *result = NewBstr(Secret(std::forward<Body>(body)())); });
 }
 
 // The same for a Boolean, a VARIANT (Empty when it throws) and nothing at all.
@@ -58,7 +59,7 @@ HRESULT Done(Body&& body) noexcept {
 }
 
 // The two methods of a text property that is nothing but `text`.
-inline HRESULT GetText(const Text& text, BSTR* value) noexcept {
+inline HRESULT GetText(TextView text, BSTR* value) noexcept {
   if (!value) return E_POINTER;
   *value = nullptr;
   return Guarded([&] {
@@ -66,7 +67,8 @@ inline HRESULT GetText(const Text& text, BSTR* value) noexcept {
     return S_OK;
   });
 }
-inline HRESULT PutText(Text& text, BSTR value) noexcept {
+template <typename AnyText>
+HRESULT PutText(AnyText& text, BSTR value) noexcept {
   return Guarded([&] {
     text = ViewOf(value);
     return S_OK;
