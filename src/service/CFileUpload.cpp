@@ -90,7 +90,7 @@ std::int32_t CFileUpload::AskForNumber(TextView requestName, TextView clientActi
 
 void CFileUpload::SetHTTPServer(TextView serverName) {
   serverName_ = serverName;
-  apartment_.session.serverName = serverName;
+  apartment_.session.SetServer(serverName);
 }
 
 const std::shared_ptr<CUpload>& CFileUpload::GetUploadObject() {
@@ -100,7 +100,7 @@ const std::shared_ptr<CUpload>& CFileUpload::GetUploadObject() {
 
 bool CFileUpload::ConnectToServer(TextView szServer) {
   return ResultAsItStood(false, [&](bool& connected) {
-    apartment_.session.serverName = szServer;
+    apartment_.session.SetServer(szServer);
     connected = BooleanFromText(
         AskForText(u"EstablishConnection", u"EstablishConnection", {}, 0, u"EstablishConnection", u"FALSE"));
   });
@@ -120,7 +120,7 @@ bool CFileUpload::LogonAs(TextView ProductID, TextView Username, TextView Passwo
     session.password = password;
     session.productNumber = NumberFromText(ProductID);
     if (!AskForLogon(product)) return;
-    session.loggedOn = true;
+    session.loggedOn = !session.IsSecure();
     // What was listed may be another user's.
     apartment_.listing.Forget();
     // The folder is the previous user's until a control prepares this one's.

@@ -25,11 +25,17 @@ struct SessionValues {
   Secret password;
   std::int32_t productNumber = 0;
   Text mguid;
-  // Set by a log-on; cleared once its FTP values were rewritten for the proxy.
+  // Set by a log-on in clear text; cleared once its FTP values were rewritten for the proxy.
   bool loggedOn = false;
 
   // Whether everything goes over TLS.
   bool IsSecure() const { return IsSecureUrl(serverName); }
+  // A password that was given for TLS does not go on in clear text.
+  void SetServer(TextView name) {
+    const bool wasSecure = IsSecure();
+    serverName = name;
+    if (wasSecure && !IsSecure()) password = {};
+  }
   AccountKey Account() const { return {serverName, userName}; }
 };
 

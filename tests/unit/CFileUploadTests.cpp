@@ -379,6 +379,14 @@ TEST_F(CFileUploadTest, SecureSessionFetchesFilesWithoutFtp) {
   EXPECT_TRUE(fake.http.sent.empty());
   // The one that was open before has been closed, and there was no other.
   EXPECT_EQ(fake.internet.calls, (Calls{u"QUIT", u"close"}));
+  // Nor does FTP get what belongs to a session over TLS.
+  fake.http.answers.clear();
+  Answer(kLoggedOn);
+  ASSERT_TRUE(client.LogonAs(u"7", u"u", u"p", u""));
+  client.SetHTTPServer(u"h");
+  EXPECT_TRUE(fake.apartment.session.password.IsEmpty()) << "it would go in clear text";
+  OpenSession();
+  EXPECT_EQ(fake.internet.calls.at(3), u"connect |21||");
 }
 
 TEST_F(CFileUploadTest, FtpProxy) {
