@@ -279,6 +279,7 @@ void WindowsThumbnailPage::Redraw(const Slot& slot) {
 // loaded.
 bool WindowsThumbnailPage::LoadPictureOf(Slot& slot) {
   if (!slot.picture) slot.place = Pixels(layout::kPicture);
+  slot.background = BackColor();
   slot.fault = PictureFault::kNone;
   WIN32_FILE_ATTRIBUTE_DATA file = {};
   if (!GetFileAttributesExW(slot.path.c_str(), GetFileExInfoStandard, &file)) return false;
@@ -613,8 +614,15 @@ std::optional<LRESULT> WindowsThumbnailPage::OnButtonMessage(HWND window, UINT m
 
 // --- Drawing ---
 
+// The container's colours and the system's change with a new drawing of all.
+void WindowsThumbnailPage::FollowBackground() {
+  for (Slot& slot : slots_)
+    if ((slot.picture || slot.awaited) && slot.background != BackColor()) LoadPictureOf(slot);
+}
+
 // Everything of a window in memory first, so that nothing flickers.
-void WindowsThumbnailPage::PaintGrid(HWND window) const {
+void WindowsThumbnailPage::PaintGrid(HWND window) {
+  FollowBackground();
   const PaintingOwner painting = Paint(window);
   const HDC screen = painting.Get().paint.hdc;
   const int slot = SlotOf(window);
@@ -650,6 +658,7 @@ void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
 }
 
 void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) {
+  FollowBackground();
   workers_.Finish();
   const SavedDcOwner saved = SaveStateOf(dc);
   IntersectClipRect(dc, bounds.left, bounds.top, bounds.right, bounds.bottom);

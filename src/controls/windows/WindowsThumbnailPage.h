@@ -70,6 +70,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
     std::optional<PicturePlace> twips;
     // The picture that a worker decodes for the slot; null when there is none.
     std::shared_ptr<const PictureRequest> awaited;
+    // What the picture was last asked for to lie on.
+    COLORREF background = 0;
     Text tip;
     // Why the picture is not shown; kNone also when there is no file.
     PictureFault fault = PictureFault::kNone;
@@ -108,7 +110,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void ApplyTexts() const;
   FontOwner LinkFont() const;
   void RefreshGrid() const;
-  void PaintGrid(HWND window) const;
+  void PaintGrid(HWND window);
+  void FollowBackground();
   TileStyle Style() const { return {Dpi(), Font(), BackColor()}; }
   void DrawMessage(HDC dc, RECT area, TextView text) const;
   void DrawLink(HDC dc, RECT area, bool focus) const;

@@ -432,6 +432,32 @@ TEST_F(ThumbnailPageTest, TipsSayWhyAPictureIsNotShown) {
   EXPECT_EQ(TipOver(Slot(1)), L"name");
 }
 
+TEST_F(ThumbnailPageTest, TransparentPicturesFollowAChangeOfColours) {
+  // A GIF of three pixels, of which the first two are transparent.
+  const std::string gif("GIF89a\3\0\1\0\x80\0\0...RGB!\xF9\4\1\0\0\0\0,\0\0\0\0\3\0\1\0\0\2\2\4R\0;", 43);
+  const PictureFile transparent(L"thumbnail-transparent.gif", 0);
+  transparent.Write(std::span(reinterpret_cast<const unsigned char*>(gif.data()), gif.size()));
+  page_->SetPicture(1, transparent.Path(), kWholeSquare);
+  const COLORREF before = GetSysColor(COLOR_WINDOW);
+  const auto opaque = [&] {
+    const WindowDcOwner dc = DcOf(Slot(1));
+    return GetPixel(dc.Get().dc, layout::Pixels(1900, SystemDpi()), layout::Pixels(1130, SystemDpi()));
+  };
+  Await([&] { return Seen(1) == before && opaque() == RGB('R', 'G', 'B'); });
+  const COLORREF green = RGB(20, 180, 60);
+  const COLORREF blue = RGB(20, 60, 180);
+  page_->SetLook(nullptr, std::nullopt, green);
+  Await([&] { return Seen(1) == green; });
+  page_->SetLook(nullptr, std::nullopt, std::nullopt);
+  Await([&] { return Seen(1) == before; });
+  const INT element = COLOR_WINDOW;
+  SetSysColors(1, &element, &blue);
+  Await([&] { return Seen(1) == blue; });
+  SetSysColors(1, &element, &before);
+  Await([&] { return Seen(1) == before; });
+  EXPECT_EQ(user_.Take(), Told{});
+}
+
 TEST_F(ThumbnailPageTest, APictureThatWasLeftIsNotDrawn) {
   const PictureFile left(L"thumbnail-left.bmp", RGB(20, 180, 60));
   for (const int slot : {1, 2, 4}) {
