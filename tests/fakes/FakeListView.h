@@ -18,6 +18,7 @@ struct FakeListView : ListView {
   bool multiple = true;
   bool listShown = true;
   Text label;
+  Text hint;
   std::string columns;
 
   void SetColumns(std::span<const ListColumn> all) override {
@@ -41,6 +42,7 @@ struct FakeListView : ListView {
     log.emplace_back(list ? "view list" : "view label");
   }
   void SetLabelText(TextView text) override { label = text; }
+  void SetHint(TextView text) override { hint = text; }
   bool IsSelected(std::size_t index) const override { return selected.at(index); }
   std::optional<std::size_t> NextSelected(std::size_t from) const override {
     for (std::size_t i = from; i < selected.size(); ++i)

@@ -255,6 +255,11 @@ TEST_F(ListImageUpload, ReplacesAFile) {
   EXPECT_TRUE(control.UploadImage(u"C:\\two.jpg"));
   EXPECT_EQ(Names(), "");
   EXPECT_TRUE(Events().ends_with(",1015 ,"));
+  EXPECT_NE(view.hint, u"");
+  fake.files.files[u"C:\\one.gif"] = {1, 0};
+  replies["FileUploadRequest"] = "FileURL=http://h/u/one.gif";
+  EXPECT_TRUE(control.UploadImage(u"C:\\one.gif"));
+  EXPECT_EQ(Names() + Utf8FromText(view.hint), "one.gif,");
 }
 
 TEST_F(ListImageUpload, LocalCopyHasTheBytesThatWereSent) {
@@ -387,6 +392,7 @@ TEST_F(ListImageTest, DeleteOutcomes) {
   EXPECT_EQ(Events(), "1001 ,1015 http://h/u/a.jpg,1002 ,");
   EXPECT_EQ(Names(), "");
   EXPECT_TRUE(view.listShown);
+  EXPECT_EQ(view.hint, u"");
   EXPECT_EQ(control.m_strLastErrorDesc, u"The files were deleted, but the rest could not be listed.");
   EXPECT_FALSE(fake.apartment.listing.isCurrent);
   EXPECT_EQ(log.back(), "view pointer");

@@ -27,6 +27,7 @@ TEST_F(ListImageTest, ListsTheAccount) {
   fake.apartment.listing.isCurrent = false;
   EXPECT_TRUE(control.Init(u"*"));
   ExpectLog({"ask ListFilesRequest Username=u@x&ProductID=7", "view label", "view columns", "view items 0"});
+  EXPECT_EQ(view.hint, u"") << "the label says it";
 }
 
 TEST_F(ListImageTest, FailingInitLeavesTheList) {
@@ -75,8 +76,10 @@ TEST_F(ListImageTest, FiltersTwice) {
     SCOPED_TRACE(Utf8FromText(test.filter));
     EXPECT_TRUE(control.Init(test.filter));
     EXPECT_EQ(Names(), test.afterInit);
+    EXPECT_EQ(view.hint, Names().empty() ? u"There are no images of this kind." : u"");
     control.ChangeFileFilter(test.filter);
     EXPECT_EQ(Names(), test.afterChange);
+    EXPECT_EQ(view.hint, u"");
     std::string gifs;
     for (std::size_t i = 0; i < control.ItemCount(); ++i) {
       const ItemPicture picture = control.PictureOf(i);

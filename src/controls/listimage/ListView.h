@@ -21,7 +21,8 @@ struct ListColumn {
 // comes later shows the same state.
 class ListView : public ControlView {
  public:
-  // Replaces all columns. Each is 96 pixels wide at 96 DPI, its text stands left.
+  // They are the same ones in each call. The first one adds them, each 96 pixels wide at 96 DPI, with its
+  // text at the left; the later ones leave them, with the widths that the user has given them.
   virtual void SetColumns(std::span<const ListColumn> columns) = 0;
 
   // The list holds `count` new items: none is selected or has the focus, the first one is on top. A label
@@ -37,6 +38,8 @@ class ListView : public ControlView {
   // Shows either the list or, in its place, the label.
   virtual void ShowList(bool list) = 0;
   virtual void SetLabelText(TextView text) = 0;
+  // What the list itself shows where the label stands; empty for nothing.
+  virtual void SetHint(TextView text) = 0;
 
   virtual bool IsSelected(std::size_t index) const = 0;
   // The first selected item from `from` on.

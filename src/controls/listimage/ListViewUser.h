@@ -35,8 +35,11 @@ class ListViewUser {
   virtual void OnKeyDown(std::int32_t keyCode) = 0;
   // Enter in the list, not in a label edit.
   virtual void OnEnter() = 0;
+  // Another item was selected in other ways than by the arrow keys or a click.
+  virtual void OnSelectionChanged() = 0;
   virtual void OnClick() = 0;
-  // The left or right mouse button, on an item or beside them, and the list has done with it what lists do.
+  // The left or right mouse button, on an item or beside them, and the list has done with it what lists do;
+  // or the key that stands for the right one.
   virtual void OnMouseButton() = 0;
   // The label edit of an item ended with a text; an edit that was cancelled is not told. True when the item
   // has a new name now, which need not be that text.

@@ -16,6 +16,7 @@ namespace {
 constexpr std::array<ListColumn, 3> kColumns{
     {{u"filename", u"File Name"}, {u"filepath", u"File Path"}, {u"filesize", u"File Size"}}};
 constexpr std::uint16_t kNoImagesString = 3582;
+constexpr TextView kNoHits = u"There are no images of this kind.";
 
 constexpr std::int32_t kUpKey = 38;
 constexpr std::int32_t kDownKey = 40;
@@ -111,6 +112,16 @@ void ctrlListImage::Fill(const std::function<bool(const CUpload&)>& shows) {
   NoteAccount();
   ++filling_;
   view_.SetItemCount(items_.size());
+  ShowHint();
+}
+
+void ctrlListImage::ShowListOrLabel() {
+  view_.ShowList(!listing_.all.IsEmpty());
+  ShowHint();
+}
+
+void ctrlListImage::ShowHint() {
+  view_.SetHint(items_.empty() && !listing_.all.IsEmpty() ? kNoHits : TextView());
 }
 
 bool ctrlListImage::ShowsWhenUploaded(TextView name) const {

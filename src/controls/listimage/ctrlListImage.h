@@ -50,8 +50,7 @@ class ctrlListImage final : public FileControl, public ListViewUser {
 
   void OnKeyDown(std::int32_t keyCode) override;
   void OnEnter() override;
-  // Another item was selected in other ways than by the arrow keys or a click.
-  void OnSelectionChanged();
+  void OnSelectionChanged() override;
   void OnClick() override;
   void OnMouseButton() override;
   bool OnBeforeLabelEdit() const override;
@@ -77,7 +76,9 @@ class ctrlListImage final : public FileControl, public ListViewUser {
 
   // Puts the records that `shows` lets pass into the list.
   void Fill(const std::function<bool(const CUpload&)>& shows);
-  void ShowListOrLabel() { view_.ShowList(!listing_.all.IsEmpty()); }
+  void ShowListOrLabel();
+  // Says so when there are files, but the filter lets none pass.
+  void ShowHint();
   bool ShowsWhenUploaded(TextView name) const;
 
   void DeleteSelected();

@@ -58,6 +58,7 @@ void ctrlListImage::DeleteFile() {
     } catch (const RuntimeError&) {
       // The account is not empty; what it holds is not known.
       view_.ShowList(true);
+      view_.SetHint({});
       if (operation.Succeeds())
         Fail(ftp_error::kNotTaken, u"The files were deleted, but the rest could not be listed.");
     }

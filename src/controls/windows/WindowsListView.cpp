@@ -15,6 +15,11 @@ constexpr wchar_t kClassName[] = L"TarnwickListImage";
 constexpr int kColumnWidth = 96;
 // Names for screen readers.
 constexpr wchar_t kListName[] = L"Files of the account";
+// What a column must have beside its text at 96 dots per inch.
+constexpr int kCellMargin = 12;
+
+// What the system sends for the menu key and Shift+F10.
+constexpr DWORD kNoPlace = 0xFFFFFFFF;
 
 void CopyTo(const NMLVDISPINFOW& info, const Text& text) {
   if (info.item.cchTextMax <= 0) return;
@@ -30,21 +35,25 @@ WindowsListView::WindowsListView(HINSTANCE module, ControlWindowUser& control)
     : ControlWindow(module, kClassName, control) {}
 
 bool WindowsListView::MakeChildren() {
-  const INITCOMMONCONTROLSEX classes = {sizeof classes, ICC_LISTVIEW_CLASSES};
+  const INITCOMMONCONTROLSEX classes = {sizeof classes, ICC_LISTVIEW_CLASSES | ICC_BAR_CLASSES};
   InitCommonControlsEx(&classes);
   list_ = MakeChild(Outer(), WC_LISTVIEWW, kListName,
-                    WS_VISIBLE | WS_TABSTOP | LVS_REPORT | LVS_OWNERDATA | LVS_SHOWSELALWAYS |
-                        LVS_EDITLABELS | LVS_SHAREIMAGELISTS | LVS_SINGLESEL);
-  label_ = MakeChild(Outer(), L"STATIC", WideFromText(labelText_).c_str(), SS_CENTER | SS_NOPREFIX);
+                    WS_VISIBLE | WS_TABSTOP | WS_CLIPCHILDREN | WS_CLIPSIBLINGS | LVS_REPORT | LVS_OWNERDATA |
+                        LVS_SHOWSELALWAYS | LVS_EDITLABELS | LVS_SHAREIMAGELISTS | LVS_SINGLESEL |
+                        LVS_NOSORTHEADER);
+  label_ = MakeChild(Outer(), L"STATIC", L"", SS_CENTER | SS_NOPREFIX);
   if (!list_ || !label_) return false;
+  SetWindowPos(label_, HWND_TOP, 0, 0, 0, 0, SWP_NOMOVE | SWP_NOSIZE | SWP_NOACTIVATE);
+  ListView_SetExtendedListViewStyle(list_, LVS_EX_FULLROWSELECT);
+  // Its own tips are for names alone, and not in every version of the system.
+  ListView_SetToolTips(list_, nullptr);
   listProc_ = reinterpret_cast<WNDPROC>(GetClassLongPtrW(list_, GCLP_WNDPROC));
   SetIcons();
   // What an earlier window showed; its selection is lost.
   if (multiple_) SetWindowLongW(list_, GWL_STYLE, GetWindowLongW(list_, GWL_STYLE) & ~LVS_SINGLESEL);
   AddColumns();
   ListView_SetItemCountEx(list_, static_cast<int>(count_), 0);
-  ShowWindow(listShown_ ? list_ : label_, SW_SHOWNA);
-  ShowWindow(listShown_ ? label_ : list_, SW_HIDE);
+  ShowParts();
   if (const auto selected = std::exchange(selected_, std::nullopt)) SelectAlone(*selected);
   return true;
 }
@@ -52,6 +61,7 @@ bool WindowsListView::MakeChildren() {
 void WindowsListView::WindowGone() {
   list_ = label_ = nullptr;
   buttons_ = 0;
+  ForgetPointer();
 }
 
 void WindowsListView::ApplyLook() {
@@ -75,7 +85,7 @@ void WindowsListView::DpiChanged(int before) {
   SetIcons();
   // The user may have made them wider.
   for (int column = 0; column < static_cast<int>(titles_.size()); ++column)
-    ListView_SetColumnWidth(list_, column, MulDiv(ListView_GetColumnWidth(list_, column), Dpi(), before));
+    ListView_SetColumnWidth(list_, column, MulDiv(ColumnWidth(column), Dpi(), before));
   Layout();
 }
 
@@ -99,20 +109,20 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) {
   GetTextMetricsW(dc, &metrics);
   const int line = metrics.tmHeight + 4;
   constexpr UINT kCell = DT_LEFT | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
-  if (!listShown_) {
+  if (!Said().empty()) {
     RECT middle = {bounds.left, (bounds.top + bounds.bottom - line) / 2, bounds.right, bounds.bottom};
-    DrawTextW(dc, WideFromText(labelText_).c_str(), -1, &middle, DT_CENTER | DT_TOP | DT_NOPREFIX);
-    return;
+    DrawTextW(dc, WideFromText(Said()).c_str(), -1, &middle, DT_CENTER | DT_TOP | DT_NOPREFIX);
   }
-  const int width = MulDiv(kColumnWidth, Dpi(), 96);
+  if (!listShown_) return;
   int top = bounds.top;
   for (std::size_t row = 0; row <= count_ && top < bounds.bottom; ++row, top += line) {
     int left = bounds.left;
-    for (std::size_t column = 0; column < titles_.size() && left < bounds.right; ++column, left += width) {
+    for (std::size_t column = 0; column < titles_.size() && left < bounds.right; ++column) {
+      const int width = ColumnWidth(static_cast<int>(column));
       RECT cell = {left, top, left + width, top + line};
       if (row == 0) {
         FillRect(dc, &cell, GetSysColorBrush(COLOR_BTNFACE));
-        DrawEdge(dc, &cell, BDR_RAISEDINNER, BF_RECT);
+        DrawEdge(dc, &cell, EDGE_ETCHED, BF_RIGHT | BF_BOTTOM);
       }
       cell.left += 4;
       cell.right -= 2;
@@ -124,17 +134,19 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) {
       const Text text =
           row == 0 ? titles_[column] : ShownName(user_->ItemText(row - 1, static_cast<int>(column)));
       DrawTextW(dc, WideFromText(text).c_str(), -1, &cell, kCell);
+      left += width;
     }
   }
 }
 
 void WindowsListView::SetColumns(std::span<const ListColumn> columns) {
-  titles_.clear();
+  if (!titles_.empty()) return;
   for (const ListColumn& column : columns) titles_.emplace_back(column.title);
-  if (!list_) return;
-  while (ListView_DeleteColumn(list_, 0)) {
-  }
-  AddColumns();
+  if (list_) AddColumns();
+}
+
+int WindowsListView::ColumnWidth(int column) const {
+  return list_ ? ListView_GetColumnWidth(list_, column) : MulDiv(kColumnWidth, Dpi(), 96);
 }
 
 void WindowsListView::AddColumns() {
@@ -159,6 +171,7 @@ void WindowsListView::SetItemCount(std::size_t count) {
     return;
   }
   ListView_CancelEditLabel(list_);
+  ForgetPointer();
   Deselect(-1);
   const int focused = NextItem(-1, LVNI_FOCUSED);
   if (focused >= 0) SetState(focused, 0, LVIS_FOCUSED);
@@ -173,19 +186,34 @@ void WindowsListView::AppendItem() {
 }
 
 void WindowsListView::RefreshItem(std::size_t index) {
+  ForgetPointer();
   if (list_) ListView_RedrawItems(list_, static_cast<int>(index), static_cast<int>(index));
 }
 
 void WindowsListView::ShowList(bool list) {
-  listShown_ = list;
-  if (!list_) return;
-  ShowWindow(list ? label_ : list_, SW_HIDE);
-  ShowWindow(list ? list_ : label_, SW_SHOWNA);
+  if (std::exchange(listShown_, list) != list) ShowParts();
 }
 
 void WindowsListView::SetLabelText(TextView text) {
   labelText_ = text;
-  if (label_) SetWindowTextW(label_, WideFromText(text).c_str());
+  ShowParts();
+}
+
+void WindowsListView::SetHint(TextView text) {
+  if (hint_ == text) return;
+  hint_ = text;
+  ShowParts();
+}
+
+void WindowsListView::ShowParts() const {
+  if (!list_) return;
+  const std::wstring said = WideFromText(Said());
+  SetWindowTextW(label_, said.c_str());
+  // Without a list the outer window has the focus, and screen readers tell its name.
+  SetWindowTextW(Outer(), listShown_ ? L"" : said.c_str());
+  ShowWindow(label_, said.empty() ? SW_HIDE : SW_SHOWNA);
+  // At the end: when the list had the focus, the host hears of it.
+  ShowWindow(list_, listShown_ ? SW_SHOWNA : SW_HIDE);
 }
 
 LRESULT WindowsListView::Ask(UINT message, WPARAM wParam, LPARAM lParam) const {
@@ -236,6 +264,7 @@ void WindowsListView::SelectAlone(std::size_t index) {
   Deselect(item);
   SetState(item, LVIS_SELECTED | LVIS_FOCUSED, LVIS_SELECTED | LVIS_FOCUSED);
   Ask(LVM_ENSUREVISIBLE, index, FALSE);
+  ForgetPointer();
 }
 
 void WindowsListView::SetMultiSelect(bool multiple) {
@@ -264,6 +293,9 @@ std::optional<LRESULT> WindowsListView::OnMessage(HWND window, UINT message, WPA
   // The label, or the editor of an item's name.
   if (window != Outer()) return std::nullopt;
   switch (message) {
+    case WM_CONTEXTMENU:
+      if (static_cast<DWORD>(lParam) != kNoPlace) return std::nullopt;
+      return OnMenuKey(window);
     case WM_SIZE:
       Layout();
       return 0;
@@ -333,7 +365,33 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
 }
 
 std::optional<LRESULT> WindowsListView::OnListMessage(HWND list, UINT message, WPARAM wParam, LPARAM lParam) {
+  if (message >= WM_MOUSEFIRST && message <= WM_MBUTTONDBLCLK) {
+    if (message == WM_MOUSEMOVE)
+      FollowPointer({static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))});
+    tip_.Relay(list, message, wParam, lParam);
+  }
   switch (message) {
+    case WM_ERASEBKGND:
+      // Painted with the rest, unless it is wanted in a picture.
+      if (WindowFromDC(reinterpret_cast<HDC>(wParam)) != list) return std::nullopt;
+      return TRUE;
+    case WM_PAINT:
+      PaintList(list);
+      return 0;
+    case WM_SIZE:
+    case WM_HSCROLL:
+    case WM_VSCROLL:
+    case WM_MOUSEWHEEL:
+    case WM_MOUSEHWHEEL:
+      ForgetPointer();
+      return std::nullopt;
+    case WM_NOTIFY:
+      // A column is as wide as it was no more.
+      if (reinterpret_cast<const NMHDR*>(lParam)->code == HDN_ITEMCHANGEDW) ForgetPointer();
+      return std::nullopt;
+    case WM_CONTEXTMENU:
+      if (static_cast<DWORD>(lParam) != kNoPlace) return std::nullopt;
+      return OnMenuKey(list);
     case WM_LBUTTONDOWN:
     case WM_RBUTTONDOWN: {
       const HWND outer = Outer();
@@ -350,24 +408,110 @@ std::optional<LRESULT> WindowsListView::OnListMessage(HWND list, UINT message, W
       const bool enter = key && key->message == WM_KEYDOWN && key->wParam == VK_RETURN;
       return DefSubclassProc(list, message, wParam, lParam) | (enter ? DLGC_WANTMESSAGE : 0);
     }
-    case WM_KEYDOWN: {
-      if (wParam == VK_RETURN) {
-        user_->OnEnter();
-        return 0;
-      }
-      if (wParam == VK_F2) {
-        // The list asks whether it may, as it does after a slow second click. The other form of the message
-        // edits what the code page can hold.
-        if (const auto selected = NextSelected(0)) SendMessageW(list, LVM_EDITLABELW, *selected, 0);
-        return 0;
-      }
-      const LRESULT result = DefSubclassProc(list, message, wParam, lParam);
-      user_->OnKeyDown(static_cast<std::int32_t>(wParam));
-      return result;
-    }
+    case WM_KEYDOWN:
+      ForgetPointer();
+      return OnKeyDown(list, wParam, lParam);
     default:
       return std::nullopt;
   }
+}
+
+std::optional<LRESULT> WindowsListView::OnKeyDown(HWND list, WPARAM key, LPARAM lParam) {
+  switch (key) {
+    case VK_RETURN:
+      user_->OnEnter();
+      return 0;
+    case VK_F2:
+      // The list asks whether it may, as it does after a slow second click. The other form of the message
+      // edits what the code page can hold.
+      if (const auto selected = NextSelected(0)) SendMessageW(list, LVM_EDITLABELW, *selected, 0);
+      return 0;
+    case 'A':
+      // With Alt as well it is a letter on some keyboards.
+      if (!multiple_ || count_ == 0 || GetKeyState(VK_CONTROL) >= 0 || GetKeyState(VK_MENU) < 0) break;
+      SetState(-1, LVIS_SELECTED, LVIS_SELECTED);
+      user_->OnSelectionChanged();
+      return 0;
+    default:
+      break;
+  }
+  const LRESULT result = DefSubclassProc(list, WM_KEYDOWN, key, lParam);
+  user_->OnKeyDown(static_cast<std::int32_t>(key));
+  return result;
+}
+
+LRESULT WindowsListView::OnMenuKey(HWND window) {
+  const HWND outer = Outer();
+  if (window == list_) user_->OnMouseButton();
+  if (Outer() != outer) return 0;
+  RECT client = {};
+  GetClientRect(outer, &client);
+  POINT at = window == list_ ? MenuPlace() : POINT{client.right / 2, client.bottom / 2};
+  ClientToScreen(window, &at);
+  // On to the form, as after a click of the right button.
+  return DefWindowProcW(outer, WM_CONTEXTMENU, reinterpret_cast<WPARAM>(window), MAKELPARAM(at.x, at.y));
+}
+
+POINT WindowsListView::MenuPlace() const {
+  RECT client = {};
+  GetClientRect(list_, &client);
+  const int current = NextItem(-1, LVNI_FOCUSED | LVNI_SELECTED);
+  const int item = current >= 0 ? current : NextItem(-1, LVNI_SELECTED);
+  if (item < 0) return {client.right / 2, client.bottom / 2};
+  Ask(LVM_ENSUREVISIBLE, static_cast<WPARAM>(item), FALSE);
+  RECT icon = {LVIR_ICON, 0, 0, 0};
+  Ask(LVM_GETITEMRECT, static_cast<WPARAM>(item), reinterpret_cast<LPARAM>(&icon));
+  return {std::clamp<LONG>(icon.right, 0, client.right), (icon.top + icon.bottom) / 2};
+}
+
+void WindowsListView::FollowPointer(const POINT& at) {
+  LVHITTESTINFO hit = {};
+  hit.pt = at;
+  Ask(LVM_SUBITEMHITTEST, 0, reinterpret_cast<LPARAM>(&hit));
+  const std::pair<int, int> pointed(hit.iItem, hit.iSubItem);
+  if (std::exchange(pointed_, pointed) == pointed) return;
+  tip_.Clear();
+  if (hit.iItem < 0 || static_cast<std::size_t>(hit.iItem) >= count_) return;
+  RECT client = {};
+  GetClientRect(list_, &client);
+  RECT cell = {LVIR_BOUNDS, hit.iSubItem, 0, 0};
+  Ask(LVM_GETSUBITEMRECT, static_cast<WPARAM>(hit.iItem), reinterpret_cast<LPARAM>(&cell));
+  // The bounds of the first column are those of the row.
+  cell.right = cell.left + ColumnWidth(hit.iSubItem);
+  LONG left = cell.left;
+  if (hit.iSubItem == 0) {
+    RECT label = {LVIR_LABEL, 0, 0, 0};
+    Ask(LVM_GETITEMRECT, static_cast<WPARAM>(hit.iItem), reinterpret_cast<LPARAM>(&label));
+    left = label.left;
+  }
+  std::wstring text =
+      WideFromText(ShownName(user_->ItemText(static_cast<std::size_t>(hit.iItem), hit.iSubItem)));
+  const auto width = static_cast<LONG>(Ask(LVM_GETSTRINGWIDTHW, 0, reinterpret_cast<LPARAM>(text.c_str())));
+  const LONG room = std::min(cell.right, client.right) - left;
+  if (left >= 0 && width + MulDiv(kCellMargin, Dpi(), 96) <= room) return;
+  tip_.Set(list_, cell, std::move(text));
+}
+
+void WindowsListView::ForgetPointer() {
+  pointed_ = {-1, -1};
+  tip_.Clear();
+}
+
+// Everything in memory first, so that nothing flickers. The older common controls do not offer that.
+void WindowsListView::PaintList(HWND list) const {
+  const PaintingOwner painting = Paint(list);
+  const HDC screen = painting.Get().paint.hdc;
+  const RECT& area = painting.Get().paint.rcPaint;
+  const int width = area.right - area.left;
+  const int height = area.bottom - area.top;
+  const MemoryDcOwner memory(CreateCompatibleDC(screen));
+  const BitmapOwner bitmap(CreateCompatibleBitmap(screen, width, height));
+  const SelectionOwner picture = SelectInto(memory.Get(), bitmap.Get());
+  SetViewportOrgEx(memory.Get(), -area.left, -area.top, nullptr);
+  const auto target = reinterpret_cast<WPARAM>(memory.Get());
+  Ask(WM_ERASEBKGND, target, 0);
+  Ask(WM_PRINTCLIENT, target, PRF_CLIENT);
+  BitBlt(screen, area.left, area.top, width, height, memory.Get(), area.left, area.top, SRCCOPY);
 }
 
 }  // namespace tarnwick

@@ -1,17 +1,19 @@
-// The list window: a report list without items of its own (owner data) and a label, one shown in place of the
-// other, in a window that fills its control.
+// The list window: a report list without items of its own (owner data) and a label, shown in its place or,
+// when the list has something to say, in the middle of it, in a window that fills its control.
 #pragma once
 
 #include "platform/windows/WindowsHeaders.h"
 
 #include <cstddef>
 #include <optional>
+#include <utility>
 #include <vector>
 
 #include "controls/listimage/ListView.h"
 #include "controls/listimage/ListViewUser.h"
 #include "controls/windows/ControlWindow.h"
 #include "controls/windows/FileIcons.h"
+#include "controls/windows/TextTip.h"
 
 namespace tarnwick {
 
@@ -34,6 +36,7 @@ class WindowsListView : public ListView, public ControlWindow {
   void RefreshItem(std::size_t index) override;
   void ShowList(bool list) override;
   void SetLabelText(TextView text) override;
+  void SetHint(TextView text) override;
   bool IsSelected(std::size_t index) const override;
   std::optional<std::size_t> NextSelected(std::size_t from) const override;
   void SelectAlone(std::size_t index) override;
@@ -51,7 +54,21 @@ class WindowsListView : public ListView, public ControlWindow {
   std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;
   std::optional<LRESULT> OnListMessage(HWND list, UINT message, WPARAM wParam, LPARAM lParam);
   LRESULT OnNotify(const NMHDR& header);
+  std::optional<LRESULT> OnKeyDown(HWND list, WPARAM key, LPARAM lParam);
+  // The key that stands for the right button was pressed in the list, or in the outer window in its place.
+  LRESULT OnMenuKey(HWND window);
+  // Where the menu belongs, in the list's coordinates.
+  POINT MenuPlace() const;
+  // The pointer is at this place in the list.
+  void FollowPointer(const POINT& at);
+  // What it is on is not known any more.
+  void ForgetPointer();
+  void PaintList(HWND list) const;
   void Layout() const;
+  // Shows the list and the label as they are to be.
+  void ShowParts() const;
+  // What the label says now; empty while it is hidden.
+  const Text& Said() const { return listShown_ ? hint_ : labelText_; }
   void SetIcons();
   // Sent to the list itself, past what watches its messages; 0 without a list. A window that is watched looks
   // its properties up three times for each message, and under Wine another process answers each time. What
@@ -64,6 +81,7 @@ class WindowsListView : public ListView, public ControlWindow {
   // Leaves at most `kept` selected, which is an item or -1.
   void Deselect(int kept);
   void AddColumns();
+  int ColumnWidth(int column) const;
 
   ListViewUser* user_ = nullptr;
   HWND list_ = nullptr;
@@ -79,6 +97,10 @@ class WindowsListView : public ListView, public ControlWindow {
   bool listShown_ = true;
   bool multiple_ = false;
   Text labelText_;
+  Text hint_;
+  TextTip tip_;
+  // Item and column that the pointer is on; -1 and -1 for none.
+  std::pair<int, int> pointed_ = {-1, -1};
   // Buttons that the list is busy with: it may handle messages of its own until a button is up.
   int buttons_ = 0;
 };

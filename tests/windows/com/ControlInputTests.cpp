@@ -255,6 +255,160 @@ TEST(ListControl, DragsItsOwnFile) {
   DeleteFileW(copy.c_str());
 }
 
+constexpr UINT_PTR kMenus = 1;
+
+// Where the form is asked for a menu, on the screen.
+LRESULT CALLBACK MenuProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam, UINT_PTR, DWORD_PTR data) {
+  if (message == WM_CONTEXTMENU)
+    *reinterpret_cast<POINT*>(data) = {static_cast<SHORT>(LOWORD(lParam)),
+                                       static_cast<SHORT>(HIWORD(lParam))};
+  return DefSubclassProc(window, message, wParam, lParam);
+}
+
+// On the screen; `column` 0 is the whole row.
+RECT PlaceOf(const Form& form, int row, int column) {
+  RECT place = {LVIR_BOUNDS, column, 0, 0};
+  SendMessageW(form.ListWindow(), LVM_GETSUBITEMRECT, static_cast<WPARAM>(row),
+               reinterpret_cast<LPARAM>(&place));
+  MapWindowPoints(form.ListWindow(), nullptr, reinterpret_cast<POINT*>(&place), 2);
+  return place;
+}
+
+void Point(Form& form, LONG x, LONG y) {
+  SetCursorPos(x, y);
+  form.Pump();
+}
+
+TEST(ListControl, SelectsByRowsAndKeys) {
+  Form form;
+  form.Open(L"jpg");
+  form.Show();
+  POINT menu = {};
+  SetWindowSubclass(form.frame, MenuProc, kMenus, reinterpret_cast<DWORD_PTR>(&menu));
+  const auto selectedCount = [&] { return SendMessageW(form.ListWindow(), LVM_GETSELECTEDCOUNT, 0, 0); };
+
+  // A press on the size is one on the file.
+  const RECT size = PlaceOf(form, 2, 2);
+  const RECT row = PlaceOf(form, 2, 0);
+  form.events.clear();
+  Point(form, size.left + 20, (size.top + size.bottom) / 2);
+  Mouse(MOUSEEVENTF_RIGHTDOWN);
+  Mouse(MOUSEEVENTF_RIGHTUP);
+  form.Pump();
+  EXPECT_EQ(form.Selected(), kJpegs[2]);
+  EXPECT_TRUE(PtInRect(&size, menu)) << menu.x << " " << menu.y;
+  const Lines clicked = std::exchange(form.events, {});
+  menu = {-1, -1};
+  Hold(VK_SHIFT, true);
+  form.Handle({form.ListWindow(), WM_SYSKEYDOWN, VK_F10, 0, 0, {0, 0}});
+  Hold(VK_SHIFT, false);
+  EXPECT_EQ(std::exchange(form.events, {}), clicked);
+  EXPECT_TRUE(PtInRect(&row, menu)) << menu.x << " " << menu.y;
+  // What the menu key sends.
+  menu = {-1, -1};
+  ListView_SetItemState(form.ListWindow(), -1, 0, LVIS_SELECTED);
+  SendMessageW(form.ListWindow(), WM_CONTEXTMENU, reinterpret_cast<WPARAM>(form.ListWindow()), -1);
+  EXPECT_EQ(std::exchange(form.events, {}), Lines{L"1015 "});
+  EXPECT_EQ(WindowFromPoint(menu), form.ListWindow());
+
+  for (const bool several : {false, true}) {
+    form.Select(kJpegs[2].c_str());
+    VARIANT_BOOL multiple = several ? VARIANT_TRUE : VARIANT_FALSE;
+    VARIANT ignored = {};
+    form.list->SetMultiSelectProperty(&multiple, &ignored);
+    form.events.clear();
+    Hold(VK_CONTROL, true);
+    form.Press('A');
+    Hold(VK_CONTROL, false);
+    EXPECT_EQ(selectedCount(), several ? 4 : 1);
+    EXPECT_EQ(form.events, several ? Lines{L"1015 " + Address(kJpegs[0])} : Lines());
+  }
+  RemoveWindowSubclass(form.frame, MenuProc, kMenus);
+}
+
+// The tip that is seen; null when there is none within the time that one takes.
+HWND TipSeen(Form& form) {
+  for (int i = 0; i < 28; ++i) {
+    Sleep(25);
+    form.Pump();
+    for (HWND tip = nullptr; (tip = FindWindowExW(nullptr, tip, TOOLTIPS_CLASSW, nullptr)) != nullptr;)
+      if (IsWindowVisible(tip)) return tip;
+  }
+  return nullptr;
+}
+
+TEST(ListControl, ShowsInATipWhatDoesNotFitUntilItsColumnIsMadeWider) {
+  Form form;
+  form.Open(L"jpg");
+  form.Show();
+  const auto rest = [&](int row, int column) {
+    const RECT cell = PlaceOf(form, row, column);
+    Point(form, cell.left + 30, (cell.top + cell.bottom) / 2);
+    const HWND seen = TipSeen(form);
+    wchar_t text[300] = {};
+    TTTOOLINFOW tool = {};
+    tool.cbSize = sizeof tool;
+    tool.hwnd = form.ListWindow();
+    tool.lpszText = text;
+    if (seen) SendMessageW(seen, TTM_GETTEXTW, 300, reinterpret_cast<LPARAM>(&tool));
+    return std::wstring(text);
+  };
+  EXPECT_EQ(rest(3, 0), L"");
+  EXPECT_EQ(rest(0, 1), Address(kJpegs[0]));
+  // It goes with what it tells of.
+  const HWND tip = TipSeen(form);
+  form.list->ChangeFileFilter(Bstr(L"jpg"));
+  EXPECT_FALSE(IsWindowVisible(tip));
+  EXPECT_EQ(rest(0, 0), kJpegs[0]);
+
+  const auto width = [&] { return SendMessageW(form.ListWindow(), LVM_GETCOLUMNWIDTH, 0, 0); };
+  EXPECT_EQ(width(), 96);
+  RECT heading = {};
+  GetWindowRect(ListView_GetHeader(form.ListWindow()), &heading);
+  const LONG y = (heading.top + heading.bottom) / 2;
+  Point(form, heading.left + 96, y);
+  Mouse(MOUSEEVENTF_LEFTDOWN);
+  form.Pump();
+  Point(form, heading.left + 150, y);
+  Mouse(MOUSEEVENTF_LEFTUP);
+  form.Pump();
+  const LRESULT dragged = width();
+  EXPECT_NEAR(static_cast<int>(dragged), 150, 2);
+  EXPECT_EQ(rest(0, 0), L"");
+  ASSERT_TRUE(form.Init(L"jpg"));
+  EXPECT_EQ(width(), dragged);
+}
+
+TEST(ListControl, SaysWhyItHasNoItems) {
+  Form form;
+  form.Open(L"GIF");
+  form.Show();
+  const auto label = [&] {
+    const HWND window = FindWindowExW(form.Window(), nullptr, L"STATIC", nullptr);
+    return IsWindowVisible(window) ? TextOf(window) : L"";
+  };
+  EXPECT_EQ(label(), L"There are no images of this kind.");
+  EXPECT_EQ(GetFocus(), form.ListWindow());
+  form.list->ChangeFileFilter(Bstr(L"gif"));
+  EXPECT_EQ(label(), L"");
+
+  ComPtr<_CFileUpload> client;
+  ASSERT_EQ(form.list->get_mobjFileupload(client.Receive()), S_OK);
+  const Bstr product(TheServer().product);
+  const Bstr user(L"empty@example.org");
+  Bstr given;
+  client->AddUser(product, user, VariantOf(Bstr(L"")), given.Receive());
+  ASSERT_TRUE(form.Init(L"*"));
+  EXPECT_EQ(label(), L"There are no images in the Brimvault account.");
+  EXPECT_EQ(GetFocus(), form.Window());
+  EXPECT_EQ(TextOf(GetFocus()), label());
+  Bstr key;
+  LONG status = 0;
+  client->GetKeyForUser(product, user, key.Receive());
+  client->DeleteUser(product, user, VariantOf(key), VARIANT_TRUE, &status);
+  EXPECT_EQ(status, 1001);
+}
+
 TEST(ListControl, SharesTheKeyboardWithItsForm) {
   Form form;
   form.Open(L"*");
