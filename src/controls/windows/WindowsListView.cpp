@@ -429,7 +429,11 @@ std::optional<LRESULT> WindowsListView::OnKeyDown(HWND list, WPARAM key, LPARAM 
     case 'A':
       // With Alt as well it is a letter on some keyboards.
       if (!multiple_ || count_ == 0 || GetKeyState(VK_CONTROL) >= 0 || GetKeyState(VK_MENU) < 0) break;
+      // Under Wine each item would be looked up on the screen.
+      Ask(WM_SETREDRAW, FALSE, 0);
       SetState(-1, LVIS_SELECTED, LVIS_SELECTED);
+      Ask(WM_SETREDRAW, TRUE, 0);
+      InvalidateRect(list, nullptr, FALSE);
       user_->OnSelectionChanged();
       return 0;
     default:
@@ -499,6 +503,9 @@ void WindowsListView::ForgetPointer() {
 
 // Everything in memory first, so that nothing flickers. The older common controls do not offer that.
 void WindowsListView::PaintList(HWND list) const {
+  // Of what lies between two rows nothing is drawn.
+  const RegionOwner changed(CreateRectRgn(0, 0, 0, 0));
+  GetUpdateRgn(list, changed.Get(), FALSE);
   const PaintingOwner painting = Paint(list);
   const HDC screen = painting.Get().paint.hdc;
   const RECT& area = painting.Get().paint.rcPaint;
@@ -507,6 +514,8 @@ void WindowsListView::PaintList(HWND list) const {
   const MemoryDcOwner memory(CreateCompatibleDC(screen));
   const BitmapOwner bitmap(CreateCompatibleBitmap(screen, width, height));
   const SelectionOwner picture = SelectInto(memory.Get(), bitmap.Get());
+  OffsetRgn(changed.Get(), -area.left, -area.top);
+  SelectClipRgn(memory.Get(), changed.Get());
   SetViewportOrgEx(memory.Get(), -area.left, -area.top, nullptr);
   const auto target = reinterpret_cast<WPARAM>(memory.Get());
   Ask(WM_ERASEBKGND, target, 0);

@@ -72,6 +72,7 @@ using BitmapOwner = Owner<HBITMAP, DeleteObject>;
 using IconOwner = Owner<HICON, DestroyIcon>;
 using BrushOwner = Owner<HBRUSH, DeleteObject>;
 using PenOwner = Owner<HPEN, DeleteObject>;
+using RegionOwner = Owner<HRGN, DeleteObject>;
 using MemoryDcOwner = Owner<HDC, DeleteDC>;
 
 // Owners of two values that end together.
