@@ -339,6 +339,8 @@ HWND TipSeen(Form& form) {
 
 TEST(ListControl, ShowsInATipWhatDoesNotFitUntilItsColumnIsMadeWider) {
   Form form;
+  // No scroll bar comes.
+  form.container->SetBounds({0, 0, 390, 290});
   form.Open(L"jpg");
   form.Show();
   const auto rest = [&](int row, int column) {
