@@ -416,7 +416,7 @@ std::optional<LRESULT> WindowsListView::OnListMessage(HWND list, UINT message, W
   }
 }
 
-std::optional<LRESULT> WindowsListView::OnKeyDown(HWND list, WPARAM key, LPARAM lParam) {
+LRESULT WindowsListView::OnKeyDown(HWND list, WPARAM key, LPARAM lParam) {
   switch (key) {
     case VK_RETURN:
       user_->OnEnter();

@@ -54,7 +54,7 @@ class WindowsListView : public ListView, public ControlWindow {
   std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;
   std::optional<LRESULT> OnListMessage(HWND list, UINT message, WPARAM wParam, LPARAM lParam);
   LRESULT OnNotify(const NMHDR& header);
-  std::optional<LRESULT> OnKeyDown(HWND list, WPARAM key, LPARAM lParam);
+  LRESULT OnKeyDown(HWND list, WPARAM key, LPARAM lParam);
   // The key that stands for the right button was pressed in the list, or in the outer window in its place.
   LRESULT OnMenuKey(HWND window);
   // Where the menu belongs, in the list's coordinates.

@@ -324,6 +324,14 @@ TEST(ListControl, SelectsByRowsAndKeys) {
     EXPECT_EQ(form.events, several ? Lines{L"1015 " + Address(kJpegs[0])} : Lines());
   }
   RemoveWindowSubclass(form.frame, MenuProc, kMenus);
+
+  // What is to be painted anew is not seen without its contents meanwhile.
+  const HDC screen = GetDC(form.ListWindow());
+  constexpr COLORREF kSeen = RGB(200, 10, 20);
+  SetPixel(screen, 5, 100, kSeen);
+  SendMessageW(form.ListWindow(), WM_ERASEBKGND, reinterpret_cast<WPARAM>(screen), 0);
+  EXPECT_EQ(GetPixel(screen, 5, 100), kSeen);
+  ReleaseDC(form.ListWindow(), screen);
 }
 
 // The tip that is seen; null when there is none within the time that one takes.
