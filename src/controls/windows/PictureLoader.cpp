@@ -18,8 +18,9 @@ namespace {
 
 // Lines are decoded in strips of about this size, which the cache of a processor core holds.
 constexpr std::size_t kStripBytes = 256 * 1024;
-// Pictures of tiles in strips of more lines, because a decoder unpacks a whole tile for any of its lines.
-constexpr std::uint32_t kTileLines = 1024;
+// A decoder of TIFF, WebP or HEIF may unpack a whole tile, or the whole picture, for any of its lines. Twelve
+// megapixels come in one strip, 64 in four.
+constexpr std::size_t kLargeStripBytes = 64 * 1024 * 1024;
 
 // Larger than any screen; keeps a line of the target small beside the picture.
 constexpr int kLongestTargetSide = 16'384;
@@ -326,9 +327,9 @@ std::optional<Source> OpenSource(IWICImagingFactory& factory, IStream& stream, P
 // Gives all lines of the picture to `averager`; false when one cannot be decoded.
 bool AddLines(const Source& source, const PictureFacts& facts, Averager& averager) {
   const std::size_t stride = std::size_t{facts.width} * BytesPerPixel(source.layout);
-  const std::size_t wanted =
-      IsMeasured(facts) ? std::max<std::size_t>(kStripBytes / stride, 1) : std::size_t{kTileLines};
-  const auto stripLines = static_cast<std::uint32_t>(std::min<std::size_t>(wanted, facts.frameHeight));
+  const std::size_t stripBytes = IsMeasured(facts) ? kStripBytes : kLargeStripBytes;
+  const auto stripLines = static_cast<std::uint32_t>(
+      std::clamp<std::size_t>(stripBytes / stride, 1, std::size_t{facts.frameHeight}));
   // Zero is transparent: what stands beside a picture that covers only a part.
   std::vector<std::uint8_t> strip(stride * stripLines);
   const std::size_t indent = std::size_t{facts.left} * BytesPerPixel(source.layout);

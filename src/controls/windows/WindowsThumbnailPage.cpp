@@ -30,7 +30,7 @@ constexpr int kTipWidth = 400;
 const wchar_t* ReasonOf(PictureFault fault) {
   switch (fault) {
     case PictureFault::kDamaged:
-      return L"Not shown: the file is damaged or cannot be read.";
+      return L"Not shown: the file is damaged, or this system cannot read it.";
     case PictureFault::kTooLarge:
       return L"Not shown: the picture is too large.";
     case PictureFault::kOtherKind:
