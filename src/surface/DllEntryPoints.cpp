@@ -4,6 +4,7 @@
 #include <olectl.h>
 
 #include "controls/windows/ControlWindow.h"
+#include "controls/windows/PageAccessible.h"
 #include "surface/ClassFactory.h"
 #include "surface/Guard.h"
 #include "surface/Module.h"
@@ -33,8 +34,11 @@ STDAPI DllGetClassObject(REFCLSID classId, REFIID interfaceId, LPVOID* factory) 
 }
 
 STDAPI DllCanUnloadNow() {
-  return tarnwick::Guarded(
-      [] { return tarnwick::module::IsHeld() || tarnwick::ControlWindow::AnyLeft() ? S_FALSE : S_OK; });
+  return tarnwick::Guarded([] {
+    const bool inUse = tarnwick::module::IsHeld() || tarnwick::ControlWindow::AnyLeft() ||
+                       tarnwick::PageAccessible::AnyLeft();
+    return inUse ? S_FALSE : S_OK;
+  });
 }
 
 STDAPI DllRegisterServer() {

@@ -89,12 +89,13 @@ TEST_F(ThumbNailTest, Pages) {
     int max;
     const char* first;
     const char* last;
+    const char* place;
   } kCases[] = {
-      {0, false, -4, "No pictures./Click here for it", "No pictures./Click here for it"},
-      {1, false, -2, "1.gif* ", "1.gif* "},
-      {4, false, 0, "1.gif* 2.gif 3.gif 4.gif ", "1.gif* 2.gif 3.gif 4.gif "},
-      {5, true, 2, "1.gif* 2.gif 3.gif 4.gif ", "3.gif* 4.gif 5.gif "},
-      {8, true, 4, "1.gif* 2.gif 3.gif 4.gif ", "5.gif* 6.gif 7.gif 8.gif "},
+      {0, false, -4, "No pictures./Click here for it", "No pictures./Click here for it", ""},
+      {1, false, -2, "1.gif* ", "1.gif* ", "1 of 1"},
+      {4, false, 0, "1.gif* 2.gif 3.gif 4.gif ", "1.gif* 2.gif 3.gif 4.gif ", "1 to 4 of 4"},
+      {5, true, 2, "1.gif* 2.gif 3.gif 4.gif ", "3.gif* 4.gif 5.gif ", "3 to 5 of 5"},
+      {8, true, 4, "1.gif* 2.gif 3.gif 4.gif ", "5.gif* 6.gif 7.gif 8.gif ", "5 to 8 of 8"},
   };
   for (const auto& test : kCases) {
     SCOPED_TRACE(test.count);
@@ -104,6 +105,7 @@ TEST_F(ThumbNailTest, Pages) {
     EXPECT_EQ(page.Look(), test.first);
     if (test.scrolls) Scroll(test.max);
     EXPECT_EQ(page.Look(), test.last);
+    EXPECT_EQ(Utf8FromText(control.PlaceOfPage()), test.place);
     EXPECT_EQ(page.scrolls, test.scrolls);
     EXPECT_EQ(Events(), "");
   }
@@ -250,6 +252,7 @@ TEST_F(ThumbNailTest, FetchesWhatIsMissing) {
              "download http://h/u/d.gif to ", "5555 ", "cancel", "watchdog stops", "caption 4 d.gif",
              "1234 -1"});
   EXPECT_EQ(page.Look(), "a.gif* b&&b.gif c.gif d.gif! ");
+  EXPECT_EQ(control.NameOf(2), u"b&b.gif");
   EXPECT_FALSE(control.m_bTransferInProgress || control.gbConnectionFailed);
   EXPECT_EQ(page.At(2).place.top, 671.5);
 }

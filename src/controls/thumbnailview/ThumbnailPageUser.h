@@ -28,6 +28,11 @@ class ThumbnailPageUser {
 
   // The picture that the slot waits for cannot be shown. Runs none of the host's code.
   virtual void OnPictureUnreadable(int slot) = 0;
+
+  // For screen readers: the whole name of the picture that a slot shows or waits for, empty for none, and
+  // where the page stands in the list, such as "5 to 8 of 120".
+  virtual Text NameOf(int slot) const = 0;
+  virtual Text PlaceOfPage() const = 0;
 };
 
 }  // namespace tarnwick

@@ -259,6 +259,21 @@ void ctrlThumbNailView::OnPictureUnreadable(int slot) {
     copies_.RemoveUnless(copies_.PathOf(record->FilePath), record->FileSize);
 }
 
+Text ctrlThumbNailView::NameOf(int slot) const {
+  const CUpload* record = listing_.shown.Find(AddressOf(slot));
+  return Text(record ? record->FileName : FileNameFromUrl(AddressOf(slot)));
+}
+
+Text ctrlThumbNailView::PlaceOfPage() const {
+  const FileList& shown = listing_.shown;
+  const auto count = static_cast<int>(shown.Count());
+  const auto first = static_cast<int>(shown.PositionOf(AddressOf(1)));
+  if (first == 0) return {};
+  const int last = std::min(first + kSlotCount - 1, count);
+  const Text end = last == first ? Text() : u" to " + TextFromNumber(last);
+  return TextFromNumber(first) + end + u" of " + TextFromNumber(count);
+}
+
 void ctrlThumbNailView::TransferEnded() {
   if (std::exchange(fillIsOwed_, false) && !IsClosed()) ShowPage(firstIndex_);
 }

@@ -61,6 +61,8 @@ class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
   void OnEditorEntered() override;
   void OnEditorLeft() override;
   void OnPictureUnreadable(int slot) override;
+  Text NameOf(int slot) const override;
+  Text PlaceOfPage() const override;
   void OnFilesEnter() override;
 
  private:
@@ -97,6 +99,7 @@ class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
   // Shows the page that begins at `first`, or the last one, and selects an item, its first one without one.
   void ShowFrom(int first, std::optional<std::size_t> position);
 
+  const Text& AddressOf(int slot) const { return addresses_[static_cast<std::size_t>(slot - 1)]; }
   Text& AddressOf(int slot) { return addresses_[static_cast<std::size_t>(slot - 1)]; }
   // 0 when the picture is not on the page.
   int SlotOf(TextView address) const;

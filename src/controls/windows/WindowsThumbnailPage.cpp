@@ -52,6 +52,10 @@ WindowsThumbnailPage::WindowsThumbnailPage(HINSTANCE module, ControlWindowUser& 
         TakePicture(request, std::move(picture));
       }) {}
 
+WindowsThumbnailPage::~WindowsThumbnailPage() {
+  DisconnectAccessibles();
+}
+
 // --- The windows ---
 
 bool WindowsThumbnailPage::MakeChildren() {
@@ -112,7 +116,8 @@ void WindowsThumbnailPage::WindowGone() {
   for (Slot& slot : slots_) slot.window = nullptr;
   tips_ = {};
   scrollBar_.SetWindow(nullptr);
-  edited_ = 0;
+  DisconnectAccessibles();
+  toldSlot_ = edited_ = 0;
   tellingFocus_ = tellingEditor_ = false;
   dragFrom_.reset();
 }
@@ -205,7 +210,9 @@ void WindowsThumbnailPage::SetEmptyTexts(TextView message, TextView link) {
 void WindowsThumbnailPage::SetGridText(TextView text) {
   if (gridText_ == text) return;
   gridText_ = text;
-  if (gridWindow_) InvalidateRect(gridWindow_, nullptr, FALSE);
+  if (!gridWindow_) return;
+  InvalidateRect(gridWindow_, nullptr, FALSE);
+  NotifyWinEvent(EVENT_OBJECT_VALUECHANGE, gridWindow_, OBJID_CLIENT, CHILDID_SELF);
 }
 
 void WindowsThumbnailPage::ApplyTexts() const {
@@ -324,11 +331,80 @@ void WindowsThumbnailPage::TakePicture(const std::shared_ptr<const PictureReques
 
 void WindowsThumbnailPage::SetSelected(int slot, bool selected) {
   Slot& changed = At(slot);
-  if (changed.selected == selected) return;
-  changed.selected = selected;
+  const bool looksOther = std::exchange(changed.selected, selected) != selected;
   if (!changed.window) return;
-  InvalidateRect(changed.window, nullptr, FALSE);
-  if (selected) NotifyWinEvent(EVENT_OBJECT_SELECTION, changed.window, OBJID_CLIENT, CHILDID_SELF);
+  if (looksOther) InvalidateRect(changed.window, nullptr, FALSE);
+  if (selected)
+    TellSelection(slot);
+  else if (toldSlot_ == slot)
+    toldSlot_ = 0;
+}
+
+// --- Screen readers ---
+
+// On another page the same slot has another picture.
+void WindowsThumbnailPage::TellSelection(int slot) {
+  const std::wstring place = SpokenPlace();
+  if (std::exchange(toldPlace_, place) != place)
+    for (const DWORD event : {EVENT_OBJECT_REORDER, EVENT_OBJECT_VALUECHANGE})
+      NotifyWinEvent(event, gridWindow_, OBJID_CLIENT, CHILDID_SELF);
+  const std::wstring name = SpokenName(slot);
+  const bool sameName = std::exchange(toldName_, name) == name;
+  if (std::exchange(toldSlot_, slot) == slot && sameName) return;
+  NotifyWinEvent(EVENT_OBJECT_SELECTION, At(slot).window, OBJID_CLIENT, CHILDID_SELF);
+  TellFocus();
+}
+
+void WindowsThumbnailPage::TellFocus() const {
+  const int selected = SelectedSlot();
+  if (selected != 0 && GetFocus() == gridWindow_)
+    NotifyWinEvent(EVENT_OBJECT_FOCUS, WindowOf(selected), OBJID_CLIENT, CHILDID_SELF);
+}
+
+PageAccessible& WindowsThumbnailPage::AccessibleOf(int slot) {
+  ComPtr<PageAccessible>& object = accessibles_[static_cast<std::size_t>(slot)];
+  if (!object) object = ComPtr<PageAccessible>::Adopt(new PageAccessible(*this, slot));
+  return *object;
+}
+
+void WindowsThumbnailPage::DisconnectAccessibles() {
+  for (ComPtr<PageAccessible>& object : accessibles_)
+    if (const ComPtr<PageAccessible> held = std::exchange(object, {})) held->Disconnect();
+}
+
+HWND WindowsThumbnailPage::WindowOf(int slot) const {
+  return slot == 0 ? gridWindow_ : slots_[static_cast<std::size_t>(slot) - 1].window;
+}
+
+int WindowsThumbnailPage::PictureCount() const {
+  int count = 0;
+  while (count < kSlotCount && !user_->NameOf(count + 1).empty()) ++count;
+  return count;
+}
+
+int WindowsThumbnailPage::SelectedSlot() const {
+  const auto selected = std::ranges::find(slots_, true, &Slot::selected);
+  return selected == slots_.end() ? 0 : static_cast<int>(selected - slots_.begin()) + 1;
+}
+
+std::wstring WindowsThumbnailPage::SpokenName(int slot) const {
+  return slot == 0 ? kPageName : WideFromText(ShownName(user_->NameOf(slot)));
+}
+
+std::wstring WindowsThumbnailPage::SpokenPlace() const {
+  const Text place = user_->PlaceOfPage();
+  return WideFromText(place.empty() ? gridText_ : place);
+}
+
+// What a program does for its user.
+LRESULT WindowsThumbnailPage::OnAct(WPARAM acts, int slot) {
+  const HWND outer = Outer();
+  // The page may have become shorter since.
+  if (content_ != Content::kGrid || slot < 0 || slot > PictureCount()) return 0;
+  if (acts & PageAccessible::kTakeFocus) SetFocus(gridWindow_);
+  if (Outer() == outer && (acts & PageAccessible::kSelect)) user_->OnSlotPressed(slot, false);
+  if (Outer() == outer && (acts & PageAccessible::kOpen)) user_->OnKeyDown(VK_RETURN);
+  return 0;
 }
 
 // --- The editor ---
@@ -378,6 +454,10 @@ Text WindowsThumbnailPage::EditorText() const {
 std::optional<LRESULT> WindowsThumbnailPage::OnMessage(HWND window, UINT message, WPARAM wParam,
                                                        LPARAM lParam) {
   if (message == WM_SETFOCUS) return OnFocus(window, wParam, lParam);
+  // 32 bits of a 64-bit value, with or without their sign.
+  if (message == WM_GETOBJECT && static_cast<LONG>(lParam) == OBJID_CLIENT &&
+      (window == gridWindow_ || SlotOf(window) != 0))
+    return LresultFromObject(__uuidof(IAccessible), wParam, &AccessibleOf(SlotOf(window)));
   if (window == Outer()) return OnOuterMessage(message, wParam, lParam);
   if (window == editorWindow_) return OnEditorMessage(message, wParam, lParam);
   if (window == linkWindow_ || window == switchWindow_)
@@ -393,6 +473,7 @@ LRESULT WindowsThumbnailPage::OnFocus(HWND window, WPARAM wParam, LPARAM lParam)
   }
   const LRESULT result = DefSubclassProc(window, WM_SETFOCUS, wParam, lParam);
   RefreshGrid();
+  if (window == gridWindow_) TellFocus();
   tellingFocus_ = true;
   control_.Activated();
   tellingFocus_ = false;
@@ -482,6 +563,8 @@ std::optional<LRESULT> WindowsThumbnailPage::OnGridMessage(HWND window, UINT mes
     case WM_KEYDOWN:
       user_->OnKeyDown(static_cast<int>(wParam));
       return 0;
+    case PageAccessible::kActMessage:
+      return OnAct(wParam, static_cast<int>(lParam));
     default:
       return std::nullopt;
   }

@@ -13,11 +13,13 @@
 #include "controls/thumbnailview/ThumbnailPage.h"
 #include "controls/thumbnailview/ThumbnailPageUser.h"
 #include "controls/windows/ControlWindow.h"
+#include "controls/windows/PageAccessible.h"
 #include "controls/windows/PageScrollBar.h"
 #include "controls/windows/PictureCache.h"
 #include "controls/windows/PictureWorkers.h"
 #include "controls/windows/ThumbnailLayout.h"
 #include "controls/windows/ThumbnailTile.h"
+#include "platform/windows/ComPtr.h"
 #include "platform/windows/Owner.h"
 
 namespace tarnwick {
@@ -30,6 +32,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   // `module` is where the window's class belongs. `control` outlives the object. The thread has initialised
   // COM, which reads the pictures.
   WindowsThumbnailPage(HINSTANCE module, ControlWindowUser& control);
+  ~WindowsThumbnailPage() override;
 
   // Before the window is made; `user` takes part until the object ends.
   void SetUser(ThumbnailPageUser& user) { user_ = &user; }
@@ -40,6 +43,16 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   // Moves the keyboard focus to the next stop inside the control, or to the one before; false at the end,
   // when it is the container's turn.
   bool MoveFocus(bool backward);
+
+  // For screen readers. Slot 0 is the grid.
+  PageAccessible& AccessibleOf(int slot);
+  HWND WindowOf(int slot) const;
+  int PictureCount() const;
+  // The slot that looks selected, or 0.
+  int SelectedSlot() const;
+  std::wstring SpokenName(int slot) const;
+  // Of the page among all pictures, or what the grid says in place of them.
+  std::wstring SpokenPlace() const;
 
   void ShowGrid(bool grid) override;
   void SetEmptyTexts(TextView message, TextView link) override;
@@ -92,6 +105,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   bool MakeTips();
   static std::wstring TipOf(const Slot& slot);
   LRESULT OnFocus(HWND window, WPARAM wParam, LPARAM lParam);
+  LRESULT OnAct(WPARAM acts, int slot);
   LRESULT OnPress(HWND window, UINT message, POINT at);
   LRESULT OnMove(POINT at);
   void EndDragWatch();
@@ -100,6 +114,9 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   int SlotOf(HWND window) const;
   HWND FirstStop() const;
   void PlaceChildren() const;
+  void TellSelection(int slot);
+  void TellFocus() const;
+  void DisconnectAccessibles();
   bool LoadPictureOf(Slot& slot);
   static void Show(Slot& slot, const SharedPicture& picture);
   void TakePicture(const std::shared_ptr<const PictureRequest>& request, ShownPicture picture);
@@ -126,6 +143,12 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   Text message_;
   Text link_;
   Text gridText_;
+  // What screen readers have of the page, the grid first; made when they ask.
+  std::array<ComPtr<PageAccessible>, kSlotCount + 1> accessibles_;
+  // What they were told last: the selected slot, or 0, its picture's name, and the page.
+  int toldSlot_ = 0;
+  std::wstring toldName_;
+  std::wstring toldPlace_;
   PageScrollBar scrollBar_;
 
   HWND gridWindow_ = nullptr;

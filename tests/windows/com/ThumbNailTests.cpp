@@ -1,4 +1,6 @@
 // The thumbnail control on a form: pages of real pictures from a server, and what the user does with them.
+#include <oleacc.h>
+
 #include <algorithm>
 #include <functional>
 #include <map>
@@ -126,6 +128,19 @@ TEST(ThumbNailControl, ShowsPagesOfPicturesFromTheServer) {
   form.control->ChangeFileFilter(Bstr(L"jpg"));
   EXPECT_EQ(form.Captions(), kJpegs);
   EXPECT_FALSE(IsWindowEnabled(form.ScrollBar()));
+  // Screen readers are told where the page stands.
+  const auto place = [&] {
+    ComPtr<IAccessible> grid;
+    Bstr value;
+    EXPECT_EQ(AccessibleObjectFromWindow(form.Grid(), static_cast<DWORD>(OBJID_CLIENT), __uuidof(IAccessible),
+                                         grid.ReceiveVoid()),
+              S_OK);
+    EXPECT_EQ(grid->get_accValue(VariantOf(LONG{CHILDID_SELF}), value.Receive()), S_OK);
+    return value.Text();
+  };
+  EXPECT_EQ(place(), L"1 to 4 of 4");
+  form.control->ChangeFileFilter(Bstr(L"none"));
+  EXPECT_EQ(place(), L"No images of this kind.");
   EXPECT_EQ(form.events, Lines());
 }
 

@@ -4,6 +4,7 @@
 
 #include <gtest/gtest.h>
 #include <objbase.h>
+#include <oleacc.h>
 
 #include <algorithm>
 #include <functional>
@@ -11,6 +12,7 @@
 #include <span>
 #include <string>
 #include <string_view>
+#include <thread>
 #include <vector>
 
 #include "controls/windows/WindowsScrollHook.h"
@@ -29,6 +31,8 @@ class ScriptedUser : public ThumbnailPageUser, public ControlWindowUser {
   std::vector<std::string> told;
   std::function<void(const std::string&)> on;
   bool tellsFocus = false;
+  // Of the page in the list.
+  int first = 0;
 
   void OnSlotPressed(int slot, bool right) override {
     Tell("slot " + std::to_string(slot) + (right ? " right" : ""));
@@ -42,6 +46,11 @@ class ScriptedUser : public ThumbnailPageUser, public ControlWindowUser {
   void OnEditorEntered() override { Tell("entered"); }
   void OnEditorLeft() override { Tell("left"); }
   void OnPictureUnreadable(int slot) override { Tell("unreadable " + std::to_string(slot)); }
+  Text NameOf(int slot) const override {
+    return slot == kSlotCount ? Text()
+                              : TextFromNumber(first + slot) + u" & a name that is longer than captions.gif";
+  }
+  Text PlaceOfPage() const override { return u"from " + TextFromNumber(first + 1); }
   void DragBegins() override { Tell("drag"); }
   void FocusLeft() override {
     if (tellsFocus) Tell("focus left");
@@ -158,8 +167,8 @@ class ThumbnailPageTest : public testing::Test {
         CreateWindowExW(0, L"STATIC", L"host", WS_POPUP, 0, 0, 600, 600, nullptr, nullptr, nullptr, nullptr);
     // Waiting for a window manager that is not there would take seconds.
     ShowWindow(top_, SW_SHOWNOACTIVATE);
-    other_ = CreateWindowExW(0, L"EDIT", L"", WS_CHILD | WS_VISIBLE, 0, 0, 10, 10, top_, nullptr, nullptr,
-                             nullptr);
+    other_ = CreateWindowExW(0, L"EDIT", L"", WS_CHILD | WS_VISIBLE | WS_TABSTOP, 0, 0, 10, 10, top_, nullptr,
+                             nullptr, nullptr);
     Make();
   }
   ~ThumbnailPageTest() override {
@@ -605,14 +614,35 @@ TEST_F(ThumbnailPageTest, TheKeyboardReachesWhatIsShown) {
   user_.tellsFocus = false;
   SetFocus(Grid());
 
+  // By the control itself, and in the loop of a dialog that knows nothing of controls.
   const auto walk = [&](bool backward) {
-    std::vector<HWND> stops = {GetFocus()};
+    const HWND begin = GetFocus();
+    std::vector<HWND> stops = {begin};
     while (page_->MoveFocus(backward) && stops.size() < 9) stops.push_back(GetFocus());
+    const HWND end = GetFocus();
+    SetFocus(begin);
+    BYTE keys[256] = {};
+    keys[VK_SHIFT] = backward ? 0x80 : 0;
+    SetKeyboardState(keys);
+    for (std::size_t i = 1; i <= stops.size(); ++i) {
+      MSG tab = {GetFocus(), WM_KEYDOWN, VK_TAB, 0, 0, {0, 0}};
+      EXPECT_TRUE(IsDialogMessageW(top_, &tab));
+      EXPECT_EQ(GetFocus(), i < stops.size() ? stops[i] : other_);
+    }
+    keys[VK_SHIFT] = 0;
+    SetKeyboardState(keys);
+    SetFocus(end);
     return stops;
   };
   using Windows = std::vector<HWND>;
   EXPECT_EQ(walk(false), (Windows{Grid(), ScrollBar(), Switch()}));
   EXPECT_EQ(walk(true), (Windows{Switch(), ScrollBar(), Grid()}));
+  page_->ShowEditor(1, u"a");
+  MSG tab = {Editor(), WM_KEYDOWN, VK_TAB, 0, 0, {0, 0}};
+  IsDialogMessageW(top_, &tab);
+  EXPECT_EQ(GetFocus(), ScrollBar());
+  page_->HideEditor();
+  SetFocus(Grid());
   page_->EnableScroll(false);
   EXPECT_EQ(walk(false), (Windows{Grid(), Switch()}));
   page_->ShowGrid(false);
@@ -620,6 +650,181 @@ TEST_F(ThumbnailPageTest, TheKeyboardReachesWhatIsShown) {
   EXPECT_EQ(walk(false), (Windows{Link(), Switch()}));
   SetFocus(other_);
   EXPECT_FALSE(page_->MoveFocus(false));
+}
+
+// --- Screen readers ---
+
+ComPtr<IAccessible> AccessibleOf(HWND window) {
+  ComPtr<IAccessible> found;
+  EXPECT_EQ(AccessibleObjectFromWindow(window, static_cast<DWORD>(OBJID_CLIENT), __uuidof(IAccessible),
+                                       found.ReceiveVoid()),
+            S_OK);
+  return found;
+}
+
+VARIANT Item(LONG number) {
+  VARIANT item = {};
+  V_VT(&item) = VT_I4;
+  V_I4(&item) = number;
+  return item;
+}
+
+std::string TakenText(HRESULT result, BSTR text) {
+  std::string told = result == S_OK ? Utf8FromText(TextFromWide(text)) : result == S_FALSE ? "" : "failed";
+  SysFreeString(text);
+  return told;
+}
+
+// Role, state, name, value and action, as such a program would read them out.
+std::string ReadOut(IAccessible& object, LONG number = CHILDID_SELF) {
+  VARIANT role = {};
+  VARIANT state = {};
+  if (FAILED(object.get_accRole(Item(number), &role)) || FAILED(object.get_accState(Item(number), &state)))
+    return "gone";
+  std::string told = V_I4(&role) == ROLE_SYSTEM_LIST       ? "list"
+                     : V_I4(&role) == ROLE_SYSTEM_LISTITEM ? "item"
+                                                           : "?";
+  for (const auto& [bit, word] : {std::pair{STATE_SYSTEM_SELECTABLE, " selectable"},
+                                  {STATE_SYSTEM_SELECTED, " selected"},
+                                  {STATE_SYSTEM_FOCUSED, " focused"},
+                                  {STATE_SYSTEM_INVISIBLE, " hidden"}})
+    if (V_I4(&state) & bit) told += word;
+  using Get = HRESULT (STDMETHODCALLTYPE IAccessible::*)(VARIANT, BSTR*);
+  for (const Get get :
+       {&IAccessible::get_accName, &IAccessible::get_accValue, &IAccessible::get_accDefaultAction}) {
+    BSTR text = nullptr;
+    const HRESULT result = (object.*get)(Item(number), &text);
+    told += "|" + TakenText(result, text);
+  }
+  return told;
+}
+
+// What is told to who listens, as event and window.
+std::vector<std::pair<DWORD, HWND>> heard;
+void CALLBACK Hear(HWINEVENTHOOK, DWORD event, HWND window, LONG object, LONG child, DWORD, DWORD) {
+  if (object == OBJID_CLIENT && child == CHILDID_SELF) heard.emplace_back(event, window);
+}
+
+TEST_F(ThumbnailPageTest, ScreenReadersFindAListOfPictures) {
+  const auto name = [](int number) {
+    return std::to_string(number) + " & a name that is longer than captions.gif";
+  };
+  page_->SetSelected(2, true);
+  ComPtr<IAccessible> grid = AccessibleOf(Grid());
+  LONG count = 0;
+  EXPECT_EQ(grid->get_accChildCount(&count), S_OK);
+  EXPECT_EQ(count, 3);
+  EXPECT_EQ(ReadOut(*grid), "list|Pictures of the account|from 1|");
+  EXPECT_EQ(ReadOut(*grid, 1), "item selectable|" + name(1) + "||Open");
+  EXPECT_EQ(ReadOut(*grid, 2), "item selectable selected focused|" + name(2) + "||Open");
+  EXPECT_EQ(ReadOut(*grid, 4), "gone");
+  // By itself, as the selection, and as what is under the pointer.
+  const auto expectSecond = [&](IDispatch* object, const char* what) {
+    SCOPED_TRACE(what);
+    ComPtr<IAccessible> item;
+    ASSERT_TRUE(object && object->QueryInterface(__uuidof(IAccessible), item.ReceiveVoid()) == S_OK);
+    object->Release();
+    EXPECT_EQ(ReadOut(*item), "item selectable selected focused|" + name(2) + "||Open");
+    LONG left = 0;
+    LONG top = 0;
+    LONG width = 0;
+    LONG height = 0;
+    EXPECT_EQ(item->accLocation(&left, &top, &width, &height, Item(CHILDID_SELF)), S_OK);
+    RECT place = {};
+    GetWindowRect(Slot(2), &place);
+    const RECT told = {left, top, left + width, top + height};
+    EXPECT_TRUE(EqualRect(&place, &told));
+    ComPtr<IDispatch> parent;
+    EXPECT_EQ(item->get_accParent(parent.Receive()), S_OK);
+    EXPECT_EQ(parent.Get(), static_cast<IDispatch*>(grid.Get()));
+  };
+  IDispatch* child = nullptr;
+  EXPECT_EQ(grid->get_accChild(Item(2), &child), S_OK);
+  expectSecond(child, "child");
+  expectSecond(AccessibleOf(Slot(2)).Detach(), "window");
+  RECT place = {};
+  GetWindowRect(Slot(2), &place);
+  VARIANT found = {};
+  EXPECT_EQ(grid->accHitTest(place.left + 5, place.top + 5, &found), S_OK);
+  expectSecond(V_DISPATCH(&found), "hit");
+  for (const auto get : {&IAccessible::get_accSelection, &IAccessible::get_accFocus}) {
+    EXPECT_EQ((grid.Get()->*get)(&found), S_OK);
+    expectSecond(V_DISPATCH(&found), "selected");
+  }
+  SetFocus(other_);
+  EXPECT_EQ(ReadOut(*grid, 2), "item selectable selected|" + name(2) + "||Open");
+  EXPECT_EQ(grid->get_accFocus(&found), S_FALSE);
+
+  // What it is told to do is what the user does.
+  EXPECT_EQ(grid->accSelect(SELFLAG_TAKESELECTION, Item(3)), S_OK);
+  EXPECT_EQ(grid->accSelect(SELFLAG_ADDSELECTION, Item(1)), E_INVALIDARG);
+  EXPECT_EQ(user_.Take(), Told{}) << "not while the other program waits";
+  Pump();
+  EXPECT_EQ(GetFocus(), other_);
+  EXPECT_EQ(grid->accDoDefaultAction(Item(1)), S_OK);
+  EXPECT_EQ(grid->accDoDefaultAction(Item(CHILDID_SELF)), DISP_E_MEMBERNOTFOUND);
+  Pump();
+  EXPECT_EQ(GetFocus(), Grid());
+  EXPECT_EQ(user_.Take(), (Told{"slot 3", "slot 1", "key 13"}));
+
+  // Another thread's program asks by messages, and keeps what it got.
+  std::string told;
+  bool done = false;
+  ComPtr<IAccessible> kept = AccessibleOf(Slot(1));
+  std::thread other([&, window = Grid()] {
+    CoInitializeEx(nullptr, COINIT_MULTITHREADED);
+    if (const ComPtr<IAccessible> far = AccessibleOf(window)) told = ReadOut(*far, 3);
+    CoUninitialize();
+    done = true;
+  });
+  Await([&] { return done; });
+  other.join();
+  EXPECT_EQ(told, "item selectable|" + name(3) + "||Open");
+  page_.reset();
+  EXPECT_EQ(ReadOut(*kept), "gone");
+  EXPECT_TRUE(PageAccessible::AnyLeft());
+  kept = grid = {};
+  EXPECT_FALSE(PageAccessible::AnyLeft());
+}
+
+TEST_F(ThumbnailPageTest, ScreenReadersHearOfEachSelection) {
+  const HWINEVENTHOOK hook = SetWinEventHook(EVENT_OBJECT_REORDER, EVENT_OBJECT_VALUECHANGE, nullptr, Hear,
+                                             GetCurrentProcessId(), 0, WINEVENT_OUTOFCONTEXT);
+  ASSERT_TRUE(hook);
+  using Heard = std::vector<std::pair<DWORD, HWND>>;
+  const auto hears = [&](const std::function<void()>& action) {
+    Pump();
+    heard.clear();
+    action();
+    Pump();
+    std::erase_if(heard, [](const auto& event) {
+      return event.first != EVENT_OBJECT_REORDER && event.first != EVENT_OBJECT_FOCUS &&
+             event.first != EVENT_OBJECT_SELECTION && event.first != EVENT_OBJECT_VALUECHANGE;
+    });
+    return heard;
+  };
+  const auto select = [&](int selected) {
+    for (int slot = 1; slot <= kSlotCount; ++slot) page_->SetSelected(slot, slot == selected);
+  };
+  select(1);
+  EXPECT_EQ(hears([&] { select(2); }),
+            (Heard{{EVENT_OBJECT_SELECTION, Slot(2)}, {EVENT_OBJECT_FOCUS, Slot(2)}}));
+  EXPECT_EQ(hears([&] { select(2); }), Heard{});
+  // The same slot of another page.
+  EXPECT_EQ(hears([&] {
+              user_.first = 4;
+              select(2);
+            }),
+            (Heard{{EVENT_OBJECT_REORDER, Grid()},
+                   {EVENT_OBJECT_VALUECHANGE, Grid()},
+                   {EVENT_OBJECT_SELECTION, Slot(2)},
+                   {EVENT_OBJECT_FOCUS, Slot(2)}}));
+  EXPECT_EQ(hears([&] { SetFocus(other_); }), (Heard{{EVENT_OBJECT_FOCUS, other_}}));
+  EXPECT_EQ(hears([&] { select(0); }), Heard{});
+  EXPECT_EQ(hears([&] { select(2); }), (Heard{{EVENT_OBJECT_SELECTION, Slot(2)}}));
+  EXPECT_EQ(hears([&] { SetFocus(Grid()); }),
+            (Heard{{EVENT_OBJECT_FOCUS, Grid()}, {EVENT_OBJECT_FOCUS, Slot(2)}}));
+  UnhookWinEvent(hook);
 }
 
 // --- How it ends ---
