@@ -4,6 +4,10 @@
 
 #include <commdlg.h>
 
+#include <algorithm>
+#include <iterator>
+#include <utility>
+
 #include "platform/windows/CommonControls.h"
 #include "platform/windows/SystemDpi.h"
 
@@ -14,22 +18,35 @@ struct Button {
   Command command;
   const wchar_t* text;
 };
-constexpr const wchar_t* kToThumbnails = L"&Thumbnails";
-constexpr const wchar_t* kToList = L"&List";
-constexpr Button kButtons[] = {{kUpload, L"&Upload"},     {kDelete, L"&Delete"},   {kRename, L"&Rename"},
-                               {kDownload, L"Do&wnload"}, {kAll, L"&All"},         {kGif, L"&GIF"},
-                               {kJpg, L"&JPG"},           {kSwitch, kToThumbnails}};
+constexpr Button kButtons[] = {{kUpload, L"&Upload"}, {kOpen, L"&Open"},         {kRename, L"&Rename"},
+                               {kDelete, L"&Delete"}, {kDownload, L"Do&wnload"}, {kAll, L"&All"},
+                               {kGif, L"&GIF"},       {kJpg, L"&JPG"},           {kStop, L"&Stop"}};
+constexpr Button kMenu[] = {
+    {kOpen, L"&Open"}, {kRename, L"&Rename"}, {kDownload, L"Do&wnload"}, {kDelete, L"&Delete..."}};
+
+// Messages of the form to itself, for what shall not run inside an event.
+constexpr UINT kShowMenu = WM_APP;
+constexpr UINT kRefreshOther = WM_APP + 1;
 
 // Pixels at 96 dots per inch.
-constexpr int kWidth = 690;
-constexpr int kHeight = 596;
+constexpr int kWidth = 800;
 constexpr int kGap = 6;
 constexpr int kButtonWidth = 78;
 constexpr int kButtonHeight = 26;
 constexpr int kStatusHeight = 18;
 constexpr int kProgressWidth = 200;
-// The size that the thumbnails ask for.
+constexpr int kEventsHeight = 88;
+// The size that the thumbnails ask for. They do not grow.
 constexpr SIZE kThumbnails = {336, 408};
+// Above and below the controls.
+constexpr int kSiteTop = kButtonHeight + 2 * kGap;
+constexpr int kBelowSite = kStatusHeight + kEventsHeight + 3 * kGap;
+constexpr int kHeight = kSiteTop + kThumbnails.cy + kBelowSite;
+// The tool bar and, below it, some of the list beside the thumbnails.
+constexpr int kLeastWidth = static_cast<int>(std::size(kButtons)) * (kButtonWidth + kGap) + kGap;
+
+constexpr DWORD kFrameStyle = WS_OVERLAPPEDWINDOW | WS_CLIPCHILDREN;
+constexpr COLORREF kErrorColor = RGB(176, 0, 32);
 
 std::string Utf8(const std::wstring& text) {
   const int length = static_cast<int>(text.size());
@@ -63,10 +80,18 @@ int DemoHost::RunUntilClosed() {
 // --- Messages ---
 
 void DemoHost::Handle(MSG& message) {
-  if (list_.TranslateKey(message) || thumbnails_.TranslateKey(message)) return;
-  if (IsDialogMessageW(frame_, &message)) return;
-  TranslateMessage(&message);
-  DispatchMessageW(&message);
+  // The list has no event for this key, the thumbnails have.
+  if (message.message == WM_KEYDOWN && message.wParam == VK_DELETE && message.hwnd == list_.ListWindow())
+    return Do(kDelete);
+  // Neither control has an event for a double click.
+  const bool opens = message.message == WM_LBUTTONDBLCLK &&
+                     (message.hwnd == list_.ListWindow() || thumbnails_.IsPicture(message.hwnd));
+  if (!list_.TranslateKey(message) && !thumbnails_.TranslateKey(message) &&
+      !IsDialogMessageW(frame_, &message)) {
+    TranslateMessage(&message);
+    DispatchMessageW(&message);
+  }
+  if (opens) Do(kOpen);
 }
 
 void DemoHost::Pump() {
@@ -95,8 +120,36 @@ LRESULT CALLBACK DemoHost::FrameProc(HWND window, UINT message, WPARAM wParam, L
     case WM_SIZE:
       host->Layout();
       return 0;
+    case WM_SETFOCUS:
+      host->used_->Focus();
+      return 0;
+    case WM_GETMINMAXINFO: {
+      RECT least = {0, 0, host->Scaled(kLeastWidth), host->Scaled(kHeight)};
+      AdjustWindowRect(&least, kFrameStyle, FALSE);
+      reinterpret_cast<MINMAXINFO*>(lParam)->ptMinTrackSize = {least.right - least.left,
+                                                               least.bottom - least.top};
+      return 0;
+    }
+    case WM_CTLCOLORSTATIC: {
+      const LRESULT brush = DefWindowProcW(window, message, wParam, lParam);
+      if (host->isError_ && reinterpret_cast<HWND>(lParam) == host->status_)
+        SetTextColor(reinterpret_cast<HDC>(wParam), kErrorColor);
+      return brush;
+    }
     case WM_COMMAND:
       host->Do(LOWORD(wParam));
+      return 0;
+    case WM_CONTEXTMENU:
+      // The list has no event for its menu, but its window passes the system's message on.
+      if (reinterpret_cast<HWND>(wParam) != host->list_.ListWindow())
+        return DefWindowProcW(window, message, wParam, lParam);
+      host->ShowMenu({static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))});
+      return 0;
+    case kShowMenu:
+      host->ShowMenu({static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))});
+      return 0;
+    case kRefreshOther:
+      host->Show(host->Other(*reinterpret_cast<const FilePane*>(lParam)));
       return 0;
     case WM_DESTROY:
       host->list_.Close();
@@ -124,11 +177,14 @@ bool DemoHost::MakeWindows() {
   frame.hbrBackground = reinterpret_cast<HBRUSH>(COLOR_BTNFACE + 1);
   frame.lpszClassName = L"TarnwickDemo";
   RegisterClassExW(&frame);
-  constexpr DWORD kStyle = WS_OVERLAPPEDWINDOW | WS_CLIPCHILDREN;
   RECT size = {0, 0, Scaled(kWidth), Scaled(kHeight)};
-  AdjustWindowRect(&size, kStyle, FALSE);
-  frame_ = CreateWindowExW(WS_EX_CONTROLPARENT, L"TarnwickDemo", L"Picture account", kStyle, 0, 0,
-                           size.right - size.left, size.bottom - size.top, nullptr, nullptr, module, this);
+  AdjustWindowRect(&size, kFrameStyle, FALSE);
+  const int width = size.right - size.left;
+  const int height = size.bottom - size.top;
+  frame_ = CreateWindowExW(WS_EX_CONTROLPARENT, L"TarnwickDemo", L"Picture account", kFrameStyle,
+                           (GetSystemMetrics(SM_CXSCREEN) - width) / 2,
+                           (GetSystemMetrics(SM_CYSCREEN) - height) / 2, width, height, nullptr, nullptr,
+                           module, this);
   if (!frame_) return false;
   const auto child = [&](const wchar_t* kind, const wchar_t* text, DWORD style, int id) {
     const HWND made = CreateWindowExW(0, kind, text, WS_CHILD | WS_VISIBLE | style, 0, 0, 0, 0, frame_,
@@ -157,43 +213,51 @@ void DemoHost::Layout() {
     left += Scaled(kButtonWidth) + gap;
   }
   const int width = client.right - 2 * gap;
-  const int siteTop = Scaled(kButtonHeight) + 2 * gap;
-  const int siteHeight = Scaled(kThumbnails.cy);
+  const int siteTop = Scaled(kSiteTop);
+  const int siteHeight = client.bottom - siteTop - Scaled(kBelowSite);
   MoveWindow(site_, gap, siteTop, width, siteHeight, TRUE);
-  list_.SetBounds({0, 0, width, siteHeight});
-  // They do not grow, so they stand in the middle.
-  const int thumbnailsLeft = (width - Scaled(kThumbnails.cx)) / 2;
-  thumbnails_.SetBounds({thumbnailsLeft, 0, thumbnailsLeft + Scaled(kThumbnails.cx), siteHeight});
+  // The list grows with the form.
+  const int thumbnailsLeft = width - Scaled(kThumbnails.cx);
+  list_.SetBounds({0, 0, thumbnailsLeft - gap, siteHeight});
+  list_.SpreadColumns();
+  thumbnails_.SetBounds({thumbnailsLeft, 0, width, Scaled(kThumbnails.cy)});
 
   const int statusTop = siteTop + siteHeight + gap;
   const int statusHeight = Scaled(kStatusHeight);
   const int progressLeft = client.right - gap - Scaled(kProgressWidth);
   MoveWindow(status_, gap, statusTop, progressLeft - 2 * gap, statusHeight, TRUE);
   MoveWindow(progress_, progressLeft, statusTop, Scaled(kProgressWidth), statusHeight, TRUE);
-  const int eventsTop = statusTop + statusHeight + gap;
-  MoveWindow(events_, gap, eventsTop, width, client.bottom - gap - eventsTop, TRUE);
+  MoveWindow(events_, gap, statusTop + statusHeight + gap, width, Scaled(kEventsHeight), TRUE);
+  // On their way windows cover each other.
+  RedrawWindow(frame_, nullptr, nullptr, RDW_INVALIDATE | RDW_ERASE | RDW_ALLCHILDREN);
 }
 
 bool DemoHost::MakeControls() {
-  const auto onEvent = [this](DISPID event, std::vector<VARIANT>& arguments) { OnEvent(event, arguments); };
-  if (!list_.Create(site_, onEvent) || !thumbnails_.Create(site_, onEvent)) {
-    Log(L"The controls could not be created: is the library registered?");
-    return false;
+  for (FilePane* const pane : {static_cast<FilePane*>(&list_), static_cast<FilePane*>(&thumbnails_)}) {
+    pane->onUse = [this, pane] { Use(*pane); };
+    if (!pane->Create(site_, [this, pane](DISPID event, std::vector<VARIANT>& arguments) {
+          OnEvent(*pane, event, arguments);
+        })) {
+      Log(L"The controls could not be created: is the library registered?");
+      return false;
+    }
   }
   // One client for both.
   thumbnails_.UseClient(list_.Client().Get());
   Layout();
+  thumbnails_.Show();
   list_.Show();
   return true;
 }
 
-void DemoHost::Show(FilePane& pane) {
-  if (shown_ == &pane) return;
-  shown_->Hide();
-  shown_ = &pane;
-  SetWindowTextW(buttons_.back(), shown_ == &list_ ? kToThumbnails : kToList);
-  shown_->Show();
-  Fill();
+FilePane& DemoHost::Other(const FilePane& pane) {
+  if (&pane == &list_) return thumbnails_;
+  return list_;
+}
+
+void DemoHost::Use(FilePane& pane) {
+  used_ = &pane;
+  Other(pane).Deactivate();
 }
 
 // --- The account ---
@@ -207,53 +271,151 @@ bool DemoHost::LogOn() {
   const Argument product(Given(kProduct));
   const Argument password(Given(kPassword));
   if (done) client->LogonAs(product.Get(), user.Get(), password.Get(), Argument(L"").Get(), &done);
-  SetStatus((done ? L"Logged on as " : L"The service refused ") + Given(kUser));
+  SetStatus((done ? L"Logged on as " : L"The service refused ") + Given(kUser), !done);
   return done && Fill();
 }
 
-bool DemoHost::Fill() {
-  const bool done = shown_->Init(filter_);
-  if (!done) SetStatus(L"The files could not be listed");
+bool DemoHost::Show(FilePane& pane) {
+  FilePane& used = *used_;
+  const bool done = pane.Init(filter_);
+  // The thumbnails take the keyboard when they are filled.
+  Use(used);
+  used.Focus();
+  if (!done) SetStatus(L"The files could not be listed: " + pane.Problem(), true);
   return done;
+}
+
+bool DemoHost::Fill() {
+  // The thumbnails show what the list has listed.
+  return Show(list_) && Show(thumbnails_);
 }
 
 void DemoHost::ChangeFilter(const wchar_t* filter) {
   filter_ = filter;
-  shown_->ChangeFilter(filter_);
+  FilePane& used = *used_;
+  list_.ChangeFilter(filter_);
+  thumbnails_.ChangeFilter(filter_);
+  Use(used);
+  used.Focus();
+}
+
+// --- Commands ---
+
+void DemoHost::BeginWork(int size) {
+  working_ = true;
+  workSize_ = size;
+  SendMessageW(progress_, PBM_SETRANGE32, 0, std::max(size, 1));
+  SendMessageW(progress_, PBM_SETPOS, 0, 0);
+  UpdateStop();
+}
+
+void DemoHost::EndWork(const std::wstring& outcome, const std::wstring& failure) {
+  // The last progress event may come before the last byte, and a file without bytes has none.
+  SendMessageW(progress_, PBM_SETPOS, failure.empty() ? static_cast<WPARAM>(std::max(workSize_, 1)) : 0, 0);
+  workSize_ = 0;
+  working_ = false;
+  UpdateStop();
+  SetStatus(failure.empty() ? outcome : failure, !failure.empty());
+}
+
+void DemoHost::UpdateStop() {
+  const HWND stop = buttons_.back();
+  const bool on = working_ || fetching_;
+  // A button that is switched off would keep the keyboard for itself.
+  if (!on && GetFocus() == stop) used_->Focus();
+  EnableWindow(stop, on);
 }
 
 bool DemoHost::Upload(const std::wstring& path) {
-  SendMessageW(progress_, PBM_SETRANGE32, 0, 100);
-  const bool done = shown_->Upload(path);
-  SetStatus((done ? L"Uploaded " : L"Not uploaded: ") + path);
+  // The events of an upload count percent.
+  BeginWork(100);
+  FilePane& pane = *used_;
+  const bool done = pane.Upload(path);
+  EndWork(L"Uploaded " + path, done ? L"" : L"Not uploaded: " + pane.Problem());
+  if (done) Show(Other(pane));
   return done;
 }
 
 std::wstring DemoHost::Download() {
-  SendMessageW(progress_, PBM_SETRANGE32, 0, 300000);
-  std::wstring path = shown_->Download(Given(kDownloads));
-  SetStatus(L"Downloaded to " + path);
-  return path;
+  // Those of a download count bytes.
+  BeginWork(used_->SelectedSize());
+  FilePane& pane = *used_;
+  const std::wstring path = pane.Download(Given(kDownloads));
+  const std::wstring problem = pane.Problem();
+  EndWork(L"Downloaded to " + path, problem.empty() ? L"" : L"Not downloaded: " + problem);
+  return problem.empty() ? path : L"";
+}
+
+void DemoHost::OpenPicture() {
+  if (used_->SelectedCount() == 0) return SetStatus(L"Select a file first", true);
+  const std::wstring path = Download();
+  if (!path.empty() && !picture_.Show(frame_, path)) SetStatus(L"No picture: " + path, true);
+}
+
+void DemoHost::Delete() {
+  FilePane& pane = *used_;
+  const int count = pane.SelectedCount();
+  if (count == 0) return SetStatus(L"Select a file first", true);
+  const std::wstring what = count == 1 ? pane.Selected() : std::to_wstring(count) + L" files";
+  if (MessageBoxW(frame_, (L"Delete " + what + L" from the account?").c_str(), L"Picture account",
+                  MB_YESNO | MB_ICONQUESTION | MB_DEFBUTTON2) != IDYES)
+    return;
+  BeginWork(0);
+  pane.Delete();
+  const std::wstring problem = pane.Problem();
+  EndWork(L"Deleted " + what, problem.empty() ? L"" : L"Not deleted: " + problem);
+  Show(Other(pane));
+}
+
+void DemoHost::Stop() {
+  VARIANT on = {};
+  V_VT(&on) = VT_BOOL;
+  V_BOOL(&on) = VARIANT_TRUE;
+  VARIANT ignored = {};
+  // The client of both controls: whatever they have under way ends.
+  list_.Client()->AbortFileTransfer(&on, &ignored);
+}
+
+void DemoHost::ChooseUpload() {
+  wchar_t path[MAX_PATH] = L"";
+  OPENFILENAMEW dialog = {};
+  dialog.lStructSize = sizeof dialog;
+  dialog.hwndOwner = frame_;
+  dialog.lpstrFilter = L"Pictures\0*.jpg;*.gif;*.png\0";
+  dialog.lpstrFile = path;
+  dialog.nMaxFile = MAX_PATH;
+  dialog.Flags = OFN_NOCHANGEDIR;
+  if (GetOpenFileNameW(&dialog)) Upload(path);
+}
+
+void DemoHost::ShowMenu(POINT at) {
+  if (used_->SelectedCount() == 0) return;
+  // By the keyboard the menu has no place.
+  if (at.x == -1 && at.y == -1) {
+    at = {0, 0};
+    ClientToScreen(used_->Window(), &at);
+  }
+  const HMENU menu = CreatePopupMenu();
+  for (const Button& item : kMenu)
+    AppendMenuW(menu, MF_STRING, static_cast<UINT_PTR>(item.command), item.text);
+  SetMenuDefaultItem(menu, kOpen, FALSE);
+  TrackPopupMenu(menu, TPM_RIGHTBUTTON, at.x, at.y, 0, frame_, nullptr);
+  DestroyMenu(menu);
 }
 
 void DemoHost::Do(int command) {
+  if (command == kStop) return Stop();
+  // Controls pump messages while they work; one command at a time.
+  if (working_) return;
   switch (command) {
-    case kUpload: {
-      wchar_t path[MAX_PATH] = L"";
-      OPENFILENAMEW dialog = {};
-      dialog.lStructSize = sizeof dialog;
-      dialog.hwndOwner = frame_;
-      dialog.lpstrFilter = L"Pictures\0*.jpg;*.gif;*.png\0";
-      dialog.lpstrFile = path;
-      dialog.nMaxFile = MAX_PATH;
-      dialog.Flags = OFN_NOCHANGEDIR;
-      if (GetOpenFileNameW(&dialog)) Upload(path);
-      return;
-    }
-    case kDelete:
-      return shown_->Delete();
+    case kUpload:
+      return ChooseUpload();
+    case kOpen:
+      return OpenPicture();
     case kRename:
-      return shown_->StartRename();
+      return used_->StartRename();
+    case kDelete:
+      return Delete();
     case kDownload:
       Download();
       return;
@@ -263,9 +425,6 @@ void DemoHost::Do(int command) {
       return ChangeFilter(L"gif");
     case kJpg:
       return ChangeFilter(L"jpg");
-    case kSwitch:
-      if (shown_ == &list_) return Show(thumbnails_);
-      return Show(list_);
     default:
       return;
   }
@@ -283,7 +442,8 @@ void DemoHost::Log(const std::wstring& line) {
   SendMessageW(events_, LB_SETTOPINDEX, static_cast<WPARAM>(count - 1), 0);
 }
 
-void DemoHost::SetStatus(const std::wstring& text) {
+void DemoHost::SetStatus(const std::wstring& text, bool isError) {
+  isError_ = isError;
   SetWindowTextW(status_, text.c_str());
   Log(L"-- " + text);
 }
@@ -295,30 +455,57 @@ std::wstring DemoHost::Status() const {
 }
 
 int DemoHost::Progress() const {
-  return static_cast<int>(SendMessageW(progress_, PBM_GETPOS, 0, 0));
+  const auto position = static_cast<int>(SendMessageW(progress_, PBM_GETPOS, 0, 0));
+  return MulDiv(position, 100, static_cast<int>(SendMessageW(progress_, PBM_GETRANGE, FALSE, 0)));
 }
 
-void DemoHost::OnEvent(DISPID event, const std::vector<VARIANT>& arguments) {
-  if (event != DISPID_FileManagerEvent) {
-    if (event == DISPID_StateChanged) Log(L"StateChanged " + std::to_wstring(*V_I4REF(&arguments[0])));
-    return;
-  }
-  const int code = V_I2(V_VARIANTREF(&arguments[0]));
-  const std::wstring text = *V_BSTRREF(&arguments[1]) ? *V_BSTRREF(&arguments[1]) : L"";
+void DemoHost::OnEvent(FilePane& pane, DISPID event, const std::vector<VARIANT>& arguments) {
+  if (event == DISPID_StateChanged) Log(L"StateChanged " + std::to_wstring(*V_I4REF(&arguments[0])));
+  if (event != DISPID_FileManagerEvent) return;
+  const BSTR text = *V_BSTRREF(&arguments[1]);
+  OnFileManagerEvent(pane, V_I2(V_VARIANTREF(&arguments[0])), text ? text : L"");
+}
+
+void DemoHost::OnFileManagerEvent(FilePane& pane, int code, const std::wstring& text) {
   Log(L"FileManagerEvent " + std::to_wstring(code) + L" \"" + text + L"\"");
-  SetWindowTextW(status_, Wording(code, text).c_str());
+  isError_ = TellsFailure(code);
+  std::wstring words = Wording(code, text);
+  if (isError_) words += L": " + pane.Problem();
+  SetWindowTextW(status_, words.c_str());
+  // What a command does may take its time, so those run when the control has done with its event.
+  const auto post = [this](Command command) {
+    PostMessageW(frame_, WM_COMMAND, static_cast<WPARAM>(command), 0);
+  };
   switch (code) {
     case kCodeProgress:
+      // The pictures of a page count their bytes, too.
+      if (!working_ || workSize_ == 0) return;
       SendMessageW(progress_, PBM_SETPOS, static_cast<WPARAM>(_wtoi(text.c_str())), 0);
       if (onProgress) onProgress();
       return;
+    case kCodeBusy:
+      fetching_ = text == L"1";
+      return UpdateStop();
+    case kCodeMenu:
+      PostMessageW(frame_, kShowMenu, 0, static_cast<LPARAM>(GetMessagePos()));
+      return;
+    case kCodeClickBegins:
+      listClicked_ = &pane == &list_;
+      return;
+    case kCodeOpen:
+      // Enter. In the list a click ends with this event, too, and that opens nothing.
+      if (!std::exchange(listClicked_, false)) post(kOpen);
+      return;
     case kCodeDeleteKey:
-      return Do(kDelete);
+      return post(kDelete);
+    case kCodeRenamed:
+      PostMessageW(frame_, kRefreshOther, 0, reinterpret_cast<LPARAM>(&pane));
+      return;
     case kCodeRefreshKey:
-      LogOn();
+      if (!working_) LogOn();
       return;
     case kCodeSwitchView:
-      return Show(list_);
+      return list_.Focus();
     default:
       return;
   }

@@ -1,7 +1,9 @@
-// The form with both controls, and the commands of its tool bar, which act on the control that is shown.
+// The form with both controls side by side. The commands of its tool bar and its menu act on the control that
+// was used last, and what they change the other control shows as well.
 #pragma once
 
 #include "FilePane.h"
+#include "PictureWindow.h"
 
 #include <cstdio>
 #include <string>
@@ -9,7 +11,7 @@
 
 namespace tarnwick::demo {
 
-enum Command : int { kUpload = 100, kDelete, kRename, kDownload, kAll, kGif, kJpg, kSwitch };
+enum Command : int { kUpload = 100, kOpen, kRename, kDelete, kDownload, kAll, kGif, kJpg, kStop };
 
 class DemoHost {
  public:
@@ -28,17 +30,23 @@ class DemoHost {
   const std::wstring& Given(Input which) const { return arguments_[which]; }
   ListPane& List() { return list_; }
   ThumbnailPane& Thumbnails() { return thumbnails_; }
-  FilePane& Shown() { return *shown_; }
+  // The one that the commands act on.
+  FilePane& Used() { return *used_; }
+  HWND Frame() const { return frame_; }
+  HWND OpenedPicture() const { return picture_.Window(); }
 
   // Logs the user on, after which the library asks the service for his files anew, and lists them.
   bool LogOn();
+  // Lists the account in both controls.
   bool Fill();
   void Do(int command);
   bool Upload(const std::wstring& path);
+  // The path of the file; empty when it failed.
   std::wstring Download();
 
   void Log(const std::wstring& line);
   std::wstring Status() const;
+  // Percent, as the progress bar shows.
   int Progress() const;
   // Called when the progress bar has moved; may be empty.
   std::function<void()> onProgress;
@@ -54,10 +62,24 @@ class DemoHost {
   bool MakeWindows();
   void Layout();
   bool MakeControls();
-  void Show(FilePane& pane);
+  FilePane& Other(const FilePane& pane);
+  // Lists the account in that control. What one control changed the other one shows only after this.
+  bool Show(FilePane& pane);
+  void Use(FilePane& pane);
   void ChangeFilter(const wchar_t* filter);
-  void SetStatus(const std::wstring& text);
-  void OnEvent(DISPID event, const std::vector<VARIANT>& arguments);
+  void ChooseUpload();
+  void OpenPicture();
+  void Delete();
+  void Stop();
+  void ShowMenu(POINT at);
+  // A command is under way from here on; `size` is what the progress events count to, 0 without any.
+  void BeginWork(int size);
+  // Its end. Without `failure` it is well.
+  void EndWork(const std::wstring& outcome, const std::wstring& failure);
+  void UpdateStop();
+  void SetStatus(const std::wstring& text, bool isError = false);
+  void OnEvent(FilePane& pane, DISPID event, const std::vector<VARIANT>& arguments);
+  void OnFileManagerEvent(FilePane& pane, int code, const std::wstring& text);
 
   const std::vector<std::wstring> arguments_;
   std::FILE* log_ = nullptr;
@@ -70,8 +92,16 @@ class DemoHost {
   std::vector<HWND> buttons_;
   ListPane list_;
   ThumbnailPane thumbnails_;
-  FilePane* shown_ = &list_;
+  FilePane* used_ = &list_;
+  PictureWindow picture_;
   std::wstring filter_ = L"*";
+  bool isError_ = false;
+  // A command or a page of pictures is under way, which Stop ends.
+  bool working_ = false;
+  bool fetching_ = false;
+  int workSize_ = 0;
+  // A click in the list has begun.
+  bool listClicked_ = false;
 };
 
 }  // namespace tarnwick::demo

@@ -15,19 +15,19 @@ const wchar_t* Words(int code) {
       return L"upload refused: the quota is used up";
     case 1015:
       return L"current item";
-    case 1016:
+    case kCodeMenu:
       return L"context menu for";
     case 1020:
       return L"files are dragged over";
     case 1021:
       return L"dropped, but no files from outside";
-    case 1022:
+    case kCodeClickBegins:
       return L"selection about to change";
     case 1023:
       return L"file dropped";
-    case 1024:
+    case kCodeOpen:
       return L"open";
-    case 1031:
+    case kCodeRenamed:
       return L"renamed";
     case 1032:
       return L"another picture has this name";
@@ -64,6 +64,22 @@ std::wstring Wording(int code, const std::wstring& text) {
       return L"to the list";
     default:
       return text.empty() ? Words(code) : Words(code) + (L" " + text);
+  }
+}
+
+bool TellsFailure(int code) {
+  switch (code) {
+    case 1002:
+    case 1005:
+    case 1014:
+    case 1032:
+    case 1033:
+    case 1034:
+    case 1035:
+    case 5555:
+      return true;
+    default:
+      return false;
   }
 }
 

@@ -7,6 +7,10 @@ namespace tarnwick::demo {
 bool FilePane::CreateControl(HWND window, REFCLSID classId, const EventHandler& onEvent) {
   container_ = ComPtr<ControlContainer>::Adopt(new ControlContainer(window));
   container_->onEvent = onEvent;
+  container_->onActivate = [this](bool ui) {
+    if (ui && onUse) onUse();
+    return S_OK;
+  };
   FONTDESC font = {};
   font.cbSizeofstruct = sizeof font;
   std::wstring name = L"Tahoma";
@@ -20,15 +24,39 @@ bool FilePane::CreateControl(HWND window, REFCLSID classId, const EventHandler& 
 HWND FilePane::Window() const {
   ComPtr<IOleWindow> window;
   HWND control = nullptr;
-  if (SUCCEEDED(Control()->QueryInterface(IID_IOleWindow, window.ReceiveVoid()))) window->GetWindow(&control);
+  if (container_ && SUCCEEDED(Control()->QueryInterface(IID_IOleWindow, window.ReceiveVoid())))
+    window->GetWindow(&control);
   return control;
+}
+
+void FilePane::Deactivate() {
+  ComPtr<IOleInPlaceObject> control;
+  if (SUCCEEDED(Control()->QueryInterface(IID_IOleInPlaceObject, control.ReceiveVoid())))
+    control->UIDeactivate();
+}
+
+double FilePane::SizeIn(IDispatch& files) {
+  VARIANT position = VariantFromNumber(1);
+  DISPPARAMS arguments = {&position, nullptr, 1, 0};
+  Variant item;
+  // Collections are reached late bound; their Item is the member that needs no name.
+  files.Invoke(DISPID_VALUE, IID_NULL, LOCALE_USER_DEFAULT, DISPATCH_METHOD | DISPATCH_PROPERTYGET,
+               &arguments, &item.Get(), nullptr, nullptr);
+  ComPtr<_CUpload> file;
+  double size = 0;
+  if (V_VT(&item.Get()) == VT_DISPATCH &&
+      SUCCEEDED(V_DISPATCH(&item.Get())->QueryInterface(__uuidof(_CUpload), file.ReceiveVoid())))
+    file->get_FileSize(&size);
+  return size;
 }
 
 bool ListPane::Init(const std::wstring& filter) {
   VARIANT_BOOL on = VARIANT_TRUE;
   VARIANT ignored = {};
   control_->SetMultiSelectProperty(&on, &ignored);
-  return FilePaneOf::Init(filter);
+  const bool done = FilePaneOf::Init(filter);
+  SpreadColumns();
+  return done;
 }
 
 HWND ListPane::ListWindow() const {
@@ -46,10 +74,42 @@ void ListPane::StartRename() {
   SendMessageW(list, LVM_EDITLABELW, static_cast<WPARAM>(selected), 0);
 }
 
-void ThumbnailPane::StartRename() {
-  // The control has no member for it: the key does it.
+void ListPane::SpreadColumns() {
+  const HWND list = ListWindow();
+  RECT area = {};
+  GetClientRect(list, &area);
+  // Leaves room for a scroll bar.
+  for (WPARAM column = 0; column < 3; ++column)
+    SendMessageW(list, LVM_SETCOLUMNWIDTH, column, area.right * 31 / 100);
+}
+
+int ListPane::SelectedCount() const {
+  Variant names;
+  LONG last = -1;
+  control_->GetFileNames(&names.Get());
+  if (V_VT(&names.Get()) & VT_ARRAY) SafeArrayGetUBound(V_ARRAY(&names.Get()), 1, &last);
+  return static_cast<int>(last + 1);
+}
+
+void ListPane::Focus() {
+  VARIANT ignored = {};
+  control_->ListViewSetFocus(&ignored);
+}
+
+void ThumbnailPane::Focus() {
   VARIANT ignored = {};
   control_->PictureSetFocus(&ignored);
+}
+
+bool ThumbnailPane::IsPicture(HWND window) const {
+  wchar_t kind[16] = L"";
+  GetClassNameW(window, kind, 16);
+  return IsChild(Window(), window) && _wcsicmp(kind, WC_STATICW) == 0;
+}
+
+void ThumbnailPane::StartRename() {
+  // The control has no member for it: the key does it.
+  Focus();
   PostMessageW(GetFocus(), WM_KEYDOWN, VK_F2, 1);
 }
 

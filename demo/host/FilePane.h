@@ -1,5 +1,5 @@
 // One of the two controls on the host's form. What both can do the host calls here, so that its commands act
-// on whichever is shown.
+// on whichever was used last.
 #pragma once
 
 #include "ControlContainer.h"
@@ -18,6 +18,9 @@ class FilePane {
   FilePane(const FilePane&) = delete;
   FilePane& operator=(const FilePane&) = delete;
 
+  // Called when the user turns to the control; may be empty.
+  std::function<void()> onUse;
+
   // Puts the control into `window`, hidden.
   virtual bool Create(HWND window, const EventHandler& onEvent) = 0;
   // The service client that the control works with.
@@ -34,9 +37,17 @@ class FilePane {
   // Whether there is a file of that name to select.
   virtual bool Select(const std::wstring& name) = 0;
   virtual std::wstring Selected() const = 0;
+  virtual int SelectedCount() const = 0;
+  // Bytes of the selected file, as the listing tells.
+  virtual int SelectedSize() const = 0;
+  // Why the operation that ended last failed; empty when it did not.
+  virtual std::wstring Problem() const = 0;
+  // Gives the control the keyboard.
+  virtual void Focus() = 0;
 
   void Show() { container_->Do(OLEIVERB_SHOW); }
-  void Hide() { container_->Do(OLEIVERB_HIDE); }
+  // Of the controls on a form one is active; the form says so to the one that was.
+  void Deactivate();
   void SetBounds(const RECT& bounds) {
     if (container_) container_->SetBounds(bounds);
   }
@@ -44,12 +55,14 @@ class FilePane {
   void Close() {
     if (container_) container_->Close();
   }
-  // The control's window.
+  // The control's window; null before there is one.
   HWND Window() const;
 
  protected:
   bool CreateControl(HWND window, REFCLSID classId, const EventHandler& onEvent);
   IUnknown* Control() const { return container_->Control(); }
+  // Of the first file in a collection that a control made.
+  static double SizeIn(IDispatch& files);
 
  private:
   ComPtr<ControlContainer> container_;
@@ -102,6 +115,22 @@ class FilePaneOf : public FilePane {
     control_->SelectedFileName(&name);
     return Taken(name);
   }
+  int SelectedSize() const override {
+    Variant address;
+    Variant ignored;
+    ComPtr<IDispatch> files;
+    control_->GetSelectedFilesHttpPath(&address.Get());
+    control_->GetFileDetails(address.Get(), files.Receive(), &ignored.Get());
+    return files ? static_cast<int>(SizeIn(*files)) : 0;
+  }
+  std::wstring Problem() const override {
+    FtpErrors error = ERROR_FTP_WINSOCK_Success;
+    BSTR words = nullptr;
+    control_->get_m_LastError(&error);
+    if (error == ERROR_FTP_WINSOCK_Success) return L"";
+    control_->get_m_strLastErrorDesc(&words);
+    return Taken(words);
+  }
 
  protected:
   virtual REFCLSID ClassId() const = 0;
@@ -113,16 +142,24 @@ class ListPane final : public FilePaneOf<_ctrlListImage> {
  public:
   bool Init(const std::wstring& filter) override;
   void StartRename() override;
+  int SelectedCount() const override;
+  void Focus() override;
   int Count() const;
+  HWND ListWindow() const;
+  // Makes the columns as wide as there is room. Init makes them narrow.
+  void SpreadColumns();
 
  private:
   REFCLSID ClassId() const override { return CLSID_ctrlListImage; }
-  HWND ListWindow() const;
 };
 
 class ThumbnailPane final : public FilePaneOf<_ctrlThumbNailView> {
  public:
   void StartRename() override;
+  int SelectedCount() const override { return Selected().empty() ? 0 : 1; }
+  void Focus() override;
+  // Whether that window inside the control is one of its pictures.
+  bool IsPicture(HWND window) const;
 
  private:
   REFCLSID ClassId() const override { return CLSID_ctrlThumbNailView; }

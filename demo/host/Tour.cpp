@@ -1,6 +1,7 @@
 #include "Tour.h"
 
 #include <algorithm>
+#include <utility>
 
 namespace tarnwick::demo {
 namespace {
@@ -18,126 +19,206 @@ std::wstring TextOf(HWND window) {
   return text;
 }
 
+LONG WidthOf(HWND window) {
+  RECT area = {};
+  GetWindowRect(window, &area);
+  return area.right - area.left;
+}
+
+void PressKey(HWND window, WPARAM key) {
+  PostMessageW(window, WM_KEYDOWN, key, 1);
+}
+
 HWND VisibleChild(HWND parent, const wchar_t* kind, const wchar_t* text) {
   const HWND child = FindWindowExW(parent, nullptr, kind, text);
   return child && IsWindowVisible(child) ? child : nullptr;
 }
 
+// What waits for a menu or a dialog: a timer's messages arrive in the loops of those, too.
+struct Wait {
+  const wchar_t* kind;
+  std::function<void(HWND)> meanwhile;
+};
+Wait waiting;
+
+void CALLBACK OnTimer(HWND, UINT, UINT_PTR timer, DWORD) {
+  const HWND opened = FindWindowW(waiting.kind, nullptr);
+  if (!opened || !IsWindowVisible(opened)) return;
+  KillTimer(nullptr, timer);
+  std::exchange(waiting.meanwhile, nullptr)(opened);
+}
+
 }  // namespace
 
 bool Tour::Run() {
-  ShowList();
-  ShowThumbnails();
-  RenameAndDelete();
+  ShowAccount();
+  ShowUploads();
+  ShowListChanges();
+  ShowMenuAndPicture();
+  ShowThumbnailChanges();
   ShowEmptyAccount();
   return well_;
 }
 
 // --- The steps ---
 
-void Tour::ShowList() {
-  const auto listed = [&](Command filter) {
-    Do(filter);
-    return host_.List().Count();
-  };
+void Tour::ShowAccount() {
+  const auto shows = [&](int count) { return static_cast<int>(Pictures().size()) == std::min(count, kPage); };
   all_ = host_.List().Count();
-  Expect(all_ > kPage, L"an account with more than a page of pictures");
-  Step(L"01-list");
-  jpg_ = listed(kJpg);
-  gif_ = listed(kGif);
-  Expect(gif_ > 0 && jpg_ > 0 && gif_ + jpg_ < all_, L"filtered lists");
-  Step(L"02-list-gif");
-  Expect(listed(kAll) == all_, L"all files again");
+  Expect(all_ > kPage && Grid() && shows(all_), L"an account with more than a page of pictures");
+  Expect(&host_.Used() == &host_.List(), L"the list first");
+  Expect(GetFocus() == host_.List().ListWindow(), L"focus in the list");
+  Step(L"01-account");
+  Do(kJpg);
+  jpg_ = host_.List().Count();
+  Expect(shows(jpg_), L"a page of JPEG pictures");
+  Do(kGif);
+  gif_ = host_.List().Count();
+  Expect(gif_ > 0 && jpg_ > 0 && gif_ + jpg_ < all_ && shows(gif_), L"filtered lists");
+  Step(L"02-gif");
+  Do(kAll);
+  Expect(host_.List().Count() == all_ && shows(all_), L"all files again");
+
+  const LONG list = WidthOf(host_.List().Window());
+  const LONG thumbnails = WidthOf(host_.Thumbnails().Window());
+  RECT frame = {};
+  GetWindowRect(host_.Frame(), &frame);
+  const auto resize = [&](LONG by) {
+    SetWindowPos(host_.Frame(), nullptr, 0, 0, frame.right - frame.left + by, frame.bottom - frame.top + by,
+                 SWP_NOMOVE | SWP_NOZORDER);
+  };
+  resize(60);
+  Expect(WidthOf(host_.List().Window()) == list + 60 && WidthOf(host_.Thumbnails().Window()) == thumbnails,
+         L"a list that grows with the window");
+  Step(L"03-larger");
+  resize(0);
+}
+
+void Tour::ShowUploads() {
+  host_.onProgress = [&] {
+    if (host_.Progress() < 40) return;
+    host_.onProgress = nullptr;
+    Do(kStop);
+  };
+  Expect(!host_.Upload(UploadPath()) && host_.Progress() == 0 && host_.List().Count() == all_,
+         L"an upload that is stopped");
+  Step(L"04-upload-stopped");
+  Expect(!host_.Upload(UploadPath() + L".gone") && host_.Status().find(L"not found") != std::wstring::npos,
+         L"the reason in words");
+  Step(L"05-error");
 
   bool shown = false;
   host_.onProgress = [&] {
     if (shown || host_.Progress() < 40) return;
     shown = true;
-    Step(L"03-list-upload-under-way");
+    Step(L"06-upload-under-way");
   };
   Upload();
-  Expect(shown, L"upload progress");
   host_.onProgress = nullptr;
-  Step(L"04-list-uploaded");
-
-  Expect(host_.Shown().Select(kUploaded), L"selecting the uploaded file");
-  TypeName(kTyped, L"05-list-editor");
-  Expect(host_.Shown().Select(kRenamed), L"rename");
-  Step(L"06-list-renamed");
-  Download();
-  Step(L"07-list-downloaded");
-  Do(kDelete);
-  Expect(!host_.Shown().Select(kRenamed) && host_.List().Count() == all_, L"delete");
-  Step(L"08-list-deleted");
-  WithEmptyAccount([&] {
-    Expect(host_.List().Count() == 0, L"an empty list");
-    Step(L"09-list-empty");
-  });
+  Expect(shown && host_.Progress() == 100, L"upload progress");
+  Step(L"07-uploaded");
 }
 
-void Tour::ShowThumbnails() {
-  Do(kSwitch);
-  Expect(Grid() && Pictures().size() == kPage, L"a page of pictures");
-  Expect(!IsWindowVisible(host_.List().Window()), L"the list hidden");
-  Step(L"10-thumbnails");
-  const auto shows = [&](int count) { return static_cast<int>(Pictures().size()) == std::min(count, kPage); };
-  Do(kGif);
-  Expect(shows(gif_), L"a page of GIF pictures");
-  Step(L"11-thumbnails-gif");
-  Do(kJpg);
-  Expect(shows(jpg_), L"a page of JPEG pictures");
-  Step(L"12-thumbnails-jpg");
-  Do(kAll);
-  Expect(shows(all_), L"a page of all pictures");
+void Tour::ShowListChanges() {
+  Expect(host_.Thumbnails().Select(kUploaded) && Picture(kUploaded), L"the uploaded file in the thumbnails");
+  Expect(host_.List().Select(kUploaded), L"selecting the uploaded file");
+  TypeName(kTyped, L"08-list-editor");
+  Expect(host_.Thumbnails().Select(kRenamed) && host_.List().Select(kRenamed), L"rename in both");
+  Step(L"09-list-renamed");
+  int most = 0;
+  host_.onProgress = [&] { most = std::max(most, host_.Progress()); };
+  Download();
+  host_.onProgress = nullptr;
+  Expect(most == 100 && host_.Progress() == 100, L"download progress up to the size in the listing");
+  Step(L"10-downloaded");
+  const auto pressDelete = [&] { Do(kDelete); };
+  DeleteAndAnswer(pressDelete, IDNO, L"11-question");
+  Expect(host_.List().Selected() == kRenamed, L"no delete without a yes");
+  DeleteAndAnswer(pressDelete, IDYES, nullptr);
+  Expect(
+      !host_.List().Select(kRenamed) && host_.List().Count() == all_ && !host_.Thumbnails().Select(kRenamed),
+      L"delete in both");
+  Step(L"12-list-deleted");
 
+  // Enter on a file opens it; a click does not.
+  Expect(host_.List().Select(L"coffee.jpg"), L"selecting in the list");
+  const LPARAM first = MAKELPARAM(20, 30);
+  PostMessageW(host_.List().ListWindow(), WM_LBUTTONDOWN, MK_LBUTTON, first);
+  PostMessageW(host_.List().ListWindow(), WM_LBUTTONUP, 0, first);
+  host_.Rest(500);
+  Expect(!host_.OpenedPicture(), L"a click opens nothing");
+  PressKey(host_.List().ListWindow(), VK_RETURN);
+  host_.Rest(500);
+  Expect(ClosePicture(), L"Enter opens a picture");
+}
+
+void Tour::ShowMenuAndPicture() {
+  While(
+      L"#32768", [&] { Expect(Press(Pictures()[2], WM_RBUTTONDOWN), L"selecting by the right button"); },
+      [&](HWND) {
+        Step(L"13-menu");
+        PressKey(host_.Frame(), VK_DOWN);
+        PressKey(host_.Frame(), VK_RETURN);
+      });
+  host_.Rest(500);
+  Expect(host_.OpenedPicture() && TextOf(host_.OpenedPicture()) == host_.Thumbnails().Selected(),
+         L"the menu opens the selected picture");
+  Step(L"14-picture");
+  ClosePicture();
+  PostMessageW(Pictures()[1], WM_LBUTTONDBLCLK, MK_LBUTTON, MAKELPARAM(20, 20));
+  host_.Rest(500);
+  Expect(ClosePicture(), L"a double click opens a picture");
+}
+
+void Tour::ShowThumbnailChanges() {
   ScrollToEnd();
   Expect(ShowsLastOf(all_), L"the last page");
-  Step(L"13-thumbnails-last-page");
+  Step(L"15-last-page");
   const HWND bar = VisibleChild(host_.Thumbnails().Window(), L"ScrollBar", nullptr);
   PostMessageW(host_.Thumbnails().Window(), WM_VSCROLL, SB_TOP, reinterpret_cast<LPARAM>(bar));
   host_.Rest(200);
-  Expect(shows(all_) && host_.Shown().Selected() == TextOf(Pictures().front()), L"the first page again");
+  Expect(Pictures().size() == kPage && host_.Used().Selected() == TextOf(Pictures().front()),
+         L"the first page again");
 
   // One picture more or less makes the last page odd.
   Upload();
-  Expect(ShowsLastOf(all_ + 1) && Picture(kUploaded) && host_.Shown().Selected() == kUploaded,
+  Expect(ShowsLastOf(all_ + 1) && Picture(kUploaded) && host_.Used().Selected() == kUploaded,
          L"the page of the uploaded picture");
-  Step(L"14-thumbnails-uploaded");
-}
-
-void Tour::RenameAndDelete() {
-  Expect(Press(Pictures().front()), L"selecting by the mouse");
-  Step(L"15-thumbnails-selected");
-  Expect(Press(Picture(kUploaded)), L"selecting the uploaded picture");
-  TypeName(kTyped, L"16-thumbnails-editor");
-  Expect(Picture(kRenamed) && host_.Shown().Selected() == kRenamed, L"rename of a picture");
-  Step(L"17-thumbnails-renamed");
+  Expect(host_.List().Count() == all_ + 1, L"the uploaded picture in the list");
+  Step(L"16-thumbnails-uploaded");
+  Expect(Press(Pictures().front()) && Press(Picture(kUploaded)), L"selecting by the mouse");
+  TypeName(kTyped, L"17-thumbnails-editor");
+  Expect(Picture(kRenamed) && host_.Used().Selected() == kRenamed, L"rename of a picture");
+  Step(L"18-thumbnails-renamed");
   Download();
   host_.Log(L"-- Delete key");
-  PostMessageW(Grid(), WM_KEYDOWN, VK_DELETE, 1);
-  host_.Rest(300);
-  Expect(!Picture(kRenamed) && ShowsLastOf(all_), L"delete of a picture");
-  Step(L"18-thumbnails-deleted");
+  DeleteAndAnswer(
+      [&] {
+        PressKey(Grid(), VK_DELETE);
+        host_.Rest(500);
+      },
+      IDYES, L"19-thumbnails-question");
+  Expect(!Picture(kRenamed) && ShowsLastOf(all_) && host_.List().Count() == all_, L"delete of a picture");
+  Step(L"20-thumbnails-deleted");
 }
 
 void Tour::ShowEmptyAccount() {
   WithEmptyAccount([&] {
     const HWND link =
         VisibleChild(host_.Thumbnails().Window(), L"Button", L"Click here for a QuickStart tutorial");
-    Expect(!Grid() && link, L"the page of an empty account");
-    Step(L"19-thumbnails-empty");
+    Expect(!Grid() && link && host_.List().Count() == 0, L"the page of an empty account");
+    Step(L"21-empty");
     PostMessageW(link, BM_CLICK, 0, 0);
     host_.Rest(200);
     Expect(host_.Status() == L"QuickStart", L"the link to the QuickStart");
-    Step(L"20-thumbnails-quickstart");
+    Step(L"22-quickstart");
   });
-  Expect(Pictures().size() == kPage, L"the pictures again");
+  Expect(Pictures().size() == kPage && host_.List().Count() == all_, L"the pictures again");
+  Expect(Press(Pictures().front()) && &host_.Used() == &host_.Thumbnails(), L"using the thumbnails");
   PostMessageW(VisibleChild(host_.Thumbnails().Window(), L"Button", L"List view"), BM_CLICK, 0, 0);
   host_.Rest(200);
-  Expect(&host_.Shown() == &host_.List() && IsWindowVisible(host_.List().Window()) &&
-             !IsWindowVisible(host_.Thumbnails().Window()) && host_.List().Count() == all_,
-         L"the list again");
-  Step(L"21-list-again");
+  Expect(&host_.Used() == &host_.List() && GetFocus() == host_.List().ListWindow(), L"to the list");
+  Step(L"23-list-again");
 }
 
 // --- What the steps consist of ---
@@ -160,8 +241,34 @@ void Tour::Do(Command command) {
   host_.Rest(100);
 }
 
+void Tour::While(const wchar_t* kind, const std::function<void()>& act, std::function<void(HWND)> meanwhile) {
+  waiting = {kind, std::move(meanwhile)};
+  const UINT_PTR timer = SetTimer(nullptr, 0, 50, OnTimer);
+  act();
+  KillTimer(nullptr, timer);
+  Expect(!waiting.meanwhile, L"a menu or a question");
+}
+
+void Tour::DeleteAndAnswer(const std::function<void()>& act, int answer, const wchar_t* step) {
+  While(L"#32770", act, [&](HWND question) {
+    if (step) Step(step);
+    PostMessageW(question, WM_COMMAND, static_cast<WPARAM>(answer), 0);
+  });
+}
+
+bool Tour::ClosePicture() {
+  if (!host_.OpenedPicture()) return false;
+  PressKey(host_.OpenedPicture(), VK_ESCAPE);
+  host_.Rest(100);
+  return !host_.OpenedPicture();
+}
+
+std::wstring Tour::UploadPath() const {
+  return host_.Given(DemoHost::kPictures) + L"\\" + kUploaded;
+}
+
 void Tour::Upload() {
-  Expect(host_.Upload(host_.Given(DemoHost::kPictures) + L"\\" + kUploaded), L"upload");
+  Expect(host_.Upload(UploadPath()), L"upload");
 }
 
 void Tour::TypeName(const wchar_t* name, const wchar_t* step) {
@@ -184,7 +291,7 @@ void Tour::Download() {
 }
 
 void Tour::WithEmptyAccount(const std::function<void()>& steps) {
-  const ComPtr<_CFileUpload> client = host_.Shown().Client();
+  const ComPtr<_CFileUpload> client = host_.Used().Client();
   const Argument product(host_.Given(DemoHost::kProduct));
   const Argument user(L"nobody.yet@demo.example");
   const Argument nothing(L"");
@@ -225,14 +332,14 @@ HWND Tour::Picture(const wchar_t* caption) {
   return VisibleChild(Grid(), L"Static", caption);
 }
 
-bool Tour::Press(HWND picture) {
+bool Tour::Press(HWND picture, UINT button) {
   RECT area = {};
   GetClientRect(picture, &area);
   const LPARAM middle = MAKELPARAM(area.right / 2, area.bottom / 2);
-  PostMessageW(picture, WM_LBUTTONDOWN, MK_LBUTTON, middle);
-  PostMessageW(picture, WM_LBUTTONUP, 0, middle);
+  PostMessageW(picture, button, 0, middle);
+  PostMessageW(picture, button + (WM_LBUTTONUP - WM_LBUTTONDOWN), 0, middle);
   host_.Rest(200);
-  return host_.Shown().Selected() == TextOf(picture);
+  return host_.Used().Selected() == TextOf(picture);
 }
 
 bool Tour::ShowsLastOf(int count) {

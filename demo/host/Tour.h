@@ -14,9 +14,11 @@ class Tour {
   bool Run();
 
  private:
-  void ShowList();
-  void ShowThumbnails();
-  void RenameAndDelete();
+  void ShowAccount();
+  void ShowUploads();
+  void ShowMenuAndPicture();
+  void ShowListChanges();
+  void ShowThumbnailChanges();
   void ShowEmptyAccount();
 
   void Expect(bool happened, const wchar_t* what);
@@ -24,6 +26,13 @@ class Tour {
   void Step(const wchar_t* name);
   // Presses a button of the tool bar.
   void Do(Command command);
+  // Runs `meanwhile` when a window of that class, a menu or a dialog, has opened in what `act` does.
+  void While(const wchar_t* kind, const std::function<void()>& act, std::function<void(HWND)> meanwhile);
+  // Deletes what is selected, by `act`; `step` is the picture of the question before it.
+  void DeleteAndAnswer(const std::function<void()>& act, int answer, const wchar_t* step);
+  // Whether a picture has been opened in a window of its own, which it closes.
+  bool ClosePicture();
+  std::wstring UploadPath() const;
   // Uploads a picture that the account does not have yet.
   void Upload();
   // Renames the selected file in place; `step` is the picture with the editor open.
@@ -37,8 +46,8 @@ class Tour {
   std::vector<HWND> Pictures();
   // The one with that caption; null when the page does not have it.
   HWND Picture(const wchar_t* caption);
-  // Presses the mouse on it; whether it is selected then.
-  bool Press(HWND picture);
+  // Presses a mouse button on it; whether it is selected then.
+  bool Press(HWND picture, UINT button = WM_LBUTTONDOWN);
   // Whether the thumbnail page shows the last `count` pictures of the account that make a page.
   bool ShowsLastOf(int count);
   void ScrollToEnd();
