@@ -199,6 +199,7 @@ bool DemoHost::MakeWindows() {
   progress_ = child(PROGRESS_CLASSW, L"", 0, 0);
   status_ = child(L"STATIC", L"", SS_LEFT | SS_NOPREFIX | SS_ENDELLIPSIS, 0);
   events_ = child(L"LISTBOX", L"", WS_VSCROLL | WS_BORDER | LBS_NOINTEGRALHEIGHT, 0);
+  UpdateStop();
   Layout();
   return true;
 }

@@ -59,6 +59,12 @@ bool ListPane::Init(const std::wstring& filter) {
   return done;
 }
 
+void ListPane::Delete() {
+  FilePaneOf::Delete();
+  // The control has listed the account again.
+  SpreadColumns();
+}
+
 HWND ListPane::ListWindow() const {
   return FindWindowExW(Window(), nullptr, WC_LISTVIEWW, nullptr);
 }

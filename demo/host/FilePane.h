@@ -141,6 +141,7 @@ class FilePaneOf : public FilePane {
 class ListPane final : public FilePaneOf<_ctrlListImage> {
  public:
   bool Init(const std::wstring& filter) override;
+  void Delete() override;
   void StartRename() override;
   int SelectedCount() const override;
   void Focus() override;
