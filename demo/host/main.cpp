@@ -1,5 +1,5 @@
-// A host program with both controls on its form, one of them shown: a tool bar, a progress bar that their
-// events drive, a status line that words each event, and an event log.
+// A host program with both controls side by side on its form: a tool bar and a menu for what can be done, a
+// progress bar that their events drive, a line that says what happened or why not, and an event log.
 //
 //   tarnwick-demo SERVER USER PASSWORD PRODUCT PICTURES DOWNLOADS LOG [SHOTS]
 //
