@@ -277,6 +277,8 @@ bool DemoHost::LogOn() {
 }
 
 bool DemoHost::Show(FilePane& pane) {
+  // Whoever closes the form in the middle of a command wants no more of it.
+  if (!frame_) return false;
   FilePane& used = *used_;
   const bool done = pane.Init(filter_);
   // The thumbnails take the keyboard when they are filled.

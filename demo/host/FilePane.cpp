@@ -24,14 +24,14 @@ bool FilePane::CreateControl(HWND window, REFCLSID classId, const EventHandler& 
 HWND FilePane::Window() const {
   ComPtr<IOleWindow> window;
   HWND control = nullptr;
-  if (container_ && SUCCEEDED(Control()->QueryInterface(IID_IOleWindow, window.ReceiveVoid())))
+  if (Control() && SUCCEEDED(Control()->QueryInterface(IID_IOleWindow, window.ReceiveVoid())))
     window->GetWindow(&control);
   return control;
 }
 
 void FilePane::Deactivate() {
   ComPtr<IOleInPlaceObject> control;
-  if (SUCCEEDED(Control()->QueryInterface(IID_IOleInPlaceObject, control.ReceiveVoid())))
+  if (Control() && SUCCEEDED(Control()->QueryInterface(IID_IOleInPlaceObject, control.ReceiveVoid())))
     control->UIDeactivate();
 }
 

@@ -55,12 +55,13 @@ class FilePane {
   void Close() {
     if (container_) container_->Close();
   }
-  // The control's window; null before there is one.
+  // The control's window; null before there is one, and when the control is closed.
   HWND Window() const;
 
  protected:
   bool CreateControl(HWND window, REFCLSID classId, const EventHandler& onEvent);
-  IUnknown* Control() const { return container_->Control(); }
+  // Null before there is one, and when it is closed.
+  IUnknown* Control() const { return container_ ? container_->Control() : nullptr; }
   // Of the first file in a collection that a control made.
   static double SizeIn(IDispatch& files);
 

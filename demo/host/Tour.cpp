@@ -57,6 +57,7 @@ bool Tour::Run() {
   ShowMenuAndPicture();
   ShowThumbnailChanges();
   ShowEmptyAccount();
+  CloseUnderWay();
   return well_;
 }
 
@@ -219,6 +220,14 @@ void Tour::ShowEmptyAccount() {
   host_.Rest(200);
   Expect(&host_.Used() == &host_.List() && GetFocus() == host_.List().ListWindow(), L"to the list");
   Step(L"23-list-again");
+}
+
+void Tour::CloseUnderWay() {
+  host_.onProgress = [&] {
+    host_.onProgress = nullptr;
+    SendMessageW(host_.Frame(), WM_CLOSE, 0, 0);
+  };
+  Expect(!host_.Upload(UploadPath()) && !host_.Frame(), L"an upload that ends with the form");
 }
 
 // --- What the steps consist of ---

@@ -20,6 +20,7 @@ class Tour {
   void ShowListChanges();
   void ShowThumbnailChanges();
   void ShowEmptyAccount();
+  void CloseUnderWay();
 
   void Expect(bool happened, const wchar_t* what);
   // One step is over: the picture of it is taken.
