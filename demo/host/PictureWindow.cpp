@@ -2,12 +2,10 @@
 
 #include <objidl.h>
 
-#include <algorithm>
-
-// Its header counts on macros that the system's header would define.
-using std::max;
-using std::min;
+// After the header that it counts on.
 #include <gdiplus.h>
+
+#include <algorithm>
 
 namespace tarnwick::demo {
 namespace {
