@@ -34,6 +34,9 @@ inline constexpr std::int32_t kNoClient = 91;         // mobjFileupload is not s
 inline constexpr std::int32_t kListingFailed = 1004;  // the service did not list the files
 }  // namespace init_error
 
+// The library's own text for a filter that no file passes.
+inline constexpr std::uint16_t kNoHitsString = 4001;
+
 // What a control works with beside its view; all of it outlives the control.
 struct ControlParts {
   Apartment& apartment;

@@ -32,6 +32,7 @@ class ControlTest : public testing::Test {
     session.productNumber = 7;
     fake.registry.InternetSettings()[u"ProxyEnable"] = FakeRegistry::Number(0);
     fake.strings.own[3582] = u"No pictures.";
+    fake.strings.own[4001] = u"No such pictures.";
     fake.http.onPost = [this](const FakeHttp::Sent& sent) { Answer(sent); };
     fake.pump.onYield = [this] { log.emplace_back("yield"); };
     return true;

@@ -76,7 +76,7 @@ TEST_F(ListImageTest, FiltersTwice) {
     SCOPED_TRACE(Utf8FromText(test.filter));
     EXPECT_TRUE(control.Init(test.filter));
     EXPECT_EQ(Names(), test.afterInit);
-    EXPECT_EQ(view.hint, Names().empty() ? u"There are no images of this kind." : u"");
+    EXPECT_EQ(view.hint, Names().empty() ? u"No such pictures." : u"");
     control.ChangeFileFilter(test.filter);
     EXPECT_EQ(Names(), test.afterChange);
     EXPECT_EQ(view.hint, u"");

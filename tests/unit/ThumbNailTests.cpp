@@ -17,7 +17,6 @@ class ThumbNailTest : public ControlTest {
     fake.strings.own[487] = u"Click";
     fake.strings.own[488] = u"here";
     fake.strings.own[489] = u"for it";
-    fake.strings.own[4001] = u"No such pictures.";
     fake.pump.onYield = nullptr;
   }
   bool HasCopy(const std::string& name) const { return fake.files.files.contains(CopyOf(name)); }

@@ -7,6 +7,7 @@
 
 #include "base/RuntimeError.h"
 #include "controls/FileNames.h"
+#include "platform/StringResources.h"
 #include "session/ResourceStrings.h"
 #include "session/UserFolder.h"
 
@@ -16,7 +17,6 @@ namespace {
 constexpr std::array<ListColumn, 3> kColumns{
     {{u"filename", u"File Name"}, {u"filepath", u"File Path"}, {u"filesize", u"File Size"}}};
 constexpr std::uint16_t kNoImagesString = 3582;
-constexpr TextView kNoHits = u"There are no images of this kind.";
 
 constexpr std::int32_t kUpKey = 38;
 constexpr std::int32_t kDownKey = 40;
@@ -121,7 +121,8 @@ void ctrlListImage::ShowListOrLabel() {
 }
 
 void ctrlListImage::ShowHint() {
-  view_.SetHint(items_.empty() && !listing_.all.IsEmpty() ? kNoHits : TextView());
+  const bool hasHits = !items_.empty() || listing_.all.IsEmpty();
+  view_.SetHint(hasHits ? Text() : apartment_.platform.strings.OwnString(kNoHitsString));
 }
 
 bool ctrlListImage::ShowsWhenUploaded(TextView name) const {

@@ -18,7 +18,6 @@ namespace tarnwick {
 namespace {
 
 constexpr std::uint16_t kNoImagesString = 3582;
-constexpr std::uint16_t kNoHitsString = 4001;
 constexpr std::uint16_t kLinkStrings[] = {487, 488, 489};
 
 constexpr std::size_t kCaptionLength = 20;

@@ -397,7 +397,7 @@ TEST(ListControl, SaysWhyItHasNoItems) {
     const HWND window = FindWindowExW(form.Window(), nullptr, L"STATIC", nullptr);
     return IsWindowVisible(window) ? TextOf(window) : L"";
   };
-  EXPECT_EQ(label(), L"There are no images of this kind.");
+  EXPECT_EQ(label(), L"No images of this kind.");
   EXPECT_EQ(GetFocus(), form.ListWindow());
   form.list->ChangeFileFilter(Bstr(L"gif"));
   EXPECT_EQ(label(), L"");

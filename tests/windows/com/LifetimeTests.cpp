@@ -77,6 +77,7 @@ TEST_F(Lifetime, ControlsWithWindowsAndSinksLeaveNothing) {
   enum class End { kHost, kHostInEvent, kWindow };
   HWND form = nullptr;
   for (const Class& known : kControls) {
+    SCOPED_TRACE(known.name);
     // What is created by its class comes from the test library then.
     ComPtr<IClassFactory> factory;
     ASSERT_EQ(
@@ -95,7 +96,9 @@ TEST_F(Lifetime, ControlsWithWindowsAndSinksLeaveNothing) {
       ASSERT_EQ(container->Create(known.id, demo::ControlContainer::WayIn::kSteps, nullptr), S_OK);
       container->SetBounds({0, 0, 300, 200});
       ASSERT_EQ(container->Do(OLEIVERB_SHOW), S_OK);
-      const HWND inside = GetWindow(GetWindow(form, GW_CHILD), GW_CHILD);
+      const HWND outer = GetWindow(form, GW_CHILD);
+      const HWND list = FindWindowExW(outer, nullptr, L"SysListView32", nullptr);
+      const HWND inside = list ? list : GetWindow(outer, GW_CHILD);
       if (end == End::kHostInEvent) {
         container->onEvent = [&](DISPID, std::vector<VARIANT>&) { container->Close(); };
         SendMessageW(inside, WM_KEYDOWN, VK_RETURN, 0);
@@ -158,6 +161,7 @@ TEST(Unloading, IsClean) {
     path = file;
     const auto canUnload = library.Get<CanUnloadNow>("DllCanUnloadNow");
     for (const Class& known : kControls) {
+      SCOPED_TRACE(known.name);
       ComPtr<IClassFactory> factory;
       ComPtr<IOleObject> control;
       ASSERT_EQ(library.Get<GetClassObject>("DllGetClassObject")(known.id, IID_IClassFactory,
