@@ -139,12 +139,17 @@ LRESULT CALLBACK DemoHost::FrameProc(HWND window, UINT message, WPARAM wParam, L
     case WM_COMMAND:
       host->Do(LOWORD(wParam));
       return 0;
-    case WM_CONTEXTMENU:
-      // The list has no event for its menu, but its window passes the system's message on.
-      if (reinterpret_cast<HWND>(wParam) != host->list_.ListWindow())
+    case WM_CONTEXTMENU: {
+      // The list has no event for its menu, but its window passes the system's message on. From which window
+      // it comes, not every system says.
+      const POINT at = {static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))};
+      const HWND list = host->list_.ListWindow();
+      const bool byKey = at.x == -1 && at.y == -1;
+      if (GetFocus() != list || (!byKey && WindowFromPoint(at) != list))
         return DefWindowProcW(window, message, wParam, lParam);
-      host->ShowMenu({static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))});
+      host->ShowMenu(at);
       return 0;
+    }
     case kShowMenu:
       host->ShowMenu({static_cast<SHORT>(LOWORD(lParam)), static_cast<SHORT>(HIWORD(lParam))});
       return 0;
