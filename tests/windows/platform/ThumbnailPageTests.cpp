@@ -389,23 +389,25 @@ TEST_F(ThumbnailPageTest, DrawsAPictureWhenItIsDecoded) {
   EXPECT_EQ(Seen(1), window);
 }
 
+// Asks a tip for the text of the tool; whether the next window is to be asked.
+BOOL CALLBACK AskTip(HWND window, LPARAM param) {
+  wchar_t name[40] = {};
+  GetClassNameW(window, name, 40);
+  if (std::wstring(name) != TOOLTIPS_CLASSW) return TRUE;
+  auto& tool = *reinterpret_cast<TTTOOLINFOW*>(param);
+  return SendMessageW(window, TTM_GETTEXTW, 300, param), tool.lpszText[0] == L'\0';
+}
+
 // The text of the tip that a slot has once the pointer was over it.
 std::wstring TipOver(HWND slot) {
   SendMessageW(slot, WM_MOUSEMOVE, 0, MAKELPARAM(9, 9));
   std::wstring tip(300, L'\0');
-  const auto ask = [](HWND window, LPARAM param) -> BOOL {
-    wchar_t name[40] = {};
-    GetClassNameW(window, name, 40);
-    if (std::wstring(name) != TOOLTIPS_CLASSW) return TRUE;
-    auto& tool = *reinterpret_cast<TTTOOLINFOW*>(param);
-    return SendMessageW(window, TTM_GETTEXTW, 300, param), tool.lpszText[0] == L'\0';
-  };
   TTTOOLINFOW tool = {};
   tool.cbSize = TTTOOLINFOW_V2_SIZE;
   tool.hwnd = GetParent(slot);
   tool.uId = reinterpret_cast<UINT_PTR>(slot);
   tool.lpszText = tip.data();
-  EnumThreadWindows(GetCurrentThreadId(), ask, reinterpret_cast<LPARAM>(&tool));
+  EnumThreadWindows(GetCurrentThreadId(), AskTip, reinterpret_cast<LPARAM>(&tool));
   tip.resize(wcslen(tip.c_str()));
   return tip;
 }
