@@ -6,6 +6,7 @@
 #include <deque>
 #include <functional>
 #include <map>
+#include <stdexcept>
 #include <string>
 #include <utility>
 #include <vector>
@@ -20,6 +21,23 @@
 #include "session/Apartment.h"
 
 namespace tarnwick {
+
+// The number of the failure that `call` ends with, 0 for none.
+template <typename Call>
+std::int32_t ErrorOf(const Call& call) {
+  try {
+    call();
+  } catch (const RuntimeError& failure) {
+    return failure.Number();
+  }
+  return 0;
+}
+
+inline std::string NamesOf(const FileList& files) {
+  std::string names;
+  for (std::size_t i = 1; i <= files.Count(); ++i) names += Utf8FromText(files.At(i)->FileName) + ",";
+  return names;
+}
 
 // Answers posts with the queued bodies; a post without one is a failed connection.
 struct FakeHttp : HttpTransport {
@@ -59,15 +77,20 @@ struct FakeHttp : HttpTransport {
     if (!answer || !sink(answer->body) || answer->status == 0) return std::nullopt;
     return answer->status;
   }
-  // Takes the whole body at once, but for its last byte, and is answered like any post.
+  // Takes the body in pieces of this size, each but for its last byte first, and is answered like any post.
+  std::size_t piece = SIZE_MAX;
   std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source,
                                        std::size_t maxBodyBytes) override {
     source.Sent(0);
     if (!source.IsWanted()) return std::nullopt;
-    std::string body(static_cast<std::size_t>(source.Length()), '\0');
-    body.resize(source.Read(body));
-    source.Sent(body.size() - 1);
-    if (!source.IsWanted()) return std::nullopt;
+    std::string room(std::min(piece, static_cast<std::size_t>(source.Length())), '\0');
+    std::string body;
+    while (body.size() < source.Length()) {
+      body.append(room, 0, source.Read(room));
+      source.Sent(body.size() - 1);
+      if (!source.IsWanted()) return std::nullopt;
+    }
+    if (source.Read(room) != 0) throw std::logic_error("a body beyond its length");
     source.Sent(body.size());
     HttpPost whole = post;
     whole.body = body;

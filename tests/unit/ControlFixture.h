@@ -61,12 +61,7 @@ class ControlTest : public testing::Test {
   // Where the control keeps the file's copy.
   static Text CopyOf(const std::string& name) { return u"C:\\Temp\\bv\\u@x\\" + *TextFromUtf8(name); }
   static std::string AddressOf(const std::string& name) { return "http://h/u/" + name; }
-  std::string Records() const {
-    std::string names;
-    const FileList& all = fake.apartment.listing.all;
-    for (std::size_t i = 1; i <= all.Count(); ++i) names += Utf8FromText(all.At(i)->FileName) + ",";
-    return names;
-  }
+  std::string Records() const { return NamesOf(fake.apartment.listing.all); }
   // Only the lines that the host hears.
   std::string Events() const {
     std::string events;

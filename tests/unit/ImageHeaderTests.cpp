@@ -25,13 +25,8 @@ std::ostream& operator<<(std::ostream& out, const Told& told) {
 
 template <typename Source>
 Told Read(CImageHeight& reader, Source source) {
-  Told told;
-  try {
-    reader.ReadImageInfo(source);
-  } catch (const RuntimeError& failure) {
-    told.error = failure.Number();
-  }
-  return {reader.ImageType(), reader.Width(), reader.Height(), reader.Depth(), told.error};
+  const std::int32_t error = ErrorOf([&] { reader.ReadImageInfo(source); });
+  return {reader.ImageType(), reader.Width(), reader.Height(), reader.Depth(), error};
 }
 
 // From memory that ends where the bytes end, so that the sanitizer sees a byte too many.

@@ -32,14 +32,7 @@ TEST_F(ListImageTest, ListsTheAccount) {
 
 TEST_F(ListImageTest, FailingInitLeavesTheList) {
   List({{"a.jpg", "1"}});
-  const auto failure = [&] {
-    try {
-      control.Init(u"gif");
-    } catch (const RuntimeError& error) {
-      return error.Number();
-    }
-    return std::int32_t{0};
-  };
+  const auto failure = [&] { return ErrorOf([&] { control.Init(u"gif"); }); };
   fake.apartment.listing.isCurrent = false;
   listingFails = true;
   EXPECT_EQ(failure(), init_error::kListingFailed);

@@ -38,19 +38,11 @@ TEST(KeyedList, KeepsOrderAndUniqueKeys) {
   EXPECT_EQ(list.PositionOf(u"three"), 3U);
   for (const TextView key : {u"Three", u"", u"none"}) EXPECT_EQ(list.PositionOf(key), 0U);
 
-  const auto errorOf = [](auto&& call) {
-    try {
-      call();
-    } catch (const RuntimeError& failure) {
-      return failure.Number();
-    }
-    return 0;
-  };
-  EXPECT_EQ(errorOf([&] { list.Add(5, u"one"); }), error::kDuplicateKey);
-  EXPECT_EQ(errorOf([&] { list.Insert(1, 5, u"one"); }), error::kDuplicateKey);
+  EXPECT_EQ(ErrorOf([&] { list.Add(5, u"one"); }), error::kDuplicateKey);
+  EXPECT_EQ(ErrorOf([&] { list.Insert(1, 5, u"one"); }), error::kDuplicateKey);
   for (const std::size_t position : {std::size_t{0}, std::size_t{6}}) {
-    EXPECT_EQ(errorOf([&] { list.Insert(position, 5, u"new"); }), error::kSubscriptOutOfRange);
-    EXPECT_EQ(errorOf([&] { list.Take(position); }), error::kSubscriptOutOfRange);
+    EXPECT_EQ(ErrorOf([&] { list.Insert(position, 5, u"new"); }), error::kSubscriptOutOfRange);
+    EXPECT_EQ(ErrorOf([&] { list.Take(position); }), error::kSubscriptOutOfRange);
   }
   EXPECT_EQ(list.Count(), 4U);
 }
@@ -89,11 +81,6 @@ class TransferListsTest : public testing::Test {
     list.Clear();
     for (const TextView name : names) list.Add(Record(name));
   }
-  static std::string Names(const FileList& list) {
-    std::string names;
-    for (std::size_t i = 1; i <= list.Count(); ++i) names += Utf8FromText(list.At(i)->FileName) + ",";
-    return names;
-  }
 
   FakePlatform fake;
   FileList& all = fake.apartment.listing.all;
@@ -104,14 +91,14 @@ TEST_F(TransferListsTest, RemovesTheFirstOfEach) {
   Fill(all, {u"x", u" a ", u"a", u"A"});
   Fill(shown, {u"a", u"a"});
   RemoveFromTransferLists(fake.apartment, u"http://h/users/u/ a ");
-  EXPECT_EQ(Names(all), "x,a,A,");
-  EXPECT_EQ(Names(shown), "a,");
+  EXPECT_EQ(NamesOf(all), "x,a,A,");
+  EXPECT_EQ(NamesOf(shown), "a,");
   // Two records looked at, one removed; one removed.
   EXPECT_EQ(fake.pump.yields, 4);
   // A name that only the shown-files list has, or that differs in letter case, stays.
   Fill(shown, {u"only"});
   for (const TextView name : {u"only", u"X", u""}) RemoveFromTransferLists(fake.apartment, name);
-  EXPECT_EQ(Names(all) + Names(shown), "x,a,A,only,");
+  EXPECT_EQ(NamesOf(all) + NamesOf(shown), "x,a,A,only,");
 }
 
 TEST_F(TransferListsTest, SurvivesListsThatChangeMeanwhile) {
@@ -130,16 +117,17 @@ TEST_F(TransferListsTest, SurvivesListsThatChangeMeanwhile) {
       all.Clear();
       shown.Clear();
     });
-    EXPECT_EQ(Names(all) + Names(shown), "") << moment;
+    EXPECT_EQ(NamesOf(all) + NamesOf(shown), "") << moment;
     // A file that moves to a place that was passed is not found.
     runWith(moment, [&] { all.Remove(1); });
-    EXPECT_EQ(Names(all), moment == 2 ? "y,a,z," : "y,z,") << moment;
+    EXPECT_EQ(NamesOf(all), moment == 2 ? "y,a,z," : "y,z,") << moment;
     runWith(moment, [&] {
       all.Insert(1, Record(u"new"));
       shown.Insert(1, Record(u"new"));
     });
     for (const char* kept : {"new,", "x,", "z,"})
-      EXPECT_TRUE(Names(all).find(kept) != std::string::npos && Names(shown).find(kept) != std::string::npos)
+      EXPECT_TRUE(NamesOf(all).find(kept) != std::string::npos &&
+                  NamesOf(shown).find(kept) != std::string::npos)
           << moment;
   }
 }

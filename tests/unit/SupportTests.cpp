@@ -176,12 +176,7 @@ TEST(ProxySettings, OfTheBrowser) {
   values[u"ProxyEnable"] = FakeRegistry::Number(1);
   values[u"ProxyServer"] = FakeRegistry::String("h");
   for (const std::int32_t number : {error::kSubscriptOutOfRange, error::kInvalidCall}) {
-    try {
-      GetProxySettings(fake.apartment);
-      ADD_FAILURE() << number;
-    } catch (const RuntimeError& failure) {
-      EXPECT_EQ(failure.Number(), number);
-    }
+    EXPECT_EQ(ErrorOf([&] { GetProxySettings(fake.apartment); }), number);
     values.erase(u"ProxyServer");
   }
   EXPECT_EQ(fake.apartment.proxy.ProxyPort, u"old");

@@ -47,12 +47,7 @@ class ThumbNailTest : public ControlTest {
   std::string Selected() const {
     return control.GetSelectedFilesHttpPath() ? Utf8FromText(*control.GetSelectedFilesHttpPath()) : "none";
   }
-  std::string Shown() const {
-    std::string names;
-    const FileList& shown = fake.apartment.listing.shown;
-    for (std::size_t i = 1; i <= shown.Count(); ++i) names += Utf8FromText(shown.At(i)->FileName) + ",";
-    return names;
-  }
+  std::string Shown() const { return NamesOf(fake.apartment.listing.shown); }
   // A download that arrives whole.
   void Arrives(FakeDownloader& from) {
     from.events->Received(11);
@@ -207,16 +202,8 @@ TEST(ThumbNail, FitsPicturesIntoTheSquare) {
     EXPECT_EQ(place, test.place);
     EXPECT_EQ(Turned(place), FitImage(test.width, test.height));
   }
-  const auto numberOf = [](std::int32_t height, std::int32_t width) {
-    try {
-      FitImage(height, width);
-      return 0;
-    } catch (const RuntimeError& failure) {
-      return static_cast<int>(failure.Number());
-    }
-  };
-  EXPECT_EQ(numberOf(0, 0), 11);
-  EXPECT_EQ(numberOf(1100000, 1100000), 6);
+  EXPECT_EQ(ErrorOf([] { FitImage(0, 0); }), 11);
+  EXPECT_EQ(ErrorOf([] { FitImage(1100000, 1100000); }), 6);
 }
 
 TEST(ThumbNail, ShortensCaptions) {

@@ -59,6 +59,12 @@ struct DriverTest : testing::Test {
     log.clear();
     downloader->Start(url, target);
   }
+  // All but the end of a download.
+  void Fetch(TextView target, std::string_view reply) {
+    Start(target);
+    socket.events->OnConnected();
+    socket.Arrives(reply);
+  }
   std::string Saved(TextView path) {
     const auto found = fake.files.files.find(Text(path));
     return found == fake.files.files.end() ? "none" : found->second.bytes;
@@ -88,9 +94,7 @@ TEST_F(DriverTest, TellsADownloadInOrderAndWritesBothFiles) {
   EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "abc");
   EXPECT_EQ(watchdog.runs, 0U);
 
-  Start(u"");
-  socket.events->OnConnected();
-  socket.Arrives("A\r\n\r\nxyz");
+  Fetch(u"", "A\r\n\r\nxyz");
   socket.events->OnClosedByPeer();
   EXPECT_EQ(Saved(kTarget), "abc");
   EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "xyz");
@@ -117,9 +121,7 @@ TEST_F(DriverTest, FindsTheHeaderAcrossAnySplit) {
   for (std::size_t first = 0; first <= reply.size(); ++first)
     for (std::size_t second = first; second <= reply.size(); ++second) {
       fake.files.files.clear();
-      Start();
-      socket.events->OnConnected();
-      socket.Arrives(reply.substr(0, first));
+      Fetch(kTarget, reply.substr(0, first));
       socket.Arrives(reply.substr(first, second - first));
       socket.Arrives(reply.substr(second));
       socket.events->OnClosedByPeer();
@@ -264,9 +266,7 @@ TEST_F(DriverTest, WritesALargeFileAsItComes) {
     // The host pumps messages before the header was searched.
     host.in = "received";
     host.does = [&] { socket.Arrives(std::string_view(body).substr(3, 500'000)); };
-    Start();
-    socket.events->OnConnected();
-    socket.Arrives("HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\n" + body.substr(0, 3));
+    Fetch(kTarget, "HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\n" + body.substr(0, 3));
     // The second of these does not fit any more in that much room, the third would.
     socket.Arrives(std::string_view(body).substr(500'003, 300'000));
     socket.Arrives(std::string_view(body).substr(800'003));
@@ -335,9 +335,7 @@ TEST_F(DriverTest, EndsBeforeItDoesAnythingUnwanted) {
 TEST_F(DriverTest, AChangeInTheAccountOvertakesTheCopy) {
   for (const TextView target : {kTarget, TextView()}) {
     fake.files.files[u"C:\\t\\a.jpg"] = {3, 0, "new"};
-    Start(target);
-    socket.events->OnConnected();
-    socket.Arrives("A\r\n\r\nold");
+    Fetch(target, "A\r\n\r\nold");
     fake.apartment.CopyChanged(u"C:\\T\\A.jpg");
     socket.events->OnClosedByPeer();
     EXPECT_EQ(Saved(u"C:\\t\\a.jpg"), "new");
@@ -345,9 +343,7 @@ TEST_F(DriverTest, AChangeInTheAccountOvertakesTheCopy) {
     EXPECT_EQ(Saved(kTarget), "old") << "what was asked for is delivered";
   }
   // Unless the target is the copy.
-  Start(u"C:\\t\\A.jpg");
-  socket.events->OnConnected();
-  socket.Arrives("A\r\n\r\nold");
+  Fetch(u"C:\\t\\A.jpg", "A\r\n\r\nold");
   fake.apartment.CopyChanged(u"C:\\t\\a.jpg");
   socket.events->OnClosedByPeer();
   EXPECT_EQ(Saved(u"C:\\t\\A.jpg"), "none");
@@ -356,9 +352,7 @@ TEST_F(DriverTest, AChangeInTheAccountOvertakesTheCopy) {
 TEST_F(DriverTest, AnEventMayReplaceTheDownload) {
   host.in = "received";
   host.does = [&] { downloader->Start(u"http://h/b.jpg", u""); };
-  Start();
-  socket.events->OnConnected();
-  socket.Arrives("A\r\n\r\nabc");
+  Fetch(kTarget, "A\r\n\r\nabc");
   socket.events->OnConnected();
   socket.Arrives("HTTP/1.1 200\r\n\r\nxyz");
   socket.events->OnClosedByPeer();
@@ -397,16 +391,11 @@ TEST_F(DriverTest, WatchdogQuitAndEnd) {
   EXPECT_EQ(watchdog.runs, 0U);
 }
 
-TEST_F(DriverTest, TellsWhetherTheFileIsThere) {
+TEST_F(DriverTest, WritesAFileOnlyWhereThereIsRoomAndAUserFolder) {
   fake.files.mostWritten = 2;
-  Start();
-  socket.events->OnConnected();
-  socket.Arrives("A\r\n\r\nabc");
+  Fetch(kTarget, "A\r\n\r\nabc");
   socket.events->OnClosedByPeer();
   EXPECT_EQ(log.back(), "finished without a file");
-}
-
-TEST_F(DriverTest, NothingIsWrittenWithoutAUserFolder) {
   EXPECT_TRUE(downloader->CanStart(kUrl));
   EXPECT_FALSE(downloader->CanStart(u"") || downloader->CanStart(u"http://h/.."));
   fake.apartment.UserFolderPath.clear();

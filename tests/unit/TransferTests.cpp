@@ -15,48 +15,14 @@ TEST(FileNameGuard, AcceptsAndRefuses) {
                               u"nully", u"\u05E9\u05DC\u05D5\u05DD 1.jpg", u"\u0645\u06CC\u200C\u062E.png",
                               u"\u00A0.gif", u"desktop.ini.jpg", u"lnk", u"a.lnk.jpg", u"$MFT"})
     EXPECT_TRUE(IsSafeFileName(good)) << Utf8FromText(good);
-  for (const TextView bad : {u"",
-                             u".",
-                             u"..",
-                             u"a.",
-                             u"a ",
-                             u"a/b",
-                             u"a\\b",
-                             u"a:b",
-                             u"*",
-                             u"a?",
-                             u"\"",
-                             u"<",
-                             u">",
-                             u"|",
-                             u"a\nb",
-                             u"a\u007f",
-                             u"NUL",
-                             u"con",
-                             u"CoN.jpg",
-                             u"aux .x",
-                             u"com1",
-                             u"COM0",
-                             u"LPT9.gif",
-                             u"com\u00b9",
-                             u"CONOUT$",
-                             u"a::$DATA",
-                             u"a\u0080",
-                             u"\u009Fa",
-                             u"\u061C",
-                             u"a\u200Eb",
-                             u"a\u200Fb",
-                             u"a\u202Agpj.exe",
-                             u"a\u202Egpj.exe",
-                             u"\u2066a",
-                             u"a\u2069",
-                             u"Desktop.INI",
-                             u"autorun.inf",
-                             u".lnk",
-                             u"a.LNK",
-                             u"a.jpg.url",
-                             u"a.library-ms"})
-    EXPECT_FALSE(IsSafeFileName(bad)) << Utf8FromText(bad);
+  using Names = std::vector<TextView>;
+  for (const Names& names :
+       {Names{u"", u".", u"..", u"a.", u"a ", u"a/b", u"a\\b", u"a:b", u"*", u"a?", u"\"", u"<", u">", u"|"},
+        Names{u"a\nb", u"a\u007f", u"a\u0080", u"\u009Fa", u"\u061C", u"a\u200Eb", u"a\u200Fb"},
+        Names{u"a\u202Agpj.exe", u"a\u202Egpj.exe", u"\u2066a", u"a\u2069"},
+        Names{u"NUL", u"con", u"CoN.jpg", u"aux .x", u"com1", u"COM0", u"LPT9.gif", u"com\u00b9", u"CONOUT$"},
+        Names{u"a::$DATA", u"Desktop.INI", u"autorun.inf", u".lnk", u"a.LNK", u"a.jpg.url", u"a.library-ms"}})
+    for (const TextView bad : names) EXPECT_FALSE(IsSafeFileName(bad)) << Utf8FromText(bad);
   EXPECT_EQ(ShownName(u"\u05E9\u202Egpj\u0085.e\nxe"), u"\u05E9\uFFFDgpj\uFFFD.e\uFFFDxe");
 }
 
@@ -80,29 +46,20 @@ struct Uploads : UploadEvents {
 
 // The number of the failure, 0 for none.
 std::int32_t Upload(FakePlatform& fake, TextView path, TextView base, Uploads& events) {
-  if (path != u"C:\\none") fake.files.files[Text(path)] = {3, 0, "abc"};
-  try {
-    UploadObject(fake.apartment.platform).UploadFile(path, base, u"/p", 0, u"u", u"p", u"g", events);
-  } catch (const RuntimeError& failure) {
-    return failure.Number();
-  }
-  return 0;
+  if (path != u"C:\\none") fake.files.files.try_emplace(Text(path), FakeFiles::File{3, 0, "abc"});
+  return ErrorOf([&] {
+    UploadObject(fake.apartment.platform)
+        .UploadFile(path, base, u"/httpupload/UploadAcceptor.asp", 0, u"u", u"p", kProductGuid, events);
+  });
 }
 
 TEST(UploadObject, SendsTheFileAndTellsItsProgress) {
   FakePlatform fake;
   fake.files.files[u"C:\\a b.jpg"] = {20, 0, "12345678901234567890"};
-  UploadObject uploader(fake.apartment.platform);
   const auto upload = [&](const char* answer) {
     Uploads events;
-    if (answer) fake.http.answers.push_back(HttpAnswer{200, answer});
-    std::int32_t error = 0;
-    try {
-      uploader.UploadFile(u"C:\\a b.jpg", u"http://h:81/users/", u"/httpupload/UploadAcceptor.asp", 0, u"u",
-                          u"p", kProductGuid, events);
-    } catch (const RuntimeError& failure) {
-      error = failure.Number();
-    }
+    fake.http.answers.push_back(HttpAnswer{200, answer});
+    const std::int32_t error = Upload(fake, u"C:\\a b.jpg", u"http://h:81/users/", events);
     return std::to_string(error) + " " + events.log;
   };
   EXPECT_EQ(upload("ErrorNumber=0"),
@@ -151,46 +108,24 @@ TEST(UploadObject, EndsWhenItIsNotWanted) {
   }
 }
 
-// A transport that takes the body in pieces of one size.
-struct PiecewiseHttp : FakeHttp {
-  std::size_t piece = 1;
-  std::optional<HttpAnswer> PostStream(const HttpPost& post, BodySource& source, std::size_t most) override {
-    std::string body;
-    std::string room(piece, '?');
-    source.Sent(0);
-    while (body.size() < source.Length()) {
-      body.append(room, 0, source.Read(room));
-      source.Sent(body.size());
-    }
-    EXPECT_EQ(source.Read(room), 0U);
-    HttpPost whole = post;
-    whole.body = body;
-    return Post(whole, most);
-  }
-};
-
 TEST(UploadObject, TellsRisingPercentsInPiecesOfAnySize) {
   for (const std::size_t length : {0U, 7U, 12345U}) {
     for (const std::size_t piece : {1U, 1000U, 1U << 20}) {
       SCOPED_TRACE(std::to_string(length) + " in " + std::to_string(piece));
       FakePlatform fake;
-      PiecewiseHttp http;
-      http.piece = piece;
-      http.answers.push_back(HttpAnswer{200, "ErrorNumber=0"});
+      fake.http.piece = piece;
+      fake.http.answers.push_back(HttpAnswer{200, "ErrorNumber=0"});
       std::string bytes(length, 'x');
       fake.files.files[u"C:\\\u00e9.jpg"] = {length, 0, bytes};
-      Platform platform = fake.apartment.platform;
-      UploadObject uploader(
-          {platform.registry, http, platform.internet, platform.files, platform.strings, platform.pump});
       Uploads events;
-      uploader.UploadFile(u"C:\\\u00e9.jpg", u"http://h/users/", u"/p", 0, u"u", u"p", u"g", events);
+      EXPECT_EQ(Upload(fake, u"C:\\\u00e9.jpg", u"http://h/users/", events), 0);
 
       std::istringstream log(events.log.substr(events.log.find("0 0;") + 4));
       int last = 0;
       for (int percent = 0, sent = 0; log >> percent >> sent; last = percent, log.ignore())
         EXPECT_LT(last, percent);
       EXPECT_EQ(last, 100) << events.log;
-      const std::string& body = http.sent[0].body;
+      const std::string& body = fake.http.sent[0].body;
       EXPECT_NE(body.find("filename=\"\xC3\xA9.jpg\"\r\nContent-Type: application/octet-stream\r\n\r\n" +
                           bytes + "\r\n--"),
                 std::string::npos);
