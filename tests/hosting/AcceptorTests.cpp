@@ -149,7 +149,6 @@ TEST_F(AcceptorTest, WhatCannotBeStoredIsNotAcknowledgedAndChangesNothing) {
 }
 
 TEST_F(AcceptorTest, UploadsAtTheSameTimeStayWholeAndWithinTheQuota) {
-  End();
   Begin([](Options& options) { options.quota = 5 * 50'000; });
   std::vector<std::thread> clients;
   for (char letter = 'a'; letter < 'i'; ++letter)

@@ -199,6 +199,7 @@ std::string FormText(const Fields& fields) {
 }
 
 void HostingTest::Begin(const std::function<void(Options&)>& change) {
+  End();
   Options options;
   options.data = Data();
   options.seedUser = kUser;
@@ -212,6 +213,13 @@ void HostingTest::Begin(const std::function<void(Options&)>& change) {
   server_->Start();
   const bool hasAuthority = options.tlsSelfSigned;
   client_ = std::make_unique<HostingClient>(port_, hasAuthority ? Authority() : std::filesystem::path());
+}
+
+void HostingTest::BeginWithFaults(std::initializer_list<const char*> faults, bool tls) {
+  Begin([&](Options& options) {
+    options.tlsSelfSigned = tls;
+    for (const char* fault : faults) options.faults.push_back(ParseFault(fault).value());
+  });
 }
 
 void HostingTest::End() {

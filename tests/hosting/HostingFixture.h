@@ -111,8 +111,9 @@ std::string FormText(const Fields& fields);
 
 class HostingTest : public testing::Test {
  protected:
-  // Starts the server with the seeded user; `change` may alter the options.
+  // Starts the server with the seeded user, in place of one that runs; `change` may alter the options.
   void Begin(const std::function<void(Options&)>& change = {});
+  void BeginWithFaults(std::initializer_list<const char*> faults, bool tls = false);
   void End();
   void SetUp() override { Begin(); }
   void TearDown() override { End(); }

@@ -87,7 +87,6 @@ TEST_F(ServicePageTest, DetailsAreFoundByMguidAndUserTogether) {
 }
 
 TEST_F(ServicePageTest, LogOnAndPasswordChangeCompareWithoutTheCharactersThatTheCipherDrops) {
-  End();
   Begin([](Options& options) {
     options.data /= "other";
     options.seedProduct = 7;
@@ -121,7 +120,6 @@ TEST_F(ServicePageTest, LogOnAndPasswordChangeCompareWithoutTheCharactersThatThe
 }
 
 TEST_F(ServicePageTest, AccountsAreAddedUpToTheLimitAndRemovedWithTheirFiles) {
-  End();
   Begin([](Options& options) { options.hardLimit = 3; });
   const auto add = [&](const char* user) {
     return Client().Ask("AddUser", {{"UserName", user}, {"ProductID", "1"}, {"MGUID", "{0}"}});
@@ -194,7 +192,6 @@ TEST_F(ServicePageTest, QuotaAndExpiryAreTold) {
   const auto canUpload = [&] {
     return Client().AskFor("CanUploadFile", "CanUploadFile", {{"UserName", kUser}, {"ProductID", "1"}});
   };
-  End();
   Begin([](Options& options) { options.quota = 10; });
   EXPECT_EQ(Client().Upload("a.jpg", "12345678901"), kName);
   EXPECT_EQ(Client().Upload("a.jpg", "123456"), kStored);
@@ -204,7 +201,6 @@ TEST_F(ServicePageTest, QuotaAndExpiryAreTold) {
   EXPECT_EQ(canUpload(), "1002");
   EXPECT_EQ(Client().CheckedListing().size(), 1U);
   EXPECT_TRUE(std::filesystem::is_empty(Data() / "work"));
-  End();
   Begin([](Options& options) { options.expireDays = 0; });
   EXPECT_EQ(canUpload(), "1004");
   EXPECT_EQ(Client().AskFor("HasUserExpired", "HasUserExpired", {{"UserName", kUser}}), "1002");

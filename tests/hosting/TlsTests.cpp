@@ -22,15 +22,7 @@ struct TlsAnswer {
 
 class TlsTest : public HostingTest {
  protected:
-  void SetUp() override { BeginWith({}); }
-
-  void BeginWith(std::initializer_list<const char*> faults) {
-    End();
-    Begin([&](Options& options) {
-      options.tlsSelfSigned = true;
-      for (const char* fault : faults) options.faults.push_back(ParseFault(fault).value());
-    });
-  }
+  void SetUp() override { BeginWithFaults({}, true); }
 
   // Speaks no version above the one given; 0 is the newest.
   TlsAnswer Exchange(std::string_view request, int version = 0) {
@@ -120,7 +112,7 @@ TEST_F(TlsTest, FaultsEndTheConnectionAsTheyDoWithoutTls) {
   };
   ASSERT_EQ(Client().Upload("a.jpg", "0123456789"), kStored);
   for (const auto& [fault, end, body] : rows) {
-    BeginWith({fault});
+    BeginWithFaults({fault}, true);
     const TlsAnswer answer = Exchange(request);
     EXPECT_EQ(answer.end, end) << fault;
     EXPECT_EQ(RawAnswer{answer.bytes}.Body(), body) << fault;
@@ -138,7 +130,6 @@ TEST_F(TlsTest, CertificatesComeFromFilesAndHoldForTheAddressOfTheServer) {
       "openssl ec -in key.pem -out encrypted.pem -aes256 -passout pass:Linden42";
   ASSERT_EQ(std::system(("(" + make + ") 2>/dev/null").c_str()), 0);
   const auto begin = [&](const std::string& itsCertificate, const std::string& itsKey) {
-    End();
     Begin([&](Options& options) {
       options.tlsCertificate = itsCertificate;
       options.tlsKey = itsKey;
@@ -154,7 +145,6 @@ TEST_F(TlsTest, CertificatesComeFromFilesAndHoldForTheAddressOfTheServer) {
         std::pair(certificate, folder + "/encrypted.pem")})
     EXPECT_THROW(begin(itsCertificate, itsKey), std::runtime_error) << itsCertificate << " " << itsKey;
 
-  End();
   Begin([](Options& options) {
     options.tlsSelfSigned = true;
     options.host = "::1";

@@ -3,6 +3,8 @@
 #include <sys/socket.h>
 
 #include <chrono>
+#include <iterator>
+#include <sstream>
 #include <thread>
 
 #include "HostingFixture.h"
@@ -23,15 +25,6 @@ class WireTest : public HostingTest {
     return "POST " + target +
            " HTTP/1.1\r\nHost: x.test:1\r\nContent-Type: application/x-www-form-urlencoded\r\n" + more +
            "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body;
-  }
-
-  static std::string Close() { return "Connection: close\r\n"; }
-
-  void Fault(std::initializer_list<const char*> faults) {
-    End();
-    Begin([&](Options& options) {
-      for (const char* fault : faults) options.faults.push_back(ParseFault(fault).value());
-    });
   }
 };
 
@@ -161,7 +154,7 @@ TEST_F(WireTest, FaultsSpoilTheAnswerOfTheirActionOnly) {
       {"SoftLimit=refuse", false, 200, good},
   };
   for (const Row& row : rows) {
-    Fault({row.fault});
+    BeginWithFaults({row.fault});
     const RawAnswer answer = RawExchange(Port(), request);
     EXPECT_EQ(answer.isReset, row.isReset) << row.fault;
     EXPECT_EQ(answer.Status(), row.status) << row.fault;
@@ -170,14 +163,14 @@ TEST_F(WireTest, FaultsSpoilTheAnswerOfTheirActionOnly) {
       EXPECT_EQ(Client().AskFor("SoftLimit", "SoftLimit", {{"ProductID", "1"}}), "900") << row.fault;
     }
   }
-  Fault({"HardLimit=length:3"});
+  BeginWithFaults({"HardLimit=length:3"});
   EXPECT_NE(RawExchange(Port(), request).bytes.find("Content-Length: 3\r\n"), std::string::npos);
-  Fault({"HardLimit=garbage"});
+  BeginWithFaults({"HardLimit=garbage"});
   EXPECT_EQ(Client().AskFor("HardLimit", "HardLimit", {{"ProductID", "1"}}), "(error)");
   EXPECT_FALSE(Client().IsLost());
   // The answer does not tell that the connection serves no second request.
   for (const std::string& first : {request, Post("/bv/bin/BVServicePage.asp", body)}) {
-    Fault({"HardLimit=late-close:200"});
+    BeginWithFaults({"HardLimit=late-close:200"});
     const auto start = Clock::now();
     const RawAnswer answer = RawExchange(Port(), first + request);
     EXPECT_EQ(answer.Body(), good);
@@ -186,31 +179,31 @@ TEST_F(WireTest, FaultsSpoilTheAnswerOfTheirActionOnly) {
     EXPECT_EQ(answer.bytes.find("Keep-Alive:"), std::string::npos) << answer.bytes;
     EXPECT_GE(Clock::now() - start, std::chrono::milliseconds(190));
   }
-  Fault({"HardLimit=huge"});
+  BeginWithFaults({"HardLimit=huge"});
   EXPECT_GT(RawExchange(Port(), request).Body().size(), std::size_t{64} << 20);
 }
 
 TEST_F(WireTest, FaultsOfPagesAndPicturesAreShownAfterTheRequestIsCarriedOut) {
-  Fault({"UploadAcceptor.asp=reset:body", "/users/=cut:2", "ListFiles=wrong"});
+  BeginWithFaults({"UploadAcceptor.asp=reset:body", "/users/=cut:2", "ListFiles=wrong"});
   EXPECT_EQ(Client().Upload("a.jpg", "12345"), kNoNumber);
   const RawAnswer picture = Get(std::string("/users/") + kFolder + "/a.jpg");
   EXPECT_EQ(picture.Body(), "12");
   const Reply listing = Client().Ask("ListFiles", {{"Username", kUser}, {"ProductID", "1"}});
   EXPECT_EQ(listing.GetValueByVariableName(u"FileName")->size(), 1U);
   EXPECT_EQ(listing.GetValueByVariableName(u"FileDate")->size(), 0U);
-  Fault({});
+  BeginWithFaults({});
   EXPECT_EQ(Client().CheckedListing().size(), 1U);
 }
 
 TEST_F(WireTest, StalledAndIdleConnectionsHoldUpNeitherClientsNorTheEnd) {
   const std::string body = FormText({{"ClientAction", Enciphered("HardLimit")}, {"ProductID", "1"}});
   const std::string request = Post("/bv/bin/BVServicePage.asp", body, "Connection: close\r\n");
-  Fault({"HardLimit=stall:1"});
+  BeginWithFaults({"HardLimit=stall:1"});
   auto start = Clock::now();
   EXPECT_EQ(RawExchange(Port(), request).Body(), "HardLimit=1000");
   EXPECT_GE(Clock::now() - start, std::chrono::milliseconds(990));
 
-  Fault({"HardLimit=stall"});
+  BeginWithFaults({"HardLimit=stall"});
   start = Clock::now();
   EXPECT_EQ(RawExchange(Port(), request, 200).bytes, "");
   EXPECT_EQ(Client().AskFor("SoftLimit", "SoftLimit", {{"ProductID", "1"}}), "900");
@@ -255,7 +248,6 @@ TEST(ConnectionTest, AHeadHasItsTimeAndABodyTakesAsLongAsItArrives) {
 }
 
 TEST(OptionsTest, BadOptionsAreToldApartFromGoodOnes) {
-  using Arguments = std::vector<std::string>;
   const Options options =
       ParseOptions({"--data", "d d", "--port=80", "--port", "81", "--fault", "/a=b/=drip:5", "--fault=*=cut",
                     "--seed-user", "a@b.c", "--seed-password=x=y", "--quota", "5", "--expire-days", "0"});
@@ -270,17 +262,16 @@ TEST(OptionsTest, BadOptionsAreToldApartFromGoodOnes) {
   EXPECT_EQ(options.faults[0].where, "/a=b/");
   EXPECT_EQ(options.faults[0].amount, 5U);
   EXPECT_NE(ParseOptions({"--help"}).help.find("--data"), std::string::npos);
-  for (const Arguments& bad :
-       {Arguments{}, Arguments{"--data"}, Arguments{"--data", "d", "--port", "65536"},
-        Arguments{"--data", "d", "--port", "x"}, Arguments{"--data", "d", "--port", "010"},
-        Arguments{"--data", "d", "--prot", "1"}, Arguments{"--data", "d", "file"},
-        Arguments{"--data", "d", "--tls-certificate", "c"}, Arguments{"--data", "d", "--tls-key", "k"},
-        Arguments{"--data", "d", "--tls-certificate", "c", "--tls-key", "k", "--tls-self-signed"},
-        Arguments{"--data", "d", "--seed-user", "u"}, Arguments{"--data", "d", "--seed-password", "p"},
-        Arguments{"--data", "d", "--seed-user", "a#b", "--seed-password", "p"},
-        Arguments{"--data", "d", "--seed-user", "u", "--seed-password", "!"},
-        Arguments{"--data", "d", "--seed-user", "u", "--seed-password", "p", "--seed-pictures", "/nowhere"}})
-    EXPECT_THROW(ParseOptions(bad), OptionError) << bad.size();
+  for (const char* bad :
+       {"", "--data", "--data d --port 65536", "--data d --port x", "--data d --port 010",
+        "--data d --prot 1", "--data d file", "--data d --tls-certificate c", "--data d --tls-key k",
+        "--data d --tls-certificate c --tls-key k --tls-self-signed", "--data d --seed-user u",
+        "--data d --seed-password p", "--data d --seed-user a#b --seed-password p",
+        "--data d --seed-user u --seed-password !",
+        "--data d --seed-user u --seed-password p --seed-pictures /nowhere"}) {
+    std::istringstream words(bad);
+    EXPECT_THROW(ParseOptions({std::istream_iterator<std::string>(words), {}}), OptionError) << bad;
+  }
   for (const char* fault :
        {"ListFiles", "=refuse", "ListFiles=", "ListFiles=explode", "ListFiles=reset", "ListFiles=reset:tail",
         "ListFiles=drip", "ListFiles=drip:x", "ListFiles=stall:handshake", "ListFiles=refuse:1",
