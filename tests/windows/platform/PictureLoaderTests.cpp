@@ -5,7 +5,6 @@
 #include <objbase.h>
 #include <wincodec.h>
 
-#include <algorithm>
 #include <cstdint>
 #include <fstream>
 #include <iterator>
@@ -305,38 +304,6 @@ TEST_F(PictureLoaderTest, ABrokenFileIsNotShown) {
       },
       kBackground, [&] { return ++asked < 2; }))
       << "given up on the way";
-}
-
-// A few bytes that say how large the picture is are not believed.
-TEST_F(PictureLoaderTest, AFileThatClaimsTooMuchIsNotShown) {
-  struct Row {
-    const char* name;
-    Bytes file;
-    // Where its sides stand, from the mark on, and in how many bytes.
-    Bytes mark;
-    std::size_t width, height;
-    int bytes;
-    bool bigEndian;
-  };
-  for (const Row& row : {Row{"PNG", FileOf("horse.png"), {'I', 'H', 'D', 'R'}, 4, 8, 4, true},
-                         Row{"GIF", FileOf("wizard.gif"), {'G', 'I', 'F'}, 6, 8, 2, false},
-                         Row{"JPEG", FileOf("rose.jpg"), {0xFF, 0xC0}, 7, 5, 2, true},
-                         Row{"BMP", Bmp(Colours(4, 2)), {'B', 'M'}, 18, 22, 4, false}}) {
-    Bytes bytes = row.file;
-    EXPECT_FALSE(Shown(bytes, 2, 2).empty()) << row.name;
-    const auto mark = static_cast<std::size_t>(
-        std::search(bytes.begin(), bytes.end(), row.mark.begin(), row.mark.end()) - bytes.begin());
-    ASSERT_LT(mark, bytes.size()) << row.name;
-    const auto put = [&](std::size_t at, std::uint32_t value) {
-      for (int i = 0; i < row.bytes; ++i)
-        bytes[mark + at + static_cast<std::size_t>(i)] =
-            static_cast<std::uint8_t>(value >> 8 * (row.bigEndian ? row.bytes - 1 - i : i));
-    };
-    put(row.width, 8001);
-    put(row.height, 8000);
-    EXPECT_TRUE(Shown(bytes, 2, 2).empty()) << row.name;
-    EXPECT_EQ(PictureFault::kTooLarge, fault_) << row.name;
-  }
 }
 
 }  // namespace

@@ -102,20 +102,18 @@ class FilesTest : public testing::Test {
   ~FilesTest() override { Remove(); }
 
   Text In(TextView name) const { return folder_ + u"\\" + Text(name); }
+  FileOwner Open(TextView name, DWORD access, DWORD share = 0, DWORD how = OPEN_EXISTING) const {
+    return FileOwner(CreateFileW(WideFromText(In(name)).c_str(), access, share, nullptr, how, 0, nullptr));
+  }
   void Write(TextView name, std::string_view bytes) {
-    HANDLE file =
-        CreateFileW(WideFromText(In(name)).c_str(), GENERIC_WRITE, 0, nullptr, CREATE_ALWAYS, 0, nullptr);
+    const FileOwner file = Open(name, GENERIC_WRITE, 0, CREATE_ALWAYS);
     DWORD written = 0;
-    WriteFile(file, bytes.data(), static_cast<DWORD>(bytes.size()), &written, nullptr);
-    CloseHandle(file);
+    WriteFile(file.Get(), bytes.data(), static_cast<DWORD>(bytes.size()), &written, nullptr);
   }
   std::string Read(TextView name) {
     char bytes[100];
-    HANDLE file = CreateFileW(WideFromText(In(name)).c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
-                              OPEN_EXISTING, 0, nullptr);
     DWORD size = 0;
-    ReadFile(file, bytes, sizeof bytes, &size, nullptr);
-    CloseHandle(file);
+    ReadFile(Open(name, GENERIC_READ, FILE_SHARE_READ).Get(), bytes, sizeof bytes, &size, nullptr);
     return {bytes, size};
   }
   // All names in the folder, hidden ones included; with `erase` they go.
@@ -151,14 +149,12 @@ TEST_F(FilesTest, TellsLengthTimeAndAttributes) {
     // Not every system keeps the archive bit: it may be set always.
     EXPECT_EQ(files_.Attributes(path) & ~attribute::kArchive, bits);
   }
-  HANDLE file = CreateFileW(WideFromText(path).c_str(), GENERIC_WRITE, 0, nullptr, OPEN_EXISTING, 0, nullptr);
   const SYSTEMTIME noon{2026, 1, 0, 2, 15, 4, 5, 0};
   SYSTEMTIME utc{};
   FILETIME time{};
   TzSpecificLocalTimeToSystemTime(nullptr, &noon, &utc);
   SystemTimeToFileTime(&utc, &time);
-  SetFileTime(file, nullptr, nullptr, &time);
-  CloseHandle(file);
+  SetFileTime(Open(u"\u65E5.jpg", GENERIC_WRITE).Get(), nullptr, nullptr, &time);
   EXPECT_EQ(files_.ModifiedText(path), u"1/2/2026 3:04:05 PM");
 
   for (const Text& nothing :
@@ -203,8 +199,7 @@ TEST_F(FilesTest, CopiesWholeOrNotAtAll) {
   Write(u"held", "old");
   files_.SetAttributes(In(u"locked"), attribute::kReadOnly);
   files_.MakeFolder(In(u"folder"));
-  HANDLE held = CreateFileW(WideFromText(In(u"held")).c_str(), GENERIC_READ, FILE_SHARE_READ, nullptr,
-                            OPEN_EXISTING, 0, nullptr);
+  FileOwner held = Open(u"held", GENERIC_READ, FILE_SHARE_READ);
   const struct {
     TextView source, destination;
     std::int32_t error;
@@ -220,7 +215,7 @@ TEST_F(FilesTest, CopiesWholeOrNotAtAll) {
       EXPECT_EQ(Read(item.destination), item.content);
     }
   }
-  CloseHandle(held);
+  held = {};
 
   // The second page of these bytes is not there, so the system writes the first at most.
   SYSTEM_INFO system{};
@@ -280,9 +275,8 @@ TEST_F(FilesTest, RemovesWhatEndedProcessesLeft) {
   files_.Remove(In(u"a.jpg.begun"));
   DWORD refused = 0;
   for (int i = 0; i < 200'000 && refused == 0 && !HasFailure(); ++i) {
-    const FileOwner file(CreateFileW(WideFromText(In(u"a.jpg")).c_str(), GENERIC_READ,
-                                     FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE, nullptr,
-                                     OPEN_EXISTING, 0, nullptr));
+    const FileOwner file =
+        Open(u"a.jpg", GENERIC_READ, FILE_SHARE_READ | FILE_SHARE_WRITE | FILE_SHARE_DELETE);
     if (file) {
       EXPECT_EQ(GetFileSize(file.Get(), nullptr), kWhole) << "nobody sees a part";
     } else if (GetLastError() != ERROR_FILE_NOT_FOUND) {
@@ -320,9 +314,7 @@ TEST_F(FilesTest, RemovesWhatEndedProcessesLeft) {
   const FILETIME old{0, 0x01C00000};
   for (const auto& file : kFiles) {
     Write(file.name, "half");
-    const FileOwner handle(CreateFileW(WideFromText(In(file.name)).c_str(), GENERIC_WRITE, 0, nullptr,
-                                       OPEN_EXISTING, 0, nullptr));
-    if (file.isOld) SetFileTime(handle.Get(), &old, nullptr, &old);
+    if (file.isOld) SetFileTime(Open(file.name, GENERIC_WRITE).Get(), &old, nullptr, &old);
   }
   files_.SetAttributes(In(ended + u"-1-1.tmp"), attribute::kReadOnly);
   {
@@ -348,12 +340,10 @@ TEST_F(FilesTest, ReadsABeginningAndCreatesWhatIsMissing) {
   EXPECT_EQ(files_.ReadBeginning(In(u"a.jpg"), room), 3U);
   EXPECT_EQ(files_.ReadBeginning(In(u"\u65E5.jpg"), room), 0U);
   EXPECT_EQ(files_.Length(In(u"\u65E5.jpg")), 0U);
-  HANDLE held = CreateFileW(WideFromText(In(u"\u65E5.jpg")).c_str(), GENERIC_READ, 0, nullptr, OPEN_EXISTING,
-                            0, nullptr);
+  const FileOwner held = Open(u"\u65E5.jpg", GENERIC_READ);
   for (const Text& name : {In(u"\u65E5.jpg"), folder_, In(Text(u"a\0", 2))})
     EXPECT_EQ(ErrorOf([&] { files_.ReadBeginning(name, room); }), 75) << Utf8FromText(name);
   EXPECT_EQ(ErrorOf([&] { files_.ReadBeginning(In(u"none\\a"), room); }), 76);
-  CloseHandle(held);
 }
 
 TEST(WindowsStringResources, ReadsOwnAndLoadedStrings) {

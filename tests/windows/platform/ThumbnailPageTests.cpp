@@ -113,14 +113,11 @@ RECT PlaceOf(HWND window) {
   return place;
 }
 
-bool Inside(const RECT& inner, const RECT& outer) {
-  return inner.left >= outer.left && inner.top >= outer.top && inner.right <= outer.right &&
-         inner.bottom <= outer.bottom && inner.left < inner.right && inner.top < inner.bottom;
-}
-
-bool Overlap(const RECT& one, const RECT& other) {
+// What both have in common; empty when they do not overlap.
+RECT Common(const RECT& one, const RECT& other) {
   RECT common = {};
-  return IntersectRect(&common, &one, &other) != FALSE;
+  IntersectRect(&common, &one, &other);
+  return common;
 }
 
 // A picture of one colour, in the temporary folder.
@@ -246,12 +243,12 @@ TEST_F(ThumbnailPageTest, WindowsStandAsLaidOutAndHaveNames) {
     for (const HWND child : children) {
       if (!IsWindowVisible(child)) continue;
       const RECT place = PlaceOf(child);
-      EXPECT_TRUE(Inside(place, {0, 0, room.right - room.left, room.bottom - room.top}));
+      const RECT inside = Common(place, {0, 0, room.right - room.left, room.bottom - room.top});
+      EXPECT_TRUE(!IsRectEmpty(&place) && EqualRect(&inside, &place));
       EXPECT_FALSE(NameOf(child).empty());
       for (const HWND sibling : children) {
-        if (sibling != child && IsWindowVisible(sibling)) {
-          EXPECT_FALSE(Overlap(place, PlaceOf(sibling)));
-        }
+        const RECT shared = Common(place, PlaceOf(sibling));
+        EXPECT_TRUE(sibling == child || !IsWindowVisible(sibling) || IsRectEmpty(&shared));
       }
     }
   };
