@@ -146,9 +146,7 @@ TEST(ListControl, DragsItsOwnFile) {
   const std::wstring name = L"wizard.gif";
   const std::wstring address = Address(name);
   // The copy that other tests may have left.
-  wchar_t temporary[MAX_PATH] = {};
-  GetTempPathW(MAX_PATH, temporary);
-  std::wstring copy = temporary + (L"bv\\" + FolderName() + L"\\" + name);
+  std::wstring copy = CopyOf(name);
   DeleteFileW(copy.c_str());
 
   // A button says that nothing is selected when the list has done with it, and says it once.

@@ -28,6 +28,15 @@ std::wstring LastReason(const Form& form) {
   return reason.Text();
 }
 
+// A download over the file of an earlier one, of which `left` is there then.
+void ExpectDownload(Form& form, const std::wstring& name, const std::optional<std::string>& left, bool told) {
+  CopyFileW(kPicture, name.c_str(), FALSE);
+  EXPECT_EQ(form.Download(name.c_str()), L".\\" + name);
+  EXPECT_TRUE(Contents(name) == left);
+  EXPECT_EQ(form.events, told ? Lines{L"5555 "} : Lines());
+  DeleteFileW(name.c_str());
+}
+
 TEST(ListControl, LeavesWholeFilesOrNoneWhateverTheServerDoes) {
   Form form;
   form.Open(L"*", TheServer().faulty);
@@ -55,10 +64,7 @@ TEST(ListControl, LeavesWholeFilesOrNoneWhateverTheServerDoes) {
   };
   for (const auto& row : rows) {
     SCOPED_TRACE(testing::Message() << row.name);
-    CopyFileW(kPicture, row.name, FALSE);  // of an earlier download
-    EXPECT_EQ(form.Download(row.name), std::wstring(L".\\") + row.name);
-    EXPECT_TRUE(Contents(row.name) == row.left);
-    EXPECT_EQ(form.events, row.told ? Lines{L"5555 "} : Lines());
+    ExpectDownload(form, row.name, row.left, row.told);
     // The end of a connection may overtake what was sent before it and has to be deciphered.
     EXPECT_TRUE((secure && row.told) || form.progress.empty() != row.arrives);
     EXPECT_EQ(LastError(form) == kSuccess, !row.told);
@@ -67,7 +73,6 @@ TEST(ListControl, LeavesWholeFilesOrNoneWhateverTheServerDoes) {
       EXPECT_GT(form.progress.size(), 20U);
       EXPECT_EQ(form.progress.back(), static_cast<int>(kDripBytes));
     }
-    DeleteFileW(row.name);
   }
 }
 
@@ -141,11 +146,7 @@ TEST(ListControl, SaysNothingToAnUnsafeServer) {
     const Bstr all(L"*");
     BSTR filter = all;
     EXPECT_EQ(static_cast<unsigned>(form.list->Init(&filter, &done)), 0x800A03ECU);
-    ComPtr<IErrorInfo> info;
-    ASSERT_EQ(GetErrorInfo(0, info.Receive()), S_OK);
-    Bstr description;
-    info->GetDescription(description.Receive());
-    EXPECT_EQ(description.Text(), row.reason);
+    EXPECT_EQ(LastDescription(), row.reason);
     EXPECT_EQ(LastError(form), kConnectAborted);
     EXPECT_EQ(LastReason(form), row.reason);
   }
@@ -171,13 +172,9 @@ TEST(ListControl, FetchesOnlyWhatIsSafeInASecureSession) {
   };
   for (const auto& row : rows) {
     SCOPED_TRACE(testing::Message() << row.name);
-    CopyFileW(kPicture, row.name, FALSE);  // of an earlier download
-    EXPECT_EQ(form.Download(row.name), std::wstring(L".\\") + row.name);
-    EXPECT_TRUE(Contents(row.name) == row.left);
-    EXPECT_EQ(form.events, row.error == kSuccess ? Lines() : Lines{L"5555 "});
+    ExpectDownload(form, row.name, row.left, row.error != kSuccess);
     EXPECT_EQ(LastError(form), row.error);
     EXPECT_EQ(LastReason(form), row.reason);
-    DeleteFileW(row.name);
   }
 }
 
@@ -188,9 +185,7 @@ TEST(ListControl, FetchesOverIpv6) {
     if (server.empty()) GTEST_SKIP() << "this machine has no IPv6";
     Form form;
     form.Open(L"*", server);
-    EXPECT_EQ(form.Download(L"rose.jpg"), L".\\rose.jpg");
-    EXPECT_TRUE(Contents(L"rose.jpg") == Contents(L"demo\\pictures\\rose.jpg"));
-    DeleteFileW(L"rose.jpg");
+    ExpectDownload(form, L"rose.jpg", Contents(L"demo\\pictures\\rose.jpg"), false);
   }
 }
 

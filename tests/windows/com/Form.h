@@ -45,6 +45,14 @@ inline void Hold(BYTE key, bool down) {
   SetKeyboardState(keys);
 }
 
+// Of the error that the last call of this thread has left.
+inline std::wstring LastDescription() {
+  ComPtr<IErrorInfo> info;
+  Bstr description;
+  if (GetErrorInfo(0, info.Receive()) == S_OK) info->GetDescription(description.Receive());
+  return description.Text();
+}
+
 using Pixels = std::vector<std::uint32_t>;
 // What `draw` draws.
 inline Pixels Drawn(int width, int height, const std::function<void(HDC)>& draw) {
@@ -97,6 +105,13 @@ void Select(Interface& control, const wchar_t* name) {
   BSTR given = text;
   VARIANT ignored = {};
   EXPECT_EQ(control.UploadedFileSetFocus(&given, &ignored), S_OK);
+}
+
+template <typename Interface>
+std::wstring Selected(Interface& control) {
+  Bstr name;
+  control.SelectedFileName(name.Receive());
+  return name.Text();
 }
 
 template <typename Interface>
@@ -153,13 +168,9 @@ class ControlForm {
   ControlForm& operator=(const ControlForm&) = delete;
 
   void LogOn(const std::wstring& serverName) {
-    const Server& server = TheServer();
     ComPtr<_CFileUpload> client;
     ASSERT_EQ(control->get_mobjFileupload(client.Receive()), S_OK);
-    VARIANT_BOOL done = VARIANT_FALSE;
-    client->ConnectToServer(Bstr(serverName), &done);
-    client->LogonAs(Bstr(server.product), Bstr(server.user), Bstr(server.password), Bstr(L""), &done);
-    ASSERT_TRUE(done);
+    ASSERT_TRUE(test::LogOn(*client, serverName));
   }
   bool Init(const wchar_t* filter) { return test::Init(*control, filter); }
   void Open(const wchar_t* filter, const std::wstring& serverName = TheServer().name) {
@@ -196,11 +207,7 @@ class ControlForm {
     test::Select(*control, name);
     return Selected();
   }
-  std::wstring Selected() const {
-    Bstr name;
-    control->SelectedFileName(name.Receive());
-    return name.Text();
-  }
+  std::wstring Selected() const { return test::Selected(*control); }
 };
 
 class Form : public ControlForm<_ctrlListImage> {
@@ -237,6 +244,12 @@ inline std::wstring FolderName() {
 inline std::wstring Address(const std::wstring& file) {
   return (TheServer().IsSecure() ? L"" : L"http://") + TheServer().name + L"/users/" + FolderName() + L"/" +
          file;
+}
+// Where the controls keep their copies.
+inline std::wstring CopyOf(const std::wstring& file) {
+  wchar_t temporary[MAX_PATH] = {};
+  GetTempPathW(MAX_PATH, temporary);
+  return temporary + (L"bv\\" + FolderName()) + L"\\" + file;
 }
 inline const Lines kJpegs = {L"Chelsea the cat.jpg", L"coffee.jpg", L"rocket.jpg", L"rose.jpg"};
 

@@ -47,15 +47,18 @@ const Server& TheServer() {
   return server;
 }
 
-ComPtr<_CFileUpload> LoggedOnClient() {
+bool LogOn(_CFileUpload& client, const std::wstring& serverName) {
   const Server& server = TheServer();
-  ComPtr<_CFileUpload> client = NewClient();
-  if (!client) return {};
   VARIANT_BOOL done = VARIANT_FALSE;
-  client->ConnectToServer(Bstr(server.name), &done);
+  client.ConnectToServer(Bstr(serverName), &done);
   EXPECT_TRUE(done);
-  client->LogonAs(Bstr(server.product), Bstr(server.user), Bstr(server.password), Bstr(L""), &done);
-  EXPECT_TRUE(done);
+  client.LogonAs(Bstr(server.product), Bstr(server.user), Bstr(server.password), Bstr(L""), &done);
+  return done != VARIANT_FALSE;
+}
+
+ComPtr<_CFileUpload> LoggedOnClient() {
+  ComPtr<_CFileUpload> client = NewClient();
+  EXPECT_TRUE(client && LogOn(*client, TheServer().name));
   return client;
 }
 

@@ -63,6 +63,14 @@ inline VARIANT VariantOf(LONG number) {
   return value;
 }
 
+// Of a variable of that type.
+inline VARIANT ReferenceTo(VARTYPE type, void* variable) {
+  VARIANT value;
+  V_VT(&value) = static_cast<VARTYPE>(VT_BYREF | type);
+  V_BYREF(&value) = variable;
+  return value;
+}
+
 // A further interface of the object.
 template <typename Interface>
 ComPtr<Interface> As(IUnknown& object) {
@@ -114,6 +122,8 @@ inline ComPtr<_CFileUpload> NewClient() {
   return client;
 }
 
+// Logs the client on to the account at that server.
+bool LogOn(_CFileUpload& client, const std::wstring& serverName);
 // A client that is logged on to the account.
 ComPtr<_CFileUpload> LoggedOnClient();
 

@@ -19,13 +19,18 @@ int WindowsBelow(HWND parent) {
   return count;
 }
 
+ComPtr<IClassFactory> FactoryOf(const TestLibrary& library, REFCLSID classId) {
+  ComPtr<IClassFactory> factory;
+  EXPECT_EQ(
+      library.Get<GetClassObject>("DllGetClassObject")(classId, IID_IClassFactory, factory.ReceiveVoid()),
+      S_OK);
+  return factory;
+}
+
 class Lifetime : public testing::Test {
  protected:
   HRESULT Make(REFCLSID classId, REFIID interfaceId, void** object) const {
-    ComPtr<IClassFactory> factory;
-    const HRESULT found =
-        library_.Get<GetClassObject>("DllGetClassObject")(classId, IID_IClassFactory, factory.ReceiveVoid());
-    return FAILED(found) ? found : factory->CreateInstance(nullptr, interfaceId, object);
+    return FactoryOf(library_, classId)->CreateInstance(nullptr, interfaceId, object);
   }
   // The library as well as the windows that it made.
   Held Count() const {
@@ -79,15 +84,10 @@ TEST_F(Lifetime, ControlsWithWindowsAndSinksLeaveNothing) {
   for (const Class& known : kControls) {
     SCOPED_TRACE(known.name);
     // What is created by its class comes from the test library then.
-    ComPtr<IClassFactory> factory;
-    ASSERT_EQ(
-        library_.Get<GetClassObject>("DllGetClassObject")(known.id, IID_IClassFactory, factory.ReceiveVoid()),
-        S_OK);
     DWORD cookie = 0;
-    ASSERT_EQ(
-        CoRegisterClassObject(known.id, factory.Get(), CLSCTX_INPROC_SERVER, REGCLS_MULTIPLEUSE, &cookie),
-        S_OK);
-    factory = {};
+    ASSERT_EQ(CoRegisterClassObject(known.id, FactoryOf(library_, known.id).Get(), CLSCTX_INPROC_SERVER,
+                                    REGCLS_MULTIPLEUSE, &cookie),
+              S_OK);
     const auto show = [&](End end) {
       if (!IsWindow(form))
         form = CreateWindowExW(0, L"STATIC", L"form", WS_POPUP, 0, 0, 400, 300, nullptr, nullptr, nullptr,
@@ -162,17 +162,12 @@ TEST(Unloading, IsClean) {
     const auto canUnload = library.Get<CanUnloadNow>("DllCanUnloadNow");
     for (const Class& known : kControls) {
       SCOPED_TRACE(known.name);
-      ComPtr<IClassFactory> factory;
-      ComPtr<IOleObject> control;
-      ASSERT_EQ(library.Get<GetClassObject>("DllGetClassObject")(known.id, IID_IClassFactory,
-                                                                 factory.ReceiveVoid()),
+      ComPtr<IOleWindow> control;
+      ASSERT_EQ(FactoryOf(library, known.id)->CreateInstance(nullptr, IID_IOleWindow, control.ReceiveVoid()),
                 S_OK);
-      ASSERT_EQ(factory->CreateInstance(nullptr, IID_IOleObject, control.ReceiveVoid()), S_OK);
       // Makes its window.
-      ComPtr<IOleWindow> inPlace;
       HWND window = nullptr;
-      ASSERT_EQ(control->QueryInterface(IID_IOleWindow, inPlace.ReceiveVoid()), S_OK);
-      inPlace->GetWindow(&window);
+      control->GetWindow(&window);
       EXPECT_EQ(canUnload(), S_FALSE);
     }
     EXPECT_EQ(canUnload(), S_OK);

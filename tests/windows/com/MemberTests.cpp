@@ -46,13 +46,7 @@ class Argument {
     return IsReference() ? &slot_ : &value_;
   }
   // For a call by name. The argument stays the owner.
-  VARIANT NameValue() {
-    if (!IsReference()) return value_;
-    VARIANT given;
-    V_VT(&given) = static_cast<VARTYPE>(VT_BYREF | Type());
-    V_BYREF(&given) = Storage();
-    return given;
-  }
+  VARIANT NameValue() { return IsReference() ? ReferenceTo(Type(), Storage()) : value_; }
   // What is in the storage of a result.
   std::wstring Shown() const { return TextOf(value_); }
 
@@ -243,11 +237,10 @@ TEST_P(Members, TakeNullPointersWithoutHarm) {
       if (call.At(i).IsResult()) continue;
       const std::size_t last = call.Given() - 1;
       for (const VARTYPE type : {call.At(i).Type(), VARTYPE{VT_VARIANT}}) {
-        EXPECT_EQ(call.ByName([&](std::vector<VARIANT>& values) {
-          V_VT(&values[last - i]) = static_cast<VARTYPE>(VT_BYREF | type);
-          V_BYREF(&values[last - i]) = nullptr;
-        }),
-                  E_POINTER);
+        const auto null = [&](std::vector<VARIANT>& values) {
+          values[last - i] = ReferenceTo(type, nullptr);
+        };
+        EXPECT_EQ(call.ByName(null), E_POINTER);
         EXPECT_EQ(call.Refused(), last - i);
       }
     }

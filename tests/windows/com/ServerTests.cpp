@@ -179,13 +179,8 @@ TEST(Server, ThreadsWorkAtOnce) {
         const auto list = NewControl<_ctrlListImage>(CLSID_ctrlListImage);
         list->putref_mobjFileupload(LoggedOnClient().Get());
         const auto selects = [&](const wchar_t* name) {
-          Bstr text(name);
-          BSTR given = text;
-          VARIANT ignored = {};
-          list->UploadedFileSetFocus(&given, &ignored);
-          Bstr selected;
-          list->SelectedFileName(selected.Receive());
-          return selected.Text() == name;
+          Select(*list, name);
+          return Selected(*list) == name;
         };
         for (int i = 0; i < 20; ++i)
           if (Init(*list, apartment.filter) && selects(apartment.shown) && !selects(apartment.hidden))

@@ -12,12 +12,7 @@
 namespace tarnwick::test {
 namespace {
 
-// Where the control keeps its copies.
-std::wstring CopyOf(const std::wstring& file) {
-  wchar_t temporary[MAX_PATH] = {};
-  GetTempPathW(MAX_PATH, temporary);
-  return temporary + (L"bv\\" + FolderName()) + L"\\" + file;
-}
+// Of the pictures, in the user's folder.
 Lines Copies() {
   Lines files;
   WIN32_FIND_DATAW found = {};
@@ -144,42 +139,6 @@ TEST(ThumbNailControl, ShowsPagesOfPicturesFromTheServer) {
   EXPECT_EQ(form.events, Lines());
 }
 
-TEST(ThumbNailControl, TellsWhatTheUserDoes) {
-  ThumbForm form;
-  form.Show();
-  form.Open(L"jpg");
-  const std::wstring third = L"1015 " + Address(kJpegs[2]);
-  const struct {
-    const char* what;
-    std::function<void()> action;
-    Lines events;
-  } rows[] = {
-      {"right",
-       [&] { SendMessageW(form.Slot(3), WM_RBUTTONDOWN, MK_RBUTTON, MAKELPARAM(20, 150)); },
-       {L"1022 ", third, L"1016 " + Address(kJpegs[2])}},
-      {"background",
-       [&] { SendMessageW(form.Window(), WM_RBUTTONDOWN, MK_RBUTTON, MAKELPARAM(200, 400)); },
-       {L"1016 " + Address(kJpegs[2])}},
-      {"Enter", [&] { form.Press(VK_RETURN); }, {L"1022 ", third, L"1024 " + Address(kJpegs[2])}},
-      {"switch",
-       [&] {
-         const HWND button = FindWindowExW(form.Window(), nullptr, L"BUTTON", L"List view");
-         SendMessageW(button, BM_CLICK, 0, 0);
-       },
-       {L"5554 5554"}},
-  };
-  for (const auto& row : rows) {
-    SCOPED_TRACE(row.what);
-    form.events.clear();
-    row.action();
-    EXPECT_EQ(form.events, row.events);
-    EXPECT_TRUE(form.container->IsUiActive());
-  }
-  SHORT slot = 0;
-  form.control->get_iImgNo(&slot);
-  EXPECT_EQ(slot, 3);
-}
-
 // What is done as soon as a slot waits for a picture, one after the other.
 struct Step {
   int slot;
@@ -291,10 +250,20 @@ TEST(ThumbNailControl, LooksTheSameOnAFormThatIsNotRunning) {
   EXPECT_TRUE(drawn == shown);
 }
 
-TEST(ThumbNailControl, HasItsOwnMembers) {
+TEST(ThumbNailControl, HasItsOwnEventsAndMembers) {
   ThumbForm form;
   form.Show();
   form.Open(L"jpg");
+  form.events.clear();
+  SendMessageW(form.Slot(3), WM_RBUTTONDOWN, MK_RBUTTON, MAKELPARAM(20, 150));
+  form.Press(VK_RETURN);
+  SendMessageW(FindWindowExW(form.Window(), nullptr, L"BUTTON", L"List view"), BM_CLICK, 0, 0);
+  const std::wstring third = Address(kJpegs[2]);
+  EXPECT_EQ(form.events, (Lines{L"1022 ", L"1015 " + third, L"1016 " + third, L"1022 ", L"1015 " + third,
+                                L"1024 " + third, L"5554 5554"}));
+  SHORT slot = 0;
+  form.control->get_iImgNo(&slot);
+  EXPECT_EQ(slot, 3);
   EXPECT_EQ(form.Select(L"coffee.jpg"), L"coffee.jpg");
   VARIANT nothing = VariantOf(LONG{1});
   SetFocus(form.frame);
