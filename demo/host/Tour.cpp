@@ -145,6 +145,10 @@ void Tour::ShowListChanges() {
   Expect(host_.List().Select(L"coffee.jpg"), L"selecting in the list");
   const LPARAM first = MAKELPARAM(20, 30);
   const auto press = [&](UINT button) {
+    // Where the pointer is counts for the menu.
+    POINT at = {20, 30};
+    ClientToScreen(host_.List().ListWindow(), &at);
+    SetCursorPos(at.x, at.y);
     PostMessageW(host_.List().ListWindow(), button, 0, first);
     PostMessageW(host_.List().ListWindow(), button + (WM_LBUTTONUP - WM_LBUTTONDOWN), 0, first);
     host_.Rest(500);
