@@ -77,13 +77,14 @@ class FileSystem {
   // A file that will be at `path`. Throws 75 when there cannot be one in that folder.
   virtual std::unique_ptr<FileWriter> Create(TextView path) = 0;
 
-  // Writes a file of these bytes where there is none. Until it is whole nobody can open it, and when that
-  // fails, or the process is killed, it goes. Whether it is there; false as well for a name that is taken.
+  // Writes a file of these bytes where there is none, which takes fewer looks into its folder than Write.
+  // Until it is whole nobody can open it, and when that fails, or the process is killed, it goes; killed in
+  // the very moment in which it is made, it may stay without a byte. Whether it is there; false as well for a
+  // name that is taken.
   virtual bool WriteNew(TextView path, std::string_view bytes) = 0;
 
   // Writes a file of these bytes over an existing one, whole or not at all. Throws 75.
   void Write(TextView path, std::string_view bytes) {
-    if (WriteNew(path, bytes)) return;
     const std::unique_ptr<FileWriter> file = Create(path);
     file->Write(bytes);
     file->Commit();

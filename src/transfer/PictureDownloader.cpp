@@ -230,7 +230,7 @@ bool PictureDownloader::FinishFile(std::string_view rest) {
     if (large_) return Copy(files, explicitPath_, path_);
     // Not copied from the other one: the bytes are here. Most often the picture has been shown before, and
     // the user's folder has it. In a large folder it takes long to find that a name is not there, so nothing
-    // looks before the file is made.
+    // looks before the file is made; an empty one that a kill leaves there is found by its length.
     if (!files.WriteNew(path_, rest) && !Holds(files, path_, rest)) files.Write(path_, rest);
   });
 }
