@@ -48,6 +48,13 @@ void CALLBACK OnTimer(HWND, UINT, UINT_PTR timer, DWORD) {
   std::exchange(waiting.meanwhile, nullptr)(opened);
 }
 
+// A menu opens where the pointer is.
+void PointAt(HWND window) {
+  POINT at = {20, 30};
+  ClientToScreen(window, &at);
+  SetCursorPos(at.x, at.y);
+}
+
 }  // namespace
 
 bool Tour::Run() {
@@ -145,10 +152,7 @@ void Tour::ShowListChanges() {
   Expect(host_.List().Select(L"coffee.jpg"), L"selecting in the list");
   const LPARAM first = MAKELPARAM(20, 30);
   const auto press = [&](UINT button) {
-    // Where the pointer is counts for the menu.
-    POINT at = {20, 30};
-    ClientToScreen(host_.List().ListWindow(), &at);
-    SetCursorPos(at.x, at.y);
+    PointAt(host_.List().ListWindow());
     PostMessageW(host_.List().ListWindow(), button, 0, first);
     PostMessageW(host_.List().ListWindow(), button + (WM_LBUTTONUP - WM_LBUTTONDOWN), 0, first);
     host_.Rest(500);
@@ -164,7 +168,11 @@ void Tour::ShowListChanges() {
 
 void Tour::ShowMenuAndPicture() {
   While(
-      L"#32768", [&] { Expect(Press(Pictures()[2], WM_RBUTTONDOWN), L"selecting by the right button"); },
+      L"#32768",
+      [&] {
+        PointAt(Pictures()[2]);
+        Expect(Press(Pictures()[2], WM_RBUTTONDOWN), L"selecting by the right button");
+      },
       [&](HWND) {
         Step(L"13-menu");
         PressKey(host_.Frame(), VK_DOWN);
