@@ -51,10 +51,10 @@ bool HoldsPattern(const void* memory, std::size_t size) noexcept {
 }
 
 void OnFree(void* block, std::size_t size) noexcept {
-  if (!watch.on || !block) return;
-  if (!watch.elsewhere && HoldsPattern(block, size)) ++watch.found;
-  // Memory that is not written when it is used again must not count for its next owner. The tests are not
-  // optimised, so this stays.
+  if (!block) return;
+  if (watch.on && !watch.elsewhere && HoldsPattern(block, size)) ++watch.found;
+  // Memory that is not written when it is used again must not count for its next owner, not even what held
+  // the patterns themselves while they were made. The tests are not optimised, so this stays.
   std::memset(block, 0, size);
 }
 
