@@ -4,6 +4,8 @@
 
 #include <algorithm>
 #include <array>
+#include <bit>
+#include <cstring>
 #include <optional>
 #include <utility>
 
@@ -24,32 +26,55 @@ constexpr auto kHexDigits = [] {
   return digits;
 }();
 
+// Most bytes of a reply stand for themselves, and all of those with a meaning come before them.
+constexpr unsigned char kLastWithMeaning = '+';
+
+// The bytes of `word` from the first one on that has a meaning, from the low end; 8 when none has one.
+constexpr unsigned FirstWithMeaning(std::uint64_t word) {
+  constexpr std::uint64_t kEach = 0x0101'0101'0101'0101;
+  // A borrow spoils the bytes above one that is found, and never makes one where none is.
+  const std::uint64_t found = (word - kEach * (kLastWithMeaning + 1U)) & ~word & (kEach * 0x80);
+  return static_cast<unsigned>(std::countr_zero(found)) / 8;
+}
+
 // Unescapes at its place what stands from `from` to `end` or to the first '&', where `from` is then: it never
 // gets longer. nullopt when an escape is broken or the bytes are not UTF-8.
 std::optional<std::string_view> Unescape(char*& from, const char* end) {
   char* const begin = from;
   char* to = begin;
-  unsigned seen = 0;
-  for (; from != end; ++from) {
-    unsigned byte = static_cast<unsigned char>(*from);
-    // Most bytes stand for themselves, and all of those with a meaning come before them.
-    if (byte <= '+') {
-      if (byte == '&') break;
-      if (byte == '+') byte = ' ';
-      if (byte == '%') {
-        if (end - from < 3) return std::nullopt;
-        const int high = kHexDigits[static_cast<unsigned char>(from[1])];
-        const int low = kHexDigits[static_cast<unsigned char>(from[2])];
-        if (high < 0 || low < 0) return std::nullopt;
-        byte = static_cast<unsigned>(high * 16 + low);
-        from += 2;
+  std::uint64_t seen = 0;
+  while (from != end) {
+    // Eight at a time: the bytes of a long listing are most of the work.
+    if (end - from >= 8) {
+      std::uint64_t word = 0;
+      std::memcpy(&word, from, sizeof word);
+      const unsigned plain = FirstWithMeaning(word);
+      // What this writes too much was read before, or stays as it is.
+      if (plain == 8 || from == to || from - to >= 8) {
+        std::memcpy(to, &word, sizeof word);
+        seen |= plain == 8 ? word : word & ~(~std::uint64_t{0} << (8 * plain));
+        from += plain;
+        to += plain;
+        if (plain == 8) continue;
       }
     }
+    unsigned byte = static_cast<unsigned char>(*from);
+    if (byte == '&') break;
+    if (byte == '+') byte = ' ';
+    if (byte == '%') {
+      if (end - from < 3) return std::nullopt;
+      const int high = kHexDigits[static_cast<unsigned char>(from[1])];
+      const int low = kHexDigits[static_cast<unsigned char>(from[2])];
+      if (high < 0 || low < 0) return std::nullopt;
+      byte = static_cast<unsigned>(high * 16 + low);
+      from += 2;
+    }
+    ++from;
     seen |= byte;
     *to++ = static_cast<char>(byte);
   }
   const std::string_view bytes(begin, static_cast<std::size_t>(to - begin));
-  if (seen >= 0x80 && !utf8::is_valid(bytes)) return std::nullopt;
+  if ((seen & 0x8080'8080'8080'8080) != 0 && !utf8::is_valid(bytes)) return std::nullopt;
   return bytes;
 }
 

@@ -34,6 +34,29 @@ TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
   EXPECT_EQ(Reply::FromBody(names.substr(3)).ErrorOccured(), 0);
 }
 
+// Wherever what has a meaning stands among bytes that have none.
+TEST(Reply, UnescapesAtEveryPlace) {
+  const std::string plain = "klmnopqrst,-./:";
+  for (const auto& [written, meant] : {std::pair{"%C3%A9", "\xC3\xA9"}, {"+", " "}, {"%26", "&"}}) {
+    for (std::size_t first = 0; first <= plain.size(); ++first) {
+      for (std::size_t second = 0; second <= plain.size(); ++second) {
+        const std::string one = plain.substr(0, first);
+        const std::string other = plain.substr(0, second);
+        std::string value = one;
+        std::string result = one;
+        for (int i = 0; i < 5; ++i) {
+          value += written + other;
+          result += meant + other;
+        }
+        const Reply reply = Reply::FromBody("A=" + value + "&B=" + one + "&" + one);
+        ASSERT_EQ(reply.GetValueByVariableName(u"A")->front(), result) << first << ' ' << second;
+        ASSERT_EQ(reply.GetValueByVariableName(u"B")->front(), one);
+        ASSERT_EQ(Reply::FromBody("A=" + one + "\x80" + value).ErrorOccured(), 1) << first << ' ' << second;
+      }
+    }
+  }
+}
+
 TEST(HttpAddress, SplitsAndRefuses) {
   const auto address = SplitHttpAddress(u"host:8080/a/b");
   ASSERT_TRUE(address);
