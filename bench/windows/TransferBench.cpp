@@ -216,7 +216,7 @@ void TransferBench(const Account& account, std::size_t largeBytes, int smallCoun
   Row(what, many[0], many[4], "", "the copy, which the loop alone does not make");
   Row(what, many[0], many[5], "", "Wine and its server make hundreds of system calls for a file");
   Row(what + " beside 3,000", many[1], many[3], ">=1.0",
-      "two look-ups of names that are not there, of which Wine makes a listing of the folder each, to the "
+      "three look-ups of names that are not there, of which Wine makes a listing of the folder each, to the "
       "peer's one");
 
   Row("peak memory of a download of 64 MiB, times the file",

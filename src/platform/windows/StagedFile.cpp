@@ -44,9 +44,8 @@ bool Lives(DWORD process, const FILETIME& fileMade) {
          CompareFileTime(&started, &fileMade) <= 0;
 }
 
-FileOwner Opened(const std::wstring& path, DWORD access, DWORD disposition, DWORD share = 0,
-                 DWORD flags = 0) {
-  return FileOwner(CreateFileW(path.c_str(), access, share, nullptr, disposition, flags, nullptr));
+FileOwner Opened(const std::wstring& path, DWORD access, DWORD disposition, DWORD share = 0) {
+  return FileOwner(CreateFileW(path.c_str(), access, share, nullptr, disposition, 0, nullptr));
 }
 
 // Whether the file goes when `file`, its only handle, is closed, be it by the end of the process.
@@ -97,10 +96,7 @@ StagedFile::StagedFile(const std::wstring& target) : StagedFile(target, FolderOf
 
 StagedFile::StagedFile(const std::wstring& target, const std::wstring& path) : target_(target), path_(path) {
   RemoveLeftoversOnce(FolderOf(path));
-  // A name of its own is no other one in capitals: where letter case counts, as below Wine, nothing needs to
-  // list the folder for one.
-  file_ =
-      Opened(path_, GENERIC_WRITE | DELETE, CREATE_NEW, 0, path == target ? 0 : FILE_FLAG_POSIX_SEMANTICS);
+  file_ = Opened(path_, GENERIC_WRITE | DELETE, CREATE_NEW);
   if (file_)
     goesWhenClosed_ = SetGoesWhenClosed(file_.Get(), true);
   else
