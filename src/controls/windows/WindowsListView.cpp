@@ -18,6 +18,9 @@ constexpr wchar_t kListName[] = L"Files of the account";
 // What a column must have beside its text at 96 dots per inch.
 constexpr int kCellMargin = 12;
 
+// Room at both ends of what the label says, and of a drawn cell's text, at 96 dots per inch.
+constexpr int kLabelMargin = 4;
+
 // What the system sends for the menu key and Shift+F10.
 constexpr DWORD kNoPlace = 0xFFFFFFFF;
 
@@ -27,6 +30,24 @@ void CopyTo(const NMLVDISPINFOW& info, const Text& text) {
   const std::size_t length = std::min(room, text.size());
   std::copy_n(text.begin(), length, info.item.pszText);
   info.item.pszText[length] = L'\0';
+}
+
+constexpr UINT kSaidFormat = DT_CENTER | DT_WORDBREAK | DT_EXPANDTABS | DT_NOPREFIX;
+
+// Where `said` stands in the middle of `room`, in the font of `dc`: as many whole lines as there is room for.
+RECT PlaceOf(HDC dc, const std::wstring& said, const RECT& room, int dpi) {
+  RECT place = room;
+  InflateRect(&place, -MulDiv(kLabelMargin, dpi, 96), 0);
+  RECT needed = {0, 0, std::max(1L, place.right - place.left), 0};
+  TEXTMETRICW metrics = {};
+  DrawTextW(dc, said.c_str(), -1, &needed, kSaidFormat | DT_CALCRECT);
+  GetTextMetricsW(dc, &metrics);
+  const LONG line = std::max(1L, metrics.tmHeight);
+  const LONG space = std::max(0L, room.bottom - room.top);
+  const LONG height = std::min(needed.bottom, space / line * line);
+  place.top += (space - height) / 2;
+  place.bottom = place.top + height;
+  return place;
 }
 
 }  // namespace
@@ -70,6 +91,7 @@ void WindowsListView::ApplyLook() {
   ListView_SetTextColor(list_, TextColor());
   ListView_SetTextBkColor(list_, BackColor());
   ListView_SetBkColor(list_, BackColor());
+  PlaceLabel();
 }
 
 void WindowsListView::SetIcons() {
@@ -93,43 +115,56 @@ void WindowsListView::Layout() const {
   RECT client = {};
   GetClientRect(Outer(), &client);
   MoveWindow(list_, 0, 0, client.right, client.bottom, TRUE);
-  // The label stands in the middle; it is as high as two of its lines.
-  const int height = std::min<int>(client.bottom, MulDiv(32, Dpi(), 96));
-  MoveWindow(label_, 0, (client.bottom - height) / 2, client.right, height, TRUE);
+  PlaceLabel();
+}
+
+void WindowsListView::PlaceLabel() const {
+  RECT room = {};
+  GetClientRect(listShown_ ? list_ : Outer(), &room);
+  RECT head = {};
+  if (listShown_ && GetClientRect(ListView_GetHeader(list_), &head)) room.top = head.bottom;
+  const WindowDcOwner dc = DcOf(label_);
+  const SelectionOwner font = SelectInto(dc.Get().dc, Font());
+  const RECT place = PlaceOf(dc.Get().dc, WideFromText(Said()), room, Dpi());
+  MoveWindow(label_, place.left, place.top, std::max(0L, place.right - place.left), place.bottom - place.top,
+             TRUE);
 }
 
 void WindowsListView::Draw(HDC dc, const RECT& bounds) {
   // There is no window yet when a form draws a control that it has not shown.
   if (!smallIcons_) smallIcons_ = MakeSmallIcons(Dpi());
+  const SavedDcOwner saved = SaveStateOf(dc);
+  // Of the last row and column there may be a part.
+  IntersectClipRect(dc, bounds.left, bounds.top, bounds.right, bounds.bottom);
   const SelectionOwner font = SelectInto(dc, Font());
   Fill(dc, bounds, BackColor());
-  SetTextColor(dc, TextColor());
   SetBkMode(dc, TRANSPARENT);
   TEXTMETRICW metrics = {};
   GetTextMetricsW(dc, &metrics);
-  const int line = metrics.tmHeight + 4;
+  int iconWidth = 0;
+  int iconHeight = 0;
+  ImageList_GetIconSize(smallIcons_.Get(), &iconWidth, &iconHeight);
+  const int margin = MulDiv(kLabelMargin, Dpi(), 96);
+  const int line = std::max<int>(metrics.tmHeight + margin, iconHeight + 1);
   constexpr UINT kCell = DT_LEFT | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
-  if (!Said().empty()) {
-    RECT middle = {bounds.left, (bounds.top + bounds.bottom - line) / 2, bounds.right, bounds.bottom};
-    DrawTextW(dc, WideFromText(Said()).c_str(), -1, &middle, DT_CENTER | DT_TOP | DT_NOPREFIX);
+  if (listShown_) {
+    RECT head = bounds;
+    head.bottom = head.top + line;
+    FillRect(dc, &head, GetSysColorBrush(COLOR_BTNFACE));
   }
-  if (!listShown_) return;
   int top = bounds.top;
-  for (std::size_t row = 0; row <= count_ && top < bounds.bottom; ++row, top += line) {
+  for (std::size_t row = 0; listShown_ && row <= count_ && top < bounds.bottom; ++row, top += line) {
+    SetTextColor(dc, row == 0 ? GetSysColor(COLOR_BTNTEXT) : TextColor());
     int left = bounds.left;
     for (std::size_t column = 0; column < titles_.size() && left < bounds.right; ++column) {
       const int width = ColumnWidth(static_cast<int>(column));
       RECT cell = {left, top, left + width, top + line};
-      if (row == 0) {
-        FillRect(dc, &cell, GetSysColorBrush(COLOR_BTNFACE));
-        DrawEdge(dc, &cell, EDGE_ETCHED, BF_RIGHT | BF_BOTTOM);
-      }
-      cell.left += 4;
-      cell.right -= 2;
-      if (row > 0 && column == 0 && smallIcons_) {
-        ImageList_Draw(smallIcons_.Get(), user_->PictureOf(row - 1).small - 1, dc, cell.left, cell.top,
-                       ILD_TRANSPARENT);
-        cell.left += MulDiv(18, Dpi(), 96);
+      if (row == 0) DrawEdge(dc, &cell, EDGE_ETCHED, BF_RIGHT | BF_BOTTOM);
+      InflateRect(&cell, -margin, 0);
+      if (row > 0 && column == 0) {
+        ImageList_Draw(smallIcons_.Get(), user_->PictureOf(row - 1).small - 1, dc, cell.left,
+                       cell.top + (line - iconHeight) / 2, ILD_TRANSPARENT);
+        cell.left += iconWidth + margin / 2;
       }
       const Text text =
           row == 0 ? titles_[column] : ShownName(user_->ItemText(row - 1, static_cast<int>(column)));
@@ -137,6 +172,12 @@ void WindowsListView::Draw(HDC dc, const RECT& bounds) {
       left += width;
     }
   }
+  RECT room = bounds;
+  if (listShown_) room.top += line;
+  const std::wstring said = WideFromText(Said());
+  RECT middle = PlaceOf(dc, said, room, Dpi());
+  SetTextColor(dc, TextColor());
+  DrawTextW(dc, said.c_str(), -1, &middle, kSaidFormat);
 }
 
 void WindowsListView::SetColumns(std::span<const ListColumn> columns) {
@@ -162,6 +203,8 @@ void WindowsListView::AddColumns() {
     SendMessageW(list_, LVM_INSERTCOLUMNW, static_cast<WPARAM>(added.iSubItem),
                  reinterpret_cast<LPARAM>(&added));
   }
+  // A scroll bar may have come.
+  PlaceLabel();
 }
 
 void WindowsListView::SetItemCount(std::size_t count) {
@@ -211,6 +254,7 @@ void WindowsListView::ShowParts() const {
   SetWindowTextW(label_, said.c_str());
   // Without a list the outer window has the focus, and screen readers tell its name.
   SetWindowTextW(Outer(), listShown_ ? L"" : said.c_str());
+  PlaceLabel();
   ShowWindow(label_, said.empty() ? SW_HIDE : SW_SHOWNA);
   // At the end: when the list had the focus, the host hears of it.
   ShowWindow(list_, listShown_ ? SW_SHOWNA : SW_HIDE);

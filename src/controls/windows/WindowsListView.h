@@ -65,6 +65,7 @@ class WindowsListView : public ListView, public ControlWindow {
   void ForgetPointer();
   void PaintList(HWND list) const;
   void Layout() const;
+  void PlaceLabel() const;
   // Shows the list and the label as they are to be.
   void ShowParts() const;
   // What the label says now; empty while it is hidden.

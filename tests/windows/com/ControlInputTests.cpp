@@ -389,11 +389,26 @@ TEST(ListControl, ShowsInATipWhatDoesNotFitUntilItsColumnIsMadeWider) {
 
 TEST(ListControl, SaysWhyItHasNoItems) {
   Form form;
+  // Too narrow for two lines, and too low for their middle to be the list's.
+  form.container->SetBounds({0, 0, 60, 100});
   form.Open(L"GIF");
   form.Show();
   const auto label = [&] {
     const HWND window = FindWindowExW(form.Window(), nullptr, L"STATIC", nullptr);
-    return IsWindowVisible(window) ? TextOf(window) : L"";
+    if (!IsWindowVisible(window)) return std::wstring();
+    std::wstring text = TextOf(window);
+    RECT room = {};
+    RECT head = {};
+    GetWindowRect(window, &room);
+    GetWindowRect(ListView_GetHeader(form.ListWindow()), &head);
+    EXPECT_TRUE(room.top >= head.bottom || !IsWindowVisible(form.ListWindow()));
+    RECT needed = {0, 0, room.right - room.left, 0};
+    Drawn(1, 1, [&](HDC dc) {
+      SelectObject(dc, reinterpret_cast<HFONT>(SendMessageW(window, WM_GETFONT, 0, 0)));
+      DrawTextW(dc, text.c_str(), -1, &needed, DT_CALCRECT | DT_WORDBREAK);
+    });
+    EXPECT_GE(room.bottom - room.top, needed.bottom);
+    return text;
   };
   EXPECT_EQ(label(), L"No images of this kind.");
   EXPECT_EQ(GetFocus(), form.ListWindow());
