@@ -29,6 +29,11 @@ void TextTip::Set(HWND window, const RECT& place, std::wstring text) {
                                     nullptr, nullptr));
   if (!tip_) return;
   if (text.size() > kLongest) text.resize(kLongest);
+  // Of one line the screen may show a part only.
+  MONITORINFO screen = {};
+  screen.cbSize = sizeof screen;
+  GetMonitorInfoW(MonitorFromWindow(window, MONITOR_DEFAULTTONEAREST), &screen);
+  SendMessageW(tip_.Get(), TTM_SETMAXTIPWIDTH, 0, (screen.rcWork.right - screen.rcWork.left) / 2);
   TTTOOLINFOW tool = ToolOf(window);
   tool.rect = place;
   tool.lpszText = text.data();

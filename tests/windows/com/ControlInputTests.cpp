@@ -365,6 +365,8 @@ TEST(ListControl, ShowsInATipWhatDoesNotFitUntilItsColumnIsMadeWider) {
   EXPECT_EQ(rest(0, 1), Address(kJpegs[0]));
   // It goes with what it tells of.
   const HWND tip = TipSeen(form);
+  const auto widest = static_cast<int>(SendMessageW(tip, TTM_GETMAXTIPWIDTH, 0, 0));
+  EXPECT_TRUE(widest > 0 && widest < GetSystemMetrics(SM_CXSCREEN)) << widest;
   form.list->ChangeFileFilter(Bstr(L"jpg"));
   EXPECT_FALSE(IsWindowVisible(tip));
   EXPECT_EQ(rest(0, 0), kJpegs[0]);
