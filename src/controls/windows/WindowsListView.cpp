@@ -1,6 +1,7 @@
 #include "controls/windows/WindowsListView.h"
 
 #include <algorithm>
+#include <cstdlib>
 #include <string>
 #include <utility>
 
@@ -20,6 +21,8 @@ constexpr int kCellMargin = 12;
 
 // Room at both ends of what the label says, and of a drawn cell's text, at 96 dots per inch.
 constexpr int kLabelMargin = 4;
+// Of two colours that are nearer than this in red, green and blue, one is not seen on the other.
+constexpr int kLeastContrast = 12;
 
 // What the system sends for the menu key and Shift+F10.
 constexpr DWORD kNoPlace = 0xFFFFFFFF;
@@ -30,6 +33,12 @@ void CopyTo(const NMLVDISPINFOW& info, const Text& text) {
   const std::size_t length = std::min(room, text.size());
   std::copy_n(text.begin(), length, info.item.pszText);
   info.item.pszText[length] = L'\0';
+}
+
+bool LookAlike(COLORREF one, COLORREF other) {
+  return std::abs(GetRValue(one) - GetRValue(other)) < kLeastContrast &&
+         std::abs(GetGValue(one) - GetGValue(other)) < kLeastContrast &&
+         std::abs(GetBValue(one) - GetBValue(other)) < kLeastContrast;
 }
 
 constexpr UINT kSaidFormat = DT_CENTER | DT_WORDBREAK | DT_EXPANDTABS | DT_NOPREFIX;
@@ -394,6 +403,8 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
                  ? TRUE
                  : FALSE;
     }
+    case NM_CUSTOMDRAW:
+      return OnDraw(*reinterpret_cast<NMLVCUSTOMDRAW*>(const_cast<NMHDR*>(&header)));
     case LVN_BEGINDRAG:
       control_.DragBegins();
       return 0;
@@ -406,6 +417,22 @@ LRESULT WindowsListView::OnNotify(const NMHDR& header) {
     default:
       return 0;
   }
+}
+
+// The list draws what is selected, while it has not the focus, on the colour of buttons. Where that is the
+// list's own colour, as on a form without one and in a high contrast, nobody would see it.
+LRESULT WindowsListView::OnDraw(NMLVCUSTOMDRAW& drawn) const {
+  if (drawn.nmcd.dwDrawStage == CDDS_PREPAINT)
+    return GetFocus() != list_ && LookAlike(BackColor(), GetSysColor(COLOR_BTNFACE)) ? CDRF_NOTIFYITEMDRAW
+                                                                                     : CDRF_DODEFAULT;
+  // Of all items the state says here that they are selected.
+  if (drawn.nmcd.dwDrawStage == CDDS_ITEMPREPAINT && IsSelected(drawn.nmcd.dwItemSpec)) {
+    // Colours of selected items are not looked at.
+    drawn.nmcd.uItemState &= ~static_cast<UINT>(CDIS_SELECTED);
+    drawn.clrText = GetSysColor(COLOR_HIGHLIGHTTEXT);
+    drawn.clrTextBk = GetSysColor(COLOR_HIGHLIGHT);
+  }
+  return CDRF_DODEFAULT;
 }
 
 std::optional<LRESULT> WindowsListView::OnListMessage(HWND list, UINT message, WPARAM wParam, LPARAM lParam) {

@@ -54,6 +54,7 @@ class WindowsListView : public ListView, public ControlWindow {
   std::optional<LRESULT> OnMessage(HWND window, UINT message, WPARAM wParam, LPARAM lParam) override;
   std::optional<LRESULT> OnListMessage(HWND list, UINT message, WPARAM wParam, LPARAM lParam);
   LRESULT OnNotify(const NMHDR& header);
+  LRESULT OnDraw(NMLVCUSTOMDRAW& drawn) const;
   LRESULT OnKeyDown(HWND list, WPARAM key, LPARAM lParam);
   // The key that stands for the right button was pressed in the list, or in the outer window in its place.
   LRESULT OnMenuKey(HWND window);

@@ -389,6 +389,38 @@ TEST(ListControl, ShowsInATipWhatDoesNotFitUntilItsColumnIsMadeWider) {
   EXPECT_EQ(width(), dragged);
 }
 
+TEST(ListControl, ShowsWhatIsSelectedOnAnyColourWithoutTheFocus) {
+  Form form;
+  form.Open(L"jpg");
+  form.Show();
+  form.Select(kJpegs[1].c_str());
+  const HWND list = form.ListWindow();
+  const COLORREF face = GetSysColor(COLOR_BTNFACE);
+  const COLORREF seen = GetSysColor(COLOR_HIGHLIGHT);
+  const struct {
+    OLE_COLOR color;
+    COLORREF shown;
+  } rows[] = {{0x80000000 | COLOR_BTNFACE, seen}, {face - 0x050505, seen}, {RGB(32, 34, 40), face}};
+  for (const auto& row : rows) {
+    form.container->ambient.backColor = row.color;
+    form.container->AmbientChanged(DISPID_AMBIENT_BACKCOLOR);
+    SetFocus(form.frame);
+    const auto colorOf = [&](int item) {
+      RECT name = {};
+      ListView_GetItemRect(list, item, &name, LVIR_LABEL);
+      COLORREF color = 0;
+      Drawn(320, 240, [&](HDC dc) {
+        SendMessageW(list, WM_ERASEBKGND, reinterpret_cast<WPARAM>(dc), 0);
+        SendMessageW(list, WM_PRINTCLIENT, reinterpret_cast<WPARAM>(dc), PRF_CLIENT);
+        color = GetPixel(dc, name.right - 2, name.top + 1);
+      });
+      return color;
+    };
+    EXPECT_EQ(colorOf(1), row.shown) << row.color;
+    EXPECT_EQ(colorOf(2), ListView_GetBkColor(list)) << row.color;
+  }
+}
+
 TEST(ListControl, SaysWhyItHasNoItems) {
   Form form;
   // Too narrow for two lines, and too low for their middle to be the list's.
