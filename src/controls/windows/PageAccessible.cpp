@@ -154,6 +154,10 @@ STDMETHODIMP PageAccessible::get_accValue(VARIANT child, BSTR* value) {
   return AskedText(child, value, [&](int slot) { return slot == 0 ? page_->SpokenPlace() : std::wstring(); });
 }
 
+STDMETHODIMP PageAccessible::get_accDescription(VARIANT child, BSTR* text) {
+  return AskedText(child, text, [&](int slot) { return page_->SpokenDetails(slot); });
+}
+
 STDMETHODIMP PageAccessible::get_accRole(VARIANT child, VARIANT* role) {
   if (!role) return E_POINTER;
   VariantInit(role);

@@ -47,7 +47,7 @@ class PageAccessible final : public IAccessible {
   STDMETHODIMP get_accChild(VARIANT child, IDispatch** object) override;
   STDMETHODIMP get_accName(VARIANT child, BSTR* name) override;
   STDMETHODIMP get_accValue(VARIANT child, BSTR* value) override;
-  STDMETHODIMP get_accDescription(VARIANT child, BSTR* text) override { return NoText(child, text); }
+  STDMETHODIMP get_accDescription(VARIANT child, BSTR* text) override;
   STDMETHODIMP get_accRole(VARIANT child, VARIANT* role) override;
   STDMETHODIMP get_accState(VARIANT child, VARIANT* state) override;
   STDMETHODIMP get_accHelp(VARIANT child, BSTR* text) override { return NoText(child, text); }

@@ -325,6 +325,8 @@ void WindowsThumbnailPage::TakePicture(const std::shared_ptr<const PictureReques
     Redraw(*slot);
   } else if (!slot->picture) {
     slot->fault = picture.decoded.fault;
+    if (slot->window)
+      NotifyWinEvent(EVENT_OBJECT_DESCRIPTIONCHANGE, slot->window, OBJID_CLIENT, CHILDID_SELF);
     user_->OnPictureUnreadable(static_cast<int>(slot - slots_.begin()) + 1);
   }
 }
@@ -389,6 +391,12 @@ int WindowsThumbnailPage::SelectedSlot() const {
 
 std::wstring WindowsThumbnailPage::SpokenName(int slot) const {
   return slot == 0 ? kPageName : WideFromText(ShownName(user_->NameOf(slot)));
+}
+
+std::wstring WindowsThumbnailPage::SpokenDetails(int slot) const {
+  const std::wstring tip = slot == 0 ? std::wstring() : TipOf(slots_[static_cast<std::size_t>(slot) - 1]);
+  const std::size_t nameEnd = tip.find(L"\r\n");
+  return nameEnd == std::wstring::npos ? std::wstring() : tip.substr(nameEnd + 2);
 }
 
 std::wstring WindowsThumbnailPage::SpokenPlace() const {

@@ -51,6 +51,8 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   // The slot that looks selected, or 0.
   int SelectedSlot() const;
   std::wstring SpokenName(int slot) const;
+  // What the tip of the slot tells beside the name.
+  std::wstring SpokenDetails(int slot) const;
   // Of the page among all pictures, or what the grid says in place of them.
   std::wstring SpokenPlace() const;
 

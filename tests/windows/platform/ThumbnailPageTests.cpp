@@ -674,7 +674,8 @@ std::string TakenText(HRESULT result, BSTR text) {
   return told;
 }
 
-// Role, state, name, value and action, as such a program would read them out.
+// Role, state, name, value, action and, where there is one, description, as such a program would read them
+// out.
 std::string ReadOut(IAccessible& object, LONG number = CHILDID_SELF) {
   VARIANT role = {};
   VARIANT state = {};
@@ -695,7 +696,10 @@ std::string ReadOut(IAccessible& object, LONG number = CHILDID_SELF) {
     const HRESULT result = (object.*get)(Item(number), &text);
     told += "|" + TakenText(result, text);
   }
-  return told;
+  BSTR text = nullptr;
+  const HRESULT result = object.get_accDescription(Item(number), &text);
+  const std::string description = TakenText(result, text);
+  return description.empty() ? told : told + "|" + description;
 }
 
 // What is told to who listens, as event and window.
@@ -715,6 +719,17 @@ TEST_F(ThumbnailPageTest, ScreenReadersFindAListOfPictures) {
   EXPECT_EQ(count, 3);
   EXPECT_EQ(ReadOut(*grid), "list|Pictures of the account|from 1|");
   EXPECT_EQ(ReadOut(*grid, 1), "item selectable|" + name(1) + "||Open");
+  // What its tip tells, when the picture has turned out to be none.
+  const PictureFile broken(L"thumbnail-broken.picture", 0);
+  broken.Write(0, 2);
+  page_->SetTip(1, u"name\r\n12 Bytes");
+  page_->SetPicture(1, broken.Path(), kWholeSquare);
+  EXPECT_EQ(ReadOut(*grid, 1), "item selectable|" + name(1) + "||Open|12 Bytes");
+  Await([&] { return !user_.told.empty(); });
+  EXPECT_EQ(user_.Take(), Told{"unreadable 1"});
+  EXPECT_EQ(ReadOut(*grid, 1),
+            "item selectable|" + name(1) +
+                "||Open|12 Bytes\r\nNot shown: the file is damaged, or this system cannot read it.");
   EXPECT_EQ(ReadOut(*grid, 2), "item selectable selected focused|" + name(2) + "||Open");
   EXPECT_EQ(ReadOut(*grid, 4), "gone");
   // By itself, as the selection, and as what is under the pointer.
@@ -798,7 +813,8 @@ TEST_F(ThumbnailPageTest, ScreenReadersHearOfEachSelection) {
     Pump();
     std::erase_if(heard, [](const auto& event) {
       return event.first != EVENT_OBJECT_REORDER && event.first != EVENT_OBJECT_FOCUS &&
-             event.first != EVENT_OBJECT_SELECTION && event.first != EVENT_OBJECT_VALUECHANGE;
+             event.first != EVENT_OBJECT_SELECTION && event.first != EVENT_OBJECT_VALUECHANGE &&
+             event.first != EVENT_OBJECT_DESCRIPTIONCHANGE;
     });
     return heard;
   };
@@ -823,6 +839,14 @@ TEST_F(ThumbnailPageTest, ScreenReadersHearOfEachSelection) {
   EXPECT_EQ(hears([&] { select(2); }), (Heard{{EVENT_OBJECT_SELECTION, Slot(2)}}));
   EXPECT_EQ(hears([&] { SetFocus(Grid()); }),
             (Heard{{EVENT_OBJECT_FOCUS, Grid()}, {EVENT_OBJECT_FOCUS, Slot(2)}}));
+  // A picture that turns out to be none.
+  const PictureFile broken(L"thumbnail-broken.picture", 0);
+  broken.Write(0, 2);
+  EXPECT_EQ(hears([&] {
+              page_->SetPicture(3, broken.Path(), kWholeSquare);
+              Await([&] { return !user_.told.empty(); });
+            }),
+            (Heard{{EVENT_OBJECT_DESCRIPTIONCHANGE, Slot(3)}}));
   UnhookWinEvent(hook);
 }
 
