@@ -427,7 +427,9 @@ void WindowsThumbnailPage::PlaceEditor() const {
     const SelectionOwner font = SelectInto(dc.Get().dc, Font());
     GetTextMetricsW(dc.Get().dc, &metrics);
   }
-  const int height = std::min<int>(metrics.tmHeight + 2 * Pixels(45), caption.bottom - caption.top);
+  // The system's editor has its text a border and two pixels below its edge, on any screen.
+  const int edges = 2 * (GetSystemMetrics(SM_CYBORDER) + 2);
+  const int height = std::min<int>(metrics.tmHeight + edges, caption.bottom - caption.top);
   MoveWindow(editorWindow_, frame.left + caption.left, frame.top + caption.top, caption.right - caption.left,
              height, TRUE);
 }
@@ -444,7 +446,8 @@ void WindowsThumbnailPage::ShowEditor(int slot, TextView name) {
 
 void WindowsThumbnailPage::HideEditor() {
   if (edited_ == 0) return;
-  edited_ = 0;
+  // The focus draws all anew, but not when it has gone elsewhere.
+  InvalidateRect(At(std::exchange(edited_, 0)).window, nullptr, FALSE);
   if (GetFocus() == editorWindow_) SetFocus(gridWindow_);
   ShowWindow(editorWindow_, SW_HIDE);
 }
@@ -727,8 +730,10 @@ void WindowsThumbnailPage::PaintGrid(HWND window) {
   const MemoryDcOwner memory(CreateCompatibleDC(screen));
   const BitmapOwner bitmap(CreateCompatibleBitmap(screen, client.right, client.bottom));
   const SelectionOwner picture = SelectInto(memory.Get(), bitmap.Get());
-  DrawTile(memory.Get(), client, slots_[static_cast<std::size_t>(slot) - 1], Style(),
-           GetFocus() == gridWindow_);
+  ThumbnailTile tile = At(slot);
+  // The editor stands there, and may be lower than a caption of two lines.
+  if (slot == edited_) tile.caption.clear();
+  DrawTile(memory.Get(), client, tile, Style(), GetFocus() == gridWindow_);
   BitBlt(screen, 0, 0, client.right, client.bottom, memory.Get(), 0, 0, SRCCOPY);
 }
 

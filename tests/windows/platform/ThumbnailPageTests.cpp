@@ -566,6 +566,15 @@ TEST_F(ThumbnailPageTest, TheEditorTellsItsEndOnce) {
   EXPECT_EQ(end, 12U);
   EXPECT_EQ(page_->EditorText(), u"Bl\u00FCm\u014Dhen.gif");
   SendMessageW(Editor(), WM_CHAR, L'\u20AC', 0);
+  // The other line of a long caption is not seen below.
+  const auto below = [&] {
+    UpdateWindow(Slot(2));
+    const WindowDcOwner dc = DcOf(Slot(2));
+    return GetPixel(dc.Get().dc, layout::Pixels(150, SystemDpi()), layout::Pixels(2610, SystemDpi()));
+  };
+  page_->SetCaption(2, u"WWWWWWWWWWWWWWWWWWWW.gif");
+  page_->SetSelected(2, true);
+  EXPECT_EQ(below(), GetSysColor(COLOR_WINDOW));
 
   // The host shows a message inside: the focus that the editor loses then is no second end.
   user_.on = [&](const std::string&) {
@@ -576,6 +585,7 @@ TEST_F(ThumbnailPageTest, TheEditorTellsItsEndOnce) {
   SendMessageW(Editor(), WM_KEYDOWN, VK_RETURN, 0);
   EXPECT_EQ(user_.Take(), Told{"entered"});
   EXPECT_FALSE(IsWindowVisible(Editor()));
+  EXPECT_EQ(below(), GetSysColor(COLOR_HIGHLIGHT));
 
   user_.on = [&](const std::string&) { page_->HideEditor(); };
   page_->ShowEditor(1, u"a");
