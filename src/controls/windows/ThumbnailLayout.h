@@ -38,7 +38,7 @@ inline constexpr TwipRect kGrid = {0, 0, kSecondColumn + kFrameWidth + kMargin,
 inline constexpr TwipRect kScrollBar = {kPage.right - 270, 0, kPage.right, kGrid.bottom};
 inline constexpr TwipRect kButton = {kMargin, kGrid.bottom + 15, kMargin + 1350, kGrid.bottom + 15 + 345};
 inline constexpr TwipRect kMessage = {kMargin, 2100, kGrid.right - kMargin, 2580};
-// The link stands in the middle of it, as wide as its text.
+// Both labels stand in the middle, as wide as their texts, and have more lines in a large font.
 inline constexpr TwipRect kLink = {kMargin, 2610, kGrid.right - kMargin, 2910};
 
 // In the grid, whose corner is the page's.

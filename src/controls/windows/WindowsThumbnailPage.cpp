@@ -43,7 +43,11 @@ const wchar_t* ReasonOf(PictureFault fault) {
 
 constexpr COLORREF kLinkColor = RGB(0, 0, 255);
 
-constexpr UINT kLinkFormat = DT_CENTER | DT_VCENTER | DT_SINGLELINE | DT_NOPREFIX | DT_END_ELLIPSIS;
+constexpr UINT kTextFormat = DT_CENTER | DT_WORDBREAK | DT_NOPREFIX;
+
+// Between a text of the empty account and the edge of its label, in twips.
+constexpr int kLabelIndent = 60;
+constexpr int kLabelInset = 45;
 
 }  // namespace
 
@@ -70,7 +74,7 @@ bool WindowsThumbnailPage::MakeChildren() {
   for (std::size_t slot = 0; slot < kSlotCount; ++slot)
     slots_[slot].window = MakeChild(gridWindow_, L"STATIC", L"", WS_CLIPSIBLINGS | SS_OWNERDRAW | SS_NOTIFY);
   scrollWindow_ = MakeChild(outer, L"SCROLLBAR", kScrollName, WS_TABSTOP | SBS_VERT);
-  messageWindow_ = MakeChild(outer, L"STATIC", L"", SS_CENTER | SS_NOPREFIX);
+  messageWindow_ = MakeChild(outer, L"STATIC", L"", SS_OWNERDRAW);
   linkWindow_ = MakeChild(outer, L"BUTTON", L"", WS_TABSTOP | BS_OWNERDRAW);
   switchWindow_ = MakeChild(outer, L"BUTTON", kSwitchText, WS_TABSTOP | WS_VISIBLE | BS_PUSHBUTTON);
   for (const HWND window :
@@ -86,7 +90,7 @@ bool WindowsThumbnailPage::MakeChildren() {
   return true;
 }
 
-// All but the link, whose place depends on its text.
+// All but the labels of an empty account, whose places depend on their texts.
 void WindowsThumbnailPage::PlaceChildren() const {
   const auto place = [this](HWND window, const layout::TwipRect& area) {
     const RECT at = Pixels(area);
@@ -95,7 +99,6 @@ void WindowsThumbnailPage::PlaceChildren() const {
   place(gridWindow_, layout::kGrid);
   for (std::size_t slot = 0; slot < kSlotCount; ++slot) place(slots_[slot].window, kFrames[slot]);
   place(scrollWindow_, layout::kScrollBar);
-  place(messageWindow_, layout::kMessage);
   place(switchWindow_, layout::kButton);
 }
 
@@ -123,7 +126,7 @@ void WindowsThumbnailPage::WindowGone() {
 }
 
 void WindowsThumbnailPage::ApplyLook() {
-  for (const HWND window : {editorWindow_, messageWindow_, switchWindow_})
+  for (const HWND window : {editorWindow_, switchWindow_})
     SendMessageW(window, WM_SETFONT, reinterpret_cast<WPARAM>(Font()), TRUE);
   ApplyTexts();
   RefreshGrid();
@@ -218,21 +221,33 @@ void WindowsThumbnailPage::SetGridText(TextView text) {
 void WindowsThumbnailPage::ApplyTexts() const {
   if (!linkWindow_) return;
   SetWindowTextW(messageWindow_, WideFromText(message_).c_str());
-  const std::wstring link = WideFromText(link_);
-  SetWindowTextW(linkWindow_, link.c_str());
+  SetWindowTextW(linkWindow_, WideFromText(link_).c_str());
   // Only over its text is the link a link.
-  const RECT room = Pixels(layout::kLink);
-  SIZE text = {};
-  {
-    const WindowDcOwner dc = DcOf(linkWindow_);
-    const FontOwner underlined = LinkFont();
-    const SelectionOwner font = SelectInto(dc.Get().dc, underlined.Get());
-    GetTextExtentPoint32W(dc.Get().dc, link.c_str(), static_cast<int>(link.size()), &text);
+  const auto [message, link] = LabelPlaces(DcOf(linkWindow_).Get().dc);
+  for (const auto& [window, place] : {std::pair(messageWindow_, message), std::pair(linkWindow_, link)}) {
+    MoveWindow(window, place.left, place.top, place.right - place.left, place.bottom - place.top, TRUE);
+    InvalidateRect(window, nullptr, TRUE);
   }
-  const int width = std::min<int>(text.cx + 2 * Pixels(60), room.right - room.left);
-  MoveWindow(linkWindow_, (room.left + room.right - width) / 2, room.top, width, room.bottom - room.top,
-             TRUE);
-  InvalidateRect(linkWindow_, nullptr, TRUE);
+}
+
+// As wide as the text, with as many lines as it takes, in the middle of `room`.
+RECT WindowsThumbnailPage::LabelPlace(HDC dc, HFONT font, TextView text, RECT room) const {
+  const SelectionOwner selected = SelectInto(dc, font);
+  InflateRect(&room, -Pixels(kLabelIndent), -Pixels(kLabelInset));
+  RECT lines = room;
+  DrawTextW(dc, WideFromText(text).c_str(), -1, &lines, kTextFormat | DT_CALCRECT);
+  lines.right = std::min(lines.right, room.right);
+  OffsetRect(&lines, (room.right - lines.right) / 2, 0);
+  InflateRect(&lines, Pixels(kLabelIndent), Pixels(kLabelInset));
+  return lines;
+}
+
+// In a large font the message takes more lines, and the link goes down.
+std::pair<RECT, RECT> WindowsThumbnailPage::LabelPlaces(HDC dc) const {
+  const RECT message = LabelPlace(dc, Font(), message_, Pixels(layout::kMessage));
+  RECT room = Pixels(layout::kLink);
+  room.top = std::max(room.top, message.bottom + Pixels(layout::kLink.top - layout::kMessage.bottom));
+  return {message, LabelPlace(dc, LinkFont().Get(), link_, room)};
 }
 
 void WindowsThumbnailPage::ShowSlot(int slot, bool shown) {
@@ -520,7 +535,7 @@ std::optional<LRESULT> WindowsThumbnailPage::OnOuterMessage(UINT message, WPARAM
       return 0;
     case WM_DRAWITEM: {
       const auto& item = *reinterpret_cast<const DRAWITEMSTRUCT*>(lParam);
-      if (item.hwndItem == linkWindow_) DrawLink(item.hDC, item.rcItem, GetFocus() == linkWindow_);
+      DrawLabel(item.hDC, item.rcItem, item.hwndItem == linkWindow_, GetFocus() == item.hwndItem);
       return TRUE;
     }
     default:
@@ -723,7 +738,7 @@ void WindowsThumbnailPage::PaintGrid(HWND window) {
   if (slot == 0) {
     Fill(screen, painting.Get().paint.rcPaint, BackColor());
     const SelectionOwner font = SelectInto(screen, Font());
-    return DrawMessage(screen, Pixels(layout::kMessage), gridText_);
+    return DrawGridText(screen, Pixels(layout::kMessage));
   }
   RECT client = {};
   GetClientRect(window, &client);
@@ -737,20 +752,22 @@ void WindowsThumbnailPage::PaintGrid(HWND window) {
   BitBlt(screen, 0, 0, client.right, client.bottom, memory.Get(), 0, 0, SRCCOPY);
 }
 
-void WindowsThumbnailPage::DrawMessage(HDC dc, RECT area, TextView text) const {
+void WindowsThumbnailPage::DrawGridText(HDC dc, RECT area) const {
   SetTextColor(dc, TextColor());
   SetBkMode(dc, TRANSPARENT);
-  DrawTextW(dc, WideFromText(text).c_str(), -1, &area, DT_CENTER | DT_WORDBREAK | DT_NOPREFIX);
+  DrawTextW(dc, WideFromText(gridText_).c_str(), -1, &area, kTextFormat | DT_NOCLIP);
 }
 
-void WindowsThumbnailPage::DrawLink(HDC dc, RECT area, bool focus) const {
-  Fill(dc, area, BackColor());
-  const FontOwner underlined = LinkFont();
-  const SelectionOwner font = SelectInto(dc, underlined.Get());
-  SetTextColor(dc, kLinkColor);
-  SetBkMode(dc, TRANSPARENT);
-  DrawTextW(dc, WideFromText(link_).c_str(), -1, &area, kLinkFormat);
+// On the system's colour of windows, whatever the container's is: there a link can be read.
+void WindowsThumbnailPage::DrawLabel(HDC dc, RECT area, bool isLink, bool focus) const {
+  Fill(dc, area, GetSysColor(COLOR_WINDOW));
   if (focus) DrawFocus(dc, area);
+  const FontOwner underlined = LinkFont();
+  const SelectionOwner font = SelectInto(dc, isLink ? underlined.Get() : Font());
+  SetTextColor(dc, isLink ? kLinkColor : GetSysColor(COLOR_WINDOWTEXT));
+  SetBkMode(dc, TRANSPARENT);
+  InflateRect(&area, -Pixels(kLabelIndent), -Pixels(kLabelInset));
+  DrawTextW(dc, WideFromText(isLink ? link_ : message_).c_str(), -1, &area, kTextFormat);
 }
 
 void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) {
@@ -767,11 +784,12 @@ void WindowsThumbnailPage::Draw(HDC dc, const RECT& bounds) {
   if (content_ == Content::kGrid) {
     for (std::size_t slot = 0; slot < kSlotCount; ++slot)
       if (slots_[slot].shown) DrawTile(dc, placed(kFrames[slot]), slots_[slot], Style(), false);
-    DrawMessage(dc, placed(layout::kMessage), gridText_);
+    DrawGridText(dc, placed(layout::kMessage));
     scrollBar_.Draw(dc, placed(layout::kScrollBar), Pixels(120));
   } else if (content_ == Content::kEmptyAccount) {
-    DrawMessage(dc, placed(layout::kMessage), message_);
-    DrawLink(dc, placed(layout::kLink), false);
+    const auto [message, link] = LabelPlaces(dc);
+    DrawLabel(dc, Moved(message, bounds.left, bounds.top), false, false);
+    DrawLabel(dc, Moved(link, bounds.left, bounds.top), true, false);
   }
   RECT button = placed(layout::kButton);
   DrawFrameControl(dc, &button, DFC_BUTTON, DFCS_BUTTONPUSH);

@@ -9,6 +9,7 @@
 #include <memory>
 #include <optional>
 #include <string>
+#include <utility>
 
 #include "controls/thumbnailview/ThumbnailPage.h"
 #include "controls/thumbnailview/ThumbnailPageUser.h"
@@ -128,12 +129,15 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   void ApplyCaption(int slot);
   void ApplyTexts() const;
   FontOwner LinkFont() const;
+  RECT LabelPlace(HDC dc, HFONT font, TextView text, RECT room) const;
+  // Of the message and of the link.
+  std::pair<RECT, RECT> LabelPlaces(HDC dc) const;
   void RefreshGrid() const;
   void PaintGrid(HWND window);
   void FollowBackground();
   TileStyle Style() const { return {Dpi(), Font(), BackColor()}; }
-  void DrawMessage(HDC dc, RECT area, TextView text) const;
-  void DrawLink(HDC dc, RECT area, bool focus) const;
+  void DrawGridText(HDC dc, RECT area) const;
+  void DrawLabel(HDC dc, RECT area, bool isLink, bool focus) const;
   int Pixels(int twips) const { return layout::Pixels(twips, Dpi()); }
   RECT Pixels(const layout::TwipRect& area) const { return layout::Pixels(area, Dpi()); }
 

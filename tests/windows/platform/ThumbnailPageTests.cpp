@@ -275,6 +275,20 @@ TEST_F(ThumbnailPageTest, WindowsStandAsLaidOutAndHaveNames) {
   EXPECT_FALSE(IsWindowVisible(ScrollBar()));
   EXPECT_EQ(NameOf(Link()), L"Click here");
   EXPECT_EQ(GetFocus(), Link());
+  // In a large font both texts take more lines.
+  const auto heights = [&] {
+    const RECT link = PlaceOf(Link());
+    const RECT message = PlaceOf(GetWindow(Link(), GW_HWNDPREV));
+    return SIZE{message.bottom - message.top, link.bottom - link.top};
+  };
+  const SIZE before = heights();
+  const FontOwner large(
+      CreateFontW(layout::Pixels(-600, SystemDpi()), 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, 0, L"Arial"));
+  page_->SetLook(large.Get(), std::nullopt, std::nullopt);
+  expectFit(page_->Window());
+  EXPECT_GT(heights().cx, 3 * before.cx);
+  EXPECT_GT(heights().cy, 2 * before.cy);
+  page_->SetLook(nullptr, std::nullopt, std::nullopt);
   page_->ShowSlot(2, false);
   page_->ShowGrid(true);
   for (int slot = 1; slot <= kSlotCount; ++slot) EXPECT_TRUE(IsWindowVisible(Slot(slot)));
@@ -353,6 +367,20 @@ TEST_F(ThumbnailPageTest, DrawsPicturesSelectionAndCaptions) {
     EXPECT_GT(inked, 2);
     EXPECT_LT(inked, 30);
   }
+
+  // The blue link stands on the system's colour also where the container is dark.
+  const COLORREF dark = RGB(9, 9, 9);
+  page_->SetLook(nullptr, RGB(250, 250, 250), dark);
+  page_->ShowGrid(false);
+  page_->Draw(dc, size);
+  UpdateWindow(page_->Window());
+  UpdateWindow(Link());
+  const RECT link = PlaceOf(Link());
+  const WindowDcOwner page = DcOf(page_->Window());
+  const WindowDcOwner label = DcOf(Link());
+  EXPECT_EQ(GetPixel(dc, link.left + 2, link.top + 2), window);
+  EXPECT_EQ(GetPixel(label.Get().dc, 2, 2), window);
+  for (const HDC shown : {dc, page.Get().dc}) EXPECT_EQ(GetPixel(shown, link.left - 2, link.top + 2), dark);
   SelectObject(dc, old);
   DeleteDC(dc);
 }
@@ -570,7 +598,7 @@ TEST_F(ThumbnailPageTest, TheEditorTellsItsEndOnce) {
   const auto below = [&] {
     UpdateWindow(Slot(2));
     const WindowDcOwner dc = DcOf(Slot(2));
-    return GetPixel(dc.Get().dc, layout::Pixels(150, SystemDpi()), layout::Pixels(2610, SystemDpi()));
+    return GetPixel(dc.Get().dc, layout::Pixels(150, SystemDpi()), layout::Pixels(2550, SystemDpi()));
   };
   page_->SetCaption(2, u"WWWWWWWWWWWWWWWWWWWW.gif");
   page_->SetSelected(2, true);
