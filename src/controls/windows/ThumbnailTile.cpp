@@ -24,6 +24,10 @@ void DrawCaption(HDC dc, RECT area, const ThumbnailTile& tile, const TileStyle& 
   const SelectionOwner font = SelectInto(dc, style.font);
   InflateRect(&area, -gap, -gap);
   RECT lines = area;
+  const int line = std::max(1, DrawTextW(dc, L"X", 1, &lines, DT_SINGLELINE | DT_CALCRECT));
+  // Only whole lines are drawn; in a large font it is one, even where it needs a little more room.
+  area.bottom = area.top + std::max<int>(1, (area.bottom - area.top) / line) * line;
+  lines = area;
   DrawTextW(dc, text.c_str(), -1, &lines, kCaptionFormat | DT_CALCRECT);
   area.bottom = std::min(area.bottom, lines.bottom);
   RECT paper = area;
