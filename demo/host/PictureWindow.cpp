@@ -1,11 +1,9 @@
 #include "PictureWindow.h"
 
-#include <objidl.h>
-
-// After the header that it counts on.
-#include <gdiplus.h>
-
 #include <algorithm>
+#include <utility>
+
+#include "controls/windows/PictureLoader.h"
 
 namespace tarnwick::demo {
 namespace {
@@ -14,23 +12,28 @@ constexpr const wchar_t* kClass = L"TarnwickDemoPicture";
 constexpr DWORD kStyle = WS_OVERLAPPEDWINDOW;
 
 // The largest rectangle of the picture's shape in the middle of the room.
-RECT Fitted(LONG width, LONG height, const RECT& room) {
+RECT Fitted(SIZE size, const RECT& room) {
   const LONG roomWidth = room.right - room.left;
   const LONG roomHeight = room.bottom - room.top;
-  const double scale = std::min(static_cast<double>(roomWidth) / static_cast<double>(width),
-                                static_cast<double>(roomHeight) / static_cast<double>(height));
-  const LONG shownWidth = std::max(1L, static_cast<LONG>(scale * static_cast<double>(width)));
-  const LONG shownHeight = std::max(1L, static_cast<LONG>(scale * static_cast<double>(height)));
-  const LONG left = room.left + (roomWidth - shownWidth) / 2;
-  const LONG top = room.top + (roomHeight - shownHeight) / 2;
-  return {left, top, left + shownWidth, top + shownHeight};
+  const double scale = std::min(static_cast<double>(roomWidth) / static_cast<double>(size.cx),
+                                static_cast<double>(roomHeight) / static_cast<double>(size.cy));
+  const LONG width = std::max(1L, static_cast<LONG>(scale * static_cast<double>(size.cx)));
+  const LONG height = std::max(1L, static_cast<LONG>(scale * static_cast<double>(size.cy)));
+  const LONG left = room.left + (roomWidth - width) / 2;
+  const LONG top = room.top + (roomHeight - height) / 2;
+  return {left, top, left + width, top + height};
+}
+
+// The size of the picture, made smaller where it does not fit.
+SIZE Reduced(SIZE size, SIZE most) {
+  if (size.cx <= most.cx && size.cy <= most.cy) return size;
+  const RECT place = Fitted(size, {0, 0, most.cx, most.cy});
+  return {place.right - place.left, place.bottom - place.top};
 }
 
 }  // namespace
 
 PictureWindow::PictureWindow() {
-  const Gdiplus::GdiplusStartupInput input;
-  Gdiplus::GdiplusStartup(&session_, &input, nullptr);
   WNDCLASSEXW kind = {};
   kind.cbSize = sizeof kind;
   kind.style = CS_HREDRAW | CS_VREDRAW;
@@ -42,34 +45,26 @@ PictureWindow::PictureWindow() {
   RegisterClassExW(&kind);
 }
 
-PictureWindow::~PictureWindow() {
-  Close();
-  picture_.reset();
-  Gdiplus::GdiplusShutdown(session_);
-}
-
 bool PictureWindow::Show(HWND owner, const std::wstring& path) {
   Close();
-  {
-    // Holds the file open as long as it lives, so what is shown is a copy.
-    Gdiplus::Bitmap file(path.c_str());
-    if (file.GetLastStatus() != Gdiplus::Ok) return false;
-    const auto width = static_cast<INT>(file.GetWidth());
-    const auto height = static_cast<INT>(file.GetHeight());
-    picture_ = std::make_unique<Gdiplus::Bitmap>(width, height, PixelFormat32bppPARGB);
-    Gdiplus::Graphics copy(picture_.get());
-    if (copy.DrawImage(&file, 0, 0, width, height) != Gdiplus::Ok) return false;
-  }
+  const SIZE screen = {GetSystemMetrics(SM_CXSCREEN), GetSystemMetrics(SM_CYSCREEN)};
+  // A picture of a camera that was held upright lies on its side in the file.
+  const auto size = [&](const PictureFacts& facts) {
+    const SIZE stored = {static_cast<LONG>(facts.width), static_cast<LONG>(facts.height)};
+    size_ = Reduced(IsTurned(facts) ? SIZE{stored.cy, stored.cx} : stored, screen);
+    return size_;
+  };
+  DecodedPicture decoded =
+      DecodePicture(ReadPictureFile(path), size, GetSysColor(COLOR_BTNFACE), [] { return true; });
+  if (!decoded) return false;
+  picture_ = std::move(decoded.bitmap);
   RECT area = {};
   GetWindowRect(owner, &area);
-  InflateRect(&area, -(area.right - area.left) / 8, -(area.bottom - area.top) / 8);
-  const auto width = static_cast<LONG>(picture_->GetWidth());
-  const auto height = static_cast<LONG>(picture_->GetHeight());
-  if (width > area.right - area.left || height > area.bottom - area.top)
-    area = Fitted(width, height, area);
-  else
-    area = {(area.left + area.right - width) / 2, (area.top + area.bottom - height) / 2,
-            (area.left + area.right + width) / 2, (area.top + area.bottom + height) / 2};
+  const SIZE shown = Reduced(size_, {(area.right - area.left) * 3 / 4, (area.bottom - area.top) * 3 / 4});
+  area.left += (area.right - area.left - shown.cx) / 2;
+  area.top += (area.bottom - area.top - shown.cy) / 2;
+  area.right = area.left + shown.cx;
+  area.bottom = area.top + shown.cy;
   AdjustWindowRect(&area, kStyle, FALSE);
   const std::wstring name = path.substr(path.find_last_of(L'\\') + 1);
   window_ = CreateWindowExW(0, kClass, name.c_str(), kStyle | WS_VISIBLE, area.left, area.top,
@@ -109,15 +104,15 @@ void PictureWindow::Paint() {
   RECT room = {};
   const HDC dc = BeginPaint(window_, &paint);
   GetClientRect(window_, &room);
-  {
-    const RECT place =
-        Fitted(static_cast<LONG>(picture_->GetWidth()), static_cast<LONG>(picture_->GetHeight()), room);
-    Gdiplus::Graphics graphics(dc);
-    graphics.SetInterpolationMode(Gdiplus::InterpolationModeHighQualityBicubic);
-    graphics.DrawImage(picture_.get(), static_cast<INT>(place.left), static_cast<INT>(place.top),
-                       static_cast<INT>(place.right - place.left),
-                       static_cast<INT>(place.bottom - place.top));
-  }
+  const RECT place = Fitted(size_, room);
+  const HDC source = CreateCompatibleDC(dc);
+  const HGDIOBJ old = SelectObject(source, picture_.Get());
+  SetStretchBltMode(dc, HALFTONE);
+  SetBrushOrgEx(dc, 0, 0, nullptr);
+  StretchBlt(dc, place.left, place.top, place.right - place.left, place.bottom - place.top, source, 0, 0,
+             size_.cx, size_.cy, SRCCOPY);
+  SelectObject(source, old);
+  DeleteDC(source);
   EndPaint(window_, &paint);
 }
 

@@ -3,19 +3,16 @@
 
 #include "platform/windows/WindowsHeaders.h"
 
-#include <memory>
 #include <string>
 
-namespace Gdiplus {
-class Bitmap;
-}
+#include "platform/windows/Owner.h"
 
 namespace tarnwick::demo {
 
 class PictureWindow {
  public:
   PictureWindow();
-  ~PictureWindow();
+  ~PictureWindow() { Close(); }
   PictureWindow(const PictureWindow&) = delete;
   PictureWindow& operator=(const PictureWindow&) = delete;
 
@@ -30,9 +27,10 @@ class PictureWindow {
   static LRESULT CALLBACK WindowProc(HWND window, UINT message, WPARAM wParam, LPARAM lParam);
   void Paint();
 
-  ULONG_PTR session_ = 0;
   HWND window_ = nullptr;
-  std::unique_ptr<Gdiplus::Bitmap> picture_;
+  // As it is seen, at most as large as the screen.
+  BitmapOwner picture_;
+  SIZE size_ = {};
 };
 
 }  // namespace tarnwick::demo
