@@ -27,6 +27,7 @@ constexpr Button kMenu[] = {
 // Messages of the form to itself, for what shall not run inside an event.
 constexpr UINT kShowMenu = WM_APP;
 constexpr UINT kRefreshOther = WM_APP + 1;
+constexpr UINT kUploadDropped = WM_APP + 2;
 
 // Pixels at 96 dots per inch.
 constexpr int kWidth = 800;
@@ -155,6 +156,9 @@ LRESULT CALLBACK DemoHost::FrameProc(HWND window, UINT message, WPARAM wParam, L
       return 0;
     case kRefreshOther:
       host->Show(host->Other(*reinterpret_cast<const FilePane*>(lParam)));
+      return 0;
+    case kUploadDropped:
+      host->UploadDropped();
       return 0;
     case WM_DESTROY:
       host->list_.Close();
@@ -324,6 +328,8 @@ void DemoHost::EndWork(const std::wstring& outcome, const std::wstring& failure)
   working_ = false;
   UpdateStop();
   SetStatus(failure.empty() ? outcome : failure, !failure.empty());
+  // What was dropped meanwhile is next.
+  if (!dropped_.empty()) PostMessageW(frame_, kUploadDropped, 0, 0);
 }
 
 void DemoHost::UpdateStop() {
@@ -334,14 +340,26 @@ void DemoHost::UpdateStop() {
   EnableWindow(stop, on);
 }
 
-bool DemoHost::Upload(const std::wstring& path) {
-  // The events of an upload count percent.
-  BeginWork(100);
+bool DemoHost::Upload(const std::vector<std::wstring>& paths) {
   FilePane& pane = *used_;
-  const bool done = pane.Upload(path);
-  EndWork(L"Uploaded " + path, done ? L"" : L"Not uploaded: " + pane.Problem());
-  if (done) Show(Other(pane));
-  return done;
+  std::size_t done = 0;
+  for (const std::wstring& path : paths) {
+    // The events of an upload count percent.
+    BeginWork(100);
+    const bool well = pane.Upload(path);
+    const std::wstring name = path.substr(path.find_last_of(L'\\') + 1);
+    EndWork(L"Uploaded " + path, well ? L"" : L"Not uploaded: " + name + L": " + pane.Problem());
+    // Whatever one file failed for, the user has to know before the next one.
+    if (!well) break;
+    ++done;
+  }
+  if (done > 1 && done == paths.size()) SetStatus(L"Uploaded " + std::to_wstring(done) + L" files");
+  if (done > 0) Show(Other(pane));
+  return done == paths.size();
+}
+
+void DemoHost::UploadDropped() {
+  if (!working_) Upload(std::exchange(dropped_, {}));
 }
 
 std::wstring DemoHost::Download() {
@@ -376,12 +394,17 @@ void DemoHost::Delete() {
 }
 
 void DemoHost::Stop() {
+  dropped_.clear();
   VARIANT on = {};
   V_VT(&on) = VT_BOOL;
   V_BOOL(&on) = VARIANT_TRUE;
   VARIANT ignored = {};
   // The client of both controls: whatever they have under way ends.
-  list_.Client()->AbortFileTransfer(&on, &ignored);
+  const ComPtr<_CFileUpload> client = list_.Client();
+  client->AbortFileTransfer(&on, &ignored);
+  // What stays stored would end the next drop of files as well.
+  V_BOOL(&on) = VARIANT_FALSE;
+  client->AbortFileTransfer(&on, &ignored);
 }
 
 void DemoHost::ChooseUpload() {
@@ -393,7 +416,7 @@ void DemoHost::ChooseUpload() {
   dialog.lpstrFile = path;
   dialog.nMaxFile = MAX_PATH;
   dialog.Flags = OFN_NOCHANGEDIR;
-  if (GetOpenFileNameW(&dialog)) Upload(path);
+  if (GetOpenFileNameW(&dialog)) Upload({path});
 }
 
 void DemoHost::ShowMenu(POINT at) {
@@ -499,6 +522,12 @@ void DemoHost::OnFileManagerEvent(FilePane& pane, int code, const std::wstring& 
       return;
     case kCodeClickBegins:
       listClicked_ = &pane == &list_;
+      return;
+    case kCodeDropped:
+      // One event for each file, and one without a path at the end.
+      if (!text.empty()) return dropped_.push_back(text);
+      Use(pane);
+      PostMessageW(frame_, kUploadDropped, 0, 0);
       return;
     case kCodeOpen:
       // Enter. In the list a click ends with this event, too, and that opens nothing.

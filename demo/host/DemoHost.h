@@ -40,7 +40,8 @@ class DemoHost {
   // Lists the account in both controls.
   bool Fill();
   void Do(int command);
-  bool Upload(const std::wstring& path);
+  // Stops at the first one that fails.
+  bool Upload(const std::vector<std::wstring>& paths);
   // The path of the file; empty when it failed.
   std::wstring Download();
 
@@ -68,6 +69,8 @@ class DemoHost {
   void Use(FilePane& pane);
   void ChangeFilter(const wchar_t* filter);
   void ChooseUpload();
+  // Waits for the command that is under way.
+  void UploadDropped();
   void OpenPicture();
   void Delete();
   void Stop();
@@ -100,6 +103,8 @@ class DemoHost {
   bool working_ = false;
   bool fetching_ = false;
   int workSize_ = 0;
+  // Paths of files that were dropped on a control and are not uploaded yet.
+  std::vector<std::wstring> dropped_;
   // A click in the list has begun.
   bool listClicked_ = false;
 };

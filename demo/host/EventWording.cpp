@@ -23,7 +23,7 @@ const wchar_t* Words(int code) {
       return L"dropped, but no files from outside";
     case kCodeClickBegins:
       return L"selection about to change";
-    case 1023:
+    case kCodeDropped:
       return L"file dropped";
     case kCodeOpen:
       return L"open";

@@ -8,6 +8,7 @@ namespace tarnwick::demo {
 // Codes of FileManagerEvent that the host acts on.
 inline constexpr int kCodeMenu = 1016;
 inline constexpr int kCodeClickBegins = 1022;
+inline constexpr int kCodeDropped = 1023;
 inline constexpr int kCodeOpen = 1024;
 inline constexpr int kCodeRenamed = 1031;
 inline constexpr int kCodeQuickStart = 1111;

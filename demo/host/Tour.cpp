@@ -1,7 +1,11 @@
 #include "Tour.h"
 
+#include <shlobj.h>
+
 #include <algorithm>
 #include <utility>
+
+#include "platform/windows/CommonControls.h"
 
 namespace tarnwick::demo {
 namespace {
@@ -49,8 +53,7 @@ void CALLBACK OnTimer(HWND, UINT, UINT_PTR timer, DWORD) {
 }
 
 // A menu opens where the pointer is.
-void PointAt(HWND window) {
-  POINT at = {20, 30};
+void PointAt(HWND window, POINT at) {
   ClientToScreen(window, &at);
   SetCursorPos(at.x, at.y);
 }
@@ -108,10 +111,10 @@ void Tour::ShowUploads() {
     host_.onProgress = nullptr;
     Do(kStop);
   };
-  Expect(!host_.Upload(UploadPath()) && host_.Progress() == 0 && host_.List().Count() == all_,
+  Expect(!host_.Upload({UploadPath()}) && host_.Progress() == 0 && host_.List().Count() == all_,
          L"an upload that is stopped");
   Step(L"04-upload-stopped");
-  Expect(!host_.Upload(UploadPath() + L".gone") && host_.Status().find(L"not found") != std::wstring::npos,
+  Expect(!host_.Upload({UploadPath() + L".gone"}) && host_.Status().find(L"not found") != std::wstring::npos,
          L"the reason in words");
   Step(L"05-error");
 
@@ -150,18 +153,22 @@ void Tour::ShowListChanges() {
 
   // Enter on a file opens it; a click does not.
   Expect(host_.List().Select(L"coffee.jpg"), L"selecting in the list");
-  const LPARAM first = MAKELPARAM(20, 30);
+  const HWND list = host_.List().ListWindow();
+  RECT row = {};
+  row.left = LVIR_LABEL;
+  SendMessageW(list, LVM_GETITEMRECT, 0, reinterpret_cast<LPARAM>(&row));
+  const POINT first = {row.left + 4, (row.top + row.bottom) / 2};
   const auto press = [&](UINT button) {
-    PointAt(host_.List().ListWindow());
-    PostMessageW(host_.List().ListWindow(), button, 0, first);
-    PostMessageW(host_.List().ListWindow(), button + (WM_LBUTTONUP - WM_LBUTTONDOWN), 0, first);
+    PointAt(list, first);
+    PostMessageW(list, button, 0, MAKELPARAM(first.x, first.y));
+    PostMessageW(list, button + (WM_LBUTTONUP - WM_LBUTTONDOWN), 0, MAKELPARAM(first.x, first.y));
     host_.Rest(500);
   };
   press(WM_LBUTTONDOWN);
   Expect(!host_.OpenedPicture(), L"a click opens nothing");
   While(
       L"#32768", [&] { press(WM_RBUTTONDOWN); }, [&](HWND) { PressKey(host_.Frame(), VK_ESCAPE); });
-  PressKey(host_.List().ListWindow(), VK_RETURN);
+  PressKey(list, VK_RETURN);
   host_.Rest(500);
   Expect(ClosePicture(), L"Enter opens a picture");
 }
@@ -170,7 +177,7 @@ void Tour::ShowMenuAndPicture() {
   While(
       L"#32768",
       [&] {
-        PointAt(Pictures()[2]);
+        PointAt(Pictures()[2], {20, 30});
         Expect(Press(Pictures()[2], WM_RBUTTONDOWN), L"selecting by the right button");
       },
       [&](HWND) {
@@ -199,7 +206,7 @@ void Tour::ShowThumbnailChanges() {
          L"the first page again");
 
   // One picture more or less makes the last page odd.
-  Upload();
+  Drop(host_.Thumbnails().Window());
   Expect(ShowsLastOf(all_ + 1) && Picture(kUploaded) && host_.Used().Selected() == kUploaded,
          L"the page of the uploaded picture");
   Expect(host_.List().Count() == all_ + 1, L"the uploaded picture in the list");
@@ -244,7 +251,7 @@ void Tour::CloseUnderWay() {
     host_.onProgress = nullptr;
     SendMessageW(host_.Frame(), WM_CLOSE, 0, 0);
   };
-  Expect(!host_.Upload(UploadPath()) && !host_.Frame(), L"an upload that ends with the form");
+  Expect(!host_.Upload({UploadPath()}) && !host_.Frame(), L"an upload that ends with the form");
 }
 
 // --- What the steps consist of ---
@@ -294,7 +301,33 @@ std::wstring Tour::UploadPath() const {
 }
 
 void Tour::Upload() {
-  Expect(host_.Upload(UploadPath()), L"upload");
+  Expect(host_.Upload({UploadPath()}), L"upload");
+}
+
+void Tour::Drop(HWND window) {
+  // As another program offers files: the system's object for what is on the clipboard.
+  const std::wstring path = UploadPath();
+  const HGLOBAL block = GlobalAlloc(GHND, sizeof(DROPFILES) + (path.size() + 2) * sizeof(wchar_t));
+  auto* files = static_cast<DROPFILES*>(GlobalLock(block));
+  files->pFiles = sizeof(DROPFILES);
+  files->fWide = TRUE;
+  std::copy(path.begin(), path.end(), reinterpret_cast<wchar_t*>(files + 1));
+  GlobalUnlock(block);
+  OpenClipboard(host_.Frame());
+  EmptyClipboard();
+  SetClipboardData(CF_HDROP, block);
+  CloseClipboard();
+  ComPtr<IDataObject> data;
+  OleGetClipboard(data.Receive());
+  // Where the system keeps what RegisterDragDrop was given.
+  auto* const target = static_cast<IDropTarget*>(GetPropW(window, L"OleDropTargetInterface"));
+  Expect(data && target, L"a place to drop files on");
+  if (!data || !target) return;
+  DWORD effect = DROPEFFECT_COPY;
+  target->DragEnter(data.Get(), MK_LBUTTON, {0, 0}, &effect);
+  target->Drop(data.Get(), MK_LBUTTON, {0, 0}, &effect);
+  Expect(effect == DROPEFFECT_COPY, L"a drop that copies");
+  host_.Rest(200);
 }
 
 void Tour::TypeName(const wchar_t* name, const wchar_t* step) {

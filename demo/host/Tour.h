@@ -36,6 +36,8 @@ class Tour {
   std::wstring UploadPath() const;
   // Uploads a picture that the account does not have yet.
   void Upload();
+  // Drops the same one on that window.
+  void Drop(HWND window);
   // Renames the selected file in place; `step` is the picture with the editor open.
   void TypeName(const wchar_t* name, const wchar_t* step);
   void Download();
