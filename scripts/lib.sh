@@ -123,8 +123,9 @@ start_server() {
   return 1
 }
 
+# start_display [WIDTHxHEIGHT]
 start_display() {
-  start_server "display" '^[0-9]+$' Xvfb -displayfd 1 -screen 0 1280x960x24 -nolisten tcp || return 1
+  start_server "display" '^[0-9]+$' Xvfb -displayfd 1 -screen 0 "${1-1280x960}x24" -nolisten tcp || return 1
   export DISPLAY=:$server_line
 }
 
