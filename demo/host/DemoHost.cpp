@@ -39,15 +39,27 @@ constexpr int kProgressWidth = 200;
 constexpr int kEventsHeight = 88;
 // The size that the thumbnails ask for. They do not grow.
 constexpr SIZE kThumbnails = {336, 408};
-// Above and below the controls.
 constexpr int kSiteTop = kButtonHeight + 2 * kGap;
-constexpr int kBelowSite = kStatusHeight + kEventsHeight + 3 * kGap;
-constexpr int kHeight = kSiteTop + kThumbnails.cy + kBelowSite;
+// On a small screen the event log gives way.
+constexpr int kLeastHeight = kSiteTop + kThumbnails.cy + kStatusHeight + 3 * kGap;
+constexpr int kHeight = kLeastHeight + kEventsHeight;
 // The tool bar and, below it, some of the list beside the thumbnails.
 constexpr int kLeastWidth = static_cast<int>(std::size(kButtons)) * (kButtonWidth + kGap) + kGap;
 
 constexpr DWORD kFrameStyle = WS_OVERLAPPEDWINDOW | WS_CLIPCHILDREN;
-constexpr COLORREF kErrorColor = RGB(176, 0, 32);
+
+// Of errors. Where red could not be read, such as with the system's dark colors, it is the text's own.
+COLORREF ErrorColor() {
+  const COLORREF face = GetSysColor(COLOR_BTNFACE);
+  const int brightness = (GetRValue(face) * 3 + GetGValue(face) * 6 + GetBValue(face)) / 10;
+  return brightness < 160 ? GetSysColor(COLOR_BTNTEXT) : RGB(176, 0, 32);
+}
+
+// The system tells only the windows of the desktop.
+BOOL CALLBACK TellOfColors(HWND child, LPARAM) {
+  SendMessageW(child, WM_SYSCOLORCHANGE, 0, 0);
+  return TRUE;
+}
 
 std::string Utf8(const std::wstring& text) {
   const int length = static_cast<int>(text.size());
@@ -125,16 +137,19 @@ LRESULT CALLBACK DemoHost::FrameProc(HWND window, UINT message, WPARAM wParam, L
       host->used_->Focus();
       return 0;
     case WM_GETMINMAXINFO: {
-      RECT least = {0, 0, host->Scaled(kLeastWidth), host->Scaled(kHeight)};
+      RECT least = {0, 0, host->Scaled(kLeastWidth), host->Scaled(kLeastHeight)};
       AdjustWindowRect(&least, kFrameStyle, FALSE);
       reinterpret_cast<MINMAXINFO*>(lParam)->ptMinTrackSize = {least.right - least.left,
                                                                least.bottom - least.top};
       return 0;
     }
+    case WM_SYSCOLORCHANGE:
+      host->TakeColors();
+      return 0;
     case WM_CTLCOLORSTATIC: {
       const LRESULT brush = DefWindowProcW(window, message, wParam, lParam);
       if (host->isError_ && reinterpret_cast<HWND>(lParam) == host->status_)
-        SetTextColor(reinterpret_cast<HDC>(wParam), kErrorColor);
+        SetTextColor(reinterpret_cast<HDC>(wParam), ErrorColor());
       return brush;
     }
     case WM_COMMAND:
@@ -188,25 +203,31 @@ bool DemoHost::MakeWindows() {
   RegisterClassExW(&frame);
   RECT size = {0, 0, Scaled(kWidth), Scaled(kHeight)};
   AdjustWindowRect(&size, kFrameStyle, FALSE);
-  const int width = size.right - size.left;
-  const int height = size.bottom - size.top;
-  frame_ = CreateWindowExW(WS_EX_CONTROLPARENT, L"TarnwickDemo", L"Picture account", kFrameStyle,
-                           (GetSystemMetrics(SM_CXSCREEN) - width) / 2,
-                           (GetSystemMetrics(SM_CYSCREEN) - height) / 2, width, height, nullptr, nullptr,
-                           module, this);
+  RECT screen = {};
+  SystemParametersInfoW(SPI_GETWORKAREA, 0, &screen, 0);
+  const LONG width = std::min(size.right - size.left, screen.right - screen.left);
+  const LONG height = std::min(size.bottom - size.top, screen.bottom - screen.top);
+  frame_ =
+      CreateWindowExW(WS_EX_CONTROLPARENT, L"TarnwickDemo", L"Picture account", kFrameStyle,
+                      (screen.left + screen.right - width) / 2, (screen.top + screen.bottom - height) / 2,
+                      width, height, nullptr, nullptr, module, this);
   if (!frame_) return false;
+  NONCLIENTMETRICSW metrics = {};
+  metrics.cbSize = sizeof metrics;
+  SystemParametersInfoW(SPI_GETNONCLIENTMETRICS, sizeof metrics, &metrics, 0);
+  font_ = FontOwner(CreateFontIndirectW(&metrics.lfMessageFont));
   const auto child = [&](const wchar_t* kind, const wchar_t* text, DWORD style, int id) {
     const HWND made = CreateWindowExW(0, kind, text, WS_CHILD | WS_VISIBLE | style, 0, 0, 0, 0, frame_,
                                       reinterpret_cast<HMENU>(static_cast<INT_PTR>(id)), module, nullptr);
-    SendMessageW(made, WM_SETFONT, reinterpret_cast<WPARAM>(GetStockObject(DEFAULT_GUI_FONT)), FALSE);
+    SendMessageW(made, WM_SETFONT, reinterpret_cast<WPARAM>(font_.Get()), FALSE);
     return made;
   };
   for (const Button& button : kButtons)
     buttons_.push_back(child(L"BUTTON", button.text, WS_TABSTOP | BS_PUSHBUTTON, button.command));
   site_ = child(L"STATIC", L"", WS_CLIPCHILDREN, 0);
   SetWindowLongPtrW(site_, GWL_EXSTYLE, WS_EX_CONTROLPARENT);
-  progress_ = child(PROGRESS_CLASSW, L"", 0, 0);
-  status_ = child(L"STATIC", L"", SS_LEFT | SS_NOPREFIX | SS_ENDELLIPSIS, 0);
+  progress_ = child(PROGRESS_CLASSW, L"", PBS_SMOOTH, 0);
+  status_ = child(L"STATIC", L"", SS_LEFT | SS_CENTERIMAGE | SS_NOPREFIX | SS_ENDELLIPSIS, 0);
   events_ = child(L"LISTBOX", L"", WS_VSCROLL | WS_BORDER | LBS_NOINTEGRALHEIGHT, 0);
   UpdateStop();
   Layout();
@@ -224,7 +245,10 @@ void DemoHost::Layout() {
   }
   const int width = client.right - 2 * gap;
   const int siteTop = Scaled(kSiteTop);
-  const int siteHeight = client.bottom - siteTop - Scaled(kBelowSite);
+  const int eventsHeight =
+      std::clamp(static_cast<int>(client.bottom) - Scaled(kLeastHeight), 0, Scaled(kEventsHeight));
+  const int statusHeight = Scaled(kStatusHeight);
+  const int siteHeight = client.bottom - siteTop - eventsHeight - statusHeight - 3 * gap;
   MoveWindow(site_, gap, siteTop, width, siteHeight, TRUE);
   // The list grows with the form.
   const int thumbnailsLeft = width - Scaled(kThumbnails.cx);
@@ -233,19 +257,25 @@ void DemoHost::Layout() {
   thumbnails_.SetBounds({thumbnailsLeft, 0, width, Scaled(kThumbnails.cy)});
 
   const int statusTop = siteTop + siteHeight + gap;
-  const int statusHeight = Scaled(kStatusHeight);
   const int progressLeft = client.right - gap - Scaled(kProgressWidth);
   MoveWindow(status_, gap, statusTop, progressLeft - 2 * gap, statusHeight, TRUE);
   MoveWindow(progress_, progressLeft, statusTop, Scaled(kProgressWidth), statusHeight, TRUE);
-  MoveWindow(events_, gap, statusTop + statusHeight + gap, width, Scaled(kEventsHeight), TRUE);
+  MoveWindow(events_, gap, statusTop + statusHeight + gap, width, eventsHeight, TRUE);
   // On their way windows cover each other.
+  RedrawWindow(frame_, nullptr, nullptr, RDW_INVALIDATE | RDW_ERASE | RDW_ALLCHILDREN);
+}
+
+void DemoHost::TakeColors() {
+  EnumChildWindows(frame_, TellOfColors, 0);
+  list_.TakeColors();
+  thumbnails_.TakeColors();
   RedrawWindow(frame_, nullptr, nullptr, RDW_INVALIDATE | RDW_ERASE | RDW_ALLCHILDREN);
 }
 
 bool DemoHost::MakeControls() {
   for (FilePane* const pane : {static_cast<FilePane*>(&list_), static_cast<FilePane*>(&thumbnails_)}) {
     pane->onUse = [this, pane] { Use(*pane); };
-    if (!pane->Create(site_, [this, pane](DISPID event, std::vector<VARIANT>& arguments) {
+    if (!pane->Create(site_, font_.Get(), [this, pane](DISPID event, std::vector<VARIANT>& arguments) {
           OnEvent(*pane, event, arguments);
         })) {
       Log(L"The controls could not be created: is the library registered?");
@@ -412,10 +442,12 @@ void DemoHost::ChooseUpload() {
   OPENFILENAMEW dialog = {};
   dialog.lStructSize = sizeof dialog;
   dialog.hwndOwner = frame_;
-  dialog.lpstrFilter = L"Pictures\0*.jpg;*.gif;*.png\0";
+  dialog.lpstrFilter =
+      L"Pictures\0*.jpg;*.jpeg;*.gif;*.png;*.bmp;*.tif;*.tiff;*.webp;*.heic;*.avif\0All files\0*.*\0";
   dialog.lpstrFile = path;
   dialog.nMaxFile = MAX_PATH;
-  dialog.Flags = OFN_NOCHANGEDIR;
+  dialog.lpstrTitle = L"Upload";
+  dialog.Flags = OFN_NOCHANGEDIR | OFN_FILEMUSTEXIST;
   if (GetOpenFileNameW(&dialog)) Upload({path});
 }
 

@@ -9,6 +9,8 @@
 #include <string>
 #include <vector>
 
+#include "platform/windows/Owner.h"
+
 namespace tarnwick::demo {
 
 enum Command : int { kUpload = 100, kOpen, kRename, kDelete, kDownload, kAll, kGif, kJpg, kStop };
@@ -62,6 +64,8 @@ class DemoHost {
   int Scaled(int at96) const { return MulDiv(at96, dpi_, 96); }
   bool MakeWindows();
   void Layout();
+  // The system's colors have changed.
+  void TakeColors();
   bool MakeControls();
   FilePane& Other(const FilePane& pane);
   // Lists the account in that control. What one control changed the other one shows only after this.
@@ -87,6 +91,7 @@ class DemoHost {
   const std::vector<std::wstring> arguments_;
   std::FILE* log_ = nullptr;
   int dpi_ = 96;
+  FontOwner font_;
   HWND frame_ = nullptr;
   HWND site_ = nullptr;
   HWND progress_ = nullptr;

@@ -6,49 +6,49 @@ namespace {
 const wchar_t* Words(int code) {
   switch (code) {
     case 1001:
-      return L"file deleted";
+      return L"File deleted";
     case 1002:
-      return L"item skipped by the delete";
+      return L"Item skipped by the delete";
     case 1005:
-      return L"not allowed for this account";
+      return L"Not allowed for this account";
     case 1014:
-      return L"upload refused: the quota is used up";
+      return L"Upload refused: the quota is used up";
     case 1015:
-      return L"current item";
+      return L"Current item";
     case kCodeMenu:
-      return L"context menu for";
+      return L"Context menu for";
     case 1020:
-      return L"files are dragged over";
+      return L"Files are dragged over";
     case 1021:
-      return L"dropped, but no files from outside";
+      return L"Dropped, but no files from outside";
     case kCodeClickBegins:
-      return L"selection about to change";
+      return L"Selection about to change";
     case kCodeDropped:
-      return L"file dropped";
+      return L"File dropped";
     case kCodeOpen:
-      return L"open";
+      return L"Open";
     case kCodeRenamed:
-      return L"renamed";
+      return L"Renamed";
     case 1032:
-      return L"another picture has this name";
+      return L"Another picture has this name";
     case 1033:
-      return L"rename failed";
+      return L"Rename failed";
     case 1034:
-      return L"name refused";
+      return L"Name refused";
     case 1035:
-      return L"no file may have this name";
+      return L"No file may have this name";
     case kCodeDeleteKey:
-      return L"delete";
+      return L"Delete";
     case 5555:
-      return L"download failed";
+      return L"Download failed";
     case kCodeRefreshKey:
-      return L"list again";
+      return L"List again";
     case 8888:
-      return L"rename begins";
+      return L"Rename begins";
     case kCodeProgress:
-      return L"progress";
+      return L"Progress";
     default:
-      return L"event";
+      return L"Event";
   }
 }
 
@@ -59,9 +59,9 @@ std::wstring Wording(int code, const std::wstring& text) {
     case kCodeQuickStart:
       return L"QuickStart";
     case kCodeBusy:
-      return text == L"1" ? L"busy: pictures are being fetched" : L"pictures fetched";
+      return text == L"1" ? L"Fetching pictures" : L"Pictures fetched";
     case kCodeSwitchView:
-      return L"to the list";
+      return L"To the list";
     default:
       return text.empty() ? Words(code) : Words(code) + (L" " + text);
   }

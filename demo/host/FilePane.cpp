@@ -1,23 +1,27 @@
 #include "FilePane.h"
 
 #include "platform/windows/CommonControls.h"
+#include "platform/windows/SystemDpi.h"
 
 namespace tarnwick::demo {
 
-bool FilePane::CreateControl(HWND window, REFCLSID classId, const EventHandler& onEvent) {
+bool FilePane::CreateControl(HWND window, HFONT font, REFCLSID classId, const EventHandler& onEvent) {
   container_ = ComPtr<ControlContainer>::Adopt(new ControlContainer(window));
   container_->onEvent = onEvent;
   container_->onActivate = [this](bool ui) {
     if (ui && onUse) onUse();
     return S_OK;
   };
-  FONTDESC font = {};
-  font.cbSizeofstruct = sizeof font;
-  std::wstring name = L"Tahoma";
-  font.lpstrName = name.data();
-  font.cySize.int64 = 90000;  // 9 points
-  font.sWeight = FW_NORMAL;
-  OleCreateFontIndirect(&font, IID_IFontDisp, container_->ambient.font.ReceiveVoid());
+  // The form's font is the one of its controls.
+  LOGFONTW form = {};
+  GetObjectW(font, sizeof form, &form);
+  FONTDESC described = {};
+  described.cbSizeofstruct = sizeof described;
+  described.lpstrName = form.lfFaceName;
+  described.cySize.int64 = MulDiv(-form.lfHeight, 72 * 10'000, SystemDpi());  // in ten thousandths of a point
+  described.sWeight = static_cast<SHORT>(form.lfWeight);
+  described.sCharset = form.lfCharSet;
+  OleCreateFontIndirect(&described, IID_IFontDisp, container_->ambient.font.ReceiveVoid());
   return SUCCEEDED(container_->Create(classId, ControlContainer::WayIn::kSteps, nullptr));
 }
 

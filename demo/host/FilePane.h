@@ -22,7 +22,7 @@ class FilePane {
   std::function<void()> onUse;
 
   // Puts the control into `window`, hidden.
-  virtual bool Create(HWND window, const EventHandler& onEvent) = 0;
+  virtual bool Create(HWND window, HFONT font, const EventHandler& onEvent) = 0;
   // The service client that the control works with.
   virtual ComPtr<_CFileUpload> Client() const = 0;
   virtual void UseClient(_CFileUpload* client) = 0;
@@ -51,6 +51,10 @@ class FilePane {
   void SetBounds(const RECT& bounds) {
     if (container_) container_->SetBounds(bounds);
   }
+  // The system's colors, which the form offers its controls, have changed.
+  void TakeColors() {
+    if (container_) container_->AmbientChanged(DISPID_UNKNOWN);
+  }
   bool TranslateKey(MSG& message) { return container_ && container_->TranslateKey(message); }
   void Close() {
     if (container_) container_->Close();
@@ -59,7 +63,7 @@ class FilePane {
   HWND Window() const;
 
  protected:
-  bool CreateControl(HWND window, REFCLSID classId, const EventHandler& onEvent);
+  bool CreateControl(HWND window, HFONT font, REFCLSID classId, const EventHandler& onEvent);
   // Null before there is one, and when it is closed.
   IUnknown* Control() const { return container_ ? container_->Control() : nullptr; }
   // Of the first file in a collection that a control made.
@@ -73,8 +77,8 @@ class FilePane {
 template <typename Interface>
 class FilePaneOf : public FilePane {
  public:
-  bool Create(HWND window, const EventHandler& onEvent) override {
-    return CreateControl(window, ClassId(), onEvent) &&
+  bool Create(HWND window, HFONT font, const EventHandler& onEvent) override {
+    return CreateControl(window, font, ClassId(), onEvent) &&
            SUCCEEDED(Control()->QueryInterface(__uuidof(Interface), control_.ReceiveVoid()));
   }
   ComPtr<_CFileUpload> Client() const override {

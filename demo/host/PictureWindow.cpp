@@ -1,6 +1,7 @@
 #include "PictureWindow.h"
 
 #include <algorithm>
+#include <cmath>
 #include <utility>
 
 #include "controls/windows/PictureLoader.h"
@@ -11,24 +12,12 @@ namespace {
 constexpr const wchar_t* kClass = L"TarnwickDemoPicture";
 constexpr DWORD kStyle = WS_OVERLAPPEDWINDOW;
 
-// The largest rectangle of the picture's shape in the middle of the room.
-RECT Fitted(SIZE size, const RECT& room) {
-  const LONG roomWidth = room.right - room.left;
-  const LONG roomHeight = room.bottom - room.top;
-  const double scale = std::min(static_cast<double>(roomWidth) / static_cast<double>(size.cx),
-                                static_cast<double>(roomHeight) / static_cast<double>(size.cy));
-  const LONG width = std::max(1L, static_cast<LONG>(scale * static_cast<double>(size.cx)));
-  const LONG height = std::max(1L, static_cast<LONG>(scale * static_cast<double>(size.cy)));
-  const LONG left = room.left + (roomWidth - width) / 2;
-  const LONG top = room.top + (roomHeight - height) / 2;
-  return {left, top, left + width, top + height};
-}
-
 // The size of the picture, made smaller where it does not fit.
 SIZE Reduced(SIZE size, SIZE most) {
-  if (size.cx <= most.cx && size.cy <= most.cy) return size;
-  const RECT place = Fitted(size, {0, 0, most.cx, most.cy});
-  return {place.right - place.left, place.bottom - place.top};
+  const double scale = std::min({1.0, static_cast<double>(most.cx) / static_cast<double>(size.cx),
+                                 static_cast<double>(most.cy) / static_cast<double>(size.cy)});
+  return {std::max(1L, std::lround(scale * static_cast<double>(size.cx))),
+          std::max(1L, std::lround(scale * static_cast<double>(size.cy)))};
 }
 
 }  // namespace
@@ -104,12 +93,12 @@ void PictureWindow::Paint() {
   RECT room = {};
   const HDC dc = BeginPaint(window_, &paint);
   GetClientRect(window_, &room);
-  const RECT place = Fitted(size_, room);
+  const SIZE shown = Reduced(size_, {room.right, room.bottom});
   const HDC source = CreateCompatibleDC(dc);
   const HGDIOBJ old = SelectObject(source, picture_.Get());
   SetStretchBltMode(dc, HALFTONE);
   SetBrushOrgEx(dc, 0, 0, nullptr);
-  StretchBlt(dc, place.left, place.top, place.right - place.left, place.bottom - place.top, source, 0, 0,
+  StretchBlt(dc, (room.right - shown.cx) / 2, (room.bottom - shown.cy) / 2, shown.cx, shown.cy, source, 0, 0,
              size_.cx, size_.cy, SRCCOPY);
   SelectObject(source, old);
   DeleteDC(source);
