@@ -52,12 +52,6 @@ void CALLBACK OnTimer(HWND, UINT, UINT_PTR timer, DWORD) {
   std::exchange(waiting.meanwhile, nullptr)(opened);
 }
 
-// A menu opens where the pointer is.
-void PointAt(HWND window, POINT at) {
-  ClientToScreen(window, &at);
-  SetCursorPos(at.x, at.y);
-}
-
 }  // namespace
 
 bool Tour::Run() {
@@ -280,6 +274,13 @@ void Tour::While(const wchar_t* kind, const std::function<void()>& act, std::fun
   act();
   KillTimer(nullptr, timer);
   Expect(!waiting.meanwhile, L"a menu or a question");
+}
+
+void Tour::PointAt(HWND window, POINT at) {
+  ClientToScreen(window, &at);
+  SetCursorPos(at.x, at.y);
+  // Messages that are posted before the pointer's own are still taken for where it was.
+  host_.Rest(100);
 }
 
 void Tour::DeleteAndAnswer(const std::function<void()>& act, int answer, const wchar_t* step) {

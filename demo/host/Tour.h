@@ -29,6 +29,8 @@ class Tour {
   void Do(Command command);
   // Runs `meanwhile` when a window of that class, a menu or a dialog, has opened in what `act` does.
   void While(const wchar_t* kind, const std::function<void()>& act, std::function<void(HWND)> meanwhile);
+  // Moves the pointer there; a menu opens where it is.
+  void PointAt(HWND window, POINT at);
   // Deletes what is selected, by `act`; `step` is the picture of the question before it.
   void DeleteAndAnswer(const std::function<void()>& act, int answer, const wchar_t* step);
   // Whether a picture has been opened in a window of its own, which it closes.
