@@ -24,6 +24,17 @@ constexpr Button kButtons[] = {{kUpload, L"&Upload"}, {kOpen, L"&Open"},        
 constexpr Button kMenu[] = {
     {kOpen, L"&Open"}, {kRename, L"&Rename"}, {kDownload, L"Do&wnload"}, {kDelete, L"&Delete..."}};
 
+// What the filter of that command lets pass; null for commands that are no filter.
+const wchar_t* Filter(int command) {
+  return command == kAll ? L"*" : command == kGif ? L"gif" : command == kJpg ? L"jpg" : nullptr;
+}
+
+// The filters are one group, in which the Tab key stops once and the arrow keys choose.
+DWORD ButtonStyle(int command) {
+  if (!Filter(command)) return WS_GROUP | WS_TABSTOP | BS_PUSHBUTTON;
+  return command == kAll ? WS_GROUP | WS_TABSTOP | BS_AUTORADIOBUTTON : BS_AUTORADIOBUTTON;
+}
+
 // Messages of the form to itself, for what shall not run inside an event.
 constexpr UINT kShowMenu = WM_APP;
 constexpr UINT kRefreshOther = WM_APP + 1;
@@ -223,7 +234,8 @@ bool DemoHost::MakeWindows() {
     return made;
   };
   for (const Button& button : kButtons)
-    buttons_.push_back(child(L"BUTTON", button.text, WS_TABSTOP | BS_PUSHBUTTON, button.command));
+    buttons_.push_back(child(L"BUTTON", button.text, ButtonStyle(button.command), button.command));
+  ShowFilter();
   site_ = child(L"STATIC", L"", WS_CLIPCHILDREN, 0);
   SetWindowLongPtrW(site_, GWL_EXSTYLE, WS_EX_CONTROLPARENT);
   progress_ = child(PROGRESS_CLASSW, L"", PBS_SMOOTH, 0);
@@ -319,7 +331,7 @@ bool DemoHost::Show(FilePane& pane) {
   // Whoever closes the form in the middle of a command wants no more of it.
   if (!frame_) return false;
   FilePane& used = *used_;
-  const bool done = pane.Init(filter_);
+  const bool done = pane.Init(Filter(filter_));
   // The thumbnails take the keyboard when they are filled.
   Use(used);
   used.Focus();
@@ -332,11 +344,16 @@ bool DemoHost::Fill() {
   return Show(list_) && Show(thumbnails_);
 }
 
-void DemoHost::ChangeFilter(const wchar_t* filter) {
-  filter_ = filter;
+void DemoHost::ShowFilter() {
+  CheckRadioButton(frame_, kAll, kJpg, filter_);
+}
+
+void DemoHost::ChangeFilter(int command) {
+  filter_ = command;
+  ShowFilter();
   FilePane& used = *used_;
-  list_.ChangeFilter(filter_);
-  thumbnails_.ChangeFilter(filter_);
+  list_.ChangeFilter(Filter(filter_));
+  thumbnails_.ChangeFilter(Filter(filter_));
   Use(used);
   used.Focus();
 }
@@ -469,7 +486,7 @@ void DemoHost::ShowMenu(POINT at) {
 void DemoHost::Do(int command) {
   if (command == kStop) return Stop();
   // Controls pump messages while they work; one command at a time.
-  if (working_) return;
+  if (working_) return ShowFilter();
   switch (command) {
     case kUpload:
       return ChooseUpload();
@@ -483,11 +500,9 @@ void DemoHost::Do(int command) {
       Download();
       return;
     case kAll:
-      return ChangeFilter(L"*");
     case kGif:
-      return ChangeFilter(L"gif");
     case kJpg:
-      return ChangeFilter(L"jpg");
+      return ChangeFilter(command);
     default:
       return;
   }

@@ -71,7 +71,9 @@ class DemoHost {
   // Lists the account in that control. What one control changed the other one shows only after this.
   bool Show(FilePane& pane);
   void Use(FilePane& pane);
-  void ChangeFilter(const wchar_t* filter);
+  // Checks the button of the filter in use; one that was pressed and refused checks itself.
+  void ShowFilter();
+  void ChangeFilter(int command);
   void ChooseUpload();
   // Waits for the command that is under way.
   void UploadDropped();
@@ -102,7 +104,8 @@ class DemoHost {
   ThumbnailPane thumbnails_;
   FilePane* used_ = &list_;
   PictureWindow picture_;
-  std::wstring filter_ = L"*";
+  // The command of the one in use.
+  int filter_ = kAll;
   bool isError_ = false;
   // A command or a page of pictures is under way, which Stop ends.
   bool working_ = false;

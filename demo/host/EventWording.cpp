@@ -26,7 +26,7 @@ const wchar_t* Words(int code) {
     case kCodeDropped:
       return L"File dropped";
     case kCodeOpen:
-      return L"Open";
+      return L"Enter, or the end of a click";
     case kCodeRenamed:
       return L"Renamed";
     case 1032:
