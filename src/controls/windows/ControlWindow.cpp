@@ -216,6 +216,15 @@ void ControlWindow::TellFocusLeft(HWND outer, UINT message, WPARAM wParam) {
   if (message == WM_KILLFOCUS && window_ == outer && to != outer && !IsChild(outer, to)) control_.FocusLeft();
 }
 
+// Containers ask the control about Tab, or a dialog's loop takes it. In a form that does neither the key
+// arrives here, and nobody could leave the control by the keyboard: after the last stop it is the form's.
+std::optional<LRESULT> ControlWindow::OnTab(HWND outer, UINT message, WPARAM wParam, LPARAM lParam) {
+  if (message != WM_KEYDOWN || wParam != VK_TAB || GetKeyState(VK_CONTROL) < 0) return std::nullopt;
+  const HWND container = GetAncestor(outer, GA_PARENT);
+  if (!MoveFocus(GetKeyState(VK_SHIFT) < 0)) SendMessageW(container, message, wParam, lParam);
+  return 0;
+}
+
 // What is seen beside the children, and behind the texts of labels.
 LRESULT ControlWindow::OnLook(HWND window, UINT message, WPARAM wParam, LPARAM lParam) const {
   const auto dc = reinterpret_cast<HDC>(wParam);
@@ -277,6 +286,7 @@ LRESULT CALLBACK ControlWindow::ChildProc(HWND window, UINT message, WPARAM wPar
     // The child's own procedure runs inside too: it may wait for more messages, and must not lose its window
     // meanwhile.
     return self->Handle([&] {
+      if (const auto taken = self->OnTab(outer, message, wParam, lParam)) return *taken;
       const std::optional<LRESULT> answer = self->OnMessage(window, message, wParam, lParam);
       const LRESULT result = answer ? *answer : DefSubclassProc(window, message, wParam, lParam);
       self->TellFocusLeft(outer, message, wParam);

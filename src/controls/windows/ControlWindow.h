@@ -45,6 +45,9 @@ class ControlWindow {
   HWND Window();
   // Takes the window out of its container and hides it; what it shows stays.
   void Park();
+  // Moves the keyboard focus to the next stop inside the control, or to the one before; false at the end,
+  // when it is the container's turn.
+  virtual bool MoveFocus([[maybe_unused]] bool backward) { return false; }
   // Size in pixels, when the window's screen has other dots per inch than the system; else nullopt.
   std::optional<SIZE> SizeOnOtherScreen() const;
   // Whether the process has windows of controls. A window is destroyed up to one message after its control.
@@ -100,6 +103,7 @@ class ControlWindow {
   LRESULT Handle(Body&& body);
   LRESULT OnLook(HWND window, UINT message, WPARAM wParam, LPARAM lParam) const;
   void TellFocusLeft(HWND outer, UINT message, WPARAM wParam);
+  std::optional<LRESULT> OnTab(HWND outer, UINT message, WPARAM wParam, LPARAM lParam);
   bool MakeWindow();
   void FollowDpi();
 

@@ -41,9 +41,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   // Draws the page as the window would show it, into `bounds` in pixels of the screen, which `dc` may map to
   // others. Waits for the pictures, because nobody draws it again when they are there.
   void Draw(HDC dc, const RECT& bounds);
-  // Moves the keyboard focus to the next stop inside the control, or to the one before; false at the end,
-  // when it is the container's turn.
-  bool MoveFocus(bool backward);
+  bool MoveFocus(bool backward) override;
 
   // For screen readers. Slot 0 is the grid.
   PageAccessible& AccessibleOf(int slot);
