@@ -394,6 +394,11 @@ TEST_F(ThumbNailTest, ClosingEndsTheWaitAndOpeningAllowsAnother) {
   EXPECT_EQ(page.Look(), "1.gif*! 2.gif ");
   Fill({Arrival()});
   EXPECT_EQ(page.Look(), "1.gif* 2.gif ");
+  // In the event that tells that the fetching begins there is no wait yet.
+  fake.files.files.erase(CopyOf("1.gif"));
+  OnEvent("1234 1", [this] { control.Close(); });
+  Fill({});
+  EXPECT_EQ(control.m_strLastErrorDesc, u"The control was closed.");
 }
 
 TEST_F(ThumbNailTest, AStopEndsTheFetchingOfThePage) {

@@ -224,13 +224,13 @@ bool ctrlThumbNailView::Fetch(int slot, const CUpload& record, const Text& copy)
   if (!busy_) {
     busy_.emplace(*this);
     Raise(event::kBusy, u"1");
-    if (IsReplaced()) return false;
   }
-  // A stop is meant for the whole page.
+  // A stop is meant for the whole page, and so is the closing of the control in an event.
   if (IsStopped()) {
     FailStopped();
-    return true;
+    return !IsReplaced();
   }
+  if (IsReplaced()) return false;
   page_.SetCaption(slot, u"Downloading " + ReplaceAll(record.FileName, u"&", u"&&"));
   const bool again = FileExists(apartment_.platform.files, copy);
   Download(Text(record.FilePath), {}, copy, [this] { return IsReplaced(); });
