@@ -351,11 +351,17 @@ void DemoHost::ShowFilter() {
 void DemoHost::ChangeFilter(int command) {
   filter_ = command;
   ShowFilter();
+  // The arrow keys go on to the next filter.
+  const HWND focus = GetFocus();
+  const bool stays = GetParent(focus) == frame_ && Filter(GetDlgCtrlID(focus));
   FilePane& used = *used_;
   list_.ChangeFilter(Filter(filter_));
   thumbnails_.ChangeFilter(Filter(filter_));
   Use(used);
-  used.Focus();
+  if (stays)
+    SetFocus(focus);
+  else
+    used.Focus();
 }
 
 // --- Commands ---
@@ -381,32 +387,48 @@ void DemoHost::EndWork(const std::wstring& outcome, const std::wstring& failure)
 
 void DemoHost::UpdateStop() {
   const HWND stop = buttons_.back();
-  const bool on = working_ || fetching_;
+  const bool on = working_ || fetching_ || !dropped_.empty();
   // A button that is switched off would keep the keyboard for itself.
   if (!on && GetFocus() == stop) used_->Focus();
   EnableWindow(stop, on);
 }
 
-bool DemoHost::Upload(const std::vector<std::wstring>& paths) {
+bool DemoHost::Upload(const std::wstring& path) {
   FilePane& pane = *used_;
-  std::size_t done = 0;
-  for (const std::wstring& path : paths) {
-    // The events of an upload count percent.
-    BeginWork(100);
-    const bool well = pane.Upload(path);
-    const std::wstring name = path.substr(path.find_last_of(L'\\') + 1);
-    EndWork(L"Uploaded " + path, well ? L"" : L"Not uploaded: " + name + L": " + pane.Problem());
-    // Whatever one file failed for, the user has to know before the next one.
-    if (!well) break;
-    ++done;
-  }
-  if (done > 1 && done == paths.size()) SetStatus(L"Uploaded " + std::to_wstring(done) + L" files");
-  if (done > 0) Show(Other(pane));
-  return done == paths.size();
+  const bool done = UploadOne(pane, path).empty();
+  if (done) Show(Other(pane));
+  return done;
+}
+
+std::wstring DemoHost::UploadOne(FilePane& pane, const std::wstring& path) {
+  // The events of an upload count percent.
+  BeginWork(100);
+  std::wstring failure;
+  if (!pane.Upload(path))
+    failure = L"Not uploaded: " + path.substr(path.find_last_of(L'\\') + 1) + L": " + pane.Problem();
+  EndWork(L"Uploaded " + path, failure);
+  return failure;
 }
 
 void DemoHost::UploadDropped() {
-  if (!working_) Upload(std::exchange(dropped_, {}));
+  if (working_ || fetching_) return;
+  FilePane& pane = *used_;
+  std::wstring failure;
+  std::size_t done = 0;
+  // Stop empties the queue.
+  while (!dropped_.empty() && failure.empty()) {
+    const std::wstring path = std::exchange(dropped_.front(), {});
+    dropped_.erase(dropped_.begin());
+    failure = UploadOne(pane, path);
+    if (failure.empty()) ++done;
+  }
+  // Whatever one file failed for, the user has to know before the next one.
+  const std::size_t left = std::exchange(dropped_, {}).size();
+  UpdateStop();
+  if (done > 0) Show(Other(pane));
+  if (left > 0) failure += L" Not tried: " + std::to_wstring(left) + L" more.";
+  if (!failure.empty()) return SetStatus(failure, true);
+  if (done > 1) SetStatus(L"Uploaded " + std::to_wstring(done) + L" files");
 }
 
 std::wstring DemoHost::Download() {
@@ -465,7 +487,7 @@ void DemoHost::ChooseUpload() {
   dialog.nMaxFile = MAX_PATH;
   dialog.lpstrTitle = L"Upload";
   dialog.Flags = OFN_NOCHANGEDIR | OFN_FILEMUSTEXIST;
-  if (GetOpenFileNameW(&dialog)) Upload({path});
+  if (GetOpenFileNameW(&dialog)) Upload(path);
 }
 
 void DemoHost::ShowMenu(POINT at) {
@@ -563,6 +585,7 @@ void DemoHost::OnFileManagerEvent(FilePane& pane, int code, const std::wstring& 
       return;
     case kCodeBusy:
       fetching_ = text == L"1";
+      if (!fetching_ && !dropped_.empty()) PostMessageW(frame_, kUploadDropped, 0, 0);
       return UpdateStop();
     case kCodeMenu:
       PostMessageW(frame_, kShowMenu, 0, static_cast<LPARAM>(GetMessagePos()));

@@ -42,8 +42,7 @@ class DemoHost {
   // Lists the account in both controls.
   bool Fill();
   void Do(int command);
-  // Stops at the first one that fails.
-  bool Upload(const std::vector<std::wstring>& paths);
+  bool Upload(const std::wstring& path);
   // The path of the file; empty when it failed.
   std::wstring Download();
 
@@ -75,7 +74,9 @@ class DemoHost {
   void ShowFilter();
   void ChangeFilter(int command);
   void ChooseUpload();
-  // Waits for the command that is under way.
+  // Why the file was not uploaded; empty when it was.
+  std::wstring UploadOne(FilePane& pane, const std::wstring& path);
+  // As long as a command or a page of pictures is under way, they wait for its end.
   void UploadDropped();
   void OpenPicture();
   void Delete();

@@ -105,10 +105,10 @@ void Tour::ShowUploads() {
     host_.onProgress = nullptr;
     Do(kStop);
   };
-  Expect(!host_.Upload({UploadPath()}) && host_.Progress() == 0 && host_.List().Count() == all_,
+  Expect(!host_.Upload(UploadPath()) && host_.Progress() == 0 && host_.List().Count() == all_,
          L"an upload that is stopped");
   Step(L"04-upload-stopped");
-  Expect(!host_.Upload({UploadPath() + L".gone"}) && host_.Status().find(L"not found") != std::wstring::npos,
+  Expect(!host_.Upload(UploadPath() + L".gone") && host_.Status().find(L"not found") != std::wstring::npos,
          L"the reason in words");
   Step(L"05-error");
 
@@ -245,7 +245,7 @@ void Tour::CloseUnderWay() {
     host_.onProgress = nullptr;
     SendMessageW(host_.Frame(), WM_CLOSE, 0, 0);
   };
-  Expect(!host_.Upload({UploadPath()}) && !host_.Frame(), L"an upload that ends with the form");
+  Expect(!host_.Upload(UploadPath()) && !host_.Frame(), L"an upload that ends with the form");
 }
 
 // --- What the steps consist of ---
@@ -302,7 +302,7 @@ std::wstring Tour::UploadPath() const {
 }
 
 void Tour::Upload() {
-  Expect(host_.Upload({UploadPath()}), L"upload");
+  Expect(host_.Upload(UploadPath()), L"upload");
 }
 
 void Tour::Drop(HWND window) {

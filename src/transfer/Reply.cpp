@@ -29,7 +29,9 @@ constexpr auto kHexDigits = [] {
 // Most bytes of a reply stand for themselves, and all of those with a meaning come before them.
 constexpr unsigned char kLastWithMeaning = '+';
 
-// The bytes of `word` from the first one on that has a meaning, from the low end; 8 when none has one.
+static_assert(std::endian::native == std::endian::little, "the first byte of a word is its lowest");
+
+// How many bytes of `word` come before the first one that has a meaning; 8 when none has one.
 constexpr unsigned FirstWithMeaning(std::uint64_t word) {
   constexpr std::uint64_t kEach = 0x0101'0101'0101'0101;
   // A borrow spoils the bytes above one that is found, and never makes one where none is.

@@ -159,6 +159,8 @@ void ctrlThumbNailView::FillPage(int first) {
     const std::size_t position = static_cast<std::size_t>(first) + static_cast<std::size_t>(slot);
     const FileList& shown = listing_.shown;
     AddressOf(slot) = position <= shown.Count() ? shown.At(position)->FilePath : Text();
+    // A screen reader asks for it when it hears what is selected, which comes before the picture.
+    if (position <= shown.Count()) page_.SetTip(slot, FormatTip(*shown.At(position)));
   }
   // A name is edited over its own picture only.
   if (!editedName_.empty() && AddressOf(editedSlot_) != edited) OnEditorLeft();

@@ -1,5 +1,6 @@
 #include "controls/windows/TextTip.h"
 
+#include <algorithm>
 #include <utility>
 
 #include "platform/windows/CommonControls.h"
@@ -18,6 +19,28 @@ TTTOOLINFOW ToolOf(HWND window) {
   return tool;
 }
 
+// The system breaks a tip's lines at blanks. What has none, such as an address, would run out of the screen.
+void BreakWords(HWND tip, std::wstring& text, int widest) {
+  const WindowDcOwner dc = DcOf(tip);
+  const SelectionOwner font =
+      SelectInto(dc.Get().dc, reinterpret_cast<HFONT>(SendMessageW(tip, WM_GETFONT, 0, 0)));
+  for (std::size_t from = 0; from < text.size();) {
+    int fits = 0;
+    SIZE size = {};
+    GetTextExtentExPointW(dc.Get().dc, text.c_str() + from, static_cast<int>(text.size() - from), widest,
+                          &fits, nullptr, &size);
+    std::size_t end = from + static_cast<std::size_t>(std::max(fits, 1));
+    if (end >= text.size()) return;
+    if (const std::size_t blank = text.find_last_of(L" \n", end); blank != text.npos && blank >= from) {
+      from = blank + 1;
+      continue;
+    }
+    if (IS_LOW_SURROGATE(text[end]) && end > from + 1) --end;
+    text.insert(end, L"\r\n");
+    from = end + 2;
+  }
+}
+
 }  // namespace
 
 void TextTip::Set(HWND window, const RECT& place, std::wstring text) {
@@ -28,12 +51,14 @@ void TextTip::Set(HWND window, const RECT& place, std::wstring text) {
                                     WS_POPUP | TTS_ALWAYSTIP | TTS_NOPREFIX, 0, 0, 0, 0, nullptr, nullptr,
                                     nullptr, nullptr));
   if (!tip_) return;
-  if (text.size() > kLongest) text.resize(kLongest);
   // Of one line the screen may show a part only.
   MONITORINFO screen = {};
   screen.cbSize = sizeof screen;
   GetMonitorInfoW(MonitorFromWindow(window, MONITOR_DEFAULTTONEAREST), &screen);
-  SendMessageW(tip_.Get(), TTM_SETMAXTIPWIDTH, 0, (screen.rcWork.right - screen.rcWork.left) / 2);
+  const int widest = (screen.rcWork.right - screen.rcWork.left) / 2;
+  SendMessageW(tip_.Get(), TTM_SETMAXTIPWIDTH, 0, widest);
+  BreakWords(tip_.Get(), text, widest);
+  if (text.size() > kLongest) text.resize(kLongest);
   TTTOOLINFOW tool = ToolOf(window);
   tool.rect = place;
   tool.lpszText = text.data();

@@ -137,6 +137,8 @@ void WindowsListView::PlaceLabel() const {
   const RECT place = PlaceOf(dc.Get().dc, WideFromText(Said()), room, Dpi());
   MoveWindow(label_, place.left, place.top, std::max(0L, place.right - place.left), place.bottom - place.top,
              TRUE);
+  // What was drawn in another size does not stand in the middle any more.
+  InvalidateRect(label_, nullptr, TRUE);
 }
 
 void WindowsListView::Draw(HDC dc, const RECT& bounds) {

@@ -286,8 +286,14 @@ bool WindowsThumbnailPage::SetPicture(int slot, TextView path, const std::option
   changed.picture = {};
   changed.awaited = {};
   const bool loads = LoadPictureOf(changed);
+  if (changed.fault != PictureFault::kNone) TellReason(changed);
   Redraw(changed);
   return loads;
+}
+
+// To screen readers: the slot's details say now why its picture is not shown.
+void WindowsThumbnailPage::TellReason(const Slot& slot) {
+  if (slot.window) NotifyWinEvent(EVENT_OBJECT_DESCRIPTIONCHANGE, slot.window, OBJID_CLIENT, CHILDID_SELF);
 }
 
 // At once: the download of the next picture may take its time.
@@ -340,8 +346,7 @@ void WindowsThumbnailPage::TakePicture(const std::shared_ptr<const PictureReques
     Redraw(*slot);
   } else if (!slot->picture) {
     slot->fault = picture.decoded.fault;
-    if (slot->window)
-      NotifyWinEvent(EVENT_OBJECT_DESCRIPTIONCHANGE, slot->window, OBJID_CLIENT, CHILDID_SELF);
+    TellReason(*slot);
     user_->OnPictureUnreadable(static_cast<int>(slot - slots_.begin()) + 1);
   }
 }
@@ -535,7 +540,9 @@ std::optional<LRESULT> WindowsThumbnailPage::OnOuterMessage(UINT message, WPARAM
       return 0;
     case WM_DRAWITEM: {
       const auto& item = *reinterpret_cast<const DRAWITEMSTRUCT*>(lParam);
-      DrawLabel(item.hDC, item.rcItem, item.hwndItem == linkWindow_, GetFocus() == item.hwndItem);
+      // The grid asks as well when somebody takes a picture of it.
+      if (item.hwndItem == linkWindow_ || item.hwndItem == messageWindow_)
+        DrawLabel(item.hDC, item.rcItem, item.hwndItem == linkWindow_, GetFocus() == item.hwndItem);
       return TRUE;
     }
     default:

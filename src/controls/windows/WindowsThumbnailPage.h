@@ -121,6 +121,7 @@ class WindowsThumbnailPage : public ThumbnailPage, public ControlWindow {
   bool LoadPictureOf(Slot& slot);
   static void Show(Slot& slot, const SharedPicture& picture);
   void TakePicture(const std::shared_ptr<const PictureRequest>& request, ShownPicture picture);
+  static void TellReason(const Slot& slot);
   static void Redraw(const Slot& slot);
   void PlaceEditor() const;
   void ApplyContent() const;

@@ -15,6 +15,7 @@
 #include <thread>
 #include <vector>
 
+#include "controls/windows/TextTip.h"
 #include "controls/windows/WindowsScrollHook.h"
 #include "controls/windows/WindowsThumbnailPage.h"
 #include "platform/windows/AnsiText.h"
@@ -1001,6 +1002,41 @@ TEST_F(ThumbnailPageTest, TheHookTakesTheColourRequestAndNothingElse) {
   SendMessageW(window, WM_SETTEXT, 0, reinterpret_cast<LPARAM>(L"name"));
   page_.reset();
   EXPECT_FALSE(IsWindow(window));
+}
+
+BOOL CALLBACK FindTipText(HWND window, LPARAM text) {
+  wchar_t found[INFOTIPSIZE] = {};
+  TTTOOLINFOW tool = {};
+  tool.cbSize = TTTOOLINFOW_V2_SIZE;
+  tool.hwnd = GetDesktopWindow();
+  tool.lpszText = found;
+  SendMessageW(window, TTM_GETTEXTW, INFOTIPSIZE, reinterpret_cast<LPARAM>(&tool));
+  if (*found != L'\0') *reinterpret_cast<std::wstring*>(text) = found;
+  return TRUE;
+}
+
+TEST(TextTip, BreaksWhatIsWiderThanHalfOfTheScreen) {
+  TextTip tip;
+  const auto shown = [&](const std::wstring& text) {
+    tip.Set(GetDesktopWindow(), {0, 0, 10, 10}, text);
+    std::wstring broken;
+    EnumThreadWindows(GetCurrentThreadId(), FindTipText, reinterpret_cast<LPARAM>(&broken));
+    return broken;
+  };
+  const std::wstring blanks = L"a few words, which the system breaks itself";
+  EXPECT_EQ(shown(blanks), blanks);
+  for (const std::wstring& word : {std::wstring(700, L'w'), L"after a blank " + std::wstring(600, L'w')}) {
+    const std::wstring broken = shown(word);
+    std::size_t longest = 0;
+    for (std::size_t from = 0; from < broken.size();) {
+      const std::size_t end = std::min(broken.find(L"\r\n", from), broken.size());
+      longest = std::max(longest, end - from);
+      from = end + 2;
+    }
+    // A w is at least five pixels wide.
+    EXPECT_LE(longest, static_cast<std::size_t>(GetSystemMetrics(SM_CXSCREEN)) / 10);
+    EXPECT_GT(longest, 40U) << "and not at each letter";
+  }
 }
 
 }  // namespace
