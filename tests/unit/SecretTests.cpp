@@ -121,7 +121,7 @@ TEST(Secrets, AreWipedWhenTheyEndAreReplacedOrGrow) {
   Text taken(kShort);
   // No std::move: what it was moved from is looked at, as memory.
   const Secret owner(static_cast<Text&&>(taken));
-  EXPECT_FALSE(HoldsPattern(&taken, sizeof taken)) << "what a secret was made of";
+  EXPECT_FALSE(HoldsPattern(&taken, sizeof(Text))) << "what a secret was made of";
   FakePlatform fake;
   fake.registry.InternetSettings()[u"ProxyEnable"] = FakeRegistry::Number(0);
   fake.files.files[u"C:\\a.jpg"] = {3, 0, "abc"};

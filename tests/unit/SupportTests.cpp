@@ -45,13 +45,14 @@ TEST(Reply, UnescapesAtEveryPlace) {
         std::string value = one;
         std::string result = one;
         for (int i = 0; i < 5; ++i) {
-          value += written + other;
-          result += meant + other;
+          value.append(written).append(other);
+          result.append(meant).append(other);
         }
-        const Reply reply = Reply::FromBody("A=" + value + "&B=" + one + "&" + one);
+        const Reply reply = Reply::FromBody(std::string("A=").append(value).append("&B=").append(one));
         ASSERT_EQ(reply.GetValueByVariableName(u"A")->front(), result) << first << ' ' << second;
         ASSERT_EQ(reply.GetValueByVariableName(u"B")->front(), one);
-        ASSERT_EQ(Reply::FromBody("A=" + one + "\x80" + value).ErrorOccured(), 1) << first << ' ' << second;
+        const Reply broken = Reply::FromBody(std::string("A=").append(one).append("\x80").append(value));
+        ASSERT_EQ(broken.ErrorOccured(), 1) << first << ' ' << second;
       }
     }
   }

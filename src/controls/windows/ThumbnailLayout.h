@@ -49,8 +49,8 @@ inline constexpr std::array<TwipRect, kSlotCount> kFrames = {
     Frame(kMargin, kMargin), Frame(kSecondColumn, kMargin), Frame(kMargin, kSecondRow),
     Frame(kSecondColumn, kSecondRow)};
 
-// In a slot's frame. The marker is a ring around the picture, the caption has room for two lines of a font of 8
-// points, in a larger one for one.
+// In a slot's frame. The marker is a ring around the picture, the caption has room for two lines of a font of
+// 8 points, in a larger one for one.
 inline constexpr TwipRect kPicture = {kPictureLeft, kPictureTop, kPictureLeft + kPictureSide,
                                       kPictureTop + kPictureSide};
 inline constexpr int kMarkerWidth = 45;
