@@ -157,7 +157,7 @@ std::wstring MakeHidden(const Account& account) {
   if (FAILED(CoCreateInstance(CLSID_ctrlListImage, nullptr, CLSCTX_INPROC_SERVER, __uuidof(_ctrlListImage),
                               hidden.ReceiveVoid())))
     Stop("the library is not registered");
-  const std::wstring url = ShowAccount(*hidden, account);
+  std::wstring url = ShowAccount(*hidden, account);
   userFolder = NativePath(UserFolder(url));
   return url;
 }
