@@ -12,6 +12,9 @@ bool FilePane::CreateControl(HWND window, HFONT font, REFCLSID classId, const Ev
     if (ui && onUse) onUse();
     return S_OK;
   };
+  // Files and pictures stand on the paper of a list, as users know it.
+  container_->ambient.backColor = 0x80000000 | COLOR_WINDOW;
+  container_->ambient.foreColor = 0x80000000 | COLOR_WINDOWTEXT;
   // The form's font is the one of its controls.
   LOGFONTW form = {};
   GetObjectW(font, sizeof form, &form);
