@@ -163,7 +163,15 @@ bool Request::SendBody() {
 }
 
 std::optional<std::size_t> Request::ReadSome(char* room, std::uint64_t most) {
-  const auto size = static_cast<DWORD>(std::min<std::uint64_t>(most, 1U << 30));
+  auto size = static_cast<DWORD>(std::min<std::uint64_t>(most, 1U << 30));
+  if (waiting_.pumps) {
+    // Wine: a read of which some bytes are there waits for the rest in the call, where no message is handled.
+    if (!Done(WINHTTP_CALLBACK_STATUS_DATA_AVAILABLE,
+              [&] { return WinHttpQueryDataAvailable(request_.Get(), nullptr); }))
+      return std::nullopt;
+    if (exchange_.count == 0) return 0;
+    size = std::min<DWORD>(size, exchange_.count);
+  }
   if (!Done(WINHTTP_CALLBACK_STATUS_READ_COMPLETE,
             [&] { return WinHttpReadData(request_.Get(), room, size, nullptr); }))
     return std::nullopt;

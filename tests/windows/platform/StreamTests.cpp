@@ -372,7 +372,8 @@ TEST(PostStream, FailsWithinItsTimeOutAndHandlesMessagesMeanwhile) {
     ticks = 0;
     EXPECT_FALSE(Stream(server.Port(), source, 1000));
     EXPECT_LT(GetTickCount() - begin, kHangs);
-    EXPECT_TRUE(ticks > 3 || row.answer.end == End::kReset) << ticks;
+    // Of the fifty in a second of silence.
+    EXPECT_TRUE(ticks > 12 || row.answer.end == End::kReset) << ticks;
   }
 }
 
