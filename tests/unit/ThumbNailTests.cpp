@@ -396,7 +396,10 @@ TEST_F(ThumbNailTest, ClosingEndsTheWaitAndOpeningAllowsAnother) {
   EXPECT_EQ(page.Look(), "1.gif* 2.gif ");
   // In the event that tells that the fetching begins there is no wait yet.
   fake.files.files.erase(CopyOf("1.gif"));
-  OnEvent("1234 1", [this] { control.Close(); });
+  OnEvent("1234 1", [this] {
+    EXPECT_EQ(page.At(2).tip.find("2.gif"), 0U) << "a screen reader asks before the picture is there";
+    control.Close();
+  });
   Fill({});
   EXPECT_EQ(control.m_strLastErrorDesc, u"The control was closed.");
 }

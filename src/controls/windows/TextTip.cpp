@@ -51,6 +51,7 @@ void TextTip::Set(HWND window, const RECT& place, std::wstring text) {
                                     WS_POPUP | TTS_ALWAYSTIP | TTS_NOPREFIX, 0, 0, 0, 0, nullptr, nullptr,
                                     nullptr, nullptr));
   if (!tip_) return;
+  text.resize(std::min(text.size(), kLongest));
   // Of one line the screen may show a part only.
   MONITORINFO screen = {};
   screen.cbSize = sizeof screen;
@@ -58,7 +59,8 @@ void TextTip::Set(HWND window, const RECT& place, std::wstring text) {
   const int widest = (screen.rcWork.right - screen.rcWork.left) / 2;
   SendMessageW(tip_.Get(), TTM_SETMAXTIPWIDTH, 0, widest);
   BreakWords(tip_.Get(), text, widest);
-  if (text.size() > kLongest) text.resize(kLongest);
+  // Line ends came to it.
+  text.resize(std::min(text.size(), kLongest));
   TTTOOLINFOW tool = ToolOf(window);
   tool.rect = place;
   tool.lpszText = text.data();
