@@ -28,6 +28,11 @@ struct Side {
 // so that a busy moment of the machine meets all alike.
 void Measure(std::vector<Side>& sides);
 
+// How many processors other programs left free in each round of the last Measure, between 1 and 2.
+Side FreeProcessors();
+// `two` if as a rule both were free then, else `one`: what work on two threads gains depends on that.
+const char* BoundByProcessors(const char* two, const char* one);
+
 // The side, which was measured for the whole, with its costs for one of so many units.
 Side PerUnit(Side side, double units);
 

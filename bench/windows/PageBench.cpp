@@ -197,9 +197,10 @@ void PageBench(const Account& account) {
   DeleteObject(bitmap);
   ReleaseDC(nullptr, screen);
   Row("page of four 12-megapixel JPEGs", sides[0], sides[1],
-      std::thread::hardware_concurrency() > 1 ? ">=2.0" : ">=1.4",
+      BoundByProcessors(">=2.0", ">=1.4"),
       "the decoder in windowscodecs, two thirds of all samples, and fresh memory for its pixels, a fifth; "
       "both have them");
+  Row("the same, processors that were free", FreeProcessors(), "x", "", "other programs");
   Row("the same, longest time without an answer", {"library", {}, 1, silences}, "s", "<=0.1",
       "what the window's thread does in one piece");
 

@@ -532,12 +532,15 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
     if (std::exchange(gbConnectionFailed, false))
       return Fail(ftp_error::kAborted, u"gbConnectionFailed was set.");
     // What is there would pass for the download: somebody has it open, or it is not to be changed.
-    const bool free = !downloader_.CanStart(url) || ResultAsItStood(false, [&](bool& done) {
+    const bool starts = downloader_.CanStart(url);
+    if (starts) downloader_.Prepare(target);
+    const bool free = !starts || ResultAsItStood(false, [&](bool& done) {
       FileSystem& files = apartment_.platform.files;
       if (FileExists(files, target)) files.Remove(target);
       done = true;
     });
     if (!free) {
+      downloader_.Cancel();
       Fail(ftp_error::kAborted, u"The local file could not be replaced.");
       return Raise(event::kDownloadFailed);
     }

@@ -140,6 +140,19 @@ void PictureDownloader::Start(TextView url, TextView explicitTarget) {
   machine_.StartDownload(url, explicitTarget, Route());
 }
 
+void PictureDownloader::Prepare(TextView target) {
+  DropFile();
+  ResultAsItStood(0, [&](int&) {
+    writerTarget_ = target;
+    writer_ = apartment_.platform.files.Create(target);
+  });
+}
+
+void PictureDownloader::Cancel() {
+  machine_.Cancel();
+  DropFile();
+}
+
 void PictureDownloader::Wait() {
   // A quit message ends the program: nothing is waited for any more.
   if (apartment_.platform.pump.Wait()) return;
@@ -195,11 +208,12 @@ void PictureDownloader::BeginFile(TextView path, TextView explicitPath) {
   path_ = path;
   explicitPath_ = explicitPath;
   large_ = false;
+  if (!writer_ || writerTarget_ != Target()) Prepare(Target());
 }
 
 void PictureDownloader::WriteFile(std::string_view bytes) {
+  large_ = true;
   const bool written = ResultAsItStood(false, [&](bool& done) {
-    if (!std::exchange(large_, true)) writer_ = apartment_.platform.files.Create(Target());
     if (writer_) writer_->Write(bytes);
     done = true;
   });
@@ -209,7 +223,7 @@ void PictureDownloader::WriteFile(std::string_view bytes) {
 bool PictureDownloader::FinishFile(std::string_view rest) {
   std::unique_ptr<FileWriter> writer = std::move(writer_);
   return ResultAsItStood(false, [&](bool& written) {
-    if (large_ && !writer) return;
+    if (!writer) return;
     FileSystem& files = apartment_.platform.files;
     // An upload, a rename or a delete has come before these bytes, which are not the file's any more. The
     // target may be the copy itself.
@@ -217,14 +231,10 @@ bool PictureDownloader::FinishFile(std::string_view rest) {
     if (overtaken && (explicitPath_.empty() || LowerCase(explicitPath_) == LowerCase(path_) ||
                       files.SameFile(explicitPath_, path_)))
       return;
-    if (large_) {
-      writer->Write(rest);
-      writer->Commit();
-      // It holds the file.
-      writer.reset();
-    } else {
-      files.Write(Target(), rest);
-    }
+    writer->Write(rest);
+    writer->Commit();
+    // It holds the file.
+    writer.reset();
     written = true;
     if (overtaken || explicitPath_.empty() || explicitPath_ == path_) return;
     if (large_) return Copy(files, explicitPath_, path_);

@@ -25,7 +25,8 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   void SetEvents(DownloadEvents* events) override { events_ = events; }
   bool CanStart(TextView url) const override;
   void Start(TextView url, TextView explicitTarget) override;
-  void Cancel() override { machine_.Cancel(); }
+  void Prepare(TextView target) override;
+  void Cancel() override;
   void RestartWatchdog() override { watchdog_.Start(kWatchdogMs); }
   void StopWatchdog() override { watchdog_.Stop(); }
   void Wait() override;
@@ -73,8 +74,9 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   Text explicitPath_;
   // The first of them.
   const Text& Target() const { return explicitPath_.empty() ? path_ : explicitPath_; }
-  // Of a large file; null when it cannot be written.
+  // Of the file at `writerTarget_`; null when it cannot be written.
   std::unique_ptr<FileWriter> writer_;
+  Text writerTarget_;
   // Whether a part of it was written, so that it is not in memory any more.
   bool large_ = false;
 };

@@ -67,6 +67,9 @@ class Downloader {
   virtual ~Downloader() = default;
   // Whether a download of `url` can be attempted; otherwise Start fails at once.
   virtual bool CanStart(TextView url) const = 0;
+  // Begins to make the file that the next Start will write at `target`, if there is one: the caller may do
+  // something else that takes long meanwhile. Cancel takes it back. No download runs.
+  virtual void Prepare(TextView target) = 0;
   // Begins to fetch the file at `url` into the user's folder, and to `explicitTarget` first unless that is
   // empty; ends a download that runs. Raises events, also the one of a failure, before it returns.
   virtual void Start(TextView url, TextView explicitTarget) = 0;

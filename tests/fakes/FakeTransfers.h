@@ -78,12 +78,19 @@ struct FakeDownloader : Downloader {
   void SetEvents(DownloadEvents* sink) override { events = sink; }
   bool canStart = true;
   bool CanStart(TextView) const override { return canStart; }
+  // What begins to be made; empty when nothing does.
+  Text prepared;
+  void Prepare(TextView itsTarget) override { prepared = itsTarget; }
   void Start(TextView itsUrl, TextView explicitTarget) override {
+    EXPECT_EQ(std::exchange(prepared, {}), canStart ? explicitTarget : TextView());
     url = itsUrl;
     target = explicitTarget;
     log.push_back("download " + Utf8FromText(url) + " to " + Utf8FromText(target));
   }
-  void Cancel() override { log.emplace_back("cancel"); }
+  void Cancel() override {
+    prepared.clear();
+    log.emplace_back("cancel");
+  }
   void RestartWatchdog() override { log.emplace_back("watchdog starts"); }
   void StopWatchdog() override { log.emplace_back("watchdog stops"); }
 };

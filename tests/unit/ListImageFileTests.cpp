@@ -662,6 +662,7 @@ TEST_F(ListImageDownload, Failures) {
   EXPECT_EQ(Heard([&] { EXPECT_EQ(control.DownLoadFileFromServer(u"C:\\To"), u"C:\\To\\a.jpg"); }), "5555 ,");
   EXPECT_EQ(control.m_LastError, ftp_error::kAborted);
   EXPECT_EQ(fake.files.files[u"C:\\To\\a.jpg"].bytes, "old");
+  EXPECT_EQ(downloader.prepared, u"");
   // The host gives up before: nothing is attempted, nor is it when the address is none.
   fake.files.files[u"C:\\To\\a.jpg"].attributes = 0;
   control.gbConnectionFailed = true;

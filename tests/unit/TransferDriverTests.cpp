@@ -281,6 +281,32 @@ TEST_F(DriverTest, WritesALargeFileAsItComes) {
   }
 }
 
+TEST_F(DriverTest, WritesOnlyThePreparedFileThatIsItsTarget) {
+  const struct {
+    TextView prepared;
+    std::function<void()> ends;
+    const char* saved;
+  } rows[] = {
+      {kTarget, [&] { socket.events->OnClosedByPeer(); }, "abc"},
+      {u"C:\\else.jpg", [&] { socket.events->OnClosedByPeer(); }, "abc"},
+      {kTarget, [&] { socket.events->OnSocketError(10054); }, "none"},
+  };
+  for (const auto& row : rows) {
+    downloader->Prepare(row.prepared);
+    EXPECT_EQ(fake.files.writers, 1);
+    Fetch(kTarget, "A\r\n\r\nabc");
+    EXPECT_EQ(fake.files.writers, 1);
+    row.ends();
+    EXPECT_EQ(Saved(kTarget), row.saved);
+    EXPECT_EQ(Saved(u"C:\\else.jpg"), "none");
+    EXPECT_EQ(fake.files.writers, 0);
+    fake.files.files.clear();
+  }
+  downloader->Prepare(kTarget);
+  downloader->Cancel();
+  EXPECT_EQ(fake.files.writers, 0);
+}
+
 // Hosts pump messages in their handlers, so whatever the socket has to tell may be told there.
 TEST_F(DriverTest, TakesWhatIsToldInsideAnEvent) {
   const std::string head = "HTTP/1.1 200 OK\r\nContent-Length: 3\r\n\r\n";

@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <array>
+#include <future>
+#include <new>
 #include <optional>
 #include <string>
 #include <utility>
@@ -10,6 +12,7 @@
 #include "platform/windows/AnsiText.h"
 #include "platform/windows/Owner.h"
 #include "platform/windows/StagedFile.h"
+#include "platform/windows/ThreadPool.h"
 
 namespace tarnwick {
 namespace {
@@ -66,19 +69,40 @@ class WindowsFileReader : public FileReader {
 
 class WindowsFileWriter : public FileWriter {
  public:
-  explicit WindowsFileWriter(const std::wstring& path) : staged_(path) {
-    if (staged_.Path().empty()) throw RuntimeError(error::kPathAccess);
+  explicit WindowsFileWriter(const std::wstring& path) {
+    const auto made = std::make_shared<std::promise<std::unique_ptr<StagedFile>>>();
+    making_ = made->get_future();
+    const auto make = [made, path] {
+      try {
+        made->set_value(std::make_unique<StagedFile>(path));
+      } catch (const std::bad_alloc&) {
+        made->set_exception(std::current_exception());
+      }
+    };
+    if (!RunOnPool(make)) make();
+  }
+  // What is not there yet goes as well, so that the caller can remove its folder.
+  ~WindowsFileWriter() override {
+    if (making_.valid()) making_.wait();
   }
 
   void Write(std::string_view bytes) override {
-    if (!staged_.Write(bytes)) throw RuntimeError(error::kPathAccess);
+    if (!Staged().Write(bytes)) throw RuntimeError(error::kPathAccess);
   }
   void Commit() override {
-    if (!staged_.Commit()) throw RuntimeError(error::kPathAccess);
+    if (!Staged().Commit()) throw RuntimeError(error::kPathAccess);
   }
 
  private:
-  StagedFile staged_;
+  StagedFile& Staged() {
+    if (making_.valid()) staged_ = making_.get();
+    if (!staged_ || staged_->Path().empty()) throw RuntimeError(error::kPathAccess);
+    return *staged_;
+  }
+
+  // Valid until it was waited for.
+  std::future<std::unique_ptr<StagedFile>> making_;
+  std::unique_ptr<StagedFile> staged_;
 };
 
 bool NothingThere(DWORD status) {
