@@ -24,10 +24,6 @@ bool IsLowSurrogate(char32_t unit) {
   return unit >= 0xDC00 && unit <= 0xDFFF;
 }
 
-bool IsDigit(char16_t unit) {
-  return unit >= u'0' && unit <= u'9';
-}
-
 // Writes each byte as the character of the same number; false when one is no ASCII, so that it is not one.
 bool WidenAscii(std::string_view bytes, char16_t* units) {
   // Blocks of a fixed length become a few vector instructions.
@@ -157,15 +153,20 @@ std::int32_t NumberFromText(TextView text) {
   return number;
 }
 
+double LeadingNumber(std::string_view utf8) {
+  // File sizes, which a listing has by the hundred thousand.
+  if (!utf8.empty() && utf8.size() <= 15 &&
+      std::ranges::all_of(utf8, [](char unit) { return unit >= '0' && unit <= '9'; })) {
+    std::int64_t whole = 0;
+    for (const char digit : utf8) whole = whole * 10 + (digit - '0');
+    return static_cast<double>(whole);
+  }
+  return LeadingNumber(TextFromUtf8(utf8).value());
+}
+
 double LeadingNumber(TextView text) {
   text = Trim(text);
   if (text.starts_with(u'+')) text.remove_prefix(1);
-  // File sizes, which a listing has by the hundred thousand.
-  if (!text.empty() && text.size() <= 15 && std::ranges::all_of(text, IsDigit)) {
-    std::int64_t whole = 0;
-    for (const char16_t digit : text) whole = whole * 10 + (digit - u'0');
-    return static_cast<double>(whole);
-  }
   // from_chars also reads "inf" and "nan", which no host takes for numbers.
   const std::string ascii = Ascii(text.substr(0, text.find_first_not_of(u"0123456789.eE+-")));
   double number = 0;

@@ -50,6 +50,8 @@ std::int32_t NumberFromText(TextView text);
 // The number at the start of `text`, with "." as the decimal point; 0 when there is none.
 // Throws run-time error 6 when it is outside the range of a double.
 double LeadingNumber(TextView text);
+// Of valid UTF-8.
+double LeadingNumber(std::string_view utf8);
 
 // The Boolean that `text` means: TRUE or FALSE in any letter case, or a number (0 is false).
 // Throws run-time error 13 when it is anything else.

@@ -122,7 +122,7 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
     RecordMaker maker(names->size());
     for (std::size_t i = 0; i < names->size(); ++i) {
       const auto file = maker.Next((*names)[i], ElementAt(*urls, i), ElementAt(*dates, i));
-      file->FileSize = LeadingNumber(TextFromUtf8(ElementAt(*sizes, i)).value());
+      file->FileSize = LeadingNumber(ElementAt(*sizes, i));
       colFiles(file);
     }
     listed = true;

@@ -6,7 +6,6 @@
 #include <array>
 #include <bit>
 #include <cstring>
-#include <optional>
 #include <utility>
 
 #include "base/RuntimeError.h"
@@ -39,11 +38,10 @@ constexpr unsigned FirstWithMeaning(std::uint64_t word) {
   return static_cast<unsigned>(std::countr_zero(found)) / 8;
 }
 
-// Unescapes at its place what stands from `from` to `end` or to the first '&', where `from` is then: it never
-// gets longer. nullopt when an escape is broken or the bytes are not UTF-8.
-std::optional<std::string_view> Unescape(char*& from, const char* end) {
-  char* const begin = from;
-  char* to = begin;
+// Unescapes what stands from `from` to `end` or to the first '&', where `from` is then, to `to`, at `from` or before:
+// it never gets longer. Returns where it ends; null when an escape is broken or the bytes are not UTF-8.
+char* Unescape(char*& from, const char* end, char* to) {
+  const char* const begin = to;
   std::uint64_t seen = 0;
   while (from != end) {
     // Eight at a time: the bytes of a long listing are most of the work.
@@ -64,10 +62,10 @@ std::optional<std::string_view> Unescape(char*& from, const char* end) {
     if (byte == '&') break;
     if (byte == '+') byte = ' ';
     if (byte == '%') {
-      if (end - from < 3) return std::nullopt;
+      if (end - from < 3) return nullptr;
       const int high = kHexDigits[static_cast<unsigned char>(from[1])];
       const int low = kHexDigits[static_cast<unsigned char>(from[2])];
-      if (high < 0 || low < 0) return std::nullopt;
+      if (high < 0 || low < 0) return nullptr;
       byte = static_cast<unsigned>(high * 16 + low);
       from += 2;
     }
@@ -75,10 +73,28 @@ std::optional<std::string_view> Unescape(char*& from, const char* end) {
     seen |= byte;
     *to++ = static_cast<char>(byte);
   }
-  const std::string_view bytes(begin, static_cast<std::size_t>(to - begin));
-  if ((seen & 0x8080'8080'8080'8080) != 0 && !utf8::is_valid(bytes)) return std::nullopt;
-  return bytes;
+  const bool ascii = (seen & 0x8080'8080'8080'8080) == 0;
+  return ascii || utf8::is_valid(std::string_view(begin, to)) ? to : nullptr;
 }
+
+// What the values of an array begin with, as it was sent and as it is meant: the addresses of a listing have their
+// folder, which is most of their bytes, and most of its bytes are escapes.
+struct Beginning {
+  std::string sent, meant;
+
+  // Of the array whose first value is at `from`: all through the last slash.
+  void Learn(const char* from, const char* end) {
+    const std::string_view value(from, std::find(from, end, '&'));
+    constexpr std::string_view kSlash = "%2F";
+    const std::size_t slash = value.rfind(kSlash);
+    sent = value.substr(0, slash == value.npos ? 0 : slash + kSlash.size());
+    meant = sent;
+    char* begin = meant.data();
+    const char* const stop = Unescape(begin, begin + meant.size(), begin);
+    if (!stop) return sent.clear();
+    meant.resize(static_cast<std::size_t>(stop - meant.data()));
+  }
+};
 
 }  // namespace
 
@@ -90,27 +106,40 @@ Reply Reply::FromBody(std::string body) {
   // Arrays come in a row, so the name seldom changes. Empty when the next one is to be looked up anyway.
   std::string_view lastName;
   Values* values = nullptr;
+  Beginning beginning;
   while (from != end) {
     if (*from == '&') {
       ++from;
       continue;
     }
     const std::string_view rest(from, end);
-    if (!lastName.empty() && rest.starts_with(lastName) && rest.substr(lastName.size()).starts_with('=')) {
+    const bool again =
+        !lastName.empty() && rest.starts_with(lastName) && rest.substr(lastName.size()).starts_with('=');
+    if (again) {
       from += lastName.size();
     } else {
       const std::size_t length = std::min(rest.find_first_of("=&"), rest.size());
-      const std::optional<std::string_view> name = Unescape(from, from + length);
-      if (!name) return {};
-      values = &reply.variables_[*name];
+      char* const begin = from;
+      const char* const stop = Unescape(from, from + length, from);
+      if (!stop) return {};
+      const std::string_view name(begin, stop);
+      values = &reply.variables_[name];
       if (reply.variables_.size() > kMostVariables) return {};
       // What had escapes is overwritten, and would pass for another name.
-      lastName = name->size() == length ? *name : std::string_view();
+      lastName = name.size() == length ? name : std::string_view();
     }
     if (from == end || *from == '&') continue;
-    const std::optional<std::string_view> value = Unescape(++from, end);
-    if (!value) return {};
-    values->push_back(*value);
+    char* const begin = ++from;
+    char* to = begin;
+    if (!again) {
+      beginning.Learn(from, end);
+    } else if (!beginning.sent.empty() && std::string_view(from, end).starts_with(beginning.sent)) {
+      to = std::copy(beginning.meant.begin(), beginning.meant.end(), to);
+      from += beginning.sent.size();
+    }
+    const char* const stop = Unescape(from, end, to);
+    if (!stop) return {};
+    values->emplace_back(begin, stop);
   }
   const auto error = reply.variables_.find("ErrorOccured");
   reply.failed_ = error != reply.variables_.end() && !error->second.empty() && error->second.front() == "1";
