@@ -6,6 +6,7 @@
 #include <array>
 #include <bit>
 #include <cstring>
+#include <limits>
 #include <utility>
 
 #include "base/RuntimeError.h"
@@ -99,6 +100,7 @@ struct Beginning {
 }  // namespace
 
 Reply Reply::FromBody(std::string body) {
+  if (body.size() > std::numeric_limits<std::uint32_t>::max()) return {};
   Reply reply;
   reply.body_.reset(new std::string(std::move(body)));
   char* from = reply.body_->data();
@@ -139,7 +141,8 @@ Reply Reply::FromBody(std::string body) {
     }
     const char* const stop = Unescape(from, end, to);
     if (!stop) return {};
-    values->emplace_back(begin, stop);
+    values->body_ = reply.body_->data();
+    values->places_.push_back({static_cast<std::uint32_t>(begin - values->body_), static_cast<std::uint32_t>(stop - begin)});
   }
   const auto error = reply.variables_.find("ErrorOccured");
   reply.failed_ = error != reply.variables_.end() && !error->second.empty() && error->second.front() == "1";

@@ -16,8 +16,26 @@ namespace tarnwick {
 
 class Reply {
  public:
-  // Valid UTF-8.
-  using Values = std::vector<std::string_view>;
+  // The values of one variable, in valid UTF-8; owned by the reply.
+  class Values {
+   public:
+    std::size_t size() const { return places_.size(); }
+    bool empty() const { return places_.empty(); }
+    // `index` is less than size().
+    std::string_view operator[](std::size_t index) const {
+      return {body_ + places_[index].begin, places_[index].length};
+    }
+    std::string_view front() const { return (*this)[0]; }
+
+   private:
+    friend class Reply;
+    // Half as long as a view: a long listing has four hundred thousand.
+    struct Place {
+      std::uint32_t begin, length;
+    };
+    const char* body_ = nullptr;
+    std::vector<Place> places_;
+  };
 
   // A failed exchange without variables.
   Reply() = default;
@@ -25,7 +43,7 @@ class Reply {
   Reply& operator=(Reply&&) = default;
 
   // Reads an `application/x-www-form-urlencoded` body in UTF-8. A broken escape or invalid UTF-8 anywhere
-  // makes the exchange a failed one, as do more than 1000 names, and a variable ErrorOccured of 1.
+  // makes the exchange a failed one, as do more than 1000 names, 4 GiB, and a variable ErrorOccured of 1.
   static Reply FromBody(std::string body);
 
   // 1 when the exchange failed, else 0.
@@ -48,8 +66,7 @@ class Reply {
     }
   };
 
-  // The body, in which names and values are unescaped where they stand, and which the views below point into:
-  // a listing has four of them for each file. Apart, because the bytes of a short string move with it.
+  // The body, in which names and values are unescaped where they stand, and which those below point into. Apart, because the bytes of a short string move with it.
   std::unique_ptr<std::string, WipingDelete> body_;
   std::unordered_map<std::string_view, Values, ProcessHash> variables_;
   bool failed_ = true;
