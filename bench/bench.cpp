@@ -152,12 +152,12 @@ void Run() {
       {"standard containers", [reply = ListingReply(kMany, 25)] { return PlainListingRun(reply, kMany); },
        kMany}};
   Measure(listings);
-  Row("listing reply, a file of 100,000", listings[0], "s", "<=600e-9",
-      "memory for a record and its four texts, unescaping, its key in the index");
+  // Both follow the machine, which takes twice as long at one time as at another. Where the peer takes 2.65
+  // us, this bound is 600 ns.
+  Row("listing reply, a file of 100,000", listings[0], listings[4], ">=4.4",
+      "page faults of fresh memory, a third of all samples; hashing and unescaping, a tenth each");
   Row("listing reply, a file of 100,000", listings[0], listings[1], "<=1.2",
       "an index that outgrows the processor's cache");
-  Row("listing reply, a file of 100,000", listings[0], listings[4], ">=2.0",
-      "page faults of fresh memory, nearly a third of all samples; hashing and unescaping, a tenth each");
   Row("listing reply, a byte, names of 200", listings[2], listings[3], "<=1.2",
       "none: a longer name spreads a record's fixed cost");
 }

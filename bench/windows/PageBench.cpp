@@ -196,8 +196,7 @@ void PageBench(const Account& account) {
   DeleteDC(memory);
   DeleteObject(bitmap);
   ReleaseDC(nullptr, screen);
-  Row("page of four 12-megapixel JPEGs", sides[0], sides[1],
-      BoundByProcessors(">=2.0", ">=1.4"),
+  Row("page of four 12-megapixel JPEGs", sides[0], sides[1], BoundByProcessors(">=2.0", ">=1.4"),
       "the decoder in windowscodecs, two thirds of all samples, and fresh memory for its pixels, a fifth; "
       "both have them");
   Row("the same, processors that were free", FreeProcessors(), "x", "", "other programs");

@@ -39,8 +39,9 @@ constexpr unsigned FirstWithMeaning(std::uint64_t word) {
   return static_cast<unsigned>(std::countr_zero(found)) / 8;
 }
 
-// Unescapes what stands from `from` to `end` or to the first '&', where `from` is then, to `to`, at `from` or before:
-// it never gets longer. Returns where it ends; null when an escape is broken or the bytes are not UTF-8.
+// Unescapes what stands from `from` to `end` or to the first '&', where `from` is then, to `to`, at `from` or
+// before: it never gets longer. Returns where it ends; null when an escape is broken or the bytes are not
+// UTF-8.
 char* Unescape(char*& from, const char* end, char* to) {
   const char* const begin = to;
   std::uint64_t seen = 0;
@@ -78,8 +79,8 @@ char* Unescape(char*& from, const char* end, char* to) {
   return ascii || utf8::is_valid(std::string_view(begin, to)) ? to : nullptr;
 }
 
-// What the values of an array begin with, as it was sent and as it is meant: the addresses of a listing have their
-// folder, which is most of their bytes, and most of its bytes are escapes.
+// What the values of an array begin with, as it was sent and as it is meant: the addresses of a listing have
+// their folder, which is most of their bytes, and most of its bytes are escapes.
 struct Beginning {
   std::string sent, meant;
 
@@ -142,7 +143,8 @@ Reply Reply::FromBody(std::string body) {
     const char* const stop = Unescape(from, end, to);
     if (!stop) return {};
     values->body_ = reply.body_->data();
-    values->places_.push_back({static_cast<std::uint32_t>(begin - values->body_), static_cast<std::uint32_t>(stop - begin)});
+    values->places_.push_back(
+        {static_cast<std::uint32_t>(begin - values->body_), static_cast<std::uint32_t>(stop - begin)});
   }
   const auto error = reply.variables_.find("ErrorOccured");
   reply.failed_ = error != reply.variables_.end() && !error->second.empty() && error->second.front() == "1";

@@ -66,7 +66,8 @@ class Reply {
     }
   };
 
-  // The body, in which names and values are unescaped where they stand, and which those below point into. Apart, because the bytes of a short string move with it.
+  // The body, in which names and values are unescaped where they stand, and which those below point into.
+  // Apart, because the bytes of a short string move with it.
   std::unique_ptr<std::string, WipingDelete> body_;
   std::unordered_map<std::string_view, Values, ProcessHash> variables_;
   bool failed_ = true;

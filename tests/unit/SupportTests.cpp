@@ -36,17 +36,20 @@ TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
 
 // The values of an array are read alike, whatever of its first one they begin with.
 TEST(Reply, UnescapesWhatValuesHaveInCommon) {
-  const std::pair<const char*, const char*> kValues[] = {
-      {"h%C3%A9%2Fa%26%2F%20b.jpg", "h\u00e9/a&/ b.jpg"}, {"h%C3%A9%2Fa%26%2F%C3%A9%26", "h\u00e9/a&/\u00e9&"},
-      {"h%C3%A9%2Fa%26%2F", "h\u00e9/a&/"},               {"h%C3%A9%2Fa%26%2", nullptr},
-      {"h%C3%A9%2Fa%26%2F\x80", nullptr},                 {"h%C3%A9%2Fb%2F+", "h\u00e9/b/ "},
-      {"", ""},                                           {"%%2F", nullptr},
-      {"%25%2F%2F", "%//"}};
+  const std::pair<const char*, const char*> kValues[] = {{"h%C3%A9%2Fa%26%2F%20b.jpg", "h\u00e9/a&/ b.jpg"},
+                                                         {"h%C3%A9%2Fa%26%2F%C3%A9%26", "h\u00e9/a&/\u00e9&"},
+                                                         {"h%C3%A9%2Fa%26%2F", "h\u00e9/a&/"},
+                                                         {"h%C3%A9%2Fa%26%2", nullptr},
+                                                         {"h%C3%A9%2Fa%26%2F\x80", nullptr},
+                                                         {"h%C3%A9%2Fb%2F+", "h\u00e9/b/ "},
+                                                         {"", ""},
+                                                         {"%%2F", nullptr},
+                                                         {"%25%2F%2F", "%//"}};
   for (const auto& [first, meantFirst] : kValues) {
     for (const auto& [second, meant] : kValues) {
       SCOPED_TRACE(std::string(first) + " " + second);
-      const Reply reply =
-          Reply::FromBody(std::string("A=").append(first).append("&A=").append(second).append("&B=").append(second));
+      const Reply reply = Reply::FromBody(
+          std::string("A=").append(first).append("&A=").append(second).append("&B=").append(second));
       ASSERT_EQ(reply.ErrorOccured(), meantFirst && meant ? 0 : 1);
       if (reply.ErrorOccured() != 0) continue;
       const Reply::Values& values = *reply.GetValueByVariableName(u"A");
