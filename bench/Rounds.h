@@ -28,7 +28,7 @@ struct Side {
 // so that a busy moment of the machine meets all alike.
 void Measure(std::vector<Side>& sides);
 
-// How many processors other programs left free in each round of the last Measure, between 1 and 2.
+// How many processors other programs left free in each round of the last Measure, about 1 to 2.
 Side FreeProcessors();
 // `two` if as a rule both were free then, else `one`: what work on two threads gains depends on that.
 const char* BoundByProcessors(const char* two, const char* one);
@@ -39,7 +39,7 @@ Side PerUnit(Side side, double units);
 // Prints a row. `bound` is ">=1.4" for times as fast as the peer, "<=1.4" for times the peer's cost, or ""
 // for a peer that is only shown. `rest` says what the remaining difference consists of.
 void Row(const std::string& what, const Side& ours, const Side& peer, const char* bound, const char* rest);
-// A figure of its own, in the unit "s" or "x". `bound` is "<=" and a figure.
+// A figure of its own, in the unit "s" or "x". `bound` is "<=" and a figure, or "".
 void Row(const std::string& what, const Side& ours, const char* unit, const char* bound, const char* rest);
 
 }  // namespace tarnwick::bench

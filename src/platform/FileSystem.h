@@ -74,8 +74,8 @@ class FileSystem {
   // is created empty. Throws 76 when its folder is missing, 75 on other failures, a locked file among them.
   virtual std::size_t ReadBeginning(TextView path, std::span<char> room) = 0;
 
-  // A file that will be at `path`. It is made while the caller goes on; when there cannot be one in that
-  // folder, the first call that needs it throws.
+  // A file that will be at `path`. It is made while the caller goes on: when there cannot be one in that
+  // folder, the first call that needs it throws 75. Throws 75 itself for what is no path.
   virtual std::unique_ptr<FileWriter> Create(TextView path) = 0;
 
   // Writes a file of these bytes where there is none, which takes fewer looks into its folder than Write.

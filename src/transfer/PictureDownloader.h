@@ -74,7 +74,7 @@ class PictureDownloader : public Downloader, private DownloadActions, private So
   Text explicitPath_;
   // The first of them.
   const Text& Target() const { return explicitPath_.empty() ? path_ : explicitPath_; }
-  // Of the file at `writerTarget_`; null when it cannot be written.
+  // Of the file that is to be at `writerTarget_`; null when there is none, or a write failed.
   std::unique_ptr<FileWriter> writer_;
   Text writerTarget_;
   // Whether a part of it was written, so that it is not in memory any more.

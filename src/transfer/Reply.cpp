@@ -79,12 +79,13 @@ char* Unescape(char*& from, const char* end, char* to) {
   return ascii || utf8::is_valid(std::string_view(begin, to)) ? to : nullptr;
 }
 
-// What the values of an array begin with, as it was sent and as it is meant: the addresses of a listing have
+// What values of an array begin with, as it was sent and as it is meant: the addresses of a listing have
 // their folder, which is most of their bytes, and most of its bytes are escapes.
 struct Beginning {
   std::string sent, meant;
 
-  // Of the array whose first value is at `from`: all through the last slash.
+  // Of an array with a value at `from`: all through its last slash. A single value, which may be a secret, is
+  // not copied.
   void Learn(const char* from, const char* end) {
     const std::string_view value(from, std::find(from, end, '&'));
     constexpr std::string_view kSlash = "%2F";
@@ -134,9 +135,9 @@ Reply Reply::FromBody(std::string body) {
     if (from == end || *from == '&') continue;
     char* const begin = ++from;
     char* to = begin;
-    if (!again) {
+    if (again && values->places_.size() == 1) {
       beginning.Learn(from, end);
-    } else if (!beginning.sent.empty() && std::string_view(from, end).starts_with(beginning.sent)) {
+    } else if (again && !beginning.sent.empty() && std::string_view(from, end).starts_with(beginning.sent)) {
       to = std::copy(beginning.meant.begin(), beginning.meant.end(), to);
       from += beginning.sent.size();
     }

@@ -43,7 +43,8 @@ class Reply {
   Reply& operator=(Reply&&) = default;
 
   // Reads an `application/x-www-form-urlencoded` body in UTF-8. A broken escape or invalid UTF-8 anywhere
-  // makes the exchange a failed one, as do more than 1000 names, 4 GiB, and a variable ErrorOccured of 1.
+  // makes the exchange a failed one, as do more than 1000 names, a body of 4 GiB, and a variable ErrorOccured
+  // of 1.
   static Reply FromBody(std::string body);
 
   // 1 when the exchange failed, else 0.

@@ -67,8 +67,8 @@ class Downloader {
   virtual ~Downloader() = default;
   // Whether a download of `url` can be attempted; otherwise Start fails at once.
   virtual bool CanStart(TextView url) const = 0;
-  // Begins to make the file that the next Start will write at `target`, if there is one: the caller may do
-  // something else that takes long meanwhile. Cancel takes it back. No download runs.
+  // Begins to make the file for the Start that follows with this target; the caller may do something slow
+  // meanwhile. Cancel drops it. Not while a download runs.
   virtual void Prepare(TextView target) = 0;
   // Begins to fetch the file at `url` into the user's folder, and to `explicitTarget` first unless that is
   // empty; ends a download that runs. Raises events, also the one of a failure, before it returns.

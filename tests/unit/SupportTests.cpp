@@ -34,7 +34,7 @@ TEST(Reply, ReadsArraysAndRefusesBrokenForms) {
   EXPECT_EQ(Reply::FromBody(names.substr(3)).ErrorOccured(), 0);
 }
 
-// The values of an array are read alike, whatever of its first one they begin with.
+// The values of an array are read alike, whatever of an earlier one they begin with.
 TEST(Reply, UnescapesWhatValuesHaveInCommon) {
   const std::pair<const char*, const char*> kValues[] = {{"h%C3%A9%2Fa%26%2F%20b.jpg", "h\u00e9/a&/ b.jpg"},
                                                          {"h%C3%A9%2Fa%26%2F%C3%A9%26", "h\u00e9/a&/\u00e9&"},
@@ -49,13 +49,13 @@ TEST(Reply, UnescapesWhatValuesHaveInCommon) {
     for (const auto& [second, meant] : kValues) {
       SCOPED_TRACE(std::string(first) + " " + second);
       const Reply reply = Reply::FromBody(
-          std::string("A=").append(first).append("&A=").append(second).append("&B=").append(second));
+          std::string("A=&A=").append(first).append("&A=").append(second).append("&B=").append(second));
       ASSERT_EQ(reply.ErrorOccured(), meantFirst && meant ? 0 : 1);
       if (reply.ErrorOccured() != 0) continue;
       const Reply::Values& values = *reply.GetValueByVariableName(u"A");
-      ASSERT_EQ(values.size(), 2U);
-      EXPECT_EQ(values[0], meantFirst);
-      EXPECT_EQ(values[1], meant);
+      ASSERT_EQ(values.size(), 3U);
+      EXPECT_EQ(values[1], meantFirst);
+      EXPECT_EQ(values[2], meant);
       EXPECT_EQ(reply.First(u"B"), TextFromUtf8(meant));
     }
   }

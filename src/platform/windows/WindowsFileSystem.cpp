@@ -3,7 +3,6 @@
 #include <algorithm>
 #include <array>
 #include <future>
-#include <new>
 #include <optional>
 #include <string>
 #include <utility>
@@ -75,15 +74,17 @@ class WindowsFileWriter : public FileWriter {
     const auto make = [made, path] {
       try {
         made->set_value(std::make_unique<StagedFile>(path));
-      } catch (const std::bad_alloc&) {
+      } catch (...) {
         made->set_exception(std::current_exception());
       }
     };
     if (!RunOnPool(make)) make();
   }
-  // What is not there yet goes as well, so that the caller can remove its folder.
+  // What is still being made goes before the return, so that the caller can remove its folder.
   ~WindowsFileWriter() override {
-    if (making_.valid()) making_.wait();
+    ResultAsItStood(0, [&](int&) {
+      if (making_.valid()) staged_ = making_.get();
+    });
   }
 
   void Write(std::string_view bytes) override {
