@@ -82,7 +82,7 @@ Side FreeProcessors() {
 const char* BoundByProcessors(const char* two, const char* one) {
   std::vector<double> sorted = freeProcessors;
   std::ranges::sort(sorted);
-  return sorted[sorted.size() / 2] > 1.7 ? two : one;
+  return sorted[sorted.size() / 2] > 1.4 ? two : one;
 }
 
 Side PerUnit(Side side, double units) {
