@@ -64,20 +64,16 @@ void RemoveFile(const std::wstring& path) {
 void RemoveLeftoversOnce(const std::wstring& folder) {
   static std::mutex lock;
   static std::set<std::wstring> folders;
-  // The current folder may be another one next time.
-  const wchar_t* const named = folder.empty() ? L"." : folder.c_str();
-  std::wstring full(GetFullPathNameW(named, 0, nullptr, nullptr), L'\0');
-  full.resize(GetFullPathNameW(named, static_cast<DWORD>(full.size()), full.data(), nullptr));
   const bool isNew = [&] {
     const std::lock_guard guard(lock);
-    return folders.insert(full).second;
+    return folders.insert(folder).second;
   }();
   if (isNew) StagedFile::RemoveLeftovers(folder);
 }
 
-// With its last separator. A path without a folder is in the current one; "C:name" keeps its drive.
-std::wstring FolderOf(const std::wstring& path) {
-  return path.substr(0, path.find_last_of(L"\\/:") + 1);
+// With its last separator.
+std::wstring FolderOf(const std::wstring& fullPath) {
+  return fullPath.substr(0, fullPath.find_last_of(L"\\/") + 1);
 }
 
 // Without a look-up of the old name, which takes longer than writing a small file.
@@ -92,10 +88,15 @@ bool Rename(HANDLE file, const std::wstring& name, bool replace) {
 
 }  // namespace
 
-StagedFile::StagedFile(const std::wstring& target) : StagedFile(target, FolderOf(target) + UniqueName()) {}
+std::wstring FullPath(const std::wstring& path) {
+  std::wstring full(GetFullPathNameW(path.c_str(), 0, nullptr, nullptr), L'\0');
+  full.resize(GetFullPathNameW(path.c_str(), static_cast<DWORD>(full.size()), full.data(), nullptr));
+  return full;
+}
 
-StagedFile::StagedFile(const std::wstring& target, const std::wstring& path) : target_(target), path_(path) {
-  RemoveLeftoversOnce(FolderOf(path));
+StagedFile::StagedFile(const std::wstring& target, Place place)
+    : target_(FullPath(target)), path_(place == Place::kTarget ? target_ : FolderOf(target_) + UniqueName()) {
+  RemoveLeftoversOnce(FolderOf(path_));
   file_ = Opened(path_, GENERIC_WRITE | DELETE, CREATE_NEW);
   if (file_)
     goesWhenClosed_ = SetGoesWhenClosed(file_.Get(), true);
@@ -109,7 +110,7 @@ StagedFile::~StagedFile() {
 }
 
 bool StagedFile::WriteNew(const std::wstring& target, std::string_view bytes) {
-  StagedFile file(target, target);
+  StagedFile file(target, Place::kTarget);
   if (!file.goesWhenClosed_ || !file.Write(bytes) || !file.Keep()) return false;
   file.path_.clear();
   return true;

@@ -9,11 +9,14 @@
 
 namespace tarnwick {
 
+// What the path names while the current folder is this one; empty when it is no path.
+std::wstring FullPath(const std::wstring& path);
+
 class StagedFile {
  public:
   // Creates an empty file of a name of its own in the folder of `target`. The first in a folder removes the
   // leftovers there.
-  explicit StagedFile(const std::wstring& target);
+  explicit StagedFile(const std::wstring& target) : StagedFile(target, Place::kBeside) {}
   ~StagedFile();
   StagedFile(const StagedFile&) = delete;
   StagedFile& operator=(const StagedFile&) = delete;
@@ -43,8 +46,8 @@ class StagedFile {
   static void RemoveLeftovers(const std::wstring& folder);
 
  private:
-  // Creates the file `path`.
-  StagedFile(const std::wstring& target, const std::wstring& path);
+  enum class Place { kBeside, kTarget };
+  StagedFile(const std::wstring& target, Place place);
   // The file stays when it is closed.
   bool Keep();
 

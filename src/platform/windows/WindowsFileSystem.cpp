@@ -178,7 +178,7 @@ std::size_t WindowsFileSystem::ReadBeginning(TextView path, std::span<char> room
 }
 
 std::unique_ptr<FileWriter> WindowsFileSystem::Create(TextView path) {
-  return std::make_unique<WindowsFileWriter>(WidePath(path, error::kPathAccess));
+  return std::make_unique<WindowsFileWriter>(FullPath(WidePath(path, error::kPathAccess)));
 }
 
 bool WindowsFileSystem::WriteNew(TextView path, std::string_view bytes) {

@@ -242,6 +242,16 @@ TEST_F(FilesTest, CopiesWholeOrNotAtAll) {
     }
   }
   VirtualFree(pages, 0, MEM_RELEASE);
+  // The current folder is another one before the file is whole.
+  std::array<wchar_t, MAX_PATH> before{};
+  GetCurrentDirectoryW(MAX_PATH, before.data());
+  SetCurrentDirectoryW(WideFromText(folder_).c_str());
+  std::unique_ptr<FileWriter> nearby = files_.Create(u"written");
+  SetCurrentDirectoryW(before.data());
+  nearby->Write("near");
+  nearby->Commit();
+  nearby.reset();
+  EXPECT_EQ(Read(u"written"), "near");
   // What was begun and given up has gone at once.
   std::size_t most = 0;
   for (int i = 0; i < 50; ++i) {
