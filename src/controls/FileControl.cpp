@@ -531,9 +531,9 @@ Text FileControl::DownLoadFileFromServer(TextView szLocalFilePath) {
     }
     if (std::exchange(gbConnectionFailed, false))
       return Fail(ftp_error::kAborted, u"gbConnectionFailed was set.");
-    // What is there would pass for the download: somebody has it open, or it is not to be changed.
     const bool starts = downloader_.CanStart(url);
     if (starts) downloader_.Prepare(target);
+    // What is there would pass for the download: somebody has it open, or it is not to be changed.
     const bool free = !starts || ResultAsItStood(false, [&](bool& done) {
       FileSystem& files = apartment_.platform.files;
       if (FileExists(files, target)) files.Remove(target);
