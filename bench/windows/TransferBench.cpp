@@ -215,7 +215,7 @@ void TransferBench(const Account& account, std::size_t largeBytes, int smallCoun
       "it");
   Row(what, many[0], many[4], "", "the copy, which the loop alone does not make");
   Row(what, many[0], many[5], "", "Wine and its server make hundreds of system calls for a file");
-  Row(what + " beside 3,000", many[1], many[3], BoundByProcessors(">=1.0", ">=0.6"),
+  Row(what + " beside 3,000", many[1], many[3], ">=1.0",
       "look-ups of names that are not there, of which Wine makes a listing of the folder each: two, and a "
       "third meanwhile on another processor, to the peer's one");
   Row("the same, processors that were free", FreeProcessors(), "x", "", "other programs");
