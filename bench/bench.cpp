@@ -94,7 +94,7 @@ Text PlainValue(const std::string& reply, std::size_t& from) {
     bytes += escape ? static_cast<char>(std::stoi(reply.substr(from + 1, 2), nullptr, 16)) : reply[from];
     if (escape) from += 2;
   }
-  return TextFromUtf8(bytes).value();
+  return TextFromWtf8(bytes);
 }
 
 // Of plain digits.

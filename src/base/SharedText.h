@@ -1,46 +1,46 @@
-// A text whose units stay where they were written, for as long as any text needs them.
+// A text whose bytes stay where they are, for as long as any text needs them.
 #pragma once
 
-#include <algorithm>
 #include <cstddef>
 #include <memory>
+#include <string>
+#include <string_view>
 #include <utility>
 
 #include "base/Text.h"
 
 namespace tarnwick {
 
-// Copies share the units, which never change: another text replaces them. Units of many texts may stand in
-// one block of memory, which then lives as long as the last of them.
+// Copies share the bytes, which never change: another text replaces them. Bytes of many texts may stand in
+// one block of memory, such as the reply with a listing, which then lives as long as the last of them. They
+// are WTF-8; each use as units makes a copy, because most texts of a listing are never used so.
 class SharedText {
  public:
   SharedText() = default;
-  // The units `text`, which `units` keeps.
-  SharedText(std::shared_ptr<const char16_t[]> units, TextView text)
-      : units_(std::move(units), text.data()), size_(text.size()) {}
+  // The text of `bytes`, which `owner` keeps.
+  SharedText(std::shared_ptr<const std::string> owner, std::string_view bytes)
+      : bytes_(std::move(owner), bytes.data()), size_(bytes.size()) {}
 
   // Throws std::bad_alloc; the text is then unchanged.
   SharedText& operator=(TextView text) {
-    auto units = std::make_shared_for_overwrite<char16_t[]>(text.size());
-    std::copy(text.begin(), text.end(), units.get());
-    units_ = std::move(units);
-    size_ = text.size();
-    return *this;
+    const auto bytes = std::make_shared<const std::string>(Wtf8FromText(text));
+    return *this = SharedText(bytes, *bytes);
   }
   void clear() { *this = SharedText(); }
 
-  // Where a text of the usual kind is wanted, this one is as good.
-  operator TextView() const { return {units_.get(), size_}; }
-  operator Text() const { return Text(TextView(*this)); }
-
+  operator Text() const { return TextFromWtf8(Bytes()); }
+  // Owned by this text and its copies.
+  std::string_view Bytes() const { return {bytes_.get(), size_}; }
+  explicit operator std::string_view() const { return Bytes(); }
   bool empty() const { return size_ == 0; }
+
   friend bool operator==(const SharedText& one, const SharedText& other) {
-    return TextView(one) == TextView(other);
+    return one.Bytes() == other.Bytes();
   }
-  friend bool operator==(const SharedText& one, TextView other) { return TextView(one) == other; }
+  friend bool operator==(const SharedText& one, TextView other) { return Text(one) == other; }
 
  private:
-  std::shared_ptr<const char16_t[]> units_;
+  std::shared_ptr<const char> bytes_;
   std::size_t size_ = 0;
 };
 

@@ -53,9 +53,8 @@ std::string Ascii(TextView text) {
   return ascii;
 }
 
-}  // namespace
-
-std::string Utf8FromText(TextView text) {
+// `loneSurrogate` is what stands for one; 0 for itself.
+std::string BytesOf(TextView text, char32_t loneSurrogate) {
   // Written in place: the library's appending forms take two to three times as long.
   std::string bytes(text.size() * 3, '\0');
   char* end = bytes.data();
@@ -64,8 +63,8 @@ std::string Utf8FromText(TextView text) {
     // The library refuses a text with a lone surrogate as a whole.
     if (IsHighSurrogate(point) && i + 1 < text.size() && IsLowSurrogate(text[i + 1])) {
       point = 0x10000 + ((point - 0xD800) << 10) + (text[++i] - char32_t{0xDC00});
-    } else if (IsHighSurrogate(point) || IsLowSurrogate(point)) {
-      point = kReplacement;
+    } else if (loneSurrogate != 0 && (IsHighSurrogate(point) || IsLowSurrogate(point))) {
+      point = loneSurrogate;
     }
     end = utf8::unchecked::append(point, end);
   }
@@ -73,17 +72,25 @@ std::string Utf8FromText(TextView text) {
   return bytes;
 }
 
-char16_t* WriteValidUtf8(std::string_view bytes, char16_t* units) {
-  // Most are.
-  if (WidenAscii(bytes, units)) return units + bytes.size();
-  return utf8::unchecked::utf8to16(bytes.begin(), bytes.end(), units);
+}  // namespace
+
+std::string Utf8FromText(TextView text) {
+  return BytesOf(text, kReplacement);
 }
 
 std::optional<Text> TextFromUtf8(std::string_view bytes) {
-  Text text(bytes.size(), u'\0');
-  // Most are, and need no check.
-  if (WidenAscii(bytes, text.data())) return text;
   if (!utf8::is_valid(bytes)) return std::nullopt;
+  return TextFromWtf8(bytes);
+}
+
+std::string Wtf8FromText(TextView text) {
+  return BytesOf(text, 0);
+}
+
+Text TextFromWtf8(std::string_view bytes) {
+  Text text(bytes.size(), u'\0');
+  // Most are ASCII.
+  if (WidenAscii(bytes, text.data())) return text;
   const char16_t* const end = utf8::unchecked::utf8to16(bytes.begin(), bytes.end(), text.data());
   text.resize(static_cast<std::size_t>(end - text.data()));
   return text;
@@ -161,7 +168,7 @@ double LeadingNumber(std::string_view utf8) {
     for (const char digit : utf8) whole = whole * 10 + (digit - '0');
     return static_cast<double>(whole);
   }
-  return LeadingNumber(TextFromUtf8(utf8).value());
+  return LeadingNumber(TextFromWtf8(utf8));
 }
 
 double LeadingNumber(TextView text) {

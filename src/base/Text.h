@@ -19,9 +19,10 @@ std::string Utf8FromText(TextView text);
 // Text of the UTF-8 `bytes`; nullopt when they are not valid UTF-8 (overlong forms and surrogates included).
 std::optional<Text> TextFromUtf8(std::string_view bytes);
 
-// Writes the text of `bytes`, valid UTF-8, at `units`, which have room for one unit a byte, and returns its
-// end.
-char16_t* WriteValidUtf8(std::string_view bytes, char16_t* units);
+// WTF-8 of any text, and the text of it: UTF-8 in which a lone surrogate stands like any other character, so
+// that nothing is lost. Every valid UTF-8 is WTF-8; no text has two forms.
+std::string Wtf8FromText(TextView text);
+Text TextFromWtf8(std::string_view bytes);
 
 // Each byte as the character of the same number (ISO 8859-1).
 Text TextFromLatin1(std::string_view bytes);

@@ -173,7 +173,8 @@ void FileControl::GetFileDetails(TextView FileName,
                                  const std::function<void(const std::shared_ptr<CUpload>&)>& colFiles) {
   ResultAsItStood(0, [&](int&) {
     const std::size_t position = listing_.all.PositionWhere([&](const CUpload& record) {
-      return record.FilePath == FileName || FileNameFromUrl(record.FilePath) == FileName;
+      const Text address = record.FilePath;
+      return address == FileName || FileNameFromUrl(address) == FileName;
     });
     if (position == 0) return;
     auto details = std::make_shared<CUpload>(*listing_.all.At(position));
@@ -373,7 +374,7 @@ FileRecord FileControl::RecordUploaded(const Text& path, const Text& url) {
   record->FileDate = GetLocalFileDate(files, path);
   copies_.FinishUpload(path, url);
   // An upload that replaced a file takes over its record.
-  FileRecord known = RecordNamed(record->FileName);
+  FileRecord known = RecordNamed(Text(record->FileName));
   if (const std::size_t position = listing_.all.PositionOf(url); !known && position != 0)
     known = listing_.all.At(position);
   if (known) {
@@ -496,7 +497,7 @@ bool FileControl::CheckIfFileDoesNotExist(TextView szFileName) const {
 
 FileRecord FileControl::RecordNamed(TextView name) const {
   const std::size_t position = listing_.all.PositionWhere(
-      [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), Trim(name)); });
+      [&](const CUpload& file) { return EqualsIgnoringCase(Trim(Text(file.FileName)), Trim(name)); });
   return position == 0 ? nullptr : listing_.all.At(position);
 }
 

@@ -18,7 +18,7 @@ Text LocalCopies::PathOf(TextView url) const {
 
 bool LocalCopies::Has(const CUpload& file) const {
   return ResultAsItStood(false, [&](bool& has) {
-    const Text copy = PathOf(file.FilePath);
+    const Text copy = PathOf(Text(file.FilePath));
     FileSystem& files = apartment_.platform.files;
     if (copy.empty() || !FileExists(files, copy)) return;
     // A size of 2 GiB and more is negative after an upload.

@@ -17,6 +17,9 @@ namespace {
 // As many as an upload may have.
 constexpr std::uint64_t kMostFileBytes = 0xFFFF'FFFF;
 
+// Records that share a block of memory: one for each would take much of a listing's time.
+constexpr std::size_t kBlockFiles = 64;
+
 // Makes a file a normal one as long as the object lives. Where that is not allowed, as on a medium that
 // cannot be written, the file stays as it is.
 class NormalAttributes {
@@ -48,60 +51,6 @@ std::string_view ElementAt(const Reply::Values& values, std::size_t index) {
   return values[index];
 }
 
-// Makes the records of a listing and their texts, many in one block of memory: otherwise the memory would
-// take most of the time. The blocks are short, because each of their records keeps them.
-class RecordMaker {
- public:
-  explicit RecordMaker(std::size_t files) : left_(files) {}
-
-  // There is one left. All arguments are valid UTF-8.
-  std::shared_ptr<CUpload> Next(std::string_view name, std::string_view url, std::string_view date) {
-    if (nextRecord_ == recordsEnd_) {
-      const std::size_t count = std::min(kBlockFiles, left_);
-      records_ = std::make_shared<CUpload[]>(count);
-      nextRecord_ = records_.get();
-      recordsEnd_ = nextRecord_ + count;
-    }
-    if (const std::size_t need = name.size() + url.size() + date.size(); need > room_) {
-      // The files that follow are likely to be much like this one.
-      room_ = std::max(need, std::min(kBlockUnits, need * left_));
-      units_ = std::make_shared_for_overwrite<char16_t[]>(room_);
-      end_ = units_.get();
-    }
-    // As a rule the address ends with the name, which then needs no units of its own.
-    const bool endsWithName = url.ends_with(name);
-    if (endsWithName) url.remove_suffix(name.size());
-    const TextView address = Write(url);
-    const TextView ownName = Write(name);
-    CUpload& record = *nextRecord_++;
-    record.FileName = {units_, ownName};
-    record.FilePath = {units_, {address.data(), address.size() + (endsWithName ? ownName.size() : 0)}};
-    record.FileDate = {units_, Write(date)};
-    --left_;
-    return {records_, &record};
-  }
-
- private:
-  static constexpr std::size_t kBlockFiles = 64;
-  static constexpr std::size_t kBlockUnits = 8192;
-
-  TextView Write(std::string_view bytes) {
-    const char16_t* const begin = end_;
-    end_ = WriteValidUtf8(bytes, end_);
-    const TextView text(begin, end_);
-    room_ -= text.size();
-    return text;
-  }
-
-  std::size_t left_;
-  std::shared_ptr<CUpload[]> records_;
-  CUpload* nextRecord_ = nullptr;
-  CUpload* recordsEnd_ = nullptr;
-  std::shared_ptr<char16_t[]> units_;
-  char16_t* end_ = nullptr;
-  std::size_t room_ = 0;
-};
-
 }  // namespace
 
 bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
@@ -119,9 +68,14 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
     const Reply::Values* dates = reply.GetValueByVariableName(u"FileDate");
     // An account without files has them all, empty.
     if (!names || !urls || !sizes || !dates) return;
-    RecordMaker maker(names->size());
+    std::shared_ptr<CUpload[]> block;
     for (std::size_t i = 0; i < names->size(); ++i) {
-      const auto file = maker.Next((*names)[i], ElementAt(*urls, i), ElementAt(*dates, i));
+      const std::size_t inBlock = i % kBlockFiles;
+      if (inBlock == 0) block = std::make_shared<CUpload[]>(std::min(kBlockFiles, names->size() - i));
+      const std::shared_ptr<CUpload> file(block, &block[inBlock]);
+      file->FileName = reply.Shared((*names)[i]);
+      file->FilePath = reply.Shared(ElementAt(*urls, i));
+      file->FileDate = reply.Shared(ElementAt(*dates, i));
       file->FileSize = LeadingNumber(ElementAt(*sizes, i));
       colFiles(file);
     }

@@ -27,7 +27,8 @@ class FileList {
   // Throws run-time error 9 when `position` is not 1 to Count().
   const FileRecord& At(std::size_t position) const;
   // Null when there is none. Costs the same whatever the length of the list is; PositionOf walks through it.
-  const CUpload* Find(TextView address) const { return address.empty() ? nullptr : addresses_.Find(address); }
+  const CUpload* Find(TextView address) const { return FindBytes(Wtf8FromText(address)); }
+  const CUpload* Find(const SharedText& address) const { return FindBytes(address.Bytes()); }
   // 0 when there is none.
   std::size_t PositionOf(TextView address) const;
   // Position of the first record for which `matches` is true, 0 when there is none.
@@ -49,6 +50,9 @@ class FileList {
  private:
   friend struct Listing;
 
+  const CUpload* FindBytes(std::string_view address) const {
+    return address.empty() ? nullptr : addresses_.Find(address);
+  }
   bool Holds(const CUpload& record) const;
   // Puts the record into the index of addresses, unless its own is empty or is there already.
   void Index(const CUpload& record);
@@ -56,7 +60,7 @@ class FileList {
   void Unindex(const CUpload& record);
 
   std::vector<FileRecord> records_;
-  KeyIndex<const CUpload, &CUpload::FilePath> addresses_;
+  KeyIndex<const CUpload, &CUpload::FilePath, std::string_view> addresses_;
 };
 
 }  // namespace tarnwick

@@ -14,8 +14,9 @@ Text Listing::AddressLike(const Text& address) const {
   // Every address contains an empty text, which a file has that the service listed without one.
   if (address.empty()) return {};
   if (all.Find(address)) return address;
+  const std::string part = Wtf8FromText(address);
   const std::size_t position = all.PositionWhere(
-      [&](const CUpload& record) { return TextView(record.FilePath).find(address) != Text::npos; });
+      [&](const CUpload& record) { return record.FilePath.Bytes().find(part) != std::string_view::npos; });
   return position == 0 ? Text() : all.At(position)->FilePath;
 }
 

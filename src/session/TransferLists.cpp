@@ -13,7 +13,7 @@ bool RemoveFirst(FileList& list, MessagePump& pump, TextView name, bool yieldPer
   for (std::size_t i = 1; i <= std::min(count, list.Count()); ++i) {
     const FileRecord record = list.At(i);
     if (yieldPerItem) pump.Yield();
-    if (Trim(record->FileName) != name) continue;
+    if (Trim(Text(record->FileName)) != name) continue;
     pump.Yield();
     // The list may have moved while messages were handled; what goes is the record that matched.
     for (std::size_t at = 1; at <= list.Count(); ++at) {

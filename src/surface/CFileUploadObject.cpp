@@ -106,7 +106,7 @@ STDMETHODIMP CFileUploadObject::ListFilesForUser(IDispatch** colFiles, VARIANT_B
     const HostCollection collection(colFiles);
     return client_->ListFilesForUser([&](const std::shared_ptr<CUpload>& file) {
       const auto object = ComPtr<CUploadObject>::Adopt(new CUploadObject(file));
-      collection.Add(object.Get(), file->FilePath);
+      collection.Add(object.Get(), Text(file->FilePath));
     });
   });
 }

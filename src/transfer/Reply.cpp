@@ -10,6 +10,7 @@
 #include <utility>
 
 #include "base/RuntimeError.h"
+#include "base/Secret.h"
 
 namespace tarnwick {
 namespace {
@@ -39,11 +40,13 @@ constexpr unsigned FirstWithMeaning(std::uint64_t word) {
   return static_cast<unsigned>(std::countr_zero(found)) / 8;
 }
 
-// Unescapes what stands from `from` to `end` or to the first '&', where `from` is then, to `to`, at `from` or
-// before: it never gets longer. Returns where it ends; null when an escape is broken or the bytes are not
-// UTF-8.
-char* Unescape(char*& from, const char* end, char* to) {
+// Unescapes what stands from `source` to `end` or to the first '&', where `source` is then, to `to`, at
+// `source` or before: it never gets longer. Returns where it ends; null when an escape is broken or the bytes
+// are not UTF-8.
+char* Unescape(char*& source, const char* end, char* to) {
   const char* const begin = to;
+  // What is written to characters may be anywhere, `source` too, but not in a register.
+  char* from = source;
   std::uint64_t seen = 0;
   while (from != end) {
     // Eight at a time: the bytes of a long listing are most of the work.
@@ -51,14 +54,21 @@ char* Unescape(char*& from, const char* end, char* to) {
       std::uint64_t word = 0;
       std::memcpy(&word, from, sizeof word);
       const unsigned plain = FirstWithMeaning(word);
-      // What this writes too much was read before, or stays as it is.
-      if (plain == 8 || from == to || from - to >= 8) {
+      if (plain == 8) {
         std::memcpy(to, &word, sizeof word);
-        seen |= plain == 8 ? word : word & ~(~std::uint64_t{0} << (8 * plain));
-        from += plain;
-        to += plain;
-        if (plain == 8) continue;
+        seen |= word;
+        from += 8;
+        to += 8;
+        continue;
       }
+      // Those before the meaning, and behind them what is not read yet and must stay as it is.
+      const std::uint64_t rest = ~std::uint64_t{0} << (8 * plain);
+      const unsigned half = 4 * static_cast<unsigned>(std::min<std::ptrdiff_t>(from - to, 8));
+      const std::uint64_t written = (word & ~rest) | (((word << half) << half) & rest);
+      std::memcpy(to, &written, sizeof written);
+      seen |= word & ~rest;
+      from += plain;
+      to += plain;
     }
     unsigned byte = static_cast<unsigned char>(*from);
     if (byte == '&') break;
@@ -75,6 +85,7 @@ char* Unescape(char*& from, const char* end, char* to) {
     seen |= byte;
     *to++ = static_cast<char>(byte);
   }
+  source = from;
   const bool ascii = (seen & 0x8080'8080'8080'8080) == 0;
   return ascii || utf8::is_valid(std::string_view(begin, to)) ? to : nullptr;
 }
@@ -99,14 +110,22 @@ struct Beginning {
   }
 };
 
+// Some replies tell a user's key; long ones list files.
+void WipeAndDelete(std::string* body) noexcept {
+  constexpr std::size_t kLong = 64 * 1024;
+  if (body->size() < kLong) Wipe(*body);
+  delete body;
+}
+
 }  // namespace
 
 Reply Reply::FromBody(std::string body) {
   if (body.size() > std::numeric_limits<std::uint32_t>::max()) return {};
+  const std::shared_ptr<std::string> bytes(new std::string(std::move(body)), WipeAndDelete);
   Reply reply;
-  reply.body_.reset(new std::string(std::move(body)));
-  char* from = reply.body_->data();
-  char* const end = from + reply.body_->size() - (reply.body_->ends_with("\r\n") ? 2 : 0);
+  reply.body_ = bytes;
+  char* from = bytes->data();
+  char* const end = from + bytes->size() - (bytes->ends_with("\r\n") ? 2 : 0);
   // Arrays come in a row, so the name seldom changes. Empty when the next one is to be looked up anyway.
   std::string_view lastName;
   Values* values = nullptr;
@@ -143,7 +162,7 @@ Reply Reply::FromBody(std::string body) {
     }
     const char* const stop = Unescape(from, end, to);
     if (!stop) return {};
-    values->body_ = reply.body_->data();
+    values->body_ = bytes->data();
     values->places_.push_back(
         {static_cast<std::uint32_t>(begin - values->body_), static_cast<std::uint32_t>(stop - begin)});
   }
@@ -160,7 +179,7 @@ const Reply::Values* Reply::GetValueByVariableName(TextView name) const {
 Text Reply::First(TextView name) const {
   const Values* values = GetValueByVariableName(name);
   if (!values || values->empty()) throw RuntimeError(error::kSubscriptOutOfRange);
-  return TextFromUtf8(values->front()).value();
+  return TextFromWtf8(values->front());
 }
 
 }  // namespace tarnwick

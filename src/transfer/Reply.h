@@ -9,7 +9,7 @@
 #include <vector>
 
 #include "base/KeyHash.h"
-#include "base/Secret.h"
+#include "base/SharedText.h"
 #include "base/Text.h"
 
 namespace tarnwick {
@@ -54,22 +54,15 @@ class Reply {
   // Null when the name did not occur. Owned by the reply.
   const Values* GetValueByVariableName(TextView name) const;
 
+  // A text that keeps the reply's bytes, of which `value` is a part.
+  SharedText Shared(std::string_view value) const { return {body_, value}; }
+
   // Element 0 of the above. Throws run-time error 9 when there is none.
   Text First(TextView name) const;
 
  private:
-  // Some replies tell a user's key; long ones list files.
-  struct WipingDelete {
-    void operator()(std::string* body) const noexcept {
-      constexpr std::size_t kLong = 64 * 1024;
-      if (body->size() < kLong) Wipe(*body);
-      delete body;
-    }
-  };
-
   // The body, in which names and values are unescaped where they stand, and which those below point into.
-  // Apart, because the bytes of a short string move with it.
-  std::unique_ptr<std::string, WipingDelete> body_;
+  std::shared_ptr<const std::string> body_;
   std::unordered_map<std::string_view, Values, ProcessHash> variables_;
   bool failed_ = true;
 };

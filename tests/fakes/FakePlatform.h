@@ -35,7 +35,7 @@ std::int32_t ErrorOf(const Call& call) {
 
 inline std::string NamesOf(const FileList& files) {
   std::string names;
-  for (std::size_t i = 1; i <= files.Count(); ++i) names += Utf8FromText(files.At(i)->FileName) + ",";
+  for (std::size_t i = 1; i <= files.Count(); ++i) names += Utf8FromText(Text(files.At(i)->FileName)) + ",";
   return names;
 }
 

@@ -28,6 +28,24 @@ TEST(KeyedHash, IsSipHash13AndCollidesForOneKeyAlone) {
   EXPECT_GT(places[1].size(), 70U);
 }
 
+// Hosts' texts may be no valid UTF-16.
+TEST(FileList, FindsEveryAddress) {
+  const Text addresses[] = {u"a", u"\u00e9\u20ac", u"\xD83D\xDE00", u"\xD83D", u"\xDE00\xD83D", u"\xFFFD"};
+  FileList list;
+  for (const Text& address : addresses) {
+    const auto record = std::make_shared<CUpload>();
+    record->FilePath = address;
+    EXPECT_EQ(record->FilePath, address);
+    list.Add(record);
+  }
+  for (const Text& address : addresses) {
+    const CUpload* const found = list.Find(address);
+    EXPECT_TRUE(found && Text(found->FilePath) == address) << Utf8FromText(address);
+    EXPECT_FALSE(list.Find(address + u"b"));
+  }
+  EXPECT_FALSE(list.Find(u""));
+}
+
 TEST(KeyedList, KeepsOrderAndUniqueKeys) {
   KeyedList<int> list;
   list.Add(1, u"one");

@@ -25,10 +25,10 @@ constexpr ItemPicture kGifPicture{2, 4};
 constexpr ItemPicture kJpegPicture{4, 5};
 
 bool IsGif(const CUpload& record) {
-  return EndsWithIgnoringCase(record.FileName, u"gif");
+  return EndsWithIgnoringCase(Text(record.FileName), u"gif");
 }
 bool IsJpg(const CUpload& record) {
-  return EndsWithIgnoringCase(record.FileName, u"jpg");
+  return EndsWithIgnoringCase(Text(record.FileName), u"jpg");
 }
 
 }  // namespace
@@ -89,7 +89,7 @@ void ctrlListImage::ChangeFileFilter(TextView szFileFilter) {
     if (!reselect_ || items_.empty()) return;
     std::size_t again = 0;
     for (std::size_t i = 0; i < items_.size(); ++i) {
-      if (!EqualsIgnoringCase(items_[i].record->FileName, previous)) continue;
+      if (!EqualsIgnoringCase(Text(items_[i].record->FileName), previous)) continue;
       again = i;
       break;
     }
@@ -175,14 +175,14 @@ ItemPicture ctrlListImage::PictureOf(std::size_t index) const {
   if (index >= items_.size()) return kJpegPicture;
   const Text filter = LowerCase(currentFilter_);
   const bool gif =
-      filter == u"gif" || (filter != u"jpg" && EndsWithIgnoringCase(items_[index].record->FileName, u".gif"));
+      filter == u"gif" || (filter != u"jpg" && EndsWithIgnoringCase(Text(items_[index].record->FileName), u".gif"));
   return gif ? kGifPicture : kJpegPicture;
 }
 
 std::optional<std::size_t> ctrlListImage::FindItem(TextView prefix, std::size_t start) const {
   for (std::size_t step = 0; step < items_.size(); ++step) {
     const std::size_t at = (start + step) % items_.size();
-    if (StartsWithIgnoringCase(items_[at].record->FileName, prefix)) return at;
+    if (StartsWithIgnoringCase(Text(items_[at].record->FileName), prefix)) return at;
   }
   return std::nullopt;
 }

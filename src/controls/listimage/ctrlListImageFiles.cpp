@@ -11,26 +11,27 @@ namespace tarnwick {
 
 bool ctrlListImage::ShowsFile(TextView name) const {
   return std::ranges::any_of(
-      items_, [&](const Item& item) { return EqualsIgnoringCase(item.record->FileName, name); });
+      items_, [&](const Item& item) { return EqualsIgnoringCase(Text(item.record->FileName), name); });
 }
 
 void ctrlListImage::ShowUploaded(const FileRecord& record) {
   if (items_.empty()) NoteAccount();
   // What is shown are still another user's files.
   if (ShowsOtherAccount()) return;
+  const Text name = record->FileName;
   const auto same = std::ranges::find_if(items_, [&](const Item& item) {
-    return item.record == record || EqualsIgnoringCase(item.record->FileName, record->FileName);
+    return item.record == record || EqualsIgnoringCase(Text(item.record->FileName), name);
   });
   if (same != items_.end()) {
     *same = {record, true};
     view_.RefreshItem(static_cast<std::size_t>(same - items_.begin()));
-  } else if (ShowsWhenUploaded(record->FileName)) {
+  } else if (ShowsWhenUploaded(name)) {
     items_.push_back({record, true});
     view_.AppendItem();
   }
   reselect_ = true;
   ShowListOrLabel();
-  UploadedFileSetFocus(record->FileName);
+  UploadedFileSetFocus(name);
 }
 
 // --- Delete ---
@@ -92,7 +93,7 @@ void ctrlListImage::DeleteSelected() {
     if (!client) return;
     const FileRecord record = items_[i].record;
     if (DeleteOnServer(*client, *record)) {
-      position = RemoveRecord(record->FileName, position);
+      position = RemoveRecord(Text(record->FileName), position);
       Raise(event::kDeleted);
       RaiseCurrentItem();
     }
@@ -106,7 +107,7 @@ std::size_t ctrlListImage::RemoveRecord(TextView name, std::size_t from) {
   const std::size_t count = all.Count();
   for (std::size_t step = 0; step < count; ++step) {
     const std::size_t position = (from - 1 + step) % count + 1;
-    if (Trim(all.At(position)->FileName) != Trim(name)) continue;
+    if (Trim(Text(all.At(position)->FileName)) != Trim(name)) continue;
     all.Remove(position);
     return position;
   }

@@ -32,12 +32,12 @@ Text FormatLabelText(TextView name) {
 }
 
 Text FormatTip(const CUpload& file) {
-  Text tip = ShownName(file.FileName);
+  Text tip = ShownName(Text(file.FileName));
   // What is 2 GiB and more has a negative size after an upload.
   if (file.FileSize >= 0)
     tip +=
         u"\r\n" + SizeText(file.FileSize) + u" Bytes (" + TextFromNumber(Kilobytes(file.FileSize)) + u" KB)";
-  if (!TextView(file.FileDate).empty()) tip += u"\r\n" + ShownName(file.FileDate);
+  if (!file.FileDate.empty()) tip += u"\r\n" + ShownName(Text(file.FileDate));
   return tip;
 }
 
@@ -101,7 +101,7 @@ void ctrlThumbNailView::Show(const Text& filter) {
   listing_.filter = filter;
   // A second file of the same address is not shown.
   for (const FileRecord& record : listing_.all)
-    if (Passes(record->FileName) && !shown.Find(record->FilePath)) shown.Add(record);
+    if (Passes(Text(record->FileName)) && !shown.Find(record->FilePath)) shown.Add(record);
   // What is selected is on the first page.
   keepSelection_ = false;
   const std::size_t selected = shown.PositionOf(selectedAddress_);
@@ -199,15 +199,15 @@ bool ctrlThumbNailView::FillSlot(int slot, const CUpload& record) {
   FileSystem& files = apartment_.platform.files;
   page_.SetTip(slot, FormatTip(record));
   // Another user's folder is none for these pictures.
-  Text copy = ShowsOtherAccount() ? Text() : copies_.PathOf(record.FilePath);
+  Text copy = ShowsOtherAccount() ? Text() : copies_.PathOf(Text(record.FilePath));
   // Once more when the file was changed in the account meanwhile; not when it was deleted.
   for (int tries = 0; tries < 2 && !copy.empty() && !copies_.Has(record); ++tries) {
     const std::uint32_t changes = apartment_.ChangesOfCopy(copy);
     if (!Fetch(slot, record, copy)) return false;
     if (apartment_.ChangesOfCopy(copy) == changes || !listing_.all.Find(record.FilePath)) break;
-    copy = copies_.PathOf(record.FilePath);
+    copy = copies_.PathOf(Text(record.FilePath));
   }
-  page_.SetCaption(slot, FormatLabelText(record.FileName));
+  page_.SetCaption(slot, FormatLabelText(Text(record.FileName)));
   AddressOf(slot) = record.FilePath;
   // A picture that cannot be shown leaves the caption and an empty square. It may be a file of another kind,
   // or what came in place of the picture or of a part of it, for which the next page with it asks again.
@@ -233,7 +233,7 @@ bool ctrlThumbNailView::Fetch(int slot, const CUpload& record, const Text& copy)
     return !IsReplaced();
   }
   if (IsReplaced()) return false;
-  page_.SetCaption(slot, u"Downloading " + ReplaceAll(record.FileName, u"&", u"&&"));
+  page_.SetCaption(slot, u"Downloading " + ReplaceAll(Text(record.FileName), u"&", u"&&"));
   const bool again = FileExists(apartment_.platform.files, copy);
   Download(Text(record.FilePath), {}, copy, [this] { return IsReplaced(); });
   if (IsReplaced()) return false;
@@ -257,12 +257,12 @@ bool ctrlThumbNailView::ShowPicture(int slot, const Text& copy) {
 void ctrlThumbNailView::OnPictureUnreadable(int slot) {
   const CUpload* record = listing_.shown.Find(AddressOf(slot));
   if (record && !ShowsOtherAccount())
-    copies_.RemoveUnless(copies_.PathOf(record->FilePath), record->FileSize);
+    copies_.RemoveUnless(copies_.PathOf(Text(record->FilePath)), record->FileSize);
 }
 
 Text ctrlThumbNailView::NameOf(int slot) const {
   const CUpload* record = listing_.shown.Find(AddressOf(slot));
-  return Text(record ? record->FileName : FileNameFromUrl(AddressOf(slot)));
+  return record ? Text(record->FileName) : Text(FileNameFromUrl(AddressOf(slot)));
 }
 
 Text ctrlThumbNailView::PlaceOfPage() const {

@@ -69,7 +69,7 @@ FileRecord ctrlThumbNailView::SelectedRecord() const {
 
 bool ctrlThumbNailView::ShowsFile(TextView name) const {
   return listing_.shown.PositionWhere(
-             [&](const CUpload& file) { return EqualsIgnoringCase(file.FileName, name); }) != 0;
+             [&](const CUpload& file) { return EqualsIgnoringCase(Text(file.FileName), name); }) != 0;
 }
 
 void ctrlThumbNailView::UploadedFileSetFocus(TextView szFileName) {
@@ -96,13 +96,14 @@ void ctrlThumbNailView::ShowUploaded(const FileRecord& record) {
   FileList& shown = listing_.shown;
   if (shown.IsEmpty()) NoteAccount();
   if (ShowsOtherAccount()) return;
+  const Text name = record->FileName;
   // The shown record may be one of an older listing.
   std::size_t position = shown.PositionWhere([&](const CUpload& file) {
-    return &file == record.get() || EqualsIgnoringCase(file.FileName, record->FileName);
+    return &file == record.get() || EqualsIgnoringCase(Text(file.FileName), name);
   });
   if (position != 0) {
     shown.Remove(position);
-  } else if (Passes(record->FileName)) {
+  } else if (Passes(name)) {
     position = shown.Count() + 1;
   }
   if (position == 0) return;
@@ -128,7 +129,7 @@ void ctrlThumbNailView::DeleteFile() {
     deleteRuns_ = true;
     const bool deleted = ResultAsItStood(false, [&](bool& gone) {
       gone = DeleteOnServer(*client, *record);
-      if (gone) RemoveFromTransferLists(apartment_, record->FileName);
+      if (gone) RemoveFromTransferLists(apartment_, Text(record->FileName));
     });
     deleteRuns_ = false;
     if (!deleted) return;
@@ -200,7 +201,7 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
     // The caption may show what was typed, such as the name without its extension.
     if (NewString == oldName) return keepName(event::kRenamed);
     if (listing_.shown.PositionWhere(
-            [&](const CUpload& file) { return EqualsIgnoringCase(Trim(file.FileName), NewString); }) != 0) {
+            [&](const CUpload& file) { return EqualsIgnoringCase(Trim(Text(file.FileName)), NewString); }) != 0) {
       Fail(ftp_error::kNameNotAllowed, u"The account has a file of that name.");
       return keepName(event::kNameTaken);
     }
