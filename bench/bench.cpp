@@ -160,11 +160,11 @@ void Run() {
        kMany}};
   Measure(listings);
   Row("listing reply, a file of 100,000", listings[0], "s", "<=600e-9",
-      "memory for a record and its four texts, unescaping, its key in the index");
-  // Both times follow the machine, which takes twice as long at one time as at another. Where the peer
-  // takes 2.4 us, this bound is the one before.
+      "unescaping, memory for a record, its key in the index");
+  // The time follows the machine, which takes twice as long at one time as at another; this does not.
   Row("listing reply, a file of 100,000", listings[0], listings[4], ">=4.0",
-      "page faults of fresh memory, a third of all samples; hashing and unescaping, a tenth each");
+      "the peer copies and widens every text; here unescaping is a sixth of all samples, fresh memory a fifth, "
+      "the index a fifth");
   Row("listing reply, a file of 100,000", listings[0], listings[1], "<=1.2",
       "an index that outgrows the processor's cache");
   Row("listing reply, a byte, names of 200", listings[2], listings[3], "<=1.2",
