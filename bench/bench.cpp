@@ -163,7 +163,8 @@ void Run() {
       "unescaping, memory for a record, its key in the index");
   // The time follows the machine, which takes twice as long at one time as at another; this does not.
   Row("listing reply, a file of 100,000", listings[0], listings[4], ">=4.0",
-      "the peer copies and widens every text; here unescaping is a sixth of all samples, fresh memory a fifth, "
+      "the peer copies and widens every text; here unescaping is a sixth of all samples, fresh memory a "
+      "fifth, "
       "the index a fifth");
   Row("listing reply, a file of 100,000", listings[0], listings[1], "<=1.2",
       "an index that outgrows the processor's cache");

@@ -291,7 +291,7 @@ void ListBench(const Account& shown, const Account& all, const std::array<Accoun
   Row("Init, a file of 100,000", inits[0], inits[1], "<=1.5",
       "the server's work is most of both; then records, their keys, the painting");
   Row("Init, a file of 100,000, replayed answer", inits[2], inits[3], "",
-      "a record with four texts and its key for each file, and the painting");
+      "a record and its key for each file, and the painting");
   Row("Init, a file of 100,000, replayed answer", inits[2], inits[4], "<=1.2",
       "the painting, whatever the number of files");
 

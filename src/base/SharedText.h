@@ -1,6 +1,7 @@
 // A text whose bytes stay where they are, for as long as any text needs them.
 #pragma once
 
+#include <algorithm>
 #include <cstddef>
 #include <memory>
 #include <string>
@@ -37,7 +38,14 @@ class SharedText {
   friend bool operator==(const SharedText& one, const SharedText& other) {
     return one.Bytes() == other.Bytes();
   }
-  friend bool operator==(const SharedText& one, TextView other) { return Text(one) == other; }
+  friend bool operator==(const SharedText& one, TextView other) {
+    const std::string_view bytes = one.Bytes();
+    const auto same = [](char byte, char16_t unit) { return unit < 0x80 && byte == static_cast<char>(unit); };
+    const auto [byte, unit] = std::mismatch(bytes.begin(), bytes.end(), other.begin(), other.end(), same);
+    if (byte == bytes.end() || unit == other.end()) return byte == bytes.end() && unit == other.end();
+    // No units are made for most names of a list that is searched.
+    return *unit >= 0x80 && Text(one) == other;
+  }
 
  private:
   std::shared_ptr<const char> bytes_;

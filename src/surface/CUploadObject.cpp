@@ -16,19 +16,19 @@ void* CUploadObject::FindInterface(REFIID interfaceId) {
 }
 
 STDMETHODIMP CUploadObject::get_FileName(BSTR* value) {
-  return AnsweredText(value, [&] { return Text(record_->FileName); });
+  return GetText(record_->FileName, value);
 }
 STDMETHODIMP CUploadObject::put_FileName(BSTR value) {
   return PutText(record_->FileName, value);
 }
 STDMETHODIMP CUploadObject::get_FileDate(BSTR* value) {
-  return AnsweredText(value, [&] { return Text(record_->FileDate); });
+  return GetText(record_->FileDate, value);
 }
 STDMETHODIMP CUploadObject::put_FileDate(BSTR value) {
   return PutText(record_->FileDate, value);
 }
 STDMETHODIMP CUploadObject::get_FilePath(BSTR* value) {
-  return AnsweredText(value, [&] { return Text(record_->FilePath); });
+  return GetText(record_->FilePath, value);
 }
 STDMETHODIMP CUploadObject::put_FilePath(BSTR value) {
   return PutText(record_->FilePath, value);

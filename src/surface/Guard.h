@@ -59,11 +59,12 @@ HRESULT Done(Body&& body) noexcept {
 }
 
 // The two methods of a text property that is nothing but `text`.
-inline HRESULT GetText(TextView text, BSTR* value) noexcept {
+template <typename AnyText>
+HRESULT GetText(const AnyText& text, BSTR* value) noexcept {
   if (!value) return E_POINTER;
   *value = nullptr;
   return Guarded([&] {
-    *value = NewBstr(text);
+    *value = NewBstr(Text(text));
     return S_OK;
   });
 }

@@ -136,7 +136,8 @@ TEST_F(CFileUploadTest, ListedRecordsStandAlone) {
   std::string reply;
   Text expected;
   for (int i = 0; i < 150; ++i) {
-    const std::string name = std::string(static_cast<std::size_t>(i), 'n') + "\u00e9\U0001F600" + std::to_string(i);
+    const std::string name =
+        std::string(static_cast<std::size_t>(i), 'n') + "\u00e9\U0001F600" + std::to_string(i);
     reply += "&FileName=" + name + "&FileURL=u%2F" + name + "&FileSize=" + std::to_string(i) + "&FileDate=d";
     expected += TextFromUtf8(name + "|u/" + name + "|d" + std::to_string(i) + "\n").value();
   }

@@ -30,12 +30,14 @@ TEST(KeyedHash, IsSipHash13AndCollidesForOneKeyAlone) {
 
 // Hosts' texts may be no valid UTF-16.
 TEST(FileList, FindsEveryAddress) {
-  const Text addresses[] = {u"a", u"\u00e9\u20ac", u"\xD83D\xDE00", u"\xD83D", u"\xDE00\xD83D", u"\xFFFD"};
+  const Text addresses[] = {u"a",       u"ab",           u"a\u00e9",
+                            u"a\u00e8", u"\u00e9\u20ac", u"\xD83D\xDE00",
+                            u"\xD83D",  u"\xDE00\xD83D", u"\xFFFD"};
   FileList list;
   for (const Text& address : addresses) {
     const auto record = std::make_shared<CUpload>();
     record->FilePath = address;
-    EXPECT_EQ(record->FilePath, address);
+    for (const Text& other : addresses) EXPECT_EQ(record->FilePath == other, address == other);
     list.Add(record);
   }
   for (const Text& address : addresses) {

@@ -56,8 +56,8 @@ void PrintTo(const Operation& operation, std::ostream* out) {
 std::string ListFiles(CFileUpload& client) {
   std::string files;
   const bool listed = client.ListFilesForUser([&](const std::shared_ptr<CUpload>& file) {
-    files += Show(Text(file->FileName)) + "|" + Show(Text(file->FilePath)) + "|" + Show(file->FileSize) + "|" +
-             Show(Text(file->FileDate)) + "|" + Show(Text(file->FilePath)) + "\n";
+    files += Show(Text(file->FileName)) + "|" + Show(Text(file->FilePath)) + "|" + Show(file->FileSize) +
+             "|" + Show(Text(file->FileDate)) + "|" + Show(Text(file->FilePath)) + "\n";
   });
   return files + Show(listed);
 }

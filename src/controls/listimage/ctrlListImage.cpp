@@ -174,8 +174,8 @@ Text ctrlListImage::ItemText(std::size_t index, int column) const {
 ItemPicture ctrlListImage::PictureOf(std::size_t index) const {
   if (index >= items_.size()) return kJpegPicture;
   const Text filter = LowerCase(currentFilter_);
-  const bool gif =
-      filter == u"gif" || (filter != u"jpg" && EndsWithIgnoringCase(Text(items_[index].record->FileName), u".gif"));
+  const bool gif = filter == u"gif" ||
+                   (filter != u"jpg" && EndsWithIgnoringCase(Text(items_[index].record->FileName), u".gif"));
   return gif ? kGifPicture : kJpegPicture;
 }
 

@@ -89,9 +89,10 @@ void ctrlThumbNailView::ChangeFileFilter(TextView szFileFilter) {
   });
 }
 
-bool ctrlThumbNailView::Passes(TextView name) const {
-  const TextView end = name.substr(name.size() - std::min<std::size_t>(name.size(), 3));
-  return listing_.filter == u"*" || LowerCase(end) == listing_.filter;
+bool ctrlThumbNailView::Passes(const CUpload& file) const {
+  if (listing_.filter == u"*") return true;
+  const Text name = file.FileName;
+  return LowerCase(name.substr(name.size() - std::min<std::size_t>(name.size(), 3))) == listing_.filter;
 }
 
 void ctrlThumbNailView::Show(const Text& filter) {
@@ -101,7 +102,7 @@ void ctrlThumbNailView::Show(const Text& filter) {
   listing_.filter = filter;
   // A second file of the same address is not shown.
   for (const FileRecord& record : listing_.all)
-    if (Passes(Text(record->FileName)) && !shown.Find(record->FilePath)) shown.Add(record);
+    if (Passes(*record) && !shown.Find(record->FilePath)) shown.Add(record);
   // What is selected is on the first page.
   keepSelection_ = false;
   const std::size_t selected = shown.PositionOf(selectedAddress_);

@@ -78,7 +78,7 @@ class ctrlThumbNailView final : public FileControl, public ThumbnailPageUser {
   bool List();
   // Fills the list of shown files through `filter` and shows its first page.
   void Show(const Text& filter);
-  bool Passes(TextView name) const;
+  bool Passes(const CUpload& file) const;
   int SetScrollRange();
   void SetScrollValue(int value);
 

@@ -103,7 +103,7 @@ void ctrlThumbNailView::ShowUploaded(const FileRecord& record) {
   });
   if (position != 0) {
     shown.Remove(position);
-  } else if (Passes(name)) {
+  } else if (Passes(*record)) {
     position = shown.Count() + 1;
   }
   if (position == 0) return;
@@ -200,8 +200,9 @@ void ctrlThumbNailView::GiveNewName(Text& NewString, const Text& oldName) {
     CheckFileExtension(NewString, ExtensionOf(oldName));
     // The caption may show what was typed, such as the name without its extension.
     if (NewString == oldName) return keepName(event::kRenamed);
-    if (listing_.shown.PositionWhere(
-            [&](const CUpload& file) { return EqualsIgnoringCase(Trim(Text(file.FileName)), NewString); }) != 0) {
+    if (listing_.shown.PositionWhere([&](const CUpload& file) {
+          return EqualsIgnoringCase(Trim(Text(file.FileName)), NewString);
+        }) != 0) {
       Fail(ftp_error::kNameNotAllowed, u"The account has a file of that name.");
       return keepName(event::kNameTaken);
     }

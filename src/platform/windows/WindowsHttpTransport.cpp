@@ -203,6 +203,8 @@ std::optional<std::string> Request::ReadBody(std::size_t maxBytes) {
   if (used == 0 && !request_.Header(WINHTTP_QUERY_RAW_HEADERS_CRLF).value_or(L"").ends_with(L"\r\n\r\n"))
     return std::nullopt;
   body.resize(used);
+  // The records of a listing keep its bytes.
+  if (used > kFirstRoom) body.shrink_to_fit();
   return std::move(body);
 }
 
