@@ -72,7 +72,7 @@ bool CFileUpload::ListFilesForUser(const FileSink& colFiles) {
     for (std::size_t i = 0; i < names->size(); ++i) {
       const std::size_t inBlock = i % kBlockFiles;
       if (inBlock == 0) block = std::make_shared<CUpload[]>(std::min(kBlockFiles, names->size() - i));
-      const std::shared_ptr<CUpload> file(block, &block[inBlock]);
+      const std::shared_ptr<CUpload> file(block, block.get() + inBlock);
       file->FileName = reply.Shared((*names)[i]);
       file->FilePath = reply.Shared(ElementAt(*urls, i));
       file->FileDate = reply.Shared(ElementAt(*dates, i));

@@ -136,10 +136,18 @@ TEST_F(CFileUploadTest, ListedRecordsStandAlone) {
   std::string reply;
   Text expected;
   for (int i = 0; i < 150; ++i) {
-    const std::string name =
-        std::string(static_cast<std::size_t>(i), 'n') + "\u00e9\U0001F600" + std::to_string(i);
-    reply += "&FileName=" + name + "&FileURL=u%2F" + name + "&FileSize=" + std::to_string(i) + "&FileDate=d";
-    expected += TextFromUtf8(name + "|u/" + name + "|d" + std::to_string(i) + "\n").value();
+    const std::string number = std::to_string(i);
+    std::string name(static_cast<std::size_t>(i), 'n');
+    name.append("\u00e9\U0001F600").append(number);
+    reply.append("&FileName=").append(name).append("&FileURL=u%2F").append(name);
+    reply.append("&FileDate=d&FileSize=").append(number);
+    const Text listed = TextFromUtf8(name).value();
+    expected.append(listed)
+        .append(u"|u/")
+        .append(listed)
+        .append(u"|d")
+        .append(TextFromNumber(i))
+        .append(u"\n");
   }
   Answer(reply.c_str());
   std::vector<std::shared_ptr<CUpload>> files;
