@@ -15,10 +15,9 @@ namespace tarnwick {
 // where they are and keep their keys as long as they are in the index.
 //
 // Open addressing with linear probing. Places lie apart from the pointers, so that a search, which jumps at
-// random, touches a small table. Measured against std::unordered_map and
-// std::unordered_set with the same hash, the best of 60 runs: 100,000 addresses go in within half of the time
-// (10 ms against 21 to 28) and are found in two thirds of it (43 ms against 62 to 75), in 1.8 MiB instead of
-// 4.4 to 5.9.
+// random, touches a small table. Measured against std::unordered_map and std::unordered_set with the same
+// hash, the best of 60 runs: 100,000 addresses go in within half of the time (10 ms against 21 to 28) and
+// are found in two thirds of it (43 ms against 62 to 75), in 1.8 MiB instead of 4.4 to 5.9.
 template <typename Entry, auto Key = &Entry::key, typename View = TextView>
 class KeyIndex {
  public:
